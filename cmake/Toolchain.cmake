@@ -1,0 +1,38 @@
+# Language, warnings, output folders and sanitizers: the same for every target.
+
+set( CMAKE_CXX_STANDARD 20 )
+set( CMAKE_CXX_STANDARD_REQUIRED ON )
+set( CMAKE_CXX_EXTENSIONS OFF )
+set( CMAKE_EXPORT_COMPILE_COMMANDS ON )
+
+# -fPIC everywhere, executables included, so that one precompiled header serves all targets.
+add_compile_options( -fPIC -Wall -Wextra -Wpedantic -Werror )
+add_compile_definitions( BOOST_BIND_GLOBAL_PLACEHOLDERS BOOST_ALLOW_DEPRECATED_HEADERS )
+if( CMAKE_CXX_COMPILER_ID STREQUAL "Clang" )
+  add_compile_options( -Wthread-safety -Xclang -fno-pch-timestamp )
+  add_compile_definitions( BOOST_THREAD_ENABLE_THREAD_SAFETY_ANALYSIS )
+endif()
+
+# Program, module and libraries lie side by side and find each other there.
+set( CMAKE_RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin" )
+set( CMAKE_LIBRARY_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin" )
+set( CMAKE_SKIP_BUILD_RPATH OFF )
+set( CMAKE_BUILD_RPATH_USE_ORIGIN ON )
+
+set( STAGECORE_SANITIZE "" CACHE STRING "address or thread; empty for none" )
+if( STAGECORE_SANITIZE STREQUAL "address" )
+  # GCC's optimiser sees false overflows in instrumented code.
+  add_compile_options( -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer -Wno-maybe-uninitialized -Wno-restrict -Wno-stringop-overflow )
+  add_link_options( -fsanitize=address,undefined )
+elseif( STAGECORE_SANITIZE STREQUAL "thread" )
+  add_compile_options( -fsanitize=thread -fno-omit-frame-pointer )
+  add_link_options( -fsanitize=thread )
+endif()
+
+find_program( STAGECORE_CCACHE ccache )
+if( STAGECORE_CCACHE )
+  set( CMAKE_CXX_COMPILER_LAUNCHER env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime ${STAGECORE_CCACHE} )
+endif()
+
+find_package( Boost 1.74 REQUIRED COMPONENTS thread filesystem )
+find_package( Threads REQUIRED )
