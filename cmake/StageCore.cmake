@@ -1,17 +1,39 @@
+# The kinds of target there are. Each takes the *.cpp files of the folder it is called in.
+#
 # stagecore_library( NAME [RUNTIME] [DEPENDS target...] )
-#   The folder's *.cpp as one target. RUNTIME puts its code into libStageCoreRuntime.so, of which module and host share one copy;
-#   otherwise it is a static library. A folder without *.cpp is an interface target.
+#   RUNTIME puts the code into libStageCoreRuntime.so, of which module and host share one copy; otherwise a static library.
+#   A folder without *.cpp is an interface target.
+# stagecore_module( NAME VERSION_SCRIPT file [DEPENDS target...] )
+#   bin/NAME.tpm, a module that exports what its version script says.
+# stagecore_virtual_card( NAME SONAME lib....so VERSION_SCRIPT file [DEPENDS target...] )
+#   bin/cards/SONAME, a stand-in for a vendor's run-time library.
+# stagecore_program( NAME [DEPENDS target...] )
+#   bin/NAME.
 # stagecore_test( NAME [DEPENDS target...] )
-#   The folder's *.cpp as one GoogleTest program, registered with CTest under NAME.
-# stagecore_precompile( TARGET ) gives a target the common precompiled header.
-
-add_library( StageCorePrecompiled STATIC "${CMAKE_CURRENT_LIST_DIR}/Precompiled.cpp" )
-target_precompile_headers( StageCorePrecompiled PRIVATE "${CMAKE_CURRENT_LIST_DIR}/Precompiled.h" )
+#   A GoogleTest program, registered with CTest under NAME.
+# stagecore_system_test( NAME [DEPENDS target...] )
+#   A GoogleTest program that runs whole programs: built after them all, run alone, label "system". The environment variable
+#   STAGECORE_BIN names the folder of programs, module and cards.
+# stagecore_fuzzer( NAME SOURCE file [DEPENDS target...] )
+#   A libFuzzer program with its corpus in the folder corpus/NAME; built in the preset `fuzz` alone.
+#
+# The target stagecore_programs is all of bin/, stagecore_fuzzers all fuzzers.
 
 add_library( StageCoreIncludes INTERFACE )
 target_include_directories( StageCoreIncludes INTERFACE "${CMAKE_SOURCE_DIR}/src" "${CMAKE_SOURCE_DIR}" )
 target_link_libraries( StageCoreIncludes INTERFACE Boost::headers Threads::Threads )
 
+# What every linked target of ours needs besides its DEPENDS.
+set( STAGECORE_COMMON_LIBRARIES StageCoreIncludes Boost::thread Boost::filesystem )
+
+add_library( StageCorePrecompiled STATIC "${CMAKE_CURRENT_LIST_DIR}/Precompiled.cpp" )
+target_link_libraries( StageCorePrecompiled PRIVATE ${STAGECORE_COMMON_LIBRARIES} )
+target_precompile_headers( StageCorePrecompiled PRIVATE "${CMAKE_CURRENT_LIST_DIR}/Precompiled.h" )
+
+add_custom_target( stagecore_programs )
+add_custom_target( stagecore_fuzzers )
+
+# Gives a target the common precompiled header.
 function( stagecore_precompile target )
   target_precompile_headers( ${target} REUSE_FROM StageCorePrecompiled )
   set_target_properties( ${target} PROPERTIES DEFINE_SYMBOL "" )
@@ -25,24 +47,86 @@ function( stagecore_library name )
     target_link_libraries( ${name} INTERFACE StageCoreIncludes ${ARG_DEPENDS} )
   elseif( ARG_RUNTIME )
     add_library( ${name}Objects OBJECT ${sources} )
-    target_link_libraries( ${name}Objects PUBLIC StageCoreIncludes Boost::thread Boost::filesystem )
+    target_link_libraries( ${name}Objects PUBLIC ${STAGECORE_COMMON_LIBRARIES} )
     stagecore_precompile( ${name}Objects )
     target_sources( StageCoreRuntimeShared PRIVATE $<TARGET_OBJECTS:${name}Objects> )
     add_library( ${name} INTERFACE )
     target_link_libraries( ${name} INTERFACE StageCoreIncludes StageCoreRuntimeShared ${ARG_DEPENDS} )
   else()
     add_library( ${name} STATIC ${sources} )
-    target_link_libraries( ${name} PUBLIC StageCoreIncludes Boost::thread Boost::filesystem ${ARG_DEPENDS} )
+    target_link_libraries( ${name} PUBLIC ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
     stagecore_precompile( ${name} )
   endif()
+endfunction()
+
+# Exports what the script names and nothing else, and leaves no name unresolved. Sanitizer run-time libraries are in the program, so there
+# a shared object may lack their names.
+function( stagecore_export_only target script )
+  get_filename_component( script "${script}" ABSOLUTE )
+  target_link_options( ${target} PRIVATE "LINKER:--version-script=${script}" )
+  if( NOT STAGECORE_SANITIZE )
+    target_link_options( ${target} PRIVATE "LINKER:--no-undefined" )
+  endif()
+  set_property( TARGET ${target} APPEND PROPERTY LINK_DEPENDS "${script}" )
+endfunction()
+
+function( stagecore_module name )
+  cmake_parse_arguments( ARG "" "VERSION_SCRIPT" "DEPENDS" ${ARGN} )
+  file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
+  add_library( ${name} MODULE ${sources} )
+  target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
+  stagecore_precompile( ${name} )
+  stagecore_export_only( ${name} "${ARG_VERSION_SCRIPT}" )
+  set_target_properties( ${name} PROPERTIES PREFIX "" SUFFIX ".tpm" )
+  add_dependencies( stagecore_programs ${name} )
+endfunction()
+
+function( stagecore_virtual_card name )
+  cmake_parse_arguments( ARG "" "SONAME;VERSION_SCRIPT" "DEPENDS" ${ARGN} )
+  file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
+  add_library( ${name} SHARED ${sources} )
+  target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
+  stagecore_precompile( ${name} )
+  stagecore_export_only( ${name} "${ARG_VERSION_SCRIPT}" )
+  get_filename_component( output "${ARG_SONAME}" NAME_WLE )
+  set_target_properties( ${name} PROPERTIES PREFIX "" OUTPUT_NAME "${output}" LIBRARY_OUTPUT_DIRECTORY "${CMAKE_LIBRARY_OUTPUT_DIRECTORY}/cards" )
+  add_dependencies( stagecore_programs ${name} )
+endfunction()
+
+function( stagecore_program name )
+  cmake_parse_arguments( ARG "" "" "DEPENDS" ${ARGN} )
+  file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
+  add_executable( ${name} ${sources} )
+  target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
+  stagecore_precompile( ${name} )
+  add_dependencies( stagecore_programs ${name} )
 endfunction()
 
 function( stagecore_test name )
   cmake_parse_arguments( ARG "" "" "DEPENDS" ${ARGN} )
   file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
   add_executable( ${name} ${sources} )
-  target_link_libraries( ${name} PRIVATE StageCoreIncludes ${ARG_DEPENDS} GTest::gtest GTest::gtest_main Boost::thread Boost::filesystem )
+  target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} GTest::gtest GTest::gtest_main )
   stagecore_precompile( ${name} )
   set_target_properties( ${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests" )
   add_test( NAME ${name} COMMAND ${name} )
+endfunction()
+
+function( stagecore_system_test name )
+  stagecore_test( ${name} ${ARGN} )
+  add_dependencies( ${name} stagecore_programs )
+  set_tests_properties( ${name} PROPERTIES LABELS system RUN_SERIAL ON ENVIRONMENT "STAGECORE_BIN=${CMAKE_RUNTIME_OUTPUT_DIRECTORY}" )
+endfunction()
+
+function( stagecore_fuzzer name )
+  if( NOT STAGECORE_SANITIZE STREQUAL "fuzzer" )
+    return()
+  endif()
+  cmake_parse_arguments( ARG "" "SOURCE" "DEPENDS" ${ARGN} )
+  add_executable( ${name} "${ARG_SOURCE}" )
+  target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
+  target_link_options( ${name} PRIVATE -fsanitize=fuzzer )
+  stagecore_precompile( ${name} )
+  set_target_properties( ${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/fuzzers" )
+  add_dependencies( stagecore_fuzzers ${name} )
 endfunction()

@@ -11,6 +11,9 @@ add_compile_definitions( BOOST_BIND_GLOBAL_PLACEHOLDERS BOOST_ALLOW_DEPRECATED_H
 if( CMAKE_CXX_COMPILER_ID STREQUAL "Clang" )
   add_compile_options( -Wthread-safety -Xclang -fno-pch-timestamp )
   add_compile_definitions( BOOST_THREAD_ENABLE_THREAD_SAFETY_ANALYSIS )
+else()
+  # Lets ccache see the precompiled header.
+  add_compile_options( -fpch-preprocess )
 endif()
 
 # Program, module and libraries lie side by side and find each other there.
@@ -19,7 +22,7 @@ set( CMAKE_LIBRARY_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin" )
 set( CMAKE_SKIP_BUILD_RPATH OFF )
 set( CMAKE_BUILD_RPATH_USE_ORIGIN ON )
 
-set( STAGECORE_SANITIZE "" CACHE STRING "address or thread; empty for none" )
+set( STAGECORE_SANITIZE "" CACHE STRING "address (with undefined behaviour), thread or fuzzer (with address); empty for none" )
 if( STAGECORE_SANITIZE STREQUAL "address" )
   # GCC's optimiser sees false overflows in instrumented code.
   add_compile_options( -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer -Wno-maybe-uninitialized -Wno-restrict -Wno-stringop-overflow )
@@ -27,6 +30,11 @@ if( STAGECORE_SANITIZE STREQUAL "address" )
 elseif( STAGECORE_SANITIZE STREQUAL "thread" )
   add_compile_options( -fsanitize=thread -fno-omit-frame-pointer )
   add_link_options( -fsanitize=thread )
+elseif( STAGECORE_SANITIZE STREQUAL "fuzzer" )
+  add_compile_options( -fsanitize=fuzzer-no-link,address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer )
+  add_link_options( -fsanitize=address,undefined )
+elseif( STAGECORE_SANITIZE )
+  message( FATAL_ERROR "STAGECORE_SANITIZE is \"${STAGECORE_SANITIZE}\"; it can be address, thread or fuzzer" )
 endif()
 
 find_program( STAGECORE_CCACHE ccache )
