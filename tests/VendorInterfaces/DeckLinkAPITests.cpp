@@ -1,0 +1,359 @@
+// The vendor's binary interface: ids, table slots, argument order and calling convention, against facts written out again here.
+#include "VendorInterfaces/DeckLinkAPI.h"
+
+#include <gtest/gtest.h>
+
+#include <iomanip>
+#include <sstream>
+#include <type_traits>
+
+using namespace DeckLinkAPI;
+
+namespace
+{
+
+// A pointer to a virtual member function holds 1 plus the byte offset in the table (Itanium C++ ABI 2.3).
+template<class TMember> long Slot( TMember i_pMember )
+{
+  static_assert( sizeof( TMember ) == 2 * sizeof( void* ) );
+  uintptr_t Representation = 0;
+  std::memcpy( &Representation, &i_pMember, sizeof( Representation ) );
+  EXPECT_EQ( Representation % sizeof( void* ), 1u ) << "not virtual";
+  return static_cast<long>( Representation / sizeof( void* ) );
+}
+
+// The slot that an operation added by a derived class gets: it counts all slots of the base, its destructor's two included.
+template<class TInterface> long SlotCount()
+{
+  struct VDerived : TInterface
+  {
+    virtual void Added() = 0;
+  };
+  return Slot( &VDerived::Added );
+}
+
+std::string ToHex( const REFIID& i_rId )
+{
+  std::ostringstream Text;
+  for( unsigned char Byte : i_rId.m_Bytes )
+  {
+    Text << std::hex << std::uppercase << std::setw( 2 ) << std::setfill( '0' ) << unsigned{ Byte };
+  }
+  return Text.str();
+}
+
+// The types that pass the boundary
+static_assert( sizeof( HRESULT ) == 4 && sizeof( bool ) == 1 && sizeof( long ) == 8 );
+static_assert( std::is_same_v<decltype( &IUnknown::AddRef ), unsigned long ( IUnknown::* )()> && sizeof( ULONG ) == 8 );
+static_assert( std::is_same_v<decltype( &IUnknown::Release ), unsigned long ( IUnknown::* )()> );
+static_assert( std::is_same_v<decltype( &IUnknown::QueryInterface ), int ( IUnknown::* )( REFIID, void** )> );
+static_assert( std::is_trivially_copyable_v<REFIID> );
+static_assert( std::is_same_v<decltype( &IDeckLinkVideoInputFrame::GetStreamTime ),
+  int ( IDeckLinkVideoInputFrame::* )( int64_t*, int64_t*, int64_t )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkVideoInputFrame::GetHardwareReferenceTimestamp ),
+  int ( IDeckLinkVideoInputFrame::* )( int64_t, int64_t*, int64_t* )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkAudioInputPacket::GetPacketTime ), int ( IDeckLinkAudioInputPacket::* )( int64_t*, int64_t )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkAudioInputPacket::GetSampleFrameCount ), long ( IDeckLinkAudioInputPacket::* )()> );
+static_assert( std::is_same_v<decltype( &IDeckLinkVideoFrame::GetRowBytes ), long ( IDeckLinkVideoFrame::* )()> );
+static_assert( std::is_same_v<decltype( &IDeckLinkAttributes::GetFlag ), int ( IDeckLinkAttributes::* )( uint32_t, bool* )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkTimecode::GetComponents ),
+  int ( IDeckLinkTimecode::* )( uint8_t*, uint8_t*, uint8_t*, uint8_t* )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkInput::DoesSupportVideoMode ),
+  int ( IDeckLinkInput::* )( uint32_t, uint32_t, uint32_t, uint32_t*, IDeckLinkDisplayMode** )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkInput::EnableAudioInput ), int ( IDeckLinkInput::* )( uint32_t, uint32_t, uint32_t )> );
+static_assert( std::is_same_v<decltype( &IDeckLinkInput::GetHardwareReferenceClock ),
+  int ( IDeckLinkInput::* )( int64_t, int64_t*, int64_t*, int64_t* )> );
+
+}
+
+TEST( DeckLinkAPI, InterfaceIdsAreThePrintedDigitsInOrder )
+{
+  EXPECT_EQ( ToHex( IID_IUnknown ), "0000000000000000C000000000000046" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkDiscovery ), "CDBF631CBC7645FAB44DC55059BC6101" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkDeviceNotificationCallback ), "4997053B0ADF4CC8AC707A50C4BE728F" );
+  EXPECT_EQ( ToHex( IID_IDeckLink ), "C418FBDD058748ED8FE5640F0A14AF91" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkAttributes ), "ABC11843D96644CB96E2A1CB5D3135C4" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkProfileAttributes ), "17D4BF8E4911473A80A0731CF6FF345B" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkInput ), "AF22762BDFAC4846AA79FA8883560995" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkInputCallback ), "DD04E5EC741542ABAE4AE80C4DFC044A" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkDisplayModeIterator ), "9C88499FF6014021B80B032E4EB41C35" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkDisplayMode ), "3EB2C1AB0A3D4523A3ADF40D7FB14E78" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkVideoFrame ), "3F716FE0F0234111BE5DEF4414C05B17" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkVideoInputFrame ), "05CFE374537C40949A57680525118F44" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkAudioInputPacket ), "E43D5870289411DE8C300800200C9A66" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkTimecode ), "BC6CFBD383174325AC1C1216391E9340" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkVideoFrameAncillary ), "732E723CD1A44E299E8E4A88797A0004" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkIterator ), "50FB36CD30634B73BDBB958087F2D8BA" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkAPIInformation ), "7BEA3C68730D4322AF348A7152B532A4" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkMemoryAllocator ), "B36EB6E79D294AA892EF843B87A289E8" );
+  EXPECT_EQ( ToHex( IID_IDeckLinkScreenPreviewCallback ), "B1D3F49A85FE4C5D95C80B5D5DCCD438" );
+}
+
+TEST( DeckLinkAPI, SlotsOfWhatARunningCardCalls )
+{
+  EXPECT_EQ( Slot( &IUnknown::QueryInterface ), 0 );
+  EXPECT_EQ( Slot( &IUnknown::AddRef ), 1 );
+  EXPECT_EQ( Slot( &IUnknown::Release ), 2 );
+
+  EXPECT_EQ( Slot( &IDeckLinkInput::DoesSupportVideoMode ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::GetDisplayModeIterator ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::SetScreenPreviewCallback ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::EnableVideoInput ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::DisableVideoInput ), 7 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::GetAvailableVideoFrameCount ), 8 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::SetVideoInputFrameMemoryAllocator ), 9 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::EnableAudioInput ), 10 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::DisableAudioInput ), 11 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::GetAvailableAudioSampleFrameCount ), 12 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::StartStreams ), 13 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::StopStreams ), 14 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::PauseStreams ), 15 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::FlushStreams ), 16 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::SetCallback ), 17 );
+  EXPECT_EQ( Slot( &IDeckLinkInput::GetHardwareReferenceClock ), 18 );
+
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetWidth ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetHeight ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetRowBytes ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetPixelFormat ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetFlags ), 7 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetBytes ), 8 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetTimecode ), 9 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrame::GetAncillaryData ), 10 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoInputFrame::GetStreamTime ), 13 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoInputFrame::GetHardwareReferenceTimestamp ), 14 );
+
+  EXPECT_EQ( Slot( &IDeckLinkInputCallback::VideoInputFormatChanged ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkInputCallback::VideoInputFrameArrived ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkAudioInputPacket::GetSampleFrameCount ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkAudioInputPacket::GetBytes ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkAudioInputPacket::GetPacketTime ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkTimecode::GetBCD ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkTimecode::GetComponents ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkTimecode::GetString ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkTimecode::GetFlags ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkTimecode::GetTimecodeUserBits ), 7 );
+}
+
+TEST( DeckLinkAPI, SlotsOfFindingAndDescribing )
+{
+  EXPECT_EQ( Slot( &IDeckLinkDiscovery::InstallDeviceNotifications ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkDiscovery::UninstallDeviceNotifications ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceArrived ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceRemoved ), 4 );
+  EXPECT_EQ( Slot( &IDeckLink::GetModelName ), 3 );
+  EXPECT_EQ( Slot( &IDeckLink::GetDisplayName ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkIterator::Next ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkAttributes::GetFlag ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkAttributes::GetInt ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkAttributes::GetFloat ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkAttributes::GetString ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkAPIInformation::GetFlag ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkAPIInformation::GetString ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayModeIterator::Next ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetName ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetDisplayMode ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetWidth ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetHeight ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetFrameRate ), 7 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetFieldDominance ), 8 );
+  EXPECT_EQ( Slot( &IDeckLinkDisplayMode::GetFlags ), 9 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrameAncillary::GetBufferForVerticalBlankingLine ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrameAncillary::GetPixelFormat ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkVideoFrameAncillary::GetDisplayMode ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkMemoryAllocator::AllocateBuffer ), 3 );
+  EXPECT_EQ( Slot( &IDeckLinkMemoryAllocator::ReleaseBuffer ), 4 );
+  EXPECT_EQ( Slot( &IDeckLinkMemoryAllocator::Commit ), 5 );
+  EXPECT_EQ( Slot( &IDeckLinkMemoryAllocator::Decommit ), 6 );
+  EXPECT_EQ( Slot( &IDeckLinkScreenPreviewCallback::DrawFrame ), 3 );
+}
+
+TEST( DeckLinkAPI, DestructorsTakeTwoSlotsWhereTheVendorHasThem )
+{
+  EXPECT_EQ( SlotCount<IUnknown>(), 3 );
+  EXPECT_EQ( SlotCount<IDeckLinkIterator>(), 4 );
+  EXPECT_EQ( SlotCount<IDeckLinkMemoryAllocator>(), 7 );
+  EXPECT_EQ( SlotCount<IDeckLinkDiscovery>(), 7 );
+  EXPECT_EQ( SlotCount<IDeckLinkDeviceNotificationCallback>(), 7 );
+  EXPECT_EQ( SlotCount<IDeckLink>(), 7 );
+  EXPECT_EQ( SlotCount<IDeckLinkAttributes>(), 9 );
+  EXPECT_EQ( SlotCount<IDeckLinkAPIInformation>(), 9 );
+  EXPECT_EQ( SlotCount<IDeckLinkInput>(), 21 );
+  EXPECT_EQ( SlotCount<IDeckLinkInputCallback>(), 7 );
+  EXPECT_EQ( SlotCount<IDeckLinkDisplayModeIterator>(), 6 );
+  EXPECT_EQ( SlotCount<IDeckLinkDisplayMode>(), 12 );
+  EXPECT_EQ( SlotCount<IDeckLinkVideoFrame>(), 13 );
+  EXPECT_EQ( SlotCount<IDeckLinkVideoInputFrame>(), 15 );
+  EXPECT_EQ( SlotCount<IDeckLinkAudioInputPacket>(), 8 );
+  EXPECT_EQ( SlotCount<IDeckLinkTimecode>(), 10 );
+  EXPECT_EQ( SlotCount<IDeckLinkVideoFrameAncillary>(), 8 );
+  EXPECT_EQ( SlotCount<IDeckLinkScreenPreviewCallback>(), 6 );
+}
+
+TEST( DeckLinkAPI, CodesOfModesFormatsAndFlags )
+{
+  EXPECT_EQ( FourCharacterCode( "ntsc" ), 0x6E747363u );
+  EXPECT_EQ( FourCharacterCode( "pal " ), 0x70616C20u );
+  EXPECT_EQ( DisplayModeUnknown, 0x69756E6Bu );
+  EXPECT_EQ( PixelFormat::YUV8Bit, 0x32767579u );
+  EXPECT_EQ( PixelFormat::YUV10Bit, 0x76323130u );
+  EXPECT_EQ( PixelFormat::BGRA8Bit, 0x42475241u );
+  EXPECT_EQ( TimecodeFormat::RP188Any, 0x72703138u );
+  EXPECT_EQ( TimecodeFormat::RP188LTC, 0x72706C74u );
+  EXPECT_EQ( TimecodeFormat::RP188VITC1, 0x72707631u );
+  EXPECT_EQ( TimecodeFormat::RP188VITC2, 0x72703132u );
+  EXPECT_EQ( TimecodeFormat::VITCField1, 0x76697463u );
+  EXPECT_EQ( TimecodeFormat::VITCField2, 0x76697432u );
+  EXPECT_EQ( TimecodeFormat::Serial, 0x73657269u );
+  EXPECT_EQ( FrameFlag::NoInputSource, 0x80000000u );
+  EXPECT_EQ( AttributeId::SupportsInputFormatDetection, 0x696E6664u );
+  EXPECT_EQ( static_cast<uint32_t>( E_ACCESSDENIED ), 0x80000009u );
+  EXPECT_EQ( static_cast<uint32_t>( E_FAIL ), 0x80000008u );
+  EXPECT_LT( E_NOINTERFACE, 0 );
+}
+
+namespace
+{
+
+// An object as a C program would make it: a table of plain functions whose first argument is the object.
+struct VForeignObject
+{
+  const void* m_pTable;
+  unsigned long m_References = 1;
+  std::string m_Calls;
+};
+
+int ForeignQueryInterface( VForeignObject* i_pThis, unsigned long i_Low, unsigned long i_High, void** o_ppObject )
+{
+  // A 16-byte structure of bytes travels in two integer registers, first bytes in the first.
+  unsigned char Bytes[ 16 ];
+  std::memcpy( Bytes, &i_Low, 8 );
+  std::memcpy( Bytes + 8, &i_High, 8 );
+  const bool bMine = std::memcmp( Bytes, IID_IDeckLinkVideoInputFrame.m_Bytes, 16 ) == 0;
+  *o_ppObject = bMine ? i_pThis : nullptr;
+  return bMine ? S_OK : E_NOINTERFACE;
+}
+
+unsigned long ForeignAddRef( VForeignObject* i_pThis )
+{
+  return i_pThis->m_References += 0x100000000;   // shows that all 64 bits come back
+}
+
+int ForeignStreamTime( VForeignObject* i_pThis, int64_t* o_pTime, int64_t* o_pDuration, int64_t i_Scale )
+{
+  i_pThis->m_Calls += "stream " + std::to_string( i_Scale ) + ";";
+  *o_pTime = 11;
+  *o_pDuration = 12;
+  return 0;
+}
+
+int ForeignHardwareTime( VForeignObject* i_pThis, int64_t i_Scale, int64_t* o_pTime, int64_t* o_pDuration )
+{
+  i_pThis->m_Calls += "hardware " + std::to_string( i_Scale ) + ";";
+  *o_pTime = 21;
+  *o_pDuration = 22;
+  return 0;
+}
+
+// Keeps the compiler from seeing through the table, which does not hold C++ functions of the called type.
+__attribute__( ( noinline ) ) IDeckLinkVideoInputFrame* AsFrame( VForeignObject* i_pObject )
+{
+  return reinterpret_cast<IDeckLinkVideoInputFrame*>( i_pObject );
+}
+
+template<class TFunction> const void* Entry( TFunction* i_pFunction )
+{
+  return reinterpret_cast<const void*>( i_pFunction );
+}
+
+// An object of ours, to be called as a C program would.
+class VOurPacket final : public IDeckLinkAudioInputPacket
+{
+public:
+  HRESULT QueryInterface( REFIID i_Id, void** o_ppObject ) override
+  {
+    const bool bMine = i_Id == IID_IDeckLinkAudioInputPacket;
+    *o_ppObject = bMine ? this : nullptr;
+    return bMine ? S_OK : E_NOINTERFACE;
+  }
+  ULONG AddRef() override { return 7; }
+  ULONG Release() override { return 6; }
+  long GetSampleFrameCount() override { return 0x123456789; }
+  HRESULT GetBytes( void** o_ppBuffer ) override
+  {
+    *o_ppBuffer = this;
+    return E_FAIL;
+  }
+  HRESULT GetPacketTime( int64_t* o_pTime, int64_t i_Scale ) override
+  {
+    *o_pTime = i_Scale * 2;
+    return S_OK;
+  }
+};
+
+__attribute__( ( noinline ) ) void* ReadTable( IUnknown* i_pObject, int i_Slot )
+{
+  void** pTable = nullptr;
+  std::memcpy( &pTable, static_cast<void*>( i_pObject ), sizeof( pTable ) );
+  return pTable[ i_Slot ];
+}
+
+template<class TFunction> TFunction* TableEntry( IUnknown* i_pObject, int i_Slot )
+{
+  return reinterpret_cast<TFunction*>( ReadTable( i_pObject, i_Slot ) );
+}
+
+}
+
+namespace
+{
+
+// The object has no type information, which one of the sanitizers would look for.
+__attribute__( ( no_sanitize( "vptr" ) ) ) void CallForeignFrame( IDeckLinkVideoInputFrame* i_pFrame )
+{
+  void* pFound = nullptr;
+  EXPECT_EQ( i_pFrame->QueryInterface( IID_IDeckLinkVideoInputFrame, &pFound ), S_OK );
+  EXPECT_EQ( pFound, i_pFrame );
+  EXPECT_EQ( i_pFrame->QueryInterface( IID_IDeckLinkVideoFrame, &pFound ), E_NOINTERFACE );
+  EXPECT_EQ( i_pFrame->AddRef(), 0x100000001u );
+
+  int64_t Time = 0;
+  int64_t Duration = 0;
+  EXPECT_EQ( i_pFrame->GetStreamTime( &Time, &Duration, 135000000 ), S_OK );
+  EXPECT_EQ( Time, 11 );
+  EXPECT_EQ( i_pFrame->GetHardwareReferenceTimestamp( 90000, &Time, &Duration ), S_OK );
+  EXPECT_EQ( Duration, 22 );
+}
+
+}
+
+TEST( DeckLinkAPI, CallsReachAForeignTable )
+{
+  const void* Table[ 15 ] = {};
+  Table[ 0 ] = Entry( ForeignQueryInterface );
+  Table[ 1 ] = Entry( ForeignAddRef );
+  Table[ 13 ] = Entry( ForeignStreamTime );
+  Table[ 14 ] = Entry( ForeignHardwareTime );
+  VForeignObject Object{ Table, 1, {} };
+  CallForeignFrame( AsFrame( &Object ) );
+  EXPECT_EQ( Object.m_Calls, "stream 135000000;hardware 90000;" );
+}
+
+TEST( DeckLinkAPI, ForeignCallsReachOurTable )
+{
+  VOurPacket Packet;
+  IDeckLinkAudioInputPacket* pPacket = &Packet;
+  REFIID Id = IID_IDeckLinkAudioInputPacket;
+  unsigned long Words[ 2 ];
+  std::memcpy( Words, Id.m_Bytes, sizeof( Words ) );
+
+  void* pFound = nullptr;
+  EXPECT_EQ( ( TableEntry<int( void*, unsigned long, unsigned long, void** )>( pPacket, 0 )( pPacket, Words[ 0 ], Words[ 1 ], &pFound ) ), S_OK );
+  EXPECT_EQ( pFound, pPacket );
+  EXPECT_EQ( ( TableEntry<unsigned long( void* )>( pPacket, 2 )( pPacket ) ), 6u );
+  EXPECT_EQ( ( TableEntry<long( void* )>( pPacket, 3 )( pPacket ) ), 0x123456789 );
+  EXPECT_EQ( ( TableEntry<int( void*, void** )>( pPacket, 4 )( pPacket, &pFound ) ), E_FAIL );
+  int64_t Time = 0;
+  EXPECT_EQ( ( TableEntry<int( void*, int64_t*, int64_t )>( pPacket, 5 )( pPacket, &Time, 48000 ) ), S_OK );
+  EXPECT_EQ( Time, 96000 );
+}
