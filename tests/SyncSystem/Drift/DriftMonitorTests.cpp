@@ -1,0 +1,283 @@
+#include "SyncSystem/DriftMonitor.h"
+
+#include "tests/SyncSystem/Drift/DeliveryTimes.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <vector>
+
+namespace
+{
+
+using Drift::VDriftMonitor;
+using Drift::VDriftMonitorConfiguration;
+
+// The same filter written down a second time, step by step and in wider numbers.
+struct VReferenceFilter
+{
+  VDriftMonitorConfiguration m_Configuration;
+  long double m_Period = 0.04L;
+  uint64_t m_Sample = 0;
+  long double m_X[ 2 ] = { 0.0L, 0.0L };
+  long double m_P[ 2 ][ 2 ] = { { 1.0L, 0.0L }, { 0.0L, 1.0L } };
+  uint64_t m_Accepted = 0;
+  long double m_Start = 0.0L;
+  long double m_Best = 1e9L;
+
+  void Begin( uint64_t i_Sample, double i_Time )
+  {
+    m_Sample = i_Sample;
+    m_X[ 0 ] = i_Time;
+    m_X[ 1 ] = m_Period;
+    m_P[ 1 ][ 1 ] = m_Configuration.m_InitialRateVariance;
+    m_Start = i_Time - i_Sample * m_Period;
+  }
+
+  void Step()
+  {
+    const long double q = m_Configuration.m_ProcessNoise;
+    const long double a = m_Period * m_Period / 2.0L;
+    m_X[ 0 ] += m_X[ 1 ];
+    const long double P00 = m_P[ 0 ][ 0 ] + m_P[ 0 ][ 1 ] + m_P[ 1 ][ 0 ] + m_P[ 1 ][ 1 ] + q * a * a;
+    const long double P01 = m_P[ 0 ][ 1 ] + m_P[ 1 ][ 1 ] + q * a * m_Period;
+    const long double P10 = m_P[ 1 ][ 0 ] + m_P[ 1 ][ 1 ] + q * a * m_Period;
+    m_P[ 1 ][ 1 ] += q * m_Period * m_Period;
+    m_P[ 0 ][ 0 ] = P00;
+    m_P[ 0 ][ 1 ] = P01;
+    m_P[ 1 ][ 0 ] = P10;
+  }
+
+  void Add( uint64_t i_Sample, double i_Time )
+  {
+    const uint64_t Steps = i_Sample - m_Sample;
+    if( i_Time - m_X[ 0 ] > m_Configuration.m_GapFactor * m_Period * Steps )
+    {
+      m_P[ 0 ][ 0 ] = 1.0L;
+      m_P[ 0 ][ 1 ] = m_P[ 1 ][ 0 ] = 0.0L;
+      m_X[ 0 ] = i_Time - Steps * m_X[ 1 ];
+      m_Best = 1e9L;
+    }
+    for( uint64_t Index = 0; Index < Steps; ++Index )
+    {
+      Step();
+    }
+    m_Sample = i_Sample;
+    const long double S = m_P[ 0 ][ 0 ] + m_Configuration.m_MeasurementNoise;
+    const long double K[ 2 ] = { m_P[ 0 ][ 0 ] / S, m_P[ 1 ][ 0 ] / S };
+    const long double Residual = i_Time - m_X[ 0 ];
+    m_X[ 0 ] += K[ 0 ] * Residual;
+    m_X[ 1 ] += K[ 1 ] * Residual;
+    const long double Row[ 2 ] = { m_P[ 0 ][ 0 ], m_P[ 0 ][ 1 ] };
+    for( int Column = 0; Column < 2; ++Column )
+    {
+      m_P[ 0 ][ Column ] -= K[ 0 ] * Row[ Column ];
+      m_P[ 1 ][ Column ] -= K[ 1 ] * Row[ Column ];
+    }
+    const long double Back = -static_cast<long double>( m_Sample );
+    const long double Uncertainty = m_P[ 0 ][ 0 ] + Back * ( m_P[ 0 ][ 1 ] + m_P[ 1 ][ 0 ] ) + Back * Back * m_P[ 1 ][ 1 ];
+    if( Uncertainty < m_Best )
+    {
+      m_Best = Uncertainty;
+      m_Start = m_X[ 0 ] + Back * m_X[ 1 ];
+    }
+  }
+};
+
+VDriftMonitor::VFit FitOf( const VDriftMonitor& i_rMonitor )
+{
+  VDriftMonitor::VFit Fit;
+  EXPECT_TRUE( i_rMonitor.GetFit( Fit ) );
+  return Fit;
+}
+
+bool Add( VDriftMonitor& io_rMonitor, uint64_t i_Sample, double i_Time, uint32_t i_Session = 1 )
+{
+  return io_rMonitor.Update( i_Session, TicksPerSecond, Period25, 0, i_Sample, i_Time );
+}
+
+TEST( DriftMonitor, FollowsTheFilterWrittenDownStepByStep )
+{
+  for( const uint32_t Mode : { 0u, 1u } )
+  {
+    SCOPED_TRACE( Mode );
+    VDriftMonitorConfiguration Configuration;
+    Configuration.m_PredictMode = Mode;
+    Configuration.m_ProcessNoise = 1e-6;   // large enough to be seen in the result
+    VDriftMonitor Monitor( Configuration );
+    VReferenceFilter Reference;
+    Reference.m_Configuration = Configuration;
+    VDeliveryTimes Times{ .m_Rate = 0.0400012, .m_Jitter = 0.004 };
+    std::mt19937_64 Random( 3 );
+
+    uint64_t Sample = 4;
+    ASSERT_TRUE( Add( Monitor, Sample, Times( Sample ) ) );
+    Times.m_Random.seed( 7 );
+    Reference.Begin( Sample, Times( Sample ) );
+    for( int Count = 0; Count < 150; ++Count )
+    {
+      Sample += Random() % 10 == 0 ? Random() % 90 + 1 : 1;
+      Times.m_Start += Count == 90 ? 700.0 : 0.0;   // a jump in time
+      const double Time = Times( Sample );
+      ASSERT_TRUE( Add( Monitor, Sample, Time ) );
+      Reference.Add( Sample, Time );
+      const VDriftMonitor::VFit Fit = FitOf( Monitor );
+      ASSERT_NEAR( Fit.m_Last.m_Time, static_cast<double>( Reference.m_X[ 0 ] ), 1e-9 ) << Count;
+      ASSERT_NEAR( Fit.m_Last.m_Rate, static_cast<double>( Reference.m_X[ 1 ] ), 1e-12 ) << Count;
+      ASSERT_NEAR( Fit.m_TimeVariance, static_cast<double>( Reference.m_P[ 0 ][ 0 ] ), 1e-12 ) << Count;
+      ASSERT_NEAR( Fit.m_StartTime, static_cast<double>( Reference.m_Start ), 1e-7 ) << Count;
+    }
+    EXPECT_EQ( FitOf( Monitor ).m_Samples, 151u );
+  }
+}
+
+TEST( DriftMonitor, FindsRateAndStartOfAJitteringSource )
+{
+  for( const uint32_t Mode : { 0u, 2u } )
+  {
+    VDriftMonitorConfiguration Configuration;
+    Configuration.m_PredictMode = Mode;
+    VDriftMonitor Monitor( Configuration );
+    VDeliveryTimes Times{ .m_Start = 50.0, .m_Rate = 0.04 * ( 1.0 + 80e-6 ), .m_Jitter = 0.002 };
+    for( uint64_t Sample = 0; Sample < 4000; ++Sample )
+    {
+      ASSERT_TRUE( Add( Monitor, Sample, Times( Sample ) ) );
+    }
+    const VDriftMonitor::VFit Fit = FitOf( Monitor );
+    EXPECT_NEAR( Fit.m_Last.m_Rate, Times.m_Rate, 5e-8 );
+    EXPECT_NEAR( Fit.m_StartTime, 50.001, 0.0003 );   // the mean lateness counts as part of the start
+  }
+}
+
+TEST( DriftMonitor, RefusesWhatCannotBeFitted )
+{
+  VDriftMonitor Monitor( {} );
+  VDriftMonitor::VFit Fit;
+  double Time = 0.0;
+  EXPECT_FALSE( Monitor.Update( 0, TicksPerSecond, Period25, 0, 0, 1.0 ) );
+  EXPECT_FALSE( Monitor.Update( 1, 0, Period25, 0, 0, 1.0 ) );
+  EXPECT_FALSE( Monitor.Update( 1, TicksPerSecond, 0, 0, 0, 1.0 ) );
+  EXPECT_FALSE( Monitor.GetFit( Fit ) );
+  EXPECT_FALSE( Monitor.GetSampleTime( 0, Time ) );
+
+  ASSERT_TRUE( Add( Monitor, 10, 1.0 ) );
+  ASSERT_TRUE( Add( Monitor, 12, 1.08 ) );
+  const VDriftMonitor::VFit Before = FitOf( Monitor );
+  EXPECT_FALSE( Add( Monitor, 12, 1.09 ) );
+  EXPECT_FALSE( Add( Monitor, 3, 1.2 ) );
+  const VDriftMonitor::VFit After = FitOf( Monitor );
+  EXPECT_EQ( After.m_Samples, Before.m_Samples );
+  EXPECT_EQ( After.m_Last.m_Sample, 12u );
+  EXPECT_EQ( After.m_Last.m_Time, Before.m_Last.m_Time );
+  EXPECT_EQ( After.m_StartTime, Before.m_StartTime );
+}
+
+TEST( DriftMonitor, ANewSessionBeginsAFreshFit )
+{
+  VDriftMonitor Monitor( {} );
+  VDeliveryTimes Times{ .m_Rate = 0.041 };
+  for( uint64_t Sample = 0; Sample < 100; ++Sample )
+  {
+    Add( Monitor, Sample, Times( Sample ) );
+  }
+  ASSERT_TRUE( Monitor.Update( 2, TicksPerSecond, Period25, 1, 3, 500.0 ) );
+  const VDriftMonitor::VFit Fit = FitOf( Monitor );
+  EXPECT_EQ( Fit.m_SessionId, 2u );
+  EXPECT_EQ( Fit.m_Samples, 1u );
+  EXPECT_DOUBLE_EQ( Fit.m_Last.m_Time, 500.0 );
+  EXPECT_DOUBLE_EQ( Fit.m_Last.m_Rate, 0.04 );
+  EXPECT_DOUBLE_EQ( Fit.m_StartTime, 499.92 );
+  Monitor.Reset();
+  VDriftMonitor::VFit None;
+  EXPECT_FALSE( Monitor.GetFit( None ) );
+}
+
+TEST( DriftMonitor, AJumpMovesTheTimeAndKeepsTheRate )
+{
+  VDriftMonitor Monitor( {} );
+  VDeliveryTimes Times{ .m_Rate = 0.0402 };
+  for( uint64_t Sample = 0; Sample < 500; ++Sample )
+  {
+    Add( Monitor, Sample, Times( Sample ) );
+  }
+  const double RateBefore = FitOf( Monitor ).m_Last.m_Rate;
+  EXPECT_LT( FitOf( Monitor ).m_TimeVariance, 1e-5 );
+
+  // 99 periods late is a disturbance that the filter averages away, 101 is a jump that it follows.
+  VDriftMonitorConfiguration Configuration;
+  const double Late = 499.0 * 0.0402 + 1000.0 + Configuration.m_GapFactor * 0.04;
+  ASSERT_TRUE( Add( Monitor, 500, Late + 0.01 ) );
+  EXPECT_NEAR( FitOf( Monitor ).m_Last.m_Time, Late + 0.01, 1e-6 );
+  EXPECT_NEAR( FitOf( Monitor ).m_Last.m_Rate, RateBefore, 1e-9 );
+  EXPECT_NEAR( FitOf( Monitor ).m_TimeVariance, Configuration.m_MeasurementNoise, 1e-7 );
+
+  VDriftMonitor Steady( {} );
+  for( uint64_t Sample = 0; Sample < 500; ++Sample )
+  {
+    Add( Steady, Sample, Times( Sample ) );
+  }
+  ASSERT_TRUE( Add( Steady, 500, Late - 0.01 ) );
+  EXPECT_LT( FitOf( Steady ).m_Last.m_Time, 1000.0 + 500 * 0.0402 + 0.1 );
+}
+
+// The history is checked against every value that the filter had on the way.
+TEST( DriftMonitor, HistoryStaysWithinItsToleranceOfTheFilter )
+{
+  VDriftMonitorConfiguration Configuration;
+  Configuration.m_ProcessNoise = 1e-4;
+  Configuration.m_SettleSeconds = 10;
+  VDriftMonitor Monitor( Configuration );
+  std::vector<double> Filtered;
+  double Time = 20.0;
+  size_t SettledAt = 0;
+  for( uint64_t Sample = 0; Sample < 6000; ++Sample )
+  {
+    ASSERT_TRUE( Add( Monitor, Sample, Time ) );
+    Filtered.push_back( FitOf( Monitor ).m_Last.m_Time );
+    SettledAt = FitOf( Monitor ).m_Segments == 0 ? Sample + 1 : SettledAt;
+    Time += 0.04 * ( 1.0 + 0.001 * std::sin( static_cast<double>( Sample ) / 400.0 ) );
+  }
+  ASSERT_GT( FitOf( Monitor ).m_Segments, 3u );
+  ASSERT_LT( FitOf( Monitor ).m_Segments, 1000u );
+  EXPECT_NEAR( static_cast<double>( SettledAt ), 251.0, 1.0 );
+  for( uint64_t Sample = SettledAt; Sample < Filtered.size(); ++Sample )
+  {
+    double FromHistory = 0.0;
+    ASSERT_TRUE( Monitor.GetSampleTime( Sample, FromHistory ) );
+    ASSERT_NEAR( FromHistory, Filtered[ Sample ], Configuration.m_SegmentTolerance + 1e-12 ) << Sample;
+  }
+}
+
+TEST( DriftMonitor, HistoryDropsItsOldestSegmentAtTheLimit )
+{
+  VDriftMonitorConfiguration Configuration;
+  Configuration.m_SettleSeconds = 0;
+  Configuration.m_SegmentTolerance = 0.0;
+  Configuration.m_MaxSegments = 5;
+  VDriftMonitor Monitor( Configuration );
+  VDeliveryTimes Times{ .m_Jitter = 0.01 };
+  for( uint64_t Sample = 0; Sample < 50; ++Sample )
+  {
+    Add( Monitor, Sample, Times( Sample ) );
+  }
+  EXPECT_EQ( FitOf( Monitor ).m_Segments, 5u );
+  double Time = 0.0;
+  ASSERT_TRUE( Monitor.GetSampleTime( 2, Time ) );
+  EXPECT_NEAR( Time, 1000.08, 0.02 );   // the oldest line reaches back
+}
+
+TEST( DriftMonitor, DumpNamesItsSettingsInOrder )
+{
+  VDriftMonitor Monitor( {} );
+  Add( Monitor, 0, 1.0 );
+  const std::string Text = Monitor.Dump();
+  size_t Position = 0;
+  for( const char* pName : { "NominalSampleRateInTicks = 5400000", "ObservationModel = ", "SystemModel = ((1, 1), (0, 1))", "MeasurementNoise = ",
+         "ProcessNoise = ", "MinUncertaintyToUpdateStartTime = 1000000000" } )
+  {
+    Position = Text.find( pName, Position );
+    ASSERT_NE( Position, std::string::npos ) << pName << "\n" << Text;
+  }
+}
+
+}
