@@ -7,6 +7,8 @@ set( CMAKE_EXPORT_COMPILE_COMMANDS ON )
 
 # -fPIC everywhere, executables included, so that one precompiled header serves all targets.
 add_compile_options( -fPIC -Wall -Wextra -Wpedantic -Werror )
+# Source positions in logs and tests begin at the root of the repository.
+add_compile_options( "-fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=" )
 add_compile_definitions( BOOST_BIND_GLOBAL_PLACEHOLDERS BOOST_ALLOW_DEPRECATED_HEADERS )
 if( CMAKE_CXX_COMPILER_ID STREQUAL "Clang" )
   add_compile_options( -Wthread-safety -Xclang -fno-pch-timestamp )
