@@ -1,0 +1,6 @@
+#include "NotificationSystem/DeregisterWeakCallbackException.h"
+
+namespace NotificationSystem
+{
+  VDeregisterWeakCallbackException::~VDeregisterWeakCallbackException() = default;
+}
