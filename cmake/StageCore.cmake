@@ -26,16 +26,23 @@ target_link_libraries( StageCoreIncludes INTERFACE Boost::headers Threads::Threa
 # What every linked target of ours needs besides its DEPENDS.
 set( STAGECORE_COMMON_LIBRARIES StageCoreIncludes Boost::thread Boost::filesystem )
 
+# Tests have a precompiled header of their own, with GoogleTest in it.
 add_library( StageCorePrecompiled STATIC "${CMAKE_CURRENT_LIST_DIR}/Precompiled.cpp" )
 target_link_libraries( StageCorePrecompiled PRIVATE ${STAGECORE_COMMON_LIBRARIES} )
 target_precompile_headers( StageCorePrecompiled PRIVATE "${CMAKE_CURRENT_LIST_DIR}/Precompiled.h" )
 
+add_library( StageCorePrecompiledTest STATIC "${CMAKE_CURRENT_LIST_DIR}/Precompiled.cpp" )
+target_link_libraries( StageCorePrecompiledTest PRIVATE ${STAGECORE_COMMON_LIBRARIES} GTest::gtest )
+target_precompile_headers( StageCorePrecompiledTest PRIVATE "${CMAKE_CURRENT_LIST_DIR}/Precompiled.h" <gtest/gtest.h> )
+
 add_custom_target( stagecore_programs )
 add_custom_target( stagecore_fuzzers )
 
-# Gives a target the common precompiled header.
+# Gives a target the common precompiled header, or that of the library named as second argument.
 function( stagecore_precompile target )
-  target_precompile_headers( ${target} REUSE_FROM StageCorePrecompiled )
+  set( from ${ARGN} StageCorePrecompiled )
+  list( GET from 0 from )
+  target_precompile_headers( ${target} REUSE_FROM ${from} )
   set_target_properties( ${target} PROPERTIES DEFINE_SYMBOL "" )
 endfunction()
 
@@ -107,7 +114,7 @@ function( stagecore_test name )
   file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
   add_executable( ${name} ${sources} )
   target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} GTest::gtest GTest::gtest_main )
-  stagecore_precompile( ${name} )
+  stagecore_precompile( ${name} StageCorePrecompiledTest )
   set_target_properties( ${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests" )
   add_test( NAME ${name} COMMAND ${name} )
 endfunction()

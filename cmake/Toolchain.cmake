@@ -46,3 +46,4 @@ endif()
 
 find_package( Boost 1.74 REQUIRED COMPONENTS thread filesystem )
 find_package( Threads REQUIRED )
+find_package( GTest REQUIRED )
