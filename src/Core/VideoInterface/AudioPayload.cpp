@@ -20,19 +20,10 @@ constexpr VEnumTable Table{ "AudioPayload.Enum", "Enumeration of payload types."
 
 }
 
-const VEnumTable& GetEnumTable( IAudioPayload::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IAudioPayload::Enum ) { return Table; }
 
-std::string ToName( IAudioPayload::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IAudioPayload::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IAudioPayload::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IAudioPayload::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -27,42 +27,28 @@ constexpr VEnumTable Table{ "AudioSampleFormat.Enum", "Enumeration.", Rows };
 
 }
 
-const VEnumTable& GetEnumTable( IAudioSampleFormat::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IAudioSampleFormat::Enum ) { return Table; }
 
 uint32_t GetBytesPerSample( IAudioSampleFormat::Enum i_Format )
 {
   switch( i_Format )
   {
     case IAudioSampleFormat::EInt8:
-    case IAudioSampleFormat::EUInt8:
-      return 1;
+    case IAudioSampleFormat::EUInt8: return 1;
     case IAudioSampleFormat::EInt16:
-    case IAudioSampleFormat::EUInt16:
-      return 2;
+    case IAudioSampleFormat::EUInt16: return 2;
     case IAudioSampleFormat::EInt24:
-    case IAudioSampleFormat::EUInt24:
-      return 3;
+    case IAudioSampleFormat::EUInt24: return 3;
     case IAudioSampleFormat::EInt32:
     case IAudioSampleFormat::EUInt32:
-    case IAudioSampleFormat::EFloat32:
-      return 4;
-    case IAudioSampleFormat::EUnspecified:
-      break;
+    case IAudioSampleFormat::EFloat32: return 4;
+    case IAudioSampleFormat::EUnspecified: break;
   }
   return 0;
 }
 
-std::string ToName( IAudioSampleFormat::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IAudioSampleFormat::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IAudioSampleFormat::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IAudioSampleFormat::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -31,7 +31,8 @@ class VFieldWriter
 public:
   VFieldWriter( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) : m_rAttributes( o_rAttributes ), m_Prefix( i_rPrefix ) {}
 
-  template<class T> void Field( const char* i_pKey, const T& i_rValue )
+  template<class T>
+  void Field( const char* i_pKey, const T& i_rValue )
   {
     if constexpr( std::is_enum_v<T> )
     {
@@ -43,7 +44,11 @@ public:
     }
   }
 
-  template<class TStored, class T> void FieldAs( const char* i_pKey, const T& i_rValue ) { Field( i_pKey, static_cast<TStored>( i_rValue ) ); }
+  template<class TStored, class T>
+  void FieldAs( const char* i_pKey, const T& i_rValue )
+  {
+    Field( i_pKey, static_cast<TStored>( i_rValue ) );
+  }
 
 private:
   IVideoAttributes& m_rAttributes;
@@ -56,7 +61,8 @@ class VFieldReader
 public:
   VFieldReader( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix ) : m_rAttributes( i_rAttributes ), m_Prefix( i_rPrefix ) {}
 
-  template<class T> void Field( const char* i_pKey, T& o_rValue )
+  template<class T>
+  void Field( const char* i_pKey, T& o_rValue )
   {
     if constexpr( std::is_enum_v<T> )
     {
@@ -70,7 +76,8 @@ public:
     }
   }
 
-  template<class TStored, class T> void FieldAs( const char* i_pKey, T& o_rValue )
+  template<class TStored, class T>
+  void FieldAs( const char* i_pKey, T& o_rValue )
   {
     TStored Stored{};
     Field( i_pKey, Stored );
@@ -88,9 +95,11 @@ private:
   bool m_bGood = true;
 };
 
-template<class TRecord> struct VFields;
+template<class TRecord>
+struct VFields;
 
-template<> struct VFields<VideoFrameInfo>
+template<>
+struct VFields<VideoFrameInfo>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -105,7 +114,8 @@ template<> struct VFields<VideoFrameInfo>
   }
 };
 
-template<> struct VFields<AudioFrameInfo>
+template<>
+struct VFields<AudioFrameInfo>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -115,7 +125,8 @@ template<> struct VFields<AudioFrameInfo>
   }
 };
 
-template<> struct VFields<VTimingRecord>
+template<>
+struct VFields<VTimingRecord>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -125,7 +136,8 @@ template<> struct VFields<VTimingRecord>
   }
 };
 
-template<> struct VFields<VColourRecord>
+template<>
+struct VFields<VColourRecord>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -134,7 +146,8 @@ template<> struct VFields<VColourRecord>
   }
 };
 
-template<> struct VFields<VCameraHardwareRecord>
+template<>
+struct VFields<VCameraHardwareRecord>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -147,20 +160,22 @@ template<> struct VFields<VCameraHardwareRecord>
   }
 };
 
-template<> struct VFields<VLensDistortionRecord>
+template<>
+struct VFields<VLensDistortionRecord>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
     i_rVisitor.Field( "LensDistortionCalibration.RadialModel", i_rRecord.m_RadialModel );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_X", i_rRecord.m_Centre[ 0 ] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_Y", i_rRecord.m_Centre[ 1 ] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_0", i_rRecord.m_Parameters[ 0 ] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_1", i_rRecord.m_Parameters[ 1 ] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_2", i_rRecord.m_Parameters[ 2 ] );
+    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_X", i_rRecord.m_Centre[0] );
+    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_Y", i_rRecord.m_Centre[1] );
+    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_0", i_rRecord.m_Parameters[0] );
+    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_1", i_rRecord.m_Parameters[1] );
+    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_2", i_rRecord.m_Parameters[2] );
   }
 };
 
-template<> struct VFields<VConversionRecord>
+template<>
+struct VFields<VConversionRecord>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -171,7 +186,8 @@ template<> struct VFields<VConversionRecord>
   }
 };
 
-template<> struct VFields<ITimecode>
+template<>
+struct VFields<ITimecode>
 {
   static void Visit( auto& i_rRecord, auto& i_rVisitor )
   {
@@ -187,14 +203,16 @@ template<> struct VFields<ITimecode>
   }
 };
 
-template<class TRecord> bool WriteFields( const TRecord& i_rRecord, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
+template<class TRecord>
+bool WriteFields( const TRecord& i_rRecord, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
 {
   VFieldWriter Writer( o_rAttributes, i_rPrefix );
   VFields<TRecord>::Visit( i_rRecord, Writer );
   return true;
 }
 
-template<class TRecord> bool ReadFields( TRecord& o_rRecord, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+template<class TRecord>
+bool ReadFields( TRecord& o_rRecord, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
 {
   VFieldReader Reader( i_rAttributes, i_rPrefix );
   VFields<TRecord>::Visit( o_rRecord, Reader );
@@ -202,8 +220,8 @@ template<class TRecord> bool ReadFields( TRecord& o_rRecord, const IVideoAttribu
 }
 
 // Frame descriptions stand behind a flag that says whether there is one at all.
-template<class TRecord> bool WriteOptional( const TRecord& i_rRecord, bool i_bWhole, const char* i_pKey, IVideoAttributes& o_rAttributes,
-  const std::string& i_rPrefix )
+template<class TRecord>
+bool WriteOptional( const TRecord& i_rRecord, bool i_bWhole, const char* i_pKey, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
 {
   if( !i_rRecord.IsEmpty() && !i_bWhole )
   {
@@ -213,7 +231,8 @@ template<class TRecord> bool WriteOptional( const TRecord& i_rRecord, bool i_bWh
   return i_rRecord.IsEmpty() || WriteFields( i_rRecord, o_rAttributes, i_rPrefix );
 }
 
-template<class TRecord> bool ReadOptional( TRecord& o_rRecord, const char* i_pKey, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+template<class TRecord>
+bool ReadOptional( TRecord& o_rRecord, const char* i_pKey, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
 {
   bool bPresent = false;
   if( !i_rAttributes.Get( i_rPrefix + i_pKey, bPresent ) || !bPresent )
@@ -291,10 +310,7 @@ bool VLensDistortionRecord::ReadAttributes( const IVideoAttributes& i_rAttribute
   return ReadFields( *this, i_rAttributes, i_rPrefix );
 }
 
-const VEnumTable& GetEnumTable( VLensDistortionRecord::ERadialModel )
-{
-  return RadialModelTable;
-}
+const VEnumTable& GetEnumTable( VLensDistortionRecord::ERadialModel ) { return RadialModelTable; }
 
 std::string ToName( VLensDistortionRecord::ERadialModel i_Model )
 {
@@ -306,7 +322,7 @@ bool WriteAttributes( const std::vector<VConversionRecord>& i_rRecords, IVideoAt
 {
   for( size_t Index = 0; Index < i_rRecords.size(); ++Index )
   {
-    WriteFields( i_rRecords[ Index ], o_rAttributes, ConversionPrefix( i_rPrefix, Index ) );
+    WriteFields( i_rRecords[Index], o_rAttributes, ConversionPrefix( i_rPrefix, Index ) );
   }
   return true;
 }

@@ -31,7 +31,7 @@ struct VideoFrameInfo
   uint16_t m_PixelAspectNumerator = 1;
   uint16_t m_PixelAspectDenominator = 1;
   IPixelFormat::Enum m_PixelFormat = IPixelFormat::EUnspecified;
-  bool m_bInverted = false;     // stored bottom-up
+  bool m_bInverted = false;   // stored bottom-up
   double m_PixelAspectRatio = 0.0;
   IInterlacedFormat::Enum m_InterlacedFormat = IInterlacedFormat::EUnspecified;
 
@@ -110,7 +110,7 @@ struct VLensDistortionRecord
   };
 
   ERadialModel m_RadialModel = EBadRadialModel;
-  std::array<double, 2> m_Centre{};       // pixels
+  std::array<double, 2> m_Centre{};   // pixels
   std::array<double, 3> m_Parameters{};
 
   bool operator==( const VLensDistortionRecord& ) const = default;
@@ -124,7 +124,7 @@ std::string ToName( VLensDistortionRecord::ERadialModel i_Model );
 // One step that a recording passed through; a list of them is stored as "ConversionRecord.0.", "ConversionRecord.1." and so on.
 struct VConversionRecord
 {
-  std::string m_Container = "Unspecified";      // names of enumerators, "Unspecified" where unset
+  std::string m_Container = "Unspecified";   // names of enumerators, "Unspecified" where unset
   std::string m_AudioPayload = "Unspecified";
   std::string m_VideoPayload = "Unspecified";
   std::string m_PixelFormat = "Unspecified";

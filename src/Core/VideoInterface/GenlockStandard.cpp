@@ -35,19 +35,10 @@ constexpr VEnumTable Table{ "DataStoreSystemSettings.EGenlockStandard", "Genlock
 
 }
 
-const VEnumTable& GetEnumTable( IGenlockStandard::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IGenlockStandard::Enum ) { return Table; }
 
-std::string ToName( IGenlockStandard::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IGenlockStandard::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IGenlockStandard::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IGenlockStandard::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -22,19 +22,10 @@ constexpr VEnumTable Table{ "InterlacedFormat.Enum", "Enumeration.", Rows };
 
 }
 
-const VEnumTable& GetEnumTable( IInterlacedFormat::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IInterlacedFormat::Enum ) { return Table; }
 
-std::string ToName( IInterlacedFormat::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IInterlacedFormat::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IInterlacedFormat::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IInterlacedFormat::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -36,10 +36,7 @@ constexpr VEnumTable Table{ "PixelFormat.Enum", "Enumeration.", Rows };
 
 }
 
-const VEnumTable& GetEnumTable( IPixelFormat::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IPixelFormat::Enum ) { return Table; }
 
 uint64_t GetImageSize( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
 {
@@ -50,40 +47,26 @@ uint64_t GetImageSize( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i
     case IPixelFormat::EBayerRG8:
     case IPixelFormat::EBayerGB8:
     case IPixelFormat::EBayerGR8:
-    case IPixelFormat::EBayerBG8:
-      return Pixels;
+    case IPixelFormat::EBayerBG8: return Pixels;
     case IPixelFormat::ER5G6B5:
     case IPixelFormat::EU8Y8V8Y8:
-    case IPixelFormat::EY8U8Y8V8:
-      return Pixels * 2;
+    case IPixelFormat::EY8U8Y8V8: return Pixels * 2;
     case IPixelFormat::ER8G8B8:
-    case IPixelFormat::EB8G8R8:
-      return Pixels * 3;
+    case IPixelFormat::EB8G8R8: return Pixels * 3;
     case IPixelFormat::ER8G8B8u8:
-    case IPixelFormat::EB8G8R8u8:
-      return Pixels * 4;
-    case IPixelFormat::EU10Y10V10Y10:
-      return ( static_cast<uint64_t>( i_Width ) + 47 ) / 48 * i_Height * 128;
+    case IPixelFormat::EB8G8R8u8: return Pixels * 4;
+    case IPixelFormat::EU10Y10V10Y10: return ( static_cast<uint64_t>( i_Width ) + 47 ) / 48 * i_Height * 128;
     case IPixelFormat::EBayerGB7:
-    case IPixelFormat::ELuminance7:
-      return ( Pixels * 7 + 7 ) / 8;
+    case IPixelFormat::ELuminance7: return ( Pixels * 7 + 7 ) / 8;
     case IPixelFormat::EBayerGB6:
-    case IPixelFormat::ELuminance6:
-      return ( Pixels * 3 + 3 ) / 4;
-    case IPixelFormat::EUnspecified:
-      break;
+    case IPixelFormat::ELuminance6: return ( Pixels * 3 + 3 ) / 4;
+    case IPixelFormat::EUnspecified: break;
   }
   return 0;
 }
 
-std::string ToName( IPixelFormat::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IPixelFormat::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IPixelFormat::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IPixelFormat::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

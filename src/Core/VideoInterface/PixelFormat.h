@@ -26,8 +26,8 @@ public:
     EU8Y8V8Y8 = 11,   // 4:2:2, two pixels in four bytes
     EY8U8Y8V8 = 12,
     EU10Y10V10Y10 = 13,   // 4:2:2 10 bit, 48 pixels in 128 bytes, rows padded to whole groups
-    EBayerGB7 = 14,   // 7 bits a pixel, packed
-    EBayerGB6 = 15,   // 6 bits a pixel, packed
+    EBayerGB7 = 14,       // 7 bits a pixel, packed
+    EBayerGB6 = 15,       // 6 bits a pixel, packed
     ELuminance7 = 16,
     ELuminance6 = 17,
   };

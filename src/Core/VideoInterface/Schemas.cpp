@@ -6,7 +6,8 @@ namespace KVZ
 namespace
 {
 
-template<class TEnum> const ISchema* SchemaOf()
+template<class TEnum>
+const ISchema* SchemaOf()
 {
   static const ISchema* const s_pSchema = []
   {
@@ -23,59 +24,26 @@ template<class TEnum> const ISchema* SchemaOf()
 
 }
 
-const ISchema* VSchemaOf<IVideoStandard::Enum>::Get()
-{
-  return SchemaOf<IVideoStandard::Enum>();
-}
+const ISchema* VSchemaOf<IVideoStandard::Enum>::Get() { return SchemaOf<IVideoStandard::Enum>(); }
 
-const ISchema* VSchemaOf<IPixelFormat::Enum>::Get()
-{
-  return SchemaOf<IPixelFormat::Enum>();
-}
+const ISchema* VSchemaOf<IPixelFormat::Enum>::Get() { return SchemaOf<IPixelFormat::Enum>(); }
 
-const ISchema* VSchemaOf<IInterlacedFormat::Enum>::Get()
-{
-  return SchemaOf<IInterlacedFormat::Enum>();
-}
+const ISchema* VSchemaOf<IInterlacedFormat::Enum>::Get() { return SchemaOf<IInterlacedFormat::Enum>(); }
 
-const ISchema* VSchemaOf<IAudioSampleFormat::Enum>::Get()
-{
-  return SchemaOf<IAudioSampleFormat::Enum>();
-}
+const ISchema* VSchemaOf<IAudioSampleFormat::Enum>::Get() { return SchemaOf<IAudioSampleFormat::Enum>(); }
 
-const ISchema* VSchemaOf<ITimecodeSource::Enum>::Get()
-{
-  return SchemaOf<ITimecodeSource::Enum>();
-}
+const ISchema* VSchemaOf<ITimecodeSource::Enum>::Get() { return SchemaOf<ITimecodeSource::Enum>(); }
 
-const ISchema* VSchemaOf<ITimecodeStandard::Enum>::Get()
-{
-  return SchemaOf<ITimecodeStandard::Enum>();
-}
+const ISchema* VSchemaOf<ITimecodeStandard::Enum>::Get() { return SchemaOf<ITimecodeStandard::Enum>(); }
 
-const ISchema* VSchemaOf<IGenlockStandard::Enum>::Get()
-{
-  return SchemaOf<IGenlockStandard::Enum>();
-}
+const ISchema* VSchemaOf<IGenlockStandard::Enum>::Get() { return SchemaOf<IGenlockStandard::Enum>(); }
 
-const ISchema* VSchemaOf<IVideoContainer::Enum>::Get()
-{
-  return SchemaOf<IVideoContainer::Enum>();
-}
+const ISchema* VSchemaOf<IVideoContainer::Enum>::Get() { return SchemaOf<IVideoContainer::Enum>(); }
 
-const ISchema* VSchemaOf<IVideoPayload::Enum>::Get()
-{
-  return SchemaOf<IVideoPayload::Enum>();
-}
+const ISchema* VSchemaOf<IVideoPayload::Enum>::Get() { return SchemaOf<IVideoPayload::Enum>(); }
 
-const ISchema* VSchemaOf<IAudioPayload::Enum>::Get()
-{
-  return SchemaOf<IAudioPayload::Enum>();
-}
+const ISchema* VSchemaOf<IAudioPayload::Enum>::Get() { return SchemaOf<IAudioPayload::Enum>(); }
 
-const ISchema* VSchemaOf<VLensDistortionRecord::ERadialModel>::Get()
-{
-  return SchemaOf<VLensDistortionRecord::ERadialModel>();
-}
+const ISchema* VSchemaOf<VLensDistortionRecord::ERadialModel>::Get() { return SchemaOf<VLensDistortionRecord::ERadialModel>(); }
 
 }

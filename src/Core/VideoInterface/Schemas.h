@@ -32,16 +32,60 @@ const VEnumTable& GetEnumTable( IAudioPayload::Enum );
 const VEnumTable& GetEnumTable( VLensDistortionRecord::ERadialModel );
 
 // Made from the tables at first use; any thread.
-template<> struct VSchemaOf<IVideoStandard::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IPixelFormat::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IInterlacedFormat::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IAudioSampleFormat::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<ITimecodeSource::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<ITimecodeStandard::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IGenlockStandard::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IVideoContainer::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IVideoPayload::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<IAudioPayload::Enum> { static const ISchema* Get(); };
-template<> struct VSchemaOf<VLensDistortionRecord::ERadialModel> { static const ISchema* Get(); };
+template<>
+struct VSchemaOf<IVideoStandard::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IPixelFormat::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IInterlacedFormat::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IAudioSampleFormat::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<ITimecodeSource::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<ITimecodeStandard::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IGenlockStandard::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IVideoContainer::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IVideoPayload::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<IAudioPayload::Enum>
+{
+  static const ISchema* Get();
+};
+template<>
+struct VSchemaOf<VLensDistortionRecord::ERadialModel>
+{
+  static const ISchema* Get();
+};
 
 }

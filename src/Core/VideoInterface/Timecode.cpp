@@ -31,26 +31,20 @@ static_assert( Standards.size() == 6 );
 constexpr std::array Rows = {
   VEnumRow{ ITimecodeStandard::ETimecodeNone, "TimecodeNone", "Invalid value representing no timecode standard" },
   VEnumRow{ ITimecodeStandard::ETimecode24, "Timecode24", "24 fps (FILM)" },
-  VEnumRow{ ITimecodeStandard::ETimecode24Drift,
-    "Timecode24Drift",
+  VEnumRow{ ITimecodeStandard::ETimecode24Drift, "Timecode24Drift",
     "24 fps but actually running at (24/1.001)fps - hence drifting from wall clock (NTSC compatible FILM)" },
   VEnumRow{ ITimecodeStandard::ETimecode25, "Timecode25", "25 fps (PAL)" },
   VEnumRow{ ITimecodeStandard::ETimecode30, "Timecode30", "30 fps" },
-  VEnumRow{ ITimecodeStandard::ETimecode30Drift,
-    "Timecode30Drift",
+  VEnumRow{ ITimecodeStandard::ETimecode30Drift, "Timecode30Drift",
     "30 fps but actually running at (30/1.001)fps hence drifting from wall clock (NTSC)" },
-  VEnumRow{ ITimecodeStandard::ETimecode30Drop,
-    "Timecode30Drop",
+  VEnumRow{ ITimecodeStandard::ETimecode30Drop, "Timecode30Drop",
     "30 fps but actually running at (30/1.001)fps with periodic correction to wall clock (NTSC Drop) [still drifts very slightly!]" },
 };
 
 constexpr VEnumTable Table{ "ETimecodeStandard", "Supported timecode standards.", Rows };
 
 // Drop-frame leaves out labels 0 and 1 of every minute but each tenth (SMPTE ST 12-1).
-int64_t LabelsToFrames( int64_t i_Labels )
-{
-  return i_Labels + 2 * ( i_Labels / 18000 ) - 2 * ( i_Labels / 1800 );
-}
+int64_t LabelsToFrames( int64_t i_Labels ) { return i_Labels + 2 * ( i_Labels / 18000 ) - 2 * ( i_Labels / 1800 ); }
 
 int64_t FramesToLabels( int64_t i_Frames )
 {
@@ -58,10 +52,7 @@ int64_t FramesToLabels( int64_t i_Frames )
   return Labels - 2 * ( Labels / 18002 );
 }
 
-bool IsDropFrame( int32_t i_Standard )
-{
-  return i_Standard == ITimecodeStandard::ETimecode30Drop;
-}
+bool IsDropFrame( int32_t i_Standard ) { return i_Standard == ITimecodeStandard::ETimecode30Drop; }
 
 int64_t TicksPerDay( const VTimecodeStandardRow& i_rRow )
 {
@@ -77,10 +68,7 @@ int64_t AddWrapped( int64_t i_Ticks, int64_t i_Factor, int64_t i_Delta )
 
 }
 
-const VEnumTable& GetEnumTable( ITimecodeStandard::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( ITimecodeStandard::Enum ) { return Table; }
 
 bool IsSameReading( const ITimecode& i_rA, const ITimecode& i_rB )
 {
@@ -92,14 +80,14 @@ bool IsSameReading( const ITimecode& i_rA, const ITimecode& i_rB )
 const VTimecodeStandardRow* FindTimecodeStandard( int32_t i_Standard )
 {
   const bool bKnown = i_Standard >= 0 && i_Standard < static_cast<int32_t>( Standards.size() );
-  return bKnown ? &Standards[ i_Standard ] : nullptr;
+  return bKnown ? &Standards[i_Standard] : nullptr;
 }
 
 bool IsValid( const ITimecode& i_rTimecode )
 {
   const VTimecodeStandardRow* pRow = FindTimecodeStandard( i_rTimecode.m_Standard );
   if( !pRow || i_rTimecode.m_Hours >= 24 || i_rTimecode.m_Minutes >= 60 || i_rTimecode.m_Seconds >= 60 ||
-      i_rTimecode.m_Frames >= pRow->m_NominalFrames || i_rTimecode.m_TickRemainder >= pRow->m_Period )
+    i_rTimecode.m_Frames >= pRow->m_NominalFrames || i_rTimecode.m_TickRemainder >= pRow->m_Period )
   {
     return false;
   }
@@ -180,14 +168,8 @@ std::string ToText( const ITimecode& i_rTimecode )
   return Text.data();
 }
 
-std::string ToName( ITimecodeStandard::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( ITimecodeStandard::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, ITimecodeStandard::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, ITimecodeStandard::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -43,10 +43,10 @@ bool IsSameReading( const ITimecode& i_rA, const ITimecode& i_rB );
 struct VTimecodeStandardRow
 {
   int32_t m_Standard;
-  const char* m_pLabel;         // "25 fps"
-  uint8_t m_NominalFrames;      // what the frames field counts to
-  uint32_t m_Period;            // ticks a timecode frame
-  int64_t m_LabelsPerDay;       // before drop-frame labels are left out
+  const char* m_pLabel;      // "25 fps"
+  uint8_t m_NominalFrames;   // what the frames field counts to
+  uint32_t m_Period;         // ticks a timecode frame
+  int64_t m_LabelsPerDay;    // before drop-frame labels are left out
   const char* m_pDescription;
 };
 

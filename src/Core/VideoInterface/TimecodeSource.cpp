@@ -27,19 +27,10 @@ constexpr VEnumTable Table{ "TimecodeSource.Enum", "Enumeration of timecode sour
 
 }
 
-const VEnumTable& GetEnumTable( ITimecodeSource::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( ITimecodeSource::Enum ) { return Table; }
 
-std::string ToName( ITimecodeSource::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( ITimecodeSource::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, ITimecodeSource::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, ITimecodeSource::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -10,27 +10,78 @@ static_assert( std::endian::native == std::endian::little, "Values go to disk as
 namespace
 {
 
-template<class T> struct VTypeTag;
-template<> struct VTypeTag<bool> { static constexpr uint32_t Value = 0; };
-template<> struct VTypeTag<char> { static constexpr uint32_t Value = 1; };
-template<> struct VTypeTag<int16_t> { static constexpr uint32_t Value = 2; };
-template<> struct VTypeTag<int32_t> { static constexpr uint32_t Value = 3; };
-template<> struct VTypeTag<int64_t> { static constexpr uint32_t Value = 4; };
-template<> struct VTypeTag<uint8_t> { static constexpr uint32_t Value = 5; };
-template<> struct VTypeTag<uint16_t> { static constexpr uint32_t Value = 6; };
-template<> struct VTypeTag<uint32_t> { static constexpr uint32_t Value = 7; };
-template<> struct VTypeTag<uint64_t> { static constexpr uint32_t Value = 8; };
-template<> struct VTypeTag<float> { static constexpr uint32_t Value = 9; };
-template<> struct VTypeTag<double> { static constexpr uint32_t Value = 10; };
-template<> struct VTypeTag<std::string> { static constexpr uint32_t Value = 11; };
+template<class T>
+struct VTypeTag;
+template<>
+struct VTypeTag<bool>
+{
+  static constexpr uint32_t Value = 0;
+};
+template<>
+struct VTypeTag<char>
+{
+  static constexpr uint32_t Value = 1;
+};
+template<>
+struct VTypeTag<int16_t>
+{
+  static constexpr uint32_t Value = 2;
+};
+template<>
+struct VTypeTag<int32_t>
+{
+  static constexpr uint32_t Value = 3;
+};
+template<>
+struct VTypeTag<int64_t>
+{
+  static constexpr uint32_t Value = 4;
+};
+template<>
+struct VTypeTag<uint8_t>
+{
+  static constexpr uint32_t Value = 5;
+};
+template<>
+struct VTypeTag<uint16_t>
+{
+  static constexpr uint32_t Value = 6;
+};
+template<>
+struct VTypeTag<uint32_t>
+{
+  static constexpr uint32_t Value = 7;
+};
+template<>
+struct VTypeTag<uint64_t>
+{
+  static constexpr uint32_t Value = 8;
+};
+template<>
+struct VTypeTag<float>
+{
+  static constexpr uint32_t Value = 9;
+};
+template<>
+struct VTypeTag<double>
+{
+  static constexpr uint32_t Value = 10;
+};
+template<>
+struct VTypeTag<std::string>
+{
+  static constexpr uint32_t Value = 11;
+};
 static_assert( sizeof( bool ) == 1 );
 
-template<class T> bool WriteValue( IOutputStream& o_rStream, const T& i_rValue )
+template<class T>
+bool WriteValue( IOutputStream& o_rStream, const T& i_rValue )
 {
   return o_rStream.Write( &i_rValue, sizeof( T ) );
 }
 
-template<> bool WriteValue( IOutputStream& o_rStream, const std::string& i_rValue )
+template<>
+bool WriteValue( IOutputStream& o_rStream, const std::string& i_rValue )
 {
   const uint32_t Length = static_cast<uint32_t>( i_rValue.size() );
   return WriteValue( o_rStream, Length ) && o_rStream.Write( i_rValue.data(), Length );
@@ -38,7 +89,8 @@ template<> bool WriteValue( IOutputStream& o_rStream, const std::string& i_rValu
 
 }
 
-template<class T> class VValueTyped : public IVideoAttributes::IValue
+template<class T>
+class VValueTyped : public IVideoAttributes::IValue
 {
 public:
   explicit VValueTyped( const T& i_rValue ) : m_Value( i_rValue ) {}
@@ -60,12 +112,14 @@ private:
   const uint32_t m_Tag = VTypeTag<T>::Value;
 };
 
-template<class T> void IVideoAttributes::Set( const std::string& i_rKey, const T& i_rValue )
+template<class T>
+void IVideoAttributes::Set( const std::string& i_rKey, const T& i_rValue )
 {
-  m_Values[ i_rKey ] = std::make_shared<VValueTyped<T>>( i_rValue );
+  m_Values[i_rKey] = std::make_shared<VValueTyped<T>>( i_rValue );
 }
 
-template<class T> bool IVideoAttributes::Get( const std::string& i_rKey, T& o_rValue ) const
+template<class T>
+bool IVideoAttributes::Get( const std::string& i_rKey, T& o_rValue ) const
 {
   const auto Found = m_Values.find( i_rKey );
   const auto* pValue = Found == m_Values.end() ? nullptr : dynamic_cast<const VValueTyped<T>*>( Found->second.get() );
@@ -77,8 +131,8 @@ template<class T> bool IVideoAttributes::Get( const std::string& i_rKey, T& o_rV
   return true;
 }
 
-#define KVZ_ATTRIBUTE_TYPE( T )                                             \
-  template void IVideoAttributes::Set<T>( const std::string&, const T& );   \
+#define KVZ_ATTRIBUTE_TYPE( T )                                           \
+  template void IVideoAttributes::Set<T>( const std::string&, const T& ); \
   template bool IVideoAttributes::Get<T>( const std::string&, T& ) const;
 KVZ_ATTRIBUTE_TYPE( bool )
 KVZ_ATTRIBUTE_TYPE( char )

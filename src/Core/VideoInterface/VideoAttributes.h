@@ -35,8 +35,10 @@ public:
 
   // T is one of the twelve types above (char stands for int8). Set replaces any old value. Get is false, leaving its output alone, when the
   // key is absent or the value is of another type.
-  template<class T> void Set( const std::string& i_rKey, const T& i_rValue );
-  template<class T> bool Get( const std::string& i_rKey, T& o_rValue ) const;
+  template<class T>
+  void Set( const std::string& i_rKey, const T& i_rValue );
+  template<class T>
+  bool Get( const std::string& i_rKey, T& o_rValue ) const;
   void Set( const std::string& i_rKey, const char* i_pValue ) { Set( i_rKey, std::string( i_pValue ) ); }
 
   bool Has( const std::string& i_rKey ) const { return m_Values.count( i_rKey ) != 0; }

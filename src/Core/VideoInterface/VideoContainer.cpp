@@ -24,26 +24,17 @@ constexpr VEnumTable Table{ "VideoContainer.Enum", "Enumeration of container for
 
 }
 
-const VEnumTable& GetEnumTable( IVideoContainer::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IVideoContainer::Enum ) { return Table; }
 
 const char* GetFileExtension( IVideoContainer::Enum i_Container )
 {
   constexpr std::array<const char*, VideoContainerCount> Extensions = { "mov", "mp4", "avi", "tvid", "mkv", "" };
   const bool bKnown = i_Container >= 0 && i_Container < VideoContainerCount;
-  return bKnown ? Extensions[ i_Container ] : "";
+  return bKnown ? Extensions[i_Container] : "";
 }
 
-std::string ToName( IVideoContainer::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IVideoContainer::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IVideoContainer::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IVideoContainer::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

@@ -23,19 +23,10 @@ constexpr VEnumTable Table{ "VideoPayload.Enum", "Enumeration of payload types."
 
 }
 
-const VEnumTable& GetEnumTable( IVideoPayload::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IVideoPayload::Enum ) { return Table; }
 
-std::string ToName( IVideoPayload::Enum i_Value )
-{
-  return FindName( Table, i_Value );
-}
+std::string ToName( IVideoPayload::Enum i_Value ) { return FindName( Table, i_Value ); }
 
-bool FromName( const std::string& i_rName, IVideoPayload::Enum& o_rValue )
-{
-  return FindEnumerator( Table, i_rName, o_rValue );
-}
+bool FromName( const std::string& i_rName, IVideoPayload::Enum& o_rValue ) { return FindEnumerator( Table, i_rName, o_rValue ); }
 
 }

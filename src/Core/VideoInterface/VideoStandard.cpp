@@ -80,7 +80,7 @@ constexpr bool IsIndexedByValue()
 {
   for( size_t Index = 0; Index < Standards.size(); ++Index )
   {
-    if( Standards[ Index ].m_Standard != static_cast<int32_t>( Index ) )
+    if( Standards[Index].m_Standard != static_cast<int32_t>( Index ) )
     {
       return false;
     }
@@ -94,7 +94,7 @@ constexpr auto EnumRows = []
   std::array<VEnumRow, Standards.size()> Rows{};
   for( size_t Index = 0; Index < Rows.size(); ++Index )
   {
-    Rows[ Index ] = VEnumRow{ Standards[ Index ].m_Standard, Standards[ Index ].m_pName };
+    Rows[Index] = VEnumRow{ Standards[Index].m_Standard, Standards[Index].m_pName };
   }
   return Rows;
 }();
@@ -109,15 +109,12 @@ bool IsProgressiveWithoutScan( const VVideoStandardRow& i_rRow )
 
 }
 
-const VEnumTable& GetEnumTable( IVideoStandard::Enum )
-{
-  return Table;
-}
+const VEnumTable& GetEnumTable( IVideoStandard::Enum ) { return Table; }
 
 const VVideoStandardRow* FindVideoStandard( IVideoStandard::Enum i_Standard )
 {
   const bool bKnown = i_Standard >= 0 && i_Standard < VideoStandardCount;
-  return bKnown ? &Standards[ i_Standard ] : nullptr;
+  return bKnown ? &Standards[i_Standard] : nullptr;
 }
 
 int64_t GetFramePeriod( IVideoStandard::Enum i_Standard )
@@ -137,14 +134,8 @@ IInterlacedFormat::Enum GetInterlacedFormat( IVideoStandard::Enum i_Standard )
   return pRow->m_Scan == EScan::Interlaced ? IInterlacedFormat::EInterlacedFrameUnspecifiedLineTiming : IInterlacedFormat::ENotInterlaced;
 }
 
-std::string ToName( IVideoStandard::Enum i_Standard )
-{
-  return FindName( Table, i_Standard );
-}
+std::string ToName( IVideoStandard::Enum i_Standard ) { return FindName( Table, i_Standard ); }
 
-bool FromName( const std::string& i_rName, IVideoStandard::Enum& o_rStandard )
-{
-  return FindEnumerator( Table, i_rName, o_rStandard );
-}
+bool FromName( const std::string& i_rName, IVideoStandard::Enum& o_rStandard ) { return FindEnumerator( Table, i_rName, o_rStandard ); }
 
 }

@@ -93,12 +93,12 @@ struct VVideoStandardRow
 {
   IVideoStandard::Enum m_Standard;
   const char* m_pName;
-  uint32_t m_Width;             // pixels
-  uint32_t m_Height;            // lines of a whole frame
+  uint32_t m_Width;    // pixels
+  uint32_t m_Height;   // lines of a whole frame
   EScan m_Scan;
-  uint32_t m_RateNumerator;     // frames a second as a fraction; 0/1 where the standard has no period
+  uint32_t m_RateNumerator;   // frames a second as a fraction; 0/1 where the standard has no period
   uint32_t m_RateDenominator;
-  int64_t m_Period;             // ticks of 1/135000000 s a frame; 0 where the standard has none
+  int64_t m_Period;   // ticks of 1/135000000 s a frame; 0 where the standard has none
 };
 
 constexpr int32_t VideoStandardCount = 61;

@@ -50,20 +50,12 @@ public:
   // UTF-8. Replaces a file of that name.
   virtual bool Open( const std::string& i_rPath ) = 0;
   virtual bool IsOpen() const = 0;
-  virtual bool WriteHeader( const VideoFrameInfo& i_rVideoInfo,
-    const AudioFrameInfo& i_rAudioInfo,
-    const VTimingRecord& i_rTiming,
-    const ITimecode& i_rTimecode,
-    const VColourRecord& i_rColour,
-    const IVideoAttributes& i_rAttributes,
-    IVideoPayload::Enum i_VideoPayload,
+  virtual bool WriteHeader( const VideoFrameInfo& i_rVideoInfo, const AudioFrameInfo& i_rAudioInfo, const VTimingRecord& i_rTiming,
+    const ITimecode& i_rTimecode, const VColourRecord& i_rColour, const IVideoAttributes& i_rAttributes, IVideoPayload::Enum i_VideoPayload,
     IAudioPayload::Enum i_AudioPayload ) = 0;
   virtual bool WriteFrame( const VFrameSet& i_rFrameSet, uint64_t i_FrameKey ) = 0;
   // The lists may be replaced by the writer's encoder. The key counts frames from 0, as a rule upwards.
-  virtual bool WriteFrame( VBufferList& io_rVideo,
-    const VideoFrameInfo& i_rVideoInfo,
-    VBufferList& io_rAudio,
-    const AudioFrameInfo& i_rAudioInfo,
+  virtual bool WriteFrame( VBufferList& io_rVideo, const VideoFrameInfo& i_rVideoInfo, VBufferList& io_rAudio, const AudioFrameInfo& i_rAudioInfo,
     uint64_t i_FrameKey ) = 0;
   virtual bool Close() = 0;
   virtual ~IVideoWriter() = default;

@@ -7,7 +7,8 @@
 namespace KVZ
 {
 
-template<IVideoContainer::Enum TContainer> class VContainerCapabilities : public IVideoWriterCapabilities
+template<IVideoContainer::Enum TContainer>
+class VContainerCapabilities : public IVideoWriterCapabilities
 {
 public:
   bool IsAudioSampleFormatSupported( IAudioSampleFormat::Enum i_Format ) const override;

@@ -1,0 +1,226 @@
+#include "FileIO/TarvoVideo/Writer.h"
+
+#include "Core/VideoInterface/EnumTable.h"
+#include "CoreVideoUtils/FrameSize.h"
+#include "FileIO/AudioEncoding/AudioEncoding.h"
+#include "FileIO/TarvoVideo/Format.h"
+#include "FileIO/WriterSupport/AttributeBlock.h"
+#include "FileIO/WriterSupport/AttributeMaps.h"
+#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+
+#include <limits>
+
+namespace TarvoVideo
+{
+
+namespace
+{
+
+uint64_t SumOfSizes( const KVZ::VBufferList& i_rBuffers )
+{
+  uint64_t Sum = 0;
+  for( const auto& rpBuffer : i_rBuffers )
+  {
+    Sum += rpBuffer->Size();
+  }
+  return Sum;
+}
+
+}
+
+VWriter::VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
+  : VWriterBase( "TarvoVideo", m_Capabilities ),
+    m_StreamMaker( std::move( i_StreamMaker ) ),
+    m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Unnamed" ) ),
+    m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
+{
+}
+
+bool VWriter::DoOpen( const std::string& i_rPath )
+{
+  std::unique_ptr<UtilsIO::IClosableStream> pStream = m_StreamMaker( i_rPath );
+  if( !pStream )
+  {
+    KVZ_LOG_ERROR( Category(), "File could not be opened." );
+    return false;
+  }
+  m_pStream = std::make_unique<WriterSupport::VWatchedStream>( std::move( pStream ) );
+  m_Index.clear();
+  return true;
+}
+
+bool VWriter::DoWriteHeader( const WriterSupport::VHeader& i_rHeader )
+{
+  StoreDescriptions( i_rHeader );
+  // A failure here shows in the block that follows, since the stream refuses it then.
+  const VFixedHeader Header;
+  m_pStream->Write( &Header, sizeof( Header ) );
+  return WriteInternalBlock() && WriteExternalBlock( i_rHeader );
+}
+
+void VWriter::StoreDescriptions( const WriterSupport::VHeader& i_rHeader )
+{
+  m_VideoPayload = i_rHeader.m_VideoPayload;
+  m_AudioPayload = i_rHeader.m_AudioPayload;
+  m_Video = i_rHeader.m_rVideo;
+  m_Audio = i_rHeader.m_rAudio;
+  VideoEncoding::PixelFormatForPayloadFormat( m_VideoPayload, i_rHeader.m_rVideo.m_PixelFormat, m_Video.m_PixelFormat );
+  bool bConversionNeeded = false;
+  AudioEncoding::SampleFormatForPayloadFormat( m_AudioPayload, i_rHeader.m_rAudio.m_SampleFormat, m_Audio.m_SampleFormat, bConversionNeeded );
+  if( m_Audio.m_SampleFormat == KVZ::IAudioSampleFormat::EUnspecified )
+  {
+    m_Audio = {};
+  }
+}
+
+bool VWriter::WriteInternalBlock()
+{
+  KVZ::IVideoAttributes Attributes;
+  if( !WriterSupport::EncodeInternalAttributes( m_Video, m_Audio, Attributes ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Could not encode internal attributes." );
+    return false;
+  }
+  if( !WriterSupport::WriteAttributeBlock( *m_pStream, Attributes ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Could not write internal attributes." );
+    return false;
+  }
+  return true;
+}
+
+bool VWriter::WriteExternalBlock( const WriterSupport::VHeader& i_rHeader )
+{
+  KVZ::IVideoAttributes Attributes;
+  const WriterSupport::VRecordingDescription Recording{ i_rHeader.m_rAttributes, i_rHeader.m_rTiming, i_rHeader.m_rColour, i_rHeader.m_rTimecode,
+    WriterSupport::ETimingKeys::WhenNotDefault, WriterSupport::ETimecodeKeys::WhenValid };
+  if( !WriterSupport::EncodeExternalAttributes( Recording, Attributes ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Could not encode external attributes." );
+    return false;
+  }
+  if( !WriterSupport::WriteAttributeBlock( *m_pStream, Attributes ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Could not write external attributes." );
+    return false;
+  }
+  return true;
+}
+
+bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
+{
+  if( m_pStream->HasFailed() || !Encode( io_rFrame ) )
+  {
+    return false;
+  }
+  const bool bAudio = m_Audio.HasAudio();
+  const uint64_t AudioSum = bAudio ? SumOfSizes( io_rFrame.m_rAudio ) : 0;
+  if( !FitsDescription( io_rFrame, AudioSum ) )
+  {
+    return false;
+  }
+  const auto AudioBytes = static_cast<uint32_t>( AudioSum );
+  const auto [Entry, bNew] = m_Index.try_emplace( io_rFrame.m_Key, VRecord{ m_pStream->GetEnd(), AudioBytes } );
+  if( Entry->second.m_AudioBytes != AudioBytes )
+  {
+    KVZ_LOG_ERROR( Category(), "Frame %1% has %2% bytes of audio in the file and cannot be replaced by one with %3%.", io_rFrame.m_Key,
+      Entry->second.m_AudioBytes, AudioBytes );
+    return false;
+  }
+  const bool bVideoWritten = m_pStream->Seek( Entry->second.m_Position ) && WriteBuffers( io_rFrame.m_rVideo, nullptr );
+  // Sound that could not be written shows in the next call.
+  if( !bVideoWritten || ( bAudio && !WriteBuffers( io_rFrame.m_rAudio, &AudioBytes ) ) )
+  {
+    m_Index.erase( Entry );
+  }
+  return bVideoWritten;
+}
+
+bool VWriter::Encode( WriterSupport::VFrame& io_rFrame )
+{
+  if( !m_pEncoder->Encode( *m_pAllocator, io_rFrame.m_rVideo, io_rFrame.m_rVideoInfo, m_VideoPayload, m_Video.m_PixelFormat ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Encoding to '%s' failed.", KVZ::NameOrUnspecified( m_VideoPayload ) );
+    return false;
+  }
+  if( m_Audio.HasAudio() &&
+    !AudioEncoding::EncodeIfRequired( *m_pAllocator, io_rFrame.m_rAudio, io_rFrame.m_rAudioInfo, m_AudioPayload, m_Audio.m_SampleFormat,
+      m_Audio.m_Channels ) )
+  {
+    KVZ_LOG_ERROR( Category(), "Encoding to '%s' failed.", KVZ::NameOrUnspecified( m_AudioPayload ) );
+    return false;
+  }
+  return true;
+}
+
+// A record carries no length of its own: one that does not match the header's description would make every reader see a wrong picture.
+bool VWriter::FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const
+{
+  const uint64_t VideoBytes = SumOfSizes( i_rFrame.m_rVideo );
+  const uint64_t StoredBytes = CoreVideoUtils::GetFrameSize( m_Video );
+  const KVZ::VideoFrameInfo& rInfo = i_rFrame.m_rVideoInfo;
+  if( VideoBytes != StoredBytes || rInfo.m_ImageWidth != m_Video.m_ImageWidth || rInfo.m_ImageHeight != m_Video.m_ImageHeight )
+  {
+    KVZ_LOG_ERROR( Category(), "Frame %1% of %2% x %3% pixels and %4% bytes does not fit the file's %5% x %6% pixels and %7% bytes.", i_rFrame.m_Key,
+      rInfo.m_ImageWidth, rInfo.m_ImageHeight, VideoBytes, m_Video.m_ImageWidth, m_Video.m_ImageHeight, StoredBytes );
+    return false;
+  }
+  if( i_AudioBytes > std::numeric_limits<uint32_t>::max() )
+  {
+    KVZ_LOG_ERROR( Category(), "Frame %1% has %2% bytes of audio, more than the 4294967295 that a record can hold.", i_rFrame.m_Key, i_AudioBytes );
+    return false;
+  }
+  return true;
+}
+
+// With a length, that goes first; all in one write.
+bool VWriter::WriteBuffers( const KVZ::VBufferList& i_rBuffers, const uint32_t* i_pLength )
+{
+  m_Spans.clear();
+  if( i_pLength )
+  {
+    m_Spans.emplace_back( i_pLength, sizeof( *i_pLength ) );
+  }
+  for( const auto& rpBuffer : i_rBuffers )
+  {
+    if( rpBuffer->Size() != 0 )
+    {
+      m_Spans.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
+    }
+  }
+  return m_pStream->Write( m_Spans );
+}
+
+bool VWriter::DoClose()
+{
+  const std::unique_ptr<WriterSupport::VWatchedStream> pStream = std::move( m_pStream );
+  const bool bIndexed = IsHeaded() && WriteIndex( *pStream );
+  return pStream->Close() && bIndexed;
+}
+
+bool VWriter::WriteIndex( WriterSupport::VWatchedStream& io_rStream ) const
+{
+  constexpr size_t EntriesAtOnce = 4096;
+  const uint64_t Position = io_rStream.GetEnd();
+  const uint64_t Count = m_Index.size();
+  bool bGood = io_rStream.Seek( Position ) && io_rStream.Write( &Count, sizeof( Count ) );
+  std::vector<VIndexEntry> Entries;
+  Entries.reserve( EntriesAtOnce );
+  for( auto Entry = m_Index.begin(); bGood && Entry != m_Index.end(); )
+  {
+    Entries.push_back( { Entry->first, Entry->second.m_Position } );
+    if( ++Entry == m_Index.end() || Entries.size() == EntriesAtOnce )
+    {
+      bGood = io_rStream.Write( Entries.data(), Entries.size() * sizeof( VIndexEntry ) );
+      Entries.clear();
+    }
+  }
+  if( !bGood )
+  {
+    KVZ_LOG_ERROR( Category(), "Could not write index entries." );
+    return false;
+  }
+  return io_rStream.Seek( IndexPositionOffset ) && io_rStream.Write( &Position, sizeof( Position ) );
+}
+
+}

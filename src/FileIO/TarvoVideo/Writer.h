@@ -1,0 +1,65 @@
+// Writes the system's own container, extension "tvid": every field of the frame description and an open list of attributes are kept, video
+// uncompressed, frames found by key. One file a writer, one thread at a time.
+#pragma once
+
+#include "Core/VideoInterface/WriterCapabilities.h"
+#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "FileIO/WriterSupport/WatchedStream.h"
+#include "FileIO/WriterSupport/WriterBase.h"
+
+#include <map>
+#include <memory>
+#include <vector>
+
+namespace TarvoVideo
+{
+
+using VWriterCapabilities = KVZ::VContainerCapabilities<KVZ::IVideoContainer::ETVID>;
+
+// A frame's record is written in the order of the calls; a key that comes again replaces its record in place, which needs the same size.
+// A failed write keeps its frame out of the index, refuses all further frames and makes Close give false; Close still writes the index
+// of the frames that are whole, if it can.
+class VWriter : public WriterSupport::VWriterBase
+{
+public:
+  // Without an encoder the writer makes its own, with the software converter.
+  explicit VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder = {},
+    WriterSupport::VStreamMaker i_StreamMaker = WriterSupport::MakeFile );
+
+  bool IsOpen() const override { return m_pStream != nullptr; }
+
+private:
+  struct VRecord
+  {
+    uint64_t m_Position;
+    uint32_t m_AudioBytes;
+  };
+
+  bool DoOpen( const std::string& i_rPath ) override;
+  bool DoWriteHeader( const WriterSupport::VHeader& i_rHeader ) override;
+  bool DoWriteFrame( WriterSupport::VFrame& io_rFrame ) override;
+  bool DoClose() override;
+
+  void StoreDescriptions( const WriterSupport::VHeader& i_rHeader );
+  bool WriteInternalBlock();
+  bool WriteExternalBlock( const WriterSupport::VHeader& i_rHeader );
+  bool Encode( WriterSupport::VFrame& io_rFrame );
+  bool FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const;
+  bool WriteBuffers( const KVZ::VBufferList& i_rBuffers, const uint32_t* i_pLength );
+  bool WriteIndex( WriterSupport::VWatchedStream& io_rStream ) const;
+
+  const VWriterCapabilities m_Capabilities;
+  const WriterSupport::VStreamMaker m_StreamMaker;
+  const std::shared_ptr<KVZ::IBufferAllocator> m_pAllocator;
+  const std::shared_ptr<VideoEncoding::VVideoFrameEncoder> m_pEncoder;
+
+  std::unique_ptr<WriterSupport::VWatchedStream> m_pStream;
+  KVZ::IVideoPayload::Enum m_VideoPayload = KVZ::IVideoPayload::ENone;
+  KVZ::IAudioPayload::Enum m_AudioPayload = KVZ::IAudioPayload::ENone;
+  KVZ::VideoFrameInfo m_Video;   // as stored
+  KVZ::AudioFrameInfo m_Audio;   // as stored
+  std::map<uint64_t, VRecord> m_Index;
+  std::vector<KVZ::IOutputStream::VSpan> m_Spans;   // kept for its memory
+};
+
+}

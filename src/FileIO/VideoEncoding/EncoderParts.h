@@ -1,0 +1,59 @@
+// What a frame encoder works with and does not contain: pixel format converters, compressors, the drawing of text.
+//
+// The composing place fills the process-wide record once, before the first encoder is made; an encoder takes its own copy.
+#pragma once
+
+#include "CoreVideoUtils/IPixelFormatConverter.h"
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace VideoEncoding
+{
+
+// Which converter an encoder asks for. Values are the constructor argument of the writers.
+enum class EConverter : int32_t
+{
+  OpenGLFirst = 1,
+  Software = 2,
+  OpenGLSecond = 3,
+};
+
+struct VBurnInSettings
+{
+  std::string m_Text;   // empty: nothing is drawn
+  uint32_t m_X = 0;     // pixels from the image's left and upper edge
+  uint32_t m_Y = 0;
+  uint32_t m_SizeIndex = 2;   // one of the five fonts
+};
+
+// Compresses one image into o_rOutput. The scratch vector is there to be reused from frame to frame. False if it could not.
+struct VCompressionInput
+{
+  const KVZ::VideoFrameInfo& m_rInfo;
+  const uint8_t* m_pPixels;
+  size_t m_Size;
+  int m_JPEGQuality;   // 1 to 100
+};
+using VCompressor = std::function<bool( const VCompressionInput&, std::vector<uint8_t>& o_rOutput, std::vector<uint8_t>& io_rScratch )>;
+
+using VConverterMaker = std::function<std::shared_ptr<KVZ::IPixelFormatConverter>()>;
+
+// Draws into an image of the given description. False if it could not.
+using VTextDrawer =
+  std::function<bool( KVZ::IPixelFormatConverter&, const KVZ::VideoFrameInfo&, const VBurnInSettings&, uint8_t* io_pPixels, size_t i_Size )>;
+
+struct VEncoderParts
+{
+  std::map<EConverter, VConverterMaker> m_ConverterMakers;
+  std::map<KVZ::IVideoPayload::Enum, VCompressor> m_Compressors;
+  VTextDrawer m_DrawText;
+};
+
+// The process-wide record.
+VEncoderParts& DefaultEncoderParts();
+
+}
