@@ -18,104 +18,88 @@
 
 namespace NotificationSystem
 {
-  namespace
+namespace
+{
+using VWorkGuard = boost::asio::executor_work_guard<boost::asio::io_context::executor_type>;
+
+constexpr int AboveNormalNice = -5;
+
+// A nice value is a thread's own on Linux. Without the right to raise it the thread stays at normal priority.
+void RaisePriority() { setpriority( PRIO_PROCESS, static_cast<id_t>( syscall( SYS_gettid ) ), AboveNormalNice ); }
+
+void RunUntilEmpty( boost::asio::io_context& i_rIoContext )
+{
+  for( bool bEnded = false; !bEnded; )
   {
-    using VWorkGuard = boost::asio::executor_work_guard<boost::asio::io_context::executor_type>;
-
-    constexpr int AboveNormalNice = -5;
-
-    // A nice value is a thread's own on Linux. Without the right to raise it the thread stays at normal priority.
-    void RaisePriority()
+    try
     {
-      setpriority( PRIO_PROCESS, static_cast<id_t>( syscall( SYS_gettid ) ), AboveNormalNice );
+      i_rIoContext.run();
+      bEnded = true;
     }
-
-    void RunUntilEmpty( boost::asio::io_context& i_rIoContext )
+    catch( const std::exception& i_rException )
     {
-      for( bool bEnded = false; !bEnded; )
-      {
-        try
-        {
-          i_rIoContext.run();
-          bEnded = true;
-        }
-        catch( const std::exception& i_rException )
-        {
-          KVZ_LOG( "NotificationSystem", 2, "A posted function ended with an exception: %1%", i_rException.what() );
-        }
-      }
-    }
-
-    // Owns all that it uses, because a service may be destroyed by a function that its own worker runs.
-    void RunWorker( const std::shared_ptr<boost::asio::io_context>& i_pIoContext, const std::string& i_Name )
-    {
-      const DebugServices::VCrashHandlerForThread CrashHandler;
-      DebugServices::SetThreadName( i_Name );
-      RaisePriority();
-      RunUntilEmpty( *i_pIoContext );
+      KVZ_LOG( "NotificationSystem", 2, "A posted function ended with an exception: %1%", i_rException.what() );
     }
   }
+}
 
-  VAsioPostalService::VAsioPostalService( const std::string& i_Name )
-    : m_Name( i_Name ), m_pIoContext( std::make_shared<boost::asio::io_context>() )
+// Owns all that it uses, because a service may be destroyed by a function that its own worker runs.
+void RunWorker( const std::shared_ptr<boost::asio::io_context>& i_pIoContext, const std::string& i_Name )
+{
+  const DebugServices::VCrashHandlerForThread CrashHandler;
+  DebugServices::SetThreadName( i_Name );
+  RaisePriority();
+  RunUntilEmpty( *i_pIoContext );
+}
+}
+
+VAsioPostalService::VAsioPostalService( const std::string& i_Name ) : m_Name( i_Name ), m_pIoContext( std::make_shared<boost::asio::io_context>() )
+{
+  Start( 1 );
+}
+
+VAsioPostalService::~VAsioPostalService() { Stop(); }
+
+void VAsioPostalService::Post( std::function<void()> i_Function, unsigned int ) { boost::asio::post( *m_pIoContext, std::move( i_Function ) ); }
+
+boost::asio::io_context* VAsioPostalService::IoService() { return m_pIoContext.get(); }
+
+std::shared_ptr<boost::asio::io_context> VAsioPostalService::IoServicePtr() { return m_pIoContext; }
+
+bool VAsioPostalService::Start( unsigned int i_ThreadCount )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  if( m_pWork || i_ThreadCount == 0 )
   {
-    Start( 1 );
+    return false;
   }
-
-  VAsioPostalService::~VAsioPostalService()
+  m_pIoContext->restart();   // a worker that stopped its own service ends after Stop and leaves the flag set
+  m_pWork = std::make_shared<VWorkGuard>( m_pIoContext->get_executor() );
+  for( unsigned int Index = 0; Index < i_ThreadCount; ++Index )
   {
-    Stop();
+    m_Workers.push_back(
+      std::make_unique<boost::thread>( [pIoContext = m_pIoContext, Name = m_Name + std::to_string( Index )] { RunWorker( pIoContext, Name ); } ) );
   }
+  return true;
+}
 
-  void VAsioPostalService::Post( std::function<void()> i_Function, unsigned int )
+bool VAsioPostalService::Stop()
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  if( !m_pWork )
   {
-    boost::asio::post( *m_pIoContext, std::move( i_Function ) );
+    return false;
   }
-
-  boost::asio::io_context* VAsioPostalService::IoService()
+  m_pWork.reset();
+  for( const auto& pWorker : m_Workers )
   {
-    return m_pIoContext.get();
-  }
-
-  std::shared_ptr<boost::asio::io_context> VAsioPostalService::IoServicePtr()
-  {
-    return m_pIoContext;
-  }
-
-  bool VAsioPostalService::Start( unsigned int i_ThreadCount )
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( m_pWork || i_ThreadCount == 0 )
+    if( pWorker->get_id() != boost::this_thread::get_id() )
     {
-      return false;
+      pWorker->join();
     }
-    m_pIoContext->restart();   // a worker that stopped its own service ends after Stop and leaves the flag set
-    m_pWork = std::make_shared<VWorkGuard>( m_pIoContext->get_executor() );
-    for( unsigned int Index = 0; Index < i_ThreadCount; ++Index )
-    {
-      m_Workers.push_back( std::make_unique<boost::thread>(
-        [pIoContext = m_pIoContext, Name = m_Name + std::to_string( Index )] { RunWorker( pIoContext, Name ); } ) );
-    }
-    return true;
   }
-
-  bool VAsioPostalService::Stop()
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( !m_pWork )
-    {
-      return false;
-    }
-    m_pWork.reset();
-    for( const auto& pWorker : m_Workers )
-    {
-      if( pWorker->get_id() != boost::this_thread::get_id() )
-      {
-        pWorker->join();
-      }
-    }
-    m_Workers.clear();
-    m_pIoContext->restart();
-    return true;
-  }
+  m_Workers.clear();
+  m_pIoContext->restart();
+  return true;
+}
 }

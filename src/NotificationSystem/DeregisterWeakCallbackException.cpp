@@ -2,5 +2,5 @@
 
 namespace NotificationSystem
 {
-  VDeregisterWeakCallbackException::~VDeregisterWeakCallbackException() = default;
+VDeregisterWeakCallbackException::~VDeregisterWeakCallbackException() = default;
 }

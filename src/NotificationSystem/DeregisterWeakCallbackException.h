@@ -5,13 +5,13 @@
 
 namespace NotificationSystem
 {
-  // The destructor is defined in the runtime library alone, so that module and host share one type information.
-  class __attribute__( ( visibility( "default" ) ) ) VDeregisterWeakCallbackException : public std::exception
-  {
-  public:
-    VDeregisterWeakCallbackException() = default;
-    VDeregisterWeakCallbackException( const VDeregisterWeakCallbackException& ) = default;
-    VDeregisterWeakCallbackException& operator=( const VDeregisterWeakCallbackException& ) = default;
-    ~VDeregisterWeakCallbackException() override;
-  };
+// The destructor is defined in the runtime library alone, so that module and host share one type information.
+class __attribute__( ( visibility( "default" ) ) ) VDeregisterWeakCallbackException : public std::exception
+{
+public:
+  VDeregisterWeakCallbackException() = default;
+  VDeregisterWeakCallbackException( const VDeregisterWeakCallbackException& ) = default;
+  VDeregisterWeakCallbackException& operator=( const VDeregisterWeakCallbackException& ) = default;
+  ~VDeregisterWeakCallbackException() override;
+};
 }

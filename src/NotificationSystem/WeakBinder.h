@@ -13,38 +13,38 @@
 
 namespace NotificationSystem
 {
-  template<class T, class TFunction>
-  class VWeakBinder
-  {
-  public:
-    VWeakBinder( std::weak_ptr<T> i_pTarget, TFunction i_Function ) : m_pTarget( std::move( i_pTarget ) ), m_Function( std::move( i_Function ) ) {}
+template<class T, class TFunction>
+class VWeakBinder
+{
+public:
+  VWeakBinder( std::weak_ptr<T> i_pTarget, TFunction i_Function ) : m_pTarget( std::move( i_pTarget ) ), m_Function( std::move( i_Function ) ) {}
 
-    template<class... TArgs>
-    auto operator()( TArgs&&... i_Args ) const -> std::invoke_result_t<const TFunction&, T&, TArgs...>
+  template<class... TArgs>
+  auto operator()( TArgs&&... i_Args ) const -> std::invoke_result_t<const TFunction&, T&, TArgs...>
+  {
+    const auto pTarget = m_pTarget.lock();
+    if( !pTarget )
     {
-      const auto pTarget = m_pTarget.lock();
-      if( !pTarget )
-      {
-        throw VDeregisterWeakCallbackException();
-      }
-      return std::invoke( m_Function, *pTarget, std::forward<TArgs>( i_Args )... );
+      throw VDeregisterWeakCallbackException();
     }
-
-  private:
-    std::weak_ptr<T> m_pTarget;
-    TFunction m_Function;
-  };
-
-  // The function is a member function of T or of a base of T, or a callable that takes T& and the signature's arguments.
-  template<class T, class TFunction>
-  VWeakBinder<T, TFunction> BindWeak( std::weak_ptr<T> i_pTarget, TFunction i_Function )
-  {
-    return { std::move( i_pTarget ), std::move( i_Function ) };
+    return std::invoke( m_Function, *pTarget, std::forward<TArgs>( i_Args )... );
   }
 
-  template<class T, class TFunction>
-  VWeakBinder<T, TFunction> BindWeak( const std::shared_ptr<T>& i_pTarget, TFunction i_Function )
-  {
-    return { std::weak_ptr<T>( i_pTarget ), std::move( i_Function ) };
-  }
+private:
+  std::weak_ptr<T> m_pTarget;
+  TFunction m_Function;
+};
+
+// The function is a member function of T or of a base of T, or a callable that takes T& and the signature's arguments.
+template<class T, class TFunction>
+VWeakBinder<T, TFunction> BindWeak( std::weak_ptr<T> i_pTarget, TFunction i_Function )
+{
+  return { std::move( i_pTarget ), std::move( i_Function ) };
+}
+
+template<class T, class TFunction>
+VWeakBinder<T, TFunction> BindWeak( const std::shared_ptr<T>& i_pTarget, TFunction i_Function )
+{
+  return { std::weak_ptr<T>( i_pTarget ), std::move( i_Function ) };
+}
 }

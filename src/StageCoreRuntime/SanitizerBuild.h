@@ -12,8 +12,8 @@
 namespace DebugServices
 {
 #if defined( STAGECORE_SANITIZER_BUILD )
-  constexpr bool IsSanitizerBuild = true;
+constexpr bool IsSanitizerBuild = true;
 #else
-  constexpr bool IsSanitizerBuild = false;
+constexpr bool IsSanitizerBuild = false;
 #endif
 }

@@ -24,69 +24,69 @@
 
 namespace KVZ
 {
+template<class T>
+struct VSchemaOf;
+
+class Variant
+{
+public:
+  using VBytes = std::vector<uint8_t>;
+
+  // Empty: no schema, no bytes. It stands for an absent value.
+  Variant() = default;
+  Variant( const ISchema* i_pSchema, VBytes i_Bytes ) : m_pSchema( i_pSchema ), m_Bytes( std::move( i_Bytes ) ) {}
+
   template<class T>
-  struct VSchemaOf;
+  static Variant Make( const T& i_rValue );
 
-  class Variant
-  {
-  public:
-    using VBytes = std::vector<uint8_t>;
+  // Also for texts given as literals.
+  static Variant Make( const char* i_pText ) { return MakeText( i_pText ); }
+  static Variant Make( std::string_view i_Text ) { return MakeText( i_Text ); }
 
-    // Empty: no schema, no bytes. It stands for an absent value.
-    Variant() = default;
-    Variant( const ISchema* i_pSchema, VBytes i_Bytes ) : m_pSchema( i_pSchema ), m_Bytes( std::move( i_Bytes ) ) {}
+  // A value of an enumeration that is known by its schema alone.
+  static Variant MakeEnumeration( const ISchema* i_pSchema, int32_t i_Value );
 
-    template<class T>
-    static Variant Make( const T& i_rValue );
+  // False, with the output left alone, if this value is of another schema or its bytes do not make up a T exactly.
+  template<class T>
+  bool Get( T& o_rValue ) const;
 
-    // Also for texts given as literals.
-    static Variant Make( const char* i_pText ) { return MakeText( i_pText ); }
-    static Variant Make( std::string_view i_Text ) { return MakeText( i_Text ); }
+  // The number of an enumeration of any schema; false for any other type.
+  bool GetEnumeration( int32_t& o_rValue ) const;
 
-    // A value of an enumeration that is known by its schema alone.
-    static Variant MakeEnumeration( const ISchema* i_pSchema, int32_t i_Value );
+  const ISchema* Schema() const { return m_pSchema; }
+  const VBytes& Bytes() const { return m_Bytes; }
+  bool IsEmpty() const { return m_pSchema == nullptr; }
 
-    // False, with the output left alone, if this value is of another schema or its bytes do not make up a T exactly.
-    template<class T>
-    bool Get( T& o_rValue ) const;
+  bool operator==( const Variant& ) const = default;
 
-    // The number of an enumeration of any schema; false for any other type.
-    bool GetEnumeration( int32_t& o_rValue ) const;
+  // For people: true, 25, -1.5, the text itself, an enumerator's name (its number if it has none), [1, 2] for lists and
+  // {Name: "value", Count: 3} for records. Empty for an empty value; "?" where the bytes do not fit the schema.
+  std::string ToText() const;
 
-    const ISchema* Schema() const { return m_pSchema; }
-    const VBytes& Bytes() const { return m_Bytes; }
-    bool IsEmpty() const { return m_pSchema == nullptr; }
+  // Reads what ToText wrote for a plain value or an enumeration, with nothing before or behind it; booleans also as 1 and 0.
+  // Nothing for any other text or schema.
+  static std::optional<Variant> FromText( const ISchema* i_pSchema, std::string_view i_Text );
 
-    bool operator==( const Variant& ) const = default;
+private:
+  static Variant MakeText( std::string_view i_Text );
 
-    // For people: true, 25, -1.5, the text itself, an enumerator's name (its number if it has none), [1, 2] for lists and
-    // {Name: "value", Count: 3} for records. Empty for an empty value; "?" where the bytes do not fit the schema.
-    std::string ToText() const;
+  const ISchema* m_pSchema = nullptr;
+  VBytes m_Bytes;
+};
 
-    // Reads what ToText wrote for a plain value or an enumeration, with nothing before or behind it; booleans also as 1 and 0.
-    // Nothing for any other text or schema.
-    static std::optional<Variant> FromText( const ISchema* i_pSchema, std::string_view i_Text );
+// One choice of a list of labels and values.
+struct VLabelledVariant
+{
+  std::string m_Label;
+  Variant m_Value;
+  bool operator==( const VLabelledVariant& ) const = default;
+};
 
-  private:
-    static Variant MakeText( std::string_view i_Text );
+// The list as one value: a list of records of label and value. Empty if a choice's value is not of the given schema.
+Variant MakeLabelledList( const ISchema* i_pValueSchema, const std::vector<VLabelledVariant>& i_rChoices );
 
-    const ISchema* m_pSchema = nullptr;
-    VBytes m_Bytes;
-  };
-
-  // One choice of a list of labels and values.
-  struct VLabelledVariant
-  {
-    std::string m_Label;
-    Variant m_Value;
-    bool operator==( const VLabelledVariant& ) const = default;
-  };
-
-  // The list as one value: a list of records of label and value. Empty if a choice's value is not of the given schema.
-  Variant MakeLabelledList( const ISchema* i_pValueSchema, const std::vector<VLabelledVariant>& i_rChoices );
-
-  // False, with the output left alone, if the value is no list of labels and values.
-  bool GetLabelledList( const Variant& i_rList, std::vector<VLabelledVariant>& o_rChoices );
+// False, with the output left alone, if the value is no list of labels and values.
+bool GetLabelledList( const Variant& i_rList, std::vector<VLabelledVariant>& o_rChoices );
 }
 
 #include "StageCoreRuntime/VariantCodec.h"

@@ -10,68 +10,72 @@
 
 namespace
 {
-  using NotificationSystem::BindWeak;
-  using NotificationSystem::VDeregisterWeakCallbackException;
-  using NotificationSystem::VMultiCallback;
-  using NotificationSystem::VMultiCallbackPostal;
-  using TestSupport::VManualPostalService;
+using NotificationSystem::BindWeak;
+using NotificationSystem::VDeregisterWeakCallbackException;
+using NotificationSystem::VMultiCallback;
+using NotificationSystem::VMultiCallbackPostal;
+using TestSupport::VManualPostalService;
 
-  TEST( MultiCallback, RunsInOrderAndDropsTheOneThatDeregisters )
-  {
-    VMultiCallback<void( unsigned int )> Callbacks;
-    std::string Ran;
-    EXPECT_FALSE( Callbacks( 0 ) );
-    Callbacks.Add( [&]( unsigned int i_Number ) { Ran += "a" + std::to_string( i_Number ); } );
-    auto pSubscriber = std::make_shared<int>( 1 );
-    Callbacks.Add( BindWeak( pSubscriber, [&]( int&, unsigned int ) { Ran += "b"; } ) );
-    Callbacks.Add( [&]( unsigned int i_Number ) { Ran += "c" + std::to_string( i_Number ); } );
-    EXPECT_TRUE( Callbacks( 1 ) );
-    EXPECT_EQ( Ran, "a1bc1" );
-    pSubscriber.reset();
-    EXPECT_EQ( Callbacks.Count(), 3u );
-    EXPECT_TRUE( Callbacks( 2 ) );
-    EXPECT_EQ( Ran, "a1bc1a2c2" );
-    EXPECT_EQ( Callbacks.Count(), 2u );
-    EXPECT_EQ( Callbacks.Clear(), 2u );
-    EXPECT_EQ( Callbacks.Clear(), 0u );
-    Callbacks.Add( []( unsigned int ) { throw VDeregisterWeakCallbackException(); } );
-    EXPECT_FALSE( Callbacks( 3 ) );
-    EXPECT_EQ( Callbacks.Count(), 0u );
-  }
+TEST( MultiCallback, RunsInOrderAndDropsTheOneThatDeregisters )
+{
+  VMultiCallback<void( unsigned int )> Callbacks;
+  std::string Ran;
+  EXPECT_FALSE( Callbacks( 0 ) );
+  Callbacks.Add( [&]( unsigned int i_Number ) { Ran += "a" + std::to_string( i_Number ); } );
+  auto pSubscriber = std::make_shared<int>( 1 );
+  Callbacks.Add( BindWeak( pSubscriber, [&]( int&, unsigned int ) { Ran += "b"; } ) );
+  Callbacks.Add( [&]( unsigned int i_Number ) { Ran += "c" + std::to_string( i_Number ); } );
+  EXPECT_TRUE( Callbacks( 1 ) );
+  EXPECT_EQ( Ran, "a1bc1" );
+  pSubscriber.reset();
+  EXPECT_EQ( Callbacks.Count(), 3u );
+  EXPECT_TRUE( Callbacks( 2 ) );
+  EXPECT_EQ( Ran, "a1bc1a2c2" );
+  EXPECT_EQ( Callbacks.Count(), 2u );
+  EXPECT_EQ( Callbacks.Clear(), 2u );
+  EXPECT_EQ( Callbacks.Clear(), 0u );
+  Callbacks.Add( []( unsigned int ) { throw VDeregisterWeakCallbackException(); } );
+  EXPECT_FALSE( Callbacks( 3 ) );
+  EXPECT_EQ( Callbacks.Count(), 0u );
+}
 
-  TEST( MultiCallback, RemovesByHandleAlone )
-  {
-    VMultiCallback<void()> Callbacks;
-    std::string Ran;
-    void* pFirst = Callbacks.Add( [&] { Ran += "a"; } );
-    void* pSecond = Callbacks.Add( [&] { Ran += "b"; } );
-    EXPECT_NE( pFirst, pSecond );
-    EXPECT_EQ( Callbacks.Remove( nullptr ), 0u );
-    EXPECT_EQ( Callbacks.Remove( &Ran ), 0u );
-    EXPECT_EQ( Callbacks.Remove( pFirst ), 1u );
-    EXPECT_EQ( Callbacks.Remove( pFirst ), 0u );
-    EXPECT_TRUE( Callbacks() );
-    EXPECT_EQ( Ran, "b" );
-  }
+TEST( MultiCallback, RemovesByHandleAlone )
+{
+  VMultiCallback<void()> Callbacks;
+  std::string Ran;
+  void* pFirst = Callbacks.Add( [&] { Ran += "a"; } );
+  void* pSecond = Callbacks.Add( [&] { Ran += "b"; } );
+  EXPECT_NE( pFirst, pSecond );
+  EXPECT_EQ( Callbacks.Remove( nullptr ), 0u );
+  EXPECT_EQ( Callbacks.Remove( &Ran ), 0u );
+  EXPECT_EQ( Callbacks.Remove( pFirst ), 1u );
+  EXPECT_EQ( Callbacks.Remove( pFirst ), 0u );
+  EXPECT_TRUE( Callbacks() );
+  EXPECT_EQ( Ran, "b" );
+}
 
-  TEST( MultiCallback, ARunningRoundGoesThroughTheListAsItWas )
-  {
-    VMultiCallback<void()> Callbacks;
-    std::string Ran;
-    void* pLast = nullptr;
-    Callbacks.Add( [&] {
+TEST( MultiCallback, ARunningRoundGoesThroughTheListAsItWas )
+{
+  VMultiCallback<void()> Callbacks;
+  std::string Ran;
+  void* pLast = nullptr;
+  Callbacks.Add(
+    [&]
+    {
       Ran += "a";
       Callbacks.Remove( pLast );
       Callbacks.Add( [&] { Ran += "n"; } );
     } );
-    pLast = Callbacks.Add( [&] { Ran += "b"; } );
-    EXPECT_TRUE( Callbacks() );
-    EXPECT_EQ( Ran, "ab" );
-    EXPECT_EQ( Callbacks.Count(), 2u );
-    Callbacks.Clear();
-    Ran.clear();
-    // A call from inside a call, and a clear of the running list
-    Callbacks.Add( [&] {
+  pLast = Callbacks.Add( [&] { Ran += "b"; } );
+  EXPECT_TRUE( Callbacks() );
+  EXPECT_EQ( Ran, "ab" );
+  EXPECT_EQ( Callbacks.Count(), 2u );
+  Callbacks.Clear();
+  Ran.clear();
+  // A call from inside a call, and a clear of the running list
+  Callbacks.Add(
+    [&]
+    {
       Ran += "x";
       if( Ran.size() == 1 )
       {
@@ -79,132 +83,135 @@ namespace
         Callbacks.Clear();
       }
     } );
-    EXPECT_TRUE( Callbacks() );
-    EXPECT_EQ( Ran, "xx" );
-    EXPECT_FALSE( Callbacks() );
-  }
+  EXPECT_TRUE( Callbacks() );
+  EXPECT_EQ( Ran, "xx" );
+  EXPECT_FALSE( Callbacks() );
+}
 
-  TEST( MultiCallback, PassesOtherExceptionsOn )
+TEST( MultiCallback, PassesOtherExceptionsOn )
+{
+  VMultiCallback<void()> Callbacks;
+  std::string Ran;
+  Callbacks.Add( [&] { Ran += "a"; } );
+  Callbacks.Add( [&] { throw std::runtime_error( "no" ); } );
+  Callbacks.Add( [&] { Ran += "b"; } );
+  EXPECT_THROW( Callbacks(), std::runtime_error );
+  EXPECT_EQ( Ran, "a" );
+  EXPECT_EQ( Callbacks.Count(), 3u );
+}
+
+TEST( MultiCallbackPostal, RunsEachServicesListAsOneItemInOrder )
+{
+  const auto pDefault = std::make_shared<VManualPostalService>();
+  const auto pOther = std::make_shared<VManualPostalService>();
+  VMultiCallbackPostal<void( unsigned int )> Callbacks( pDefault );
+  std::string Ran;
+  const auto Append = [&Ran]( const char* i_pName )
+  { return [&Ran, i_pName]( unsigned int i_Number ) { Ran += i_pName + std::to_string( i_Number ); }; };
+  EXPECT_FALSE( Callbacks( 0 ) );
+  Callbacks.Add( Append( "d" ) );
+  Callbacks.Add( Append( "o" ), pOther );
+  Callbacks.AddImmediate( Append( "i" ) );
+  Callbacks.Add( Append( "e" ) );
+  Callbacks.Add( Append( "j" ), nullptr );
+  EXPECT_EQ( Callbacks.Count(), 5u );
+  EXPECT_TRUE( Callbacks( 1 ) );
+  EXPECT_EQ( Ran, "i1j1" );
+  EXPECT_EQ( pDefault->RunAll(), 1u );
+  EXPECT_EQ( Ran, "i1j1d1e1" );
+  EXPECT_EQ( pOther->RunAll(), 1u );
+  EXPECT_EQ( Ran, "i1j1d1e1o1" );
+  EXPECT_EQ( Callbacks.Clear(), 5u );
+  EXPECT_FALSE( Callbacks( 2 ) );
+  EXPECT_EQ( pDefault->Pending() + pOther->Pending(), 0u );
+}
+
+TEST( MultiCallbackPostal, RemovingAServicesLastEntryLetsTheServiceGo )
+{
+  auto pService = std::make_shared<VManualPostalService>();
+  const std::weak_ptr<VManualPostalService> pWeakService = pService;
+  VMultiCallbackPostal<void()> Callbacks;
+  void* pFirst = Callbacks.Add( [] {}, pService );
+  void* pSecond = Callbacks.Add( [] {}, pService );
+  void* pImmediate = Callbacks.AddImmediate( [] {} );
+  pService.reset();
+  EXPECT_EQ( Callbacks.Remove( &Callbacks ), 0u );
+  EXPECT_EQ( Callbacks.Remove( pFirst ), 1u );
+  EXPECT_FALSE( pWeakService.expired() );
+  EXPECT_EQ( Callbacks.Remove( pSecond ), 1u );
+  EXPECT_TRUE( pWeakService.expired() );
+  EXPECT_EQ( Callbacks.Remove( pSecond ), 0u );
+  EXPECT_EQ( Callbacks.Remove( pImmediate ), 1u );
+  EXPECT_EQ( Callbacks.Count(), 0u );
+}
+
+TEST( MultiCallbackPostal, DropsAServiceWhoseSubscribersHaveAllDied )
+{
+  auto pService = std::make_shared<VManualPostalService>();
+  const std::weak_ptr<VManualPostalService> pWeakService = pService;
+  VMultiCallbackPostal<void()> Callbacks( pService );
+  auto pSubscriber = std::make_shared<int>( 1 );
+  Callbacks.Add( BindWeak( pSubscriber, []( int& i_rCount ) { ++i_rCount; } ), pService );
+  Callbacks.Add( BindWeak( pSubscriber, []( int& i_rCount ) { ++i_rCount; } ), nullptr );
+  pSubscriber.reset();
+  EXPECT_TRUE( Callbacks() );
+  EXPECT_EQ( Callbacks.Count(), 1u );
+  EXPECT_EQ( pService->RunAll(), 1u );
+  EXPECT_EQ( Callbacks.Count(), 0u );
+  EXPECT_FALSE( Callbacks() );
+  EXPECT_EQ( pService->Pending(), 0u );
+}
+
+TEST( MultiCallbackPostal, APostedListOutlivesItsOwnerAndItsEntriesGoWithTheirRemoval )
+{
+  const auto pService = std::make_shared<VManualPostalService>();
+  auto pCallbacks = std::make_unique<VMultiCallbackPostal<void()>>( pService );
+  std::string Ran;
+  void* pFirst = pCallbacks->Add( [&] { Ran += "a"; } );
+  pCallbacks->Add( [&] { Ran += "b"; } );
+  ( *pCallbacks )();
+  pCallbacks->Remove( pFirst );
+  pCallbacks.reset();
+  EXPECT_EQ( pService->RunAll(), 1u );
+  EXPECT_EQ( Ran, "b" );
+}
+
+// The destruction of a callable or a service may come back into the list: a deadlock if that held its lock.
+TEST( MultiCallbackPostal, HoldsNoLockWhileACallableOrServiceEnds )
+{
+  VMultiCallbackPostal<void()> Callbacks;
+  const auto CallsBack = [&Callbacks] { return std::shared_ptr<void>( nullptr, [&Callbacks]( void* ) { Callbacks.Count(); } ); };
+  class VServiceThatCallsBack : public VManualPostalService
   {
-    VMultiCallback<void()> Callbacks;
-    std::string Ran;
-    Callbacks.Add( [&] { Ran += "a"; } );
-    Callbacks.Add( [&] { throw std::runtime_error( "no" ); } );
-    Callbacks.Add( [&] { Ran += "b"; } );
-    EXPECT_THROW( Callbacks(), std::runtime_error );
-    EXPECT_EQ( Ran, "a" );
-    EXPECT_EQ( Callbacks.Count(), 3u );
-  }
+  public:
+    explicit VServiceThatCallsBack( std::shared_ptr<void> i_pEnd ) : m_pEnd( std::move( i_pEnd ) ) {}
 
-  TEST( MultiCallbackPostal, RunsEachServicesListAsOneItemInOrder )
+  private:
+    const std::shared_ptr<void> m_pEnd;
+  };
+  const auto Add = [&] { return Callbacks.Add( [p = CallsBack()] {}, std::make_shared<VServiceThatCallsBack>( CallsBack() ) ); };
+  EXPECT_EQ( Callbacks.Remove( Add() ), 1u );
+  Add();
+  EXPECT_EQ( Callbacks.Clear(), 1u );
+  Callbacks.AddImmediate( [p = CallsBack()] { throw VDeregisterWeakCallbackException(); } );
+  EXPECT_FALSE( Callbacks() );
+  EXPECT_EQ( Callbacks.Count(), 0u );
+}
+
+TEST( MultiCallbackPostal, StandsSubscribersThatComeAndGoWhileItFires )
+{
+  constexpr int Rounds = 400;
+  const auto pService = std::make_shared<VManualPostalService>();
+  VMultiCallbackPostal<void( unsigned int )> Callbacks( pService );
+  std::atomic<unsigned int> Permanent{ 0 };
+  std::atomic<unsigned int> Passing{ 0 };
+  Callbacks.AddImmediate( [&]( unsigned int ) { ++Permanent; } );
+  boost::thread_group Threads;
+  for( int Thread = 0; Thread < 2; ++Thread )
   {
-    const auto pDefault = std::make_shared<VManualPostalService>();
-    const auto pOther = std::make_shared<VManualPostalService>();
-    VMultiCallbackPostal<void( unsigned int )> Callbacks( pDefault );
-    std::string Ran;
-    const auto Append = [&Ran]( const char* i_pName ) { return [&Ran, i_pName]( unsigned int i_Number ) { Ran += i_pName + std::to_string( i_Number ); }; };
-    EXPECT_FALSE( Callbacks( 0 ) );
-    Callbacks.Add( Append( "d" ) );
-    Callbacks.Add( Append( "o" ), pOther );
-    Callbacks.AddImmediate( Append( "i" ) );
-    Callbacks.Add( Append( "e" ) );
-    Callbacks.Add( Append( "j" ), nullptr );
-    EXPECT_EQ( Callbacks.Count(), 5u );
-    EXPECT_TRUE( Callbacks( 1 ) );
-    EXPECT_EQ( Ran, "i1j1" );
-    EXPECT_EQ( pDefault->RunAll(), 1u );
-    EXPECT_EQ( Ran, "i1j1d1e1" );
-    EXPECT_EQ( pOther->RunAll(), 1u );
-    EXPECT_EQ( Ran, "i1j1d1e1o1" );
-    EXPECT_EQ( Callbacks.Clear(), 5u );
-    EXPECT_FALSE( Callbacks( 2 ) );
-    EXPECT_EQ( pDefault->Pending() + pOther->Pending(), 0u );
-  }
-
-  TEST( MultiCallbackPostal, RemovingAServicesLastEntryLetsTheServiceGo )
-  {
-    auto pService = std::make_shared<VManualPostalService>();
-    const std::weak_ptr<VManualPostalService> pWeakService = pService;
-    VMultiCallbackPostal<void()> Callbacks;
-    void* pFirst = Callbacks.Add( [] {}, pService );
-    void* pSecond = Callbacks.Add( [] {}, pService );
-    void* pImmediate = Callbacks.AddImmediate( [] {} );
-    pService.reset();
-    EXPECT_EQ( Callbacks.Remove( &Callbacks ), 0u );
-    EXPECT_EQ( Callbacks.Remove( pFirst ), 1u );
-    EXPECT_FALSE( pWeakService.expired() );
-    EXPECT_EQ( Callbacks.Remove( pSecond ), 1u );
-    EXPECT_TRUE( pWeakService.expired() );
-    EXPECT_EQ( Callbacks.Remove( pSecond ), 0u );
-    EXPECT_EQ( Callbacks.Remove( pImmediate ), 1u );
-    EXPECT_EQ( Callbacks.Count(), 0u );
-  }
-
-  TEST( MultiCallbackPostal, DropsAServiceWhoseSubscribersHaveAllDied )
-  {
-    auto pService = std::make_shared<VManualPostalService>();
-    const std::weak_ptr<VManualPostalService> pWeakService = pService;
-    VMultiCallbackPostal<void()> Callbacks( pService );
-    auto pSubscriber = std::make_shared<int>( 1 );
-    Callbacks.Add( BindWeak( pSubscriber, []( int& i_rCount ) { ++i_rCount; } ), pService );
-    Callbacks.Add( BindWeak( pSubscriber, []( int& i_rCount ) { ++i_rCount; } ), nullptr );
-    pSubscriber.reset();
-    EXPECT_TRUE( Callbacks() );
-    EXPECT_EQ( Callbacks.Count(), 1u );
-    EXPECT_EQ( pService->RunAll(), 1u );
-    EXPECT_EQ( Callbacks.Count(), 0u );
-    EXPECT_FALSE( Callbacks() );
-    EXPECT_EQ( pService->Pending(), 0u );
-  }
-
-  TEST( MultiCallbackPostal, APostedListOutlivesItsOwnerAndItsEntriesGoWithTheirRemoval )
-  {
-    const auto pService = std::make_shared<VManualPostalService>();
-    auto pCallbacks = std::make_unique<VMultiCallbackPostal<void()>>( pService );
-    std::string Ran;
-    void* pFirst = pCallbacks->Add( [&] { Ran += "a"; } );
-    pCallbacks->Add( [&] { Ran += "b"; } );
-    ( *pCallbacks )();
-    pCallbacks->Remove( pFirst );
-    pCallbacks.reset();
-    EXPECT_EQ( pService->RunAll(), 1u );
-    EXPECT_EQ( Ran, "b" );
-  }
-
-  // The destruction of a callable or a service may come back into the list: a deadlock if that held its lock.
-  TEST( MultiCallbackPostal, HoldsNoLockWhileACallableOrServiceEnds )
-  {
-    VMultiCallbackPostal<void()> Callbacks;
-    const auto CallsBack = [&Callbacks] { return std::shared_ptr<void>( nullptr, [&Callbacks]( void* ) { Callbacks.Count(); } ); };
-    class VServiceThatCallsBack : public VManualPostalService
-    {
-    public:
-      explicit VServiceThatCallsBack( std::shared_ptr<void> i_pEnd ) : m_pEnd( std::move( i_pEnd ) ) {}
-
-    private:
-      const std::shared_ptr<void> m_pEnd;
-    };
-    const auto Add = [&] { return Callbacks.Add( [p = CallsBack()] {}, std::make_shared<VServiceThatCallsBack>( CallsBack() ) ); };
-    EXPECT_EQ( Callbacks.Remove( Add() ), 1u );
-    Add();
-    EXPECT_EQ( Callbacks.Clear(), 1u );
-    Callbacks.AddImmediate( [p = CallsBack()] { throw VDeregisterWeakCallbackException(); } );
-    EXPECT_FALSE( Callbacks() );
-    EXPECT_EQ( Callbacks.Count(), 0u );
-  }
-
-  TEST( MultiCallbackPostal, StandsSubscribersThatComeAndGoWhileItFires )
-  {
-    constexpr int Rounds = 400;
-    const auto pService = std::make_shared<VManualPostalService>();
-    VMultiCallbackPostal<void( unsigned int )> Callbacks( pService );
-    std::atomic<unsigned int> Permanent{ 0 };
-    std::atomic<unsigned int> Passing{ 0 };
-    Callbacks.AddImmediate( [&]( unsigned int ) { ++Permanent; } );
-    boost::thread_group Threads;
-    for( int Thread = 0; Thread < 2; ++Thread )
-    {
-      Threads.create_thread( [&] {
+    Threads.create_thread(
+      [&]
+      {
         for( int Round = 0; Round < Rounds; ++Round )
         {
           auto pSubscriber = std::make_shared<int>( 0 );
@@ -214,15 +221,15 @@ namespace
           EXPECT_EQ( Callbacks.Remove( pHandle ), 1u );
         }
       } );
-    }
-    for( int Round = 0; Round < Rounds; ++Round )
-    {
-      EXPECT_TRUE( Callbacks( 1 ) );
-      pService->RunAll();
-    }
-    Threads.join_all();
-    Callbacks( 1 );
-    EXPECT_EQ( Permanent, Rounds + 1u );
-    EXPECT_EQ( Callbacks.Count(), 1u );
   }
+  for( int Round = 0; Round < Rounds; ++Round )
+  {
+    EXPECT_TRUE( Callbacks( 1 ) );
+    pService->RunAll();
+  }
+  Threads.join_all();
+  Callbacks( 1 );
+  EXPECT_EQ( Permanent, Rounds + 1u );
+  EXPECT_EQ( Callbacks.Count(), 1u );
+}
 }

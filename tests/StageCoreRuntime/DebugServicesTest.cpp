@@ -11,92 +11,99 @@
 
 namespace
 {
-  TEST( Assert, IsEvaluatedOnceAndReportsOnlyAFailure )
-  {
-    std::vector<std::string> Expressions;
-    const auto Former = DebugServices::SetAssertFailHandler(
-      [&Expressions]( const char* i_pExpression, const char* i_pFile, int i_Line ) {
-        Expressions.push_back( i_pExpression );
-        EXPECT_STREQ( i_pFile, __FILE__ );
-        EXPECT_GT( i_Line, 0 );
-      } );
-    int Calls = 0;
-    EXPECT_TRUE( KVZ_ASSERT( ++Calls == 1 ) );
-    EXPECT_FALSE( KVZ_ASSERT( ++Calls == 1 ) );
-    KVZ_ASSERT( !"Fatal attempt to acquire a write lock from within a read lock." );
-    DebugServices::SetAssertFailHandler( Former );
-    EXPECT_EQ( Calls, 2 );
-    EXPECT_EQ( Expressions, ( std::vector<std::string>{ "++Calls == 1", "!\"Fatal attempt to acquire a write lock from within a read lock.\"" } ) );
-  }
+TEST( Assert, IsEvaluatedOnceAndReportsOnlyAFailure )
+{
+  std::vector<std::string> Expressions;
+  const auto Former = DebugServices::SetAssertFailHandler(
+    [&Expressions]( const char* i_pExpression, const char* i_pFile, int i_Line )
+    {
+      Expressions.push_back( i_pExpression );
+      EXPECT_STREQ( i_pFile, __FILE__ );
+      EXPECT_GT( i_Line, 0 );
+    } );
+  int Calls = 0;
+  EXPECT_TRUE( KVZ_ASSERT( ++Calls == 1 ) );
+  EXPECT_FALSE( KVZ_ASSERT( ++Calls == 1 ) );
+  KVZ_ASSERT( !"Fatal attempt to acquire a write lock from within a read lock." );
+  DebugServices::SetAssertFailHandler( Former );
+  EXPECT_EQ( Calls, 2 );
+  EXPECT_EQ( Expressions, ( std::vector<std::string>{ "++Calls == 1", "!\"Fatal attempt to acquire a write lock from within a read lock.\"" } ) );
+}
 
-  TEST( Assert, GoesToTheLogByDefaultAndExecutionGoesOn )
-  {
-    const TestSupport::VLogCapture Capture( "DebugServices" );
-    EXPECT_FALSE( KVZ_ASSERT( 100 % 7 == 0 ) );
-    const auto Lines = Capture.Lines();
-    ASSERT_EQ( Lines.size(), 1u );
-    EXPECT_EQ( Lines[0].m_Text, "Assertion failed: 100 % 7 == 0" );
-    EXPECT_EQ( Lines[0].m_Level, 2 );
-    EXPECT_EQ( Lines[0].m_File, __FILE__ );
-  }
+TEST( Assert, GoesToTheLogByDefaultAndExecutionGoesOn )
+{
+  const TestSupport::VLogCapture Capture( "DebugServices" );
+  EXPECT_FALSE( KVZ_ASSERT( 100 % 7 == 0 ) );
+  const auto Lines = Capture.Lines();
+  ASSERT_EQ( Lines.size(), 1u );
+  EXPECT_EQ( Lines[0].m_Text, "Assertion failed: 100 % 7 == 0" );
+  EXPECT_EQ( Lines[0].m_Level, 2 );
+  EXPECT_EQ( Lines[0].m_File, __FILE__ );
+}
 
-  std::string SystemNameOfAThreadNamed( const std::string& i_Name )
-  {
-    std::string SystemName;
-    boost::thread( [&] {
+std::string SystemNameOfAThreadNamed( const std::string& i_Name )
+{
+  std::string SystemName;
+  boost::thread(
+    [&]
+    {
       DebugServices::SetThreadName( i_Name );
       EXPECT_EQ( DebugServices::GetThreadName(), i_Name );
       char Name[16] = {};
       pthread_getname_np( pthread_self(), Name, sizeof( Name ) );
       SystemName = Name;
-    } ).join();
-    return SystemName;
-  }
+    } )
+    .join();
+  return SystemName;
+}
 
-  TEST( ThreadName, KeepsTheWorkersIndexWhenTheSystemCutsTheName )
-  {
-    EXPECT_EQ( SystemNameOfAThreadNamed( "Engine0" ), "Engine0" );
-    EXPECT_EQ( SystemNameOfAThreadNamed( "Video Input En0" ), "Video Input En0" );
-    EXPECT_EQ( SystemNameOfAThreadNamed( "Video Input Engine12" ), "Video Input E12" );
-    EXPECT_EQ( SystemNameOfAThreadNamed( "VVideoInputBufferClient" ), "VVideoInputBuff" );
-    EXPECT_EQ( SystemNameOfAThreadNamed( "12345678901234567890" ), "123456789012345" );
-  }
+TEST( ThreadName, KeepsTheWorkersIndexWhenTheSystemCutsTheName )
+{
+  EXPECT_EQ( SystemNameOfAThreadNamed( "Engine0" ), "Engine0" );
+  EXPECT_EQ( SystemNameOfAThreadNamed( "Video Input En0" ), "Video Input En0" );
+  EXPECT_EQ( SystemNameOfAThreadNamed( "Video Input Engine12" ), "Video Input E12" );
+  EXPECT_EQ( SystemNameOfAThreadNamed( "VVideoInputBufferClient" ), "VVideoInputBuff" );
+  EXPECT_EQ( SystemNameOfAThreadNamed( "12345678901234567890" ), "123456789012345" );
+}
 
-  // Fills the thread's stack until the guard page is hit.
-  [[maybe_unused]] int Overflow( int i_Depth )
-  {
-    volatile char Block[4096] = {};
-    Block[i_Depth % 4096] = 1;
-    return i_Depth < 0 ? 0 : Overflow( i_Depth + 1 ) + Block[0];
-  }
+// Fills the thread's stack until the guard page is hit.
+[[maybe_unused]] int Overflow( int i_Depth )
+{
+  volatile char Block[4096] = {};
+  Block[i_Depth % 4096] = 1;
+  return i_Depth < 0 ? 0 : Overflow( i_Depth + 1 ) + Block[0];
+}
 
-  [[maybe_unused]] void CrashInNamedThread( void ( *i_pCrash )() )
-  {
-    DebugServices::InstallCrashHandler();
-    boost::thread( [i_pCrash] {
+[[maybe_unused]] void CrashInNamedThread( void ( *i_pCrash )() )
+{
+  DebugServices::InstallCrashHandler();
+  boost::thread(
+    [i_pCrash]
+    {
       const DebugServices::VCrashHandlerForThread CrashHandler;
       DebugServices::SetThreadName( "Doomed3" );
       i_pCrash();
-    } ).join();
-  }
+    } )
+    .join();
+}
 
-  TEST( CrashHandlerDeathTest, ReportsTheThreadAndDiesOfTheSignal )
+TEST( CrashHandlerDeathTest, ReportsTheThreadAndDiesOfTheSignal )
+{
+  if constexpr( DebugServices::IsSanitizerBuild )
   {
-    if constexpr( DebugServices::IsSanitizerBuild )
-    {
-      struct sigaction Before = {};
-      struct sigaction After = {};
-      sigaction( SIGSEGV, nullptr, &Before );
-      DebugServices::InstallCrashHandler();
-      sigaction( SIGSEGV, nullptr, &After );
-      EXPECT_EQ( Before.sa_handler, After.sa_handler );
-    }
-    else
-    {
-      GTEST_FLAG_SET( death_test_style, "threadsafe" );
-      EXPECT_EXIT( CrashInNamedThread( [] { raise( SIGSEGV ); } ), testing::KilledBySignal( SIGSEGV ), "Crash: SIGSEGV in thread \"Doomed3\"" );
-      EXPECT_EXIT( CrashInNamedThread( [] { std::abort(); } ), testing::KilledBySignal( SIGABRT ), "Crash: SIGABRT in thread \"Doomed3\"" );
-      EXPECT_EXIT( CrashInNamedThread( [] { exit( Overflow( 0 ) ); } ), testing::KilledBySignal( SIGSEGV ), "Crash: SIGSEGV in thread \"Doomed3\"" );
-    }
+    struct sigaction Before = {};
+    struct sigaction After = {};
+    sigaction( SIGSEGV, nullptr, &Before );
+    DebugServices::InstallCrashHandler();
+    sigaction( SIGSEGV, nullptr, &After );
+    EXPECT_EQ( Before.sa_handler, After.sa_handler );
   }
+  else
+  {
+    GTEST_FLAG_SET( death_test_style, "threadsafe" );
+    EXPECT_EXIT( CrashInNamedThread( [] { raise( SIGSEGV ); } ), testing::KilledBySignal( SIGSEGV ), "Crash: SIGSEGV in thread \"Doomed3\"" );
+    EXPECT_EXIT( CrashInNamedThread( [] { std::abort(); } ), testing::KilledBySignal( SIGABRT ), "Crash: SIGABRT in thread \"Doomed3\"" );
+    EXPECT_EXIT( CrashInNamedThread( [] { exit( Overflow( 0 ) ); } ), testing::KilledBySignal( SIGSEGV ), "Crash: SIGSEGV in thread \"Doomed3\"" );
+  }
+}
 }
