@@ -1,0 +1,223 @@
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
+
+#include "tests/support/LogCapture.h"
+#include "tests/support/ManualPostalService.h"
+
+#include <boost/thread/thread.hpp>
+#include <gtest/gtest.h>
+
+#include <future>
+
+namespace
+{
+
+using namespace VideoInputHAL;
+
+// Only its index and identifier matter to the manager.
+class VPlainDevice : public IVideoInputDevice
+{
+public:
+  void SetDeviceIndex( int32_t i_Index ) override { m_Index = i_Index; }
+  VCountCallback& GetDroppedFramesCallback() override { return m_Dropped; }
+  VEventCallback& GetStatusChangedCallback() override { return m_Event; }
+  VEventCallback& GetPixelFormatsChangedCallback() override { return m_Event; }
+  VEventCallback& GetVideoStandardChangedCallback() override { return m_Event; }
+  VEventCallback& GetTimecodeChangedCallback() override { return m_Event; }
+  void SetDataCallback( std::shared_ptr<IVideoInputDataCallback> ) override {}
+  void SetAllocator( std::shared_ptr<IVideoInputAllocator> ) override {}
+  std::string GetManufacturerName() const override { return {}; }
+  std::string GetDriverName() const override { return {}; }
+  std::string GetDeviceName() const override { return {}; }
+  std::string GetDeviceURN() const override { return MakeDeviceURN( m_Index ); }
+  KVZ::IVideoStandard::Enum GetVideoStandard() const override { return KVZ::IVideoStandard::EUnspecified; }
+  KVZ::IPixelFormat::Enum GetPixelFormat() const override { return KVZ::IPixelFormat::EUnspecified; }
+  KVZ::ITimecode GetTimecode() const override { return {}; }
+  void GetSupportedPixelFormats( std::set<KVZ::IPixelFormat::Enum>& ) const override {}
+  void GetSupportedTimecodeSources( std::set<KVZ::ITimecodeSource::Enum>& ) const override {}
+  void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& ) const override {}
+  void GetSupportedAudioSampleRates( std::set<uint32_t>& ) const override {}
+  void GetSupportedAudioChannelCounts( std::set<uint32_t>& ) const override {}
+  VDeviceResult StartCapture( KVZ::IPixelFormat::Enum, KVZ::ITimecodeSource::Enum, KVZ::IAudioSampleFormat::Enum, uint32_t ) override { return {}; }
+  bool StopCapture() override { return true; }
+  EStatus::Enum GetStatus() const override { return EStatus::EReady; }
+  int32_t GetDeviceIndex() const override { return m_Index; }
+
+private:
+  int32_t m_Index = -1;
+  NotificationSystem::VMultiCallbackPostal<void( unsigned int )> m_Dropped;
+  NotificationSystem::VMultiCallbackPostal<void()> m_Event;
+};
+
+// Announces on the caller's thread.
+class VPlainDriver : public IVideoInputDriver
+{
+public:
+  VDeviceCallback& GetDeviceArrivedCallback() override { return m_DeviceArrived; }
+  void StartDiscovery() override
+  {
+    for( const auto& pDevice : m_OnDiscovery )
+    {
+      m_DeviceArrived( pDevice );
+    }
+  }
+
+  std::vector<std::shared_ptr<IVideoInputDevice>> m_OnDiscovery;
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<IVideoInputDevice> )> m_DeviceArrived;
+};
+
+class VideoInputDeviceManager : public ::testing::Test
+{
+protected:
+  std::shared_ptr<VPlainDriver> m_pFirst = std::make_shared<VPlainDriver>();
+  std::shared_ptr<VPlainDriver> m_pSecond = std::make_shared<VPlainDriver>();
+  std::shared_ptr<VVideoInputDeviceManager> m_pManager = KVZ::MakeShared<VVideoInputDeviceManager>(
+    std::vector<VDriverMaker>{ [this] { return m_pFirst; }, [this] { return m_pSecond; } } );
+  std::shared_ptr<TestSupport::VManualPostalService> m_pListenerService = std::make_shared<TestSupport::VManualPostalService>();
+  std::vector<std::string> m_Announced;
+
+  void Listen()
+  {
+    m_pManager->GetDeviceAddedCallback().Add(
+      [this]( const std::shared_ptr<IVideoInputDevice>& i_pDevice ) { m_Announced.push_back( i_pDevice->GetDeviceURN() ); }, m_pListenerService );
+  }
+  std::vector<std::shared_ptr<IVideoInputDevice>> Devices() const
+  {
+    std::vector<std::shared_ptr<IVideoInputDevice>> Devices;
+    m_pManager->GetDevices( Devices );
+    return Devices;
+  }
+};
+
+using VDevices = std::vector<std::shared_ptr<IVideoInputDevice>>;
+
+TEST_F( VideoInputDeviceManager, WithoutCardsThereAreNoDevices )
+{
+  TestSupport::VLogCapture Log( "VideoInputHAL" );
+  m_pManager->StartDiscovery();
+  EXPECT_TRUE( Devices().empty() );
+  EXPECT_EQ( m_pManager->GetDevice( 0 ), nullptr );
+  EXPECT_EQ( m_pManager->GetDeviceURN( 0 ), "" );
+  ASSERT_EQ( Log.Count( "Device identifier not found." ), 2u );
+  EXPECT_EQ( Log.Lines().front().m_Level, 2 );
+}
+
+TEST_F( VideoInputDeviceManager, DriversShareOneIndexSpaceInOrderOfArrival )
+{
+  m_pFirst->m_OnDiscovery = { std::make_shared<VPlainDevice>() };
+  m_pSecond->m_OnDiscovery = { std::make_shared<VPlainDevice>(), std::make_shared<VPlainDevice>() };
+  Listen();
+  m_pManager->StartDiscovery();
+  const auto pLate = std::make_shared<VPlainDevice>();
+  m_pFirst->m_DeviceArrived( pLate );
+
+  EXPECT_EQ( Devices(), ( VDevices{ m_pFirst->m_OnDiscovery[0], m_pSecond->m_OnDiscovery[0], m_pSecond->m_OnDiscovery[1], pLate } ) );
+  EXPECT_EQ( m_pManager->GetDevice( 3 ), pLate );
+  EXPECT_EQ( m_pManager->GetDeviceURN( 3 ), "vi:3" );
+  EXPECT_TRUE( m_Announced.empty() );
+  m_pListenerService->RunAll();
+  EXPECT_EQ( m_Announced, ( std::vector<std::string>{ "vi:0", "vi:1", "vi:2", "vi:3" } ) );
+}
+
+TEST_F( VideoInputDeviceManager, AnnouncesADeviceWithItsIndexBeforeItJoinsTheList )
+{
+  size_t ListedThen = 99;
+  std::string URNThen;
+  m_pManager->GetDeviceAddedCallback().AddImmediate(
+    [&]( const std::shared_ptr<IVideoInputDevice>& i_pDevice )
+    {
+      ListedThen = Devices().size();
+      URNThen = i_pDevice->GetDeviceURN();
+    } );
+  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  EXPECT_EQ( ListedThen, 0u );
+  EXPECT_EQ( URNThen, "vi:0" );
+  EXPECT_EQ( Devices().size(), 1u );
+}
+
+TEST_F( VideoInputDeviceManager, ALateListenerGetsNoReplay )
+{
+  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  Listen();
+  m_pListenerService->RunAll();
+  EXPECT_TRUE( m_Announced.empty() );
+}
+
+TEST_F( VideoInputDeviceManager, ListenersAreCalledOnTheManagersOwnThreadUnlessTheyBringAService )
+{
+  std::promise<boost::thread::id> Thread;
+  m_pManager->GetDeviceAddedCallback().Add( [&]( const auto& ) { Thread.set_value( boost::this_thread::get_id() ); } );
+  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  EXPECT_NE( Thread.get_future().get(), boost::this_thread::get_id() );
+}
+
+TEST_F( VideoInputDeviceManager, ShutdownLetsDevicesAndDriversGoAndKeepsTheIndices )
+{
+  Listen();
+  auto pDevice = std::make_shared<VPlainDevice>();
+  m_pFirst->m_DeviceArrived( pDevice );
+  m_pManager->Shutdown();
+
+  TestSupport::VLogCapture Log( "VideoInputHAL" );
+  EXPECT_EQ( m_pManager->GetDevice( 0 ), nullptr );
+  EXPECT_EQ( m_pManager->GetDeviceURN( 0 ), "" );
+  EXPECT_TRUE( Log.Lines().empty() );
+  EXPECT_EQ( m_pManager->GetDevice( 1 ), nullptr );
+  EXPECT_EQ( Log.Lines().size(), 1u );
+
+  EXPECT_EQ( m_pFirst.use_count(), 1 );
+  EXPECT_EQ( m_pFirst->m_DeviceArrived.Count(), 0u );
+  EXPECT_EQ( m_pManager->GetDeviceAddedCallback().Count(), 0u );
+  m_pManager->StartDiscovery();
+  m_pListenerService->RunAll();
+  EXPECT_EQ( pDevice.use_count(), 1 );
+}
+
+TEST_F( VideoInputDeviceManager, AnArrivalAfterTheManagersEndDoesNothing )
+{
+  m_pManager.reset();
+  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  EXPECT_EQ( m_pFirst->m_DeviceArrived.Count(), 0u );
+}
+
+TEST_F( VideoInputDeviceManager, ArrivalsOnSeveralThreadsWhileOthersReadGetIndicesOfTheirOwn )
+{
+  constexpr int PerDriver = 100;
+  const auto Announce = []( VPlainDriver& i_rDriver )
+  {
+    for( int Count = 0; Count < PerDriver; ++Count )
+    {
+      i_rDriver.m_DeviceArrived( std::make_shared<VPlainDevice>() );
+    }
+  };
+  boost::thread First( Announce, boost::ref( *m_pFirst ) );
+  boost::thread Second( Announce, boost::ref( *m_pSecond ) );
+  size_t Seen = 0;
+  while( Seen < 2 * PerDriver )
+  {
+    Seen = Devices().size();
+  }
+  First.join();
+  Second.join();
+  for( uint32_t Index = 0; Index < 2 * PerDriver; ++Index )
+  {
+    ASSERT_EQ( m_pManager->GetDeviceURN( Index ), MakeDeviceURN( static_cast<int32_t>( Index ) ) );
+  }
+}
+
+TEST( VideoInputDeviceManagerConstruction, WithoutASharedOwnerTheDriversAreNotBound )
+{
+  class VUnowned : public VVideoInputDeviceManager
+  {
+  public:
+    using VVideoInputDeviceManager::VVideoInputDeviceManager;
+
+  private:
+    void MadeByMakeShared() const override {}
+  };
+  const auto pDriver = std::make_shared<VPlainDriver>();
+  VUnowned Manager( { [pDriver] { return pDriver; } } );
+  EXPECT_THROW( Manager.PostConstruct(), std::bad_weak_ptr );
+  EXPECT_EQ( pDriver->m_DeviceArrived.Count(), 0u );
+}
+
+}
