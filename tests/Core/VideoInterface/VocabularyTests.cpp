@@ -1,0 +1,151 @@
+#include "Core/VideoInterface/Schemas.h"
+#include "Core/VideoInterface/VideoWriter.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <set>
+
+using namespace KVZ;
+
+namespace
+{
+
+// Names are told apart, come back as the value they stand for, and the schema says the same.
+template<class TEnum>
+void CheckTable( int32_t i_First, int32_t i_Last )
+{
+  const ISchema* pSchema = VSchemaOf<TEnum>::Get();
+  ASSERT_NE( pSchema, nullptr );
+  SCOPED_TRACE( pSchema->Name() );
+  std::set<std::string> Names;
+  for( int32_t Value = i_First; Value <= i_Last; ++Value )
+  {
+    const std::string Name = ToName( static_cast<TEnum>( Value ) );
+    Names.insert( Name );
+    TEnum Back{};
+    EXPECT_TRUE( FromName( Name, Back ) );
+    EXPECT_EQ( Back, Value );
+    EXPECT_EQ( pSchema->NameFromValue( Value ), Name );
+  }
+  EXPECT_EQ( Names.size(), static_cast<size_t>( i_Last - i_First + 1 ) );
+  EXPECT_EQ( Names.count( "" ), 0u );
+  EXPECT_EQ( ToName( static_cast<TEnum>( i_Last + 1 ) ), "" );
+  EXPECT_EQ( pSchema->Entries().size(), Names.size() );
+  auto Kept = static_cast<TEnum>( i_First );
+  EXPECT_FALSE( FromName( "NoSuchName", Kept ) );
+  EXPECT_EQ( Kept, i_First );
+}
+
+}
+
+TEST( Vocabulary, NamesAndSchemasAgree )
+{
+  CheckTable<IVideoStandard::Enum>( 0, 60 );
+  CheckTable<IPixelFormat::Enum>( 0, 17 );
+  CheckTable<IInterlacedFormat::Enum>( 0, 4 );
+  CheckTable<IAudioSampleFormat::Enum>( 0, 9 );
+  CheckTable<ITimecodeSource::Enum>( 0, 9 );
+  CheckTable<ITimecodeStandard::Enum>( -1, 5 );
+  CheckTable<IGenlockStandard::Enum>( 0, 16 );
+  CheckTable<IVideoContainer::Enum>( 0, 5 );
+  CheckTable<IVideoPayload::Enum>( 0, 5 );
+  CheckTable<IAudioPayload::Enum>( 0, 2 );
+  EXPECT_EQ( VSchemaOf<IGenlockStandard::Enum>::Get()->Name(), "DataStoreSystemSettings.EGenlockStandard" );
+}
+
+// The name spells width, height, scan and rate; the other columns are checked against it.
+TEST( Vocabulary, VideoStandardsAreWhatTheirNamesSay )
+{
+  for( int32_t Value = 0; Value < VideoStandardCount - 1; ++Value )
+  {
+    const VVideoStandardRow& rRow = *FindVideoStandard( static_cast<IVideoStandard::Enum>( Value ) );
+    SCOPED_TRACE( rRow.m_pName );
+    unsigned Width = 0, Height = 0, Rate = 0;
+    char Scan[ 4 ] = {};
+    ASSERT_EQ( std::sscanf( rRow.m_pName, "%*2s_%u_%u%3[IPSF]_%u", &Width, &Height, Scan, &Rate ), 4 );
+    EXPECT_EQ( rRow.m_Width, Width );
+    EXPECT_EQ( rRow.m_Height, Height );
+    const EScan Expected = Scan[ 0 ] == 'I' ? EScan::Interlaced : Scan[ 1 ] == 'S' ? EScan::SegmentedFrame : EScan::Progressive;
+    EXPECT_EQ( rRow.m_Scan, Expected );
+    if( rRow.m_Period != 0 )
+    {
+      // An interlaced name gives fields a second.
+      const double FramesASecond = Rate / ( Expected == EScan::Interlaced ? 200.0 : 100.0 );
+      EXPECT_NEAR( static_cast<double>( rRow.m_RateNumerator ) / rRow.m_RateDenominator, FramesASecond, 0.006 );
+      EXPECT_EQ( rRow.m_Period * rRow.m_RateNumerator, int64_t{ 135000000 } * rRow.m_RateDenominator );
+    }
+  }
+  EXPECT_EQ( GetFramePeriod( IVideoStandard::EHD_2048_1556PSF_1500 ), 0 );
+  EXPECT_EQ( GetFramePeriod( static_cast<IVideoStandard::Enum>( 61 ) ), 0 );
+}
+
+TEST( Vocabulary, DevicesLogTheStandardsWithoutAScan )
+{
+  std::set<int32_t> Logged;
+  for( int32_t Value = -1; Value <= 61; ++Value )
+  {
+    const TestSupport::VLogCapture Log( "VideoCaptureDevice" );
+    const auto Standard = static_cast<IVideoStandard::Enum>( Value );
+    const bool bUnspecified = GetInterlacedFormat( Standard ) == IInterlacedFormat::EUnspecified;
+    EXPECT_EQ( Log.Texts(), bUnspecified ? std::vector<std::string>{ "Invalid video standard." } : std::vector<std::string>{} );
+    if( bUnspecified )
+    {
+      Logged.insert( Value );
+    }
+  }
+  EXPECT_EQ( Logged, ( std::set<int32_t>{ -1, 1, 2, 4, 30, 31, 32, 60, 61 } ) );
+  EXPECT_EQ( GetInterlacedFormat( IVideoStandard::EHD_1920_1080PSF_2500 ), IInterlacedFormat::ENotInterlaced );
+  EXPECT_EQ( GetInterlacedFormat( IVideoStandard::ESD_720_576I_5000 ), IInterlacedFormat::EInterlacedFrameUnspecifiedLineTiming );
+}
+
+TEST( Vocabulary, PackedImagesRoundUpWhereTheirLayoutDoes )
+{
+  EXPECT_EQ( GetImageSize( IPixelFormat::EU10Y10V10Y10, 1280, 720 ), 27u * 128 * 720 );
+  EXPECT_EQ( GetImageSize( IPixelFormat::EU10Y10V10Y10, 1920, 1080 ), 40u * 128 * 1080 );
+  EXPECT_EQ( GetImageSize( IPixelFormat::EU10Y10V10Y10, 1, 1 ), 128u );
+  EXPECT_EQ( GetImageSize( IPixelFormat::ELuminance7, 3, 3 ), 8u );   // 63 bits
+  EXPECT_EQ( GetImageSize( IPixelFormat::EBayerGB6, 3, 3 ), 7u );     // 54 bits
+  EXPECT_EQ( GetImageSize( IPixelFormat::ER8G8B8u8, 65536, 65536 ), uint64_t{ 1 } << 34 );
+}
+
+// The sets are irregular on purpose; what is checked is where an obvious set would differ.
+TEST( WriterCapabilities, KeepTheirIrregularities )
+{
+  const auto& rMkv = GetVideoWriterCapabilities( IVideoContainer::EMKV );
+  EXPECT_TRUE( rMkv.IsPixelFormatSupported( IPixelFormat::EBayerGB8 ) );
+  EXPECT_FALSE( rMkv.IsPixelFormatSupported( IPixelFormat::EBayerRG8 ) );
+  EXPECT_FALSE( rMkv.IsPixelFormatSupported( IPixelFormat::EUnspecified ) );
+  const auto& rAvi = GetVideoWriterCapabilities( IVideoContainer::EAVI );
+  EXPECT_FALSE( rAvi.IsChannelCountSupported( 0 ) );
+  EXPECT_FALSE( rAvi.IsChannelCountSupported( 5 ) );
+  EXPECT_TRUE( rAvi.IsChannelCountSupported( 8 ) );
+  const auto& rImages = GetVideoWriterCapabilities( IVideoContainer::EIMAGES );
+  EXPECT_TRUE( rImages.IsPixelFormatSupported( IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_FALSE( rImages.IsVideoPayloadSupported( IVideoPayload::EUncompressed ) );
+  EXPECT_FALSE( rImages.IsChannelCountSupported( 0 ) );
+  EXPECT_FALSE( rImages.IsAudioSampleFormatSupported( IAudioSampleFormat::EInt16 ) );
+  const auto& rTvid = GetVideoWriterCapabilities( IVideoContainer::ETVID );
+  EXPECT_TRUE( rTvid.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( 99 ) ) );
+  EXPECT_FALSE( rTvid.IsVideoPayloadSupported( IVideoPayload::EImageJPEG ) );
+  EXPECT_TRUE( rTvid.IsChannelCountSupported( 16 ) );
+  EXPECT_FALSE( rTvid.IsChannelCountSupported( 17 ) );
+}
+
+TEST( WriterCapabilities, MovAndMp4AnswerAlikeAndNobodyTakesFlac )
+{
+  const auto& rMov = GetVideoWriterCapabilities( IVideoContainer::EMOV );
+  const auto& rMp4 = GetVideoWriterCapabilities( IVideoContainer::EMP4 );
+  for( int32_t Value = -1; Value < 40; ++Value )
+  {
+    EXPECT_EQ( rMov.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ), rMp4.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ) );
+    EXPECT_EQ( rMov.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ), rMp4.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ) );
+  }
+  for( int32_t Container = 0; Container <= VideoContainerCount; ++Container )
+  {
+    const auto& rCapabilities = GetVideoWriterCapabilities( static_cast<IVideoContainer::Enum>( Container ) );
+    EXPECT_FALSE( rCapabilities.IsAudioPayloadSupported( IAudioPayload::ELosslessFLAC ) );
+    EXPECT_EQ( rCapabilities.IsNative(), Container == IVideoContainer::ETVID );
+    EXPECT_EQ( rCapabilities.IsAudioPayloadSupported( IAudioPayload::ENone ), Container < VideoContainerCount );
+  }
+}
