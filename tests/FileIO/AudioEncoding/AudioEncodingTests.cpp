@@ -1,0 +1,98 @@
+#include "FileIO/AudioEncoding/AudioEncoding.h"
+#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+using namespace KVZ;
+using AudioEncoding::EncodeIfRequired;
+
+namespace
+{
+
+std::shared_ptr<IStandardBuffer> Samples( const std::vector<int16_t>& i_rSamples )
+{
+  auto pBuffer = std::make_shared<IStandardBuffer>( i_rSamples.size() * 2 );
+  std::memcpy( pBuffer->Data(), i_rSamples.data(), pBuffer->Size() );
+  return pBuffer;
+}
+
+template<class T>
+std::vector<T> SamplesOf( const IBufferConst& i_rBuffer )
+{
+  std::vector<T> Samples( i_rBuffer.Size() / sizeof( T ) );
+  std::memcpy( Samples.data(), i_rBuffer.Data(), i_rBuffer.Size() );
+  return Samples;
+}
+
+class AudioEncoder : public testing::Test
+{
+protected:
+  bool Encode( const AudioFrameInfo& i_rInfo, IAudioPayload::Enum i_Payload, IAudioSampleFormat::Enum i_Format, uint32_t i_Channels )
+  {
+    return EncodeIfRequired( m_Allocator, m_Audio, i_rInfo, i_Payload, i_Format, i_Channels );
+  }
+
+  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+  VBufferList m_Audio{ Samples( { 1, 2, 3, 4, 5, 6, 7, 8 } ), Samples( {} ), Samples( { 9, 10, 11, 12 } ) };
+  const TestSupport::VLogCapture m_Log{ "AudioEncoding" };
+};
+
+constexpr AudioFrameInfo FourChannels{ IAudioSampleFormat::EInt16, 48000, 4 };
+
+}
+
+TEST_F( AudioEncoder, WhatFitsPassesWithoutACopy )
+{
+  const VBufferList Before = m_Audio;
+  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 4 ) );
+  EXPECT_EQ( m_Audio, Before );
+}
+
+TEST_F( AudioEncoder, SurplusChannelsAreDroppedFromTheEnd )
+{
+  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 2 ) );
+  ASSERT_EQ( m_Audio.size(), 3u );
+  EXPECT_EQ( SamplesOf<int16_t>( *m_Audio[0] ), ( std::vector<int16_t>{ 1, 2, 5, 6 } ) );
+  EXPECT_EQ( m_Audio[1]->Size(), 0u );
+  EXPECT_EQ( SamplesOf<int16_t>( *m_Audio[2] ), ( std::vector<int16_t>{ 9, 10 } ) );
+}
+
+TEST_F( AudioEncoder, DroppingAndConvertingGoTogether )
+{
+  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt32, 3 ) );
+  EXPECT_EQ( SamplesOf<int32_t>( *m_Audio[2] ), ( std::vector<int32_t>{ 9 << 16, 10 << 16, 11 << 16 } ) );
+}
+
+TEST_F( AudioEncoder, WithoutAPayloadOrAFullDescriptionThereIsNoAudio )
+{
+  const VBufferList Before = m_Audio;
+  const std::vector<AudioFrameInfo> Incomplete = { { IAudioSampleFormat::EInt16, 0, 4 }, { IAudioSampleFormat::EInt16, 48000, 0 },
+    { IAudioSampleFormat::EUnspecified, 48000, 4 } };
+  for( const AudioFrameInfo& rInfo : Incomplete )
+  {
+    m_Audio = Before;
+    EXPECT_TRUE( Encode( rInfo, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 8 ) );
+    EXPECT_TRUE( m_Audio.empty() );
+  }
+  m_Audio = Before;
+  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::ENone, IAudioSampleFormat::EUnspecified, 0 ) );
+  EXPECT_TRUE( m_Audio.empty() );
+}
+
+TEST_F( AudioEncoder, RefusalsSayWhyAndLeaveTheList )
+{
+  const VBufferList Before = m_Audio;
+  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt32, 5 ) );
+  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::ELosslessFLAC, IAudioSampleFormat::EInt16, 4 ) );
+  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EUInt16, 4 ) );
+  EXPECT_EQ( m_Audio, Before );
+  EXPECT_EQ( m_Log.Texts(), ( std::vector<std::string>{ "Increasing number of audio channels is not supported.", "Unsupported audio format" } ) );
+
+  auto Stored = IAudioSampleFormat::EInt24;
+  bool bConversionNeeded = false;
+  AudioEncoding::SampleFormatForPayloadFormat( IAudioPayload::ELosslessFLAC, IAudioSampleFormat::EInt16, Stored, bConversionNeeded );
+  EXPECT_EQ( Stored, IAudioSampleFormat::EInt24 );
+  EXPECT_TRUE( bConversionNeeded );
+  EXPECT_EQ( m_Log.Texts().back(), "Unsupported audio format." );
+}

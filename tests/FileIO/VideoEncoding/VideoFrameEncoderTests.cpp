@@ -1,0 +1,206 @@
+#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <numeric>
+
+using namespace KVZ;
+using namespace VideoEncoding;
+
+namespace
+{
+
+constexpr uint32_t Width = 4;
+constexpr uint32_t Height = 2;
+
+VideoFrameInfo Info( IPixelFormat::Enum i_Format )
+{
+  VideoFrameInfo Result;
+  Result.m_ImageWidth = Width;
+  Result.m_ImageHeight = Height;
+  Result.m_PixelFormat = i_Format;
+  return Result;
+}
+
+std::shared_ptr<IStandardBuffer> Counting( uint8_t i_First, size_t i_Size )
+{
+  auto pBuffer = std::make_shared<IStandardBuffer>( i_Size );
+  std::iota( pBuffer->Bytes().begin(), pBuffer->Bytes().end(), i_First );
+  return pBuffer;
+}
+
+std::vector<uint8_t> BytesOf( const VBufferList& i_rList )
+{
+  std::vector<uint8_t> Bytes;
+  for( const auto& rpBuffer : i_rList )
+  {
+    Bytes.insert( Bytes.end(), rpBuffer->Data(), rpBuffer->Data() + rpBuffer->Size() );
+  }
+  return Bytes;
+}
+
+// Grey from any format: fills the target with the source's first byte plus one.
+class VFillingConverter : public IPixelFormatConverter
+{
+public:
+  bool Convert( const VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, size_t i_SourceSize, IPixelFormat::Enum i_Target, uint8_t* o_pTarget,
+    size_t i_TargetSize ) override
+  {
+    m_Target = i_Target;
+    if( i_SourceSize < GetImageSize( i_rInfo.m_PixelFormat, i_rInfo.m_ImageWidth, i_rInfo.m_ImageHeight ) || i_TargetSize == 0 )
+    {
+      return false;
+    }
+    std::fill_n( o_pTarget, i_TargetSize, static_cast<uint8_t>( *i_pSource + 1 ) );
+    return true;
+  }
+  void SetColourCorrection( const VColourRecord& i_rColour ) override { m_Colour = i_rColour; }
+  void SetLensCorrection( const VLensDistortionRecord& i_rLens ) override { m_Lens = i_rLens; }
+  void SetLensCorrectionEnabled( bool i_bEnabled ) override { m_bLens = i_bEnabled; }
+
+  IPixelFormat::Enum m_Target = IPixelFormat::EUnspecified;
+  VColourRecord m_Colour;
+  VLensDistortionRecord m_Lens;
+  bool m_bLens = false;
+};
+
+class VideoFrameEncoder : public testing::Test
+{
+protected:
+  VideoFrameEncoder()
+  {
+    m_Parts.m_ConverterMakers[EConverter::Software] = [this] { return m_pConverter; };
+    m_Parts.m_Compressors[IVideoPayload::EImagePNG] =
+      [this]( const VCompressionInput& i_rInput, std::vector<uint8_t>& o_rOutput, std::vector<uint8_t>& )
+    {
+      m_Compressed = i_rInput.m_rInfo.m_PixelFormat;
+      m_Quality = i_rInput.m_JPEGQuality;
+      o_rOutput.assign( i_rInput.m_pPixels, i_rInput.m_pPixels + 1 );
+      return m_bCompressorWorks;
+    };
+    m_Parts.m_DrawText = []( IPixelFormatConverter&, const VideoFrameInfo&, const VBurnInSettings& i_rSettings, uint8_t* io_pPixels, size_t )
+    {
+      io_pPixels[0] = static_cast<uint8_t>( i_rSettings.m_Text[0] );
+      return true;
+    };
+  }
+
+  bool Encode( IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Target )
+  {
+    return m_Encoder->Encode( m_Allocator, m_Video, Info( i_Source ), i_Payload, i_Target );
+  }
+
+  void MakeEncoder() { m_Encoder.emplace( EConverter::Software, m_Parts ); }
+
+  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+  std::shared_ptr<VFillingConverter> m_pConverter = std::make_shared<VFillingConverter>();
+  VEncoderParts m_Parts;
+  std::optional<VVideoFrameEncoder> m_Encoder;
+  VBufferList m_Video{ Counting( 10, 8 ), Counting( 18, 8 ) };
+  IPixelFormat::Enum m_Compressed = IPixelFormat::EUnspecified;
+  int m_Quality = 0;
+  bool m_bCompressorWorks = true;
+  const TestSupport::VLogCapture m_Log{ "VideoEncoding" };
+};
+
+}
+
+TEST_F( VideoFrameEncoder, AnUncompressedFrameInItsFormatPassesWithoutACopy )
+{
+  MakeEncoder();
+  const VBufferList Before = m_Video;
+  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( m_Video, Before );
+  m_Video.clear();
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+}
+
+TEST_F( VideoFrameEncoder, ConversionJoinsFirstAndHandsTheSettingsOver )
+{
+  MakeEncoder();
+  m_Encoder->SetColour( { 0.5f, 2.0f } );
+  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
+  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 8, 11 ) );
+  EXPECT_EQ( m_pConverter->m_Colour, ( VColourRecord{ 0.5f, 2.0f } ) );
+  EXPECT_FALSE( m_pConverter->m_bLens );
+}
+
+TEST_F( VideoFrameEncoder, LensCorrectionConvertsEvenBetweenEqualFormats )
+{
+  MakeEncoder();
+  const VLensDistortionRecord Lens{ VLensDistortionRecord::ETarvo2Parameter, { 1, 2 }, { 3, 4, 0 } };
+  m_Encoder->SetLensCorrection( Lens );
+  m_Encoder->SetLensCorrectionEnabled( true );
+  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 16, 11 ) );
+  EXPECT_TRUE( m_pConverter->m_bLens );
+  EXPECT_EQ( m_pConverter->m_Lens, Lens );
+}
+
+TEST_F( VideoFrameEncoder, TextIsDrawnIntoACopy )
+{
+  MakeEncoder();
+  m_Encoder->SetBurnIn( { "T" } );
+  const std::shared_ptr<IStandardBuffer> pCaptured = Counting( 10, 16 );
+  m_Video = { pCaptured };
+  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  std::vector<uint8_t> Expected = pCaptured->Bytes();
+  EXPECT_EQ( Expected[0], 10 );
+  Expected[0] = 'T';
+  EXPECT_EQ( BytesOf( m_Video ), Expected );
+
+  m_Video = { Counting( 10, 15 ) };
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+}
+
+TEST_F( VideoFrameEncoder, ACompressedPayloadChoosesItsOwnFormat )
+{
+  MakeEncoder();
+  m_Encoder->SetJPEGQuality( 75 );
+  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EImagePNG, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::ER8G8B8 );
+  EXPECT_EQ( m_Compressed, IPixelFormat::ER8G8B8 );
+  EXPECT_EQ( m_Quality, 75 );
+  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 1, 11 ) );
+
+  m_bCompressorWorks = false;
+  m_Video = { Counting( 10, 8 ) };
+  EXPECT_FALSE( Encode( IPixelFormat::ELuminance7, IVideoPayload::EImagePNG, IPixelFormat::EUnspecified ) );
+  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::ELuminance8 );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Error encoding data in 'Luminance8' pixel format to 'ImagePNG'." } );
+}
+
+TEST_F( VideoFrameEncoder, RefusalsSayWhy )
+{
+  MakeEncoder();
+  EXPECT_FALSE( Encode( IPixelFormat::ER8G8B8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EVideoH264, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, static_cast<IVideoPayload::Enum>( 77 ), IPixelFormat::EU8Y8V8Y8 ) );
+  m_Parts.m_ConverterMakers.clear();
+  m_Parts.m_DrawText = {};
+  MakeEncoder();
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
+  m_Encoder->SetBurnIn( { "T" } );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.", "Unsupported video payload format 'VideoH264'.",
+      "Unsupported video payload format 'Unspecified'.", "Error converting pixel format from 'U8Y8V8Y8' to 'Luminance8'.",
+      "Burn-in text is not available." } ) );
+}
+
+TEST( PixelFormatForPayload, JpegKeepsWhatItsCompressorTakes )
+{
+  for( int32_t Value = 0; Value <= 17; ++Value )
+  {
+    const auto Source = static_cast<IPixelFormat::Enum>( Value );
+    IPixelFormat::Enum Stored{};
+    ASSERT_TRUE( PixelFormatForPayloadFormat( IVideoPayload::EImageJPEG, Source, Stored ) );
+    const bool bKept = Value == IPixelFormat::ELuminance8 || ( Value >= IPixelFormat::ER8G8B8 && Value <= IPixelFormat::EB8G8R8u8 );
+    EXPECT_EQ( Stored, bKept ? Source : IPixelFormat::ER8G8B8 );
+  }
+  auto Kept = IPixelFormat::ER5G6B5;
+  EXPECT_FALSE( PixelFormatForPayloadFormat( IVideoPayload::EVideoH264, IPixelFormat::ER8G8B8, Kept ) );
+  EXPECT_EQ( Kept, IPixelFormat::ER5G6B5 );
+}
