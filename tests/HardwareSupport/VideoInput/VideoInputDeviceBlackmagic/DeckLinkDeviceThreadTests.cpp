@@ -166,6 +166,25 @@ TEST_F( DeckLinkDevice, AClosedDeviceRefusesToStart )
   EXPECT_FALSE( Input().IsRunning() );
 }
 
+// The runtime had chosen to call back before it was detached.
+TEST_F( DeckLinkDevice, CallbacksThatBeginAfterTheEndDoNothing )
+{
+  InitialiseAndCapture();
+  auto* const pCallback = Input().Callback();
+  pCallback->AddRef();
+  m_pDevice.reset();
+  auto* const pFrame = new Fake::VFrame( {} );
+  auto* const pMode = new Fake::VDisplayMode( Hp60 );
+  EXPECT_EQ( pCallback->VideoInputFrameArrived( pFrame, nullptr ), S_OK );
+  EXPECT_EQ( pCallback->VideoInputFormatChanged( FormatChange::DisplayMode, pMode, DetectedSignal::RGB444 ), S_OK );
+  pFrame->Release();
+  pMode->Release();
+  pCallback->Release();
+  EXPECT_EQ( Fired(), VFired() );
+  EXPECT_EQ( m_pReceiver->Count(), 0u );
+  EXPECT_FALSE( Input().IsRunning() );
+}
+
 // One callback is in the receiver, two wait for the lock; the runtime neither holds the callback object nor waits for its callbacks.
 TEST_F( DeckLinkDevice, CallbacksThatWaitForTheLockOutliveTheDevice )
 {
