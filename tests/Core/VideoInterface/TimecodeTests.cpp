@@ -52,7 +52,7 @@ TEST_P( TimecodeOfStandard, EveryLabelOfADayIsOnePeriodAfterTheOneBeforeAndComes
   int64_t Expected = 0;
   int64_t Wrong = 0;
   ForEachLabel( GetParam(),
-    [ & ]( const ITimecode& i_rTimecode )
+    [&]( const ITimecode& i_rTimecode )
     {
       ITimecode Back;
       Back.m_Standard = GetParam();
@@ -70,7 +70,8 @@ TEST( Timecode, ValidityHasALimitForEachFieldAndKnowsTheDroppedLabels )
   const ITimecode Good = Make( 2, 23, 59, 59, 24 );
   EXPECT_TRUE( IsValid( Good ) );
   EXPECT_FALSE( IsValid( ITimecode() ) );
-  for( const ITimecode& rBad : { Make( 2, 24, 0, 0, 0 ), Make( 2, 0, 60, 0, 0 ), Make( 2, 0, 0, 60, 0 ), Make( 2, 0, 0, 0, 25 ), Make( 6, 0, 0, 0, 0 ) } )
+  for( const ITimecode& rBad :
+    { Make( 2, 24, 0, 0, 0 ), Make( 2, 0, 60, 0, 0 ), Make( 2, 0, 0, 60, 0 ), Make( 2, 0, 0, 0, 25 ), Make( 6, 0, 0, 0, 0 ) } )
   {
     EXPECT_FALSE( IsValid( rBad ) );
   }

@@ -62,11 +62,11 @@ TEST( Vocabulary, VideoStandardsAreWhatTheirNamesSay )
     const VVideoStandardRow& rRow = *FindVideoStandard( static_cast<IVideoStandard::Enum>( Value ) );
     SCOPED_TRACE( rRow.m_pName );
     unsigned Width = 0, Height = 0, Rate = 0;
-    char Scan[ 4 ] = {};
+    char Scan[4] = {};
     ASSERT_EQ( std::sscanf( rRow.m_pName, "%*2s_%u_%u%3[IPSF]_%u", &Width, &Height, Scan, &Rate ), 4 );
     EXPECT_EQ( rRow.m_Width, Width );
     EXPECT_EQ( rRow.m_Height, Height );
-    const EScan Expected = Scan[ 0 ] == 'I' ? EScan::Interlaced : Scan[ 1 ] == 'S' ? EScan::SegmentedFrame : EScan::Progressive;
+    const EScan Expected = Scan[0] == 'I' ? EScan::Interlaced : Scan[1] == 'S' ? EScan::SegmentedFrame : EScan::Progressive;
     EXPECT_EQ( rRow.m_Scan, Expected );
     if( rRow.m_Period != 0 )
     {
@@ -138,8 +138,10 @@ TEST( WriterCapabilities, MovAndMp4AnswerAlikeAndNobodyTakesFlac )
   const auto& rMp4 = GetVideoWriterCapabilities( IVideoContainer::EMP4 );
   for( int32_t Value = -1; Value < 40; ++Value )
   {
-    EXPECT_EQ( rMov.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ), rMp4.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ) );
-    EXPECT_EQ( rMov.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ), rMp4.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ) );
+    EXPECT_EQ( rMov.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ),
+      rMp4.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ) );
+    EXPECT_EQ( rMov.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ),
+      rMp4.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ) );
   }
   for( int32_t Container = 0; Container <= VideoContainerCount; ++Container )
   {

@@ -13,7 +13,8 @@ namespace
 std::shared_ptr<IStandardBuffer> Samples( const std::vector<int16_t>& i_rSamples )
 {
   auto pBuffer = std::make_shared<IStandardBuffer>( i_rSamples.size() * 2 );
-  std::memcpy( pBuffer->Data(), i_rSamples.data(), pBuffer->Size() );
+  const auto* pBytes = reinterpret_cast<const uint8_t*>( i_rSamples.data() );
+  std::copy( pBytes, pBytes + pBuffer->Size(), pBuffer->Data() );
   return pBuffer;
 }
 

@@ -1,0 +1,139 @@
+// What the writer says, and what it leaves behind, when the disk fails.
+#include "SmallFile.h"
+#include "tests/support/FileSizeLimit.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <gtest/gtest.h>
+
+using namespace KVZ;
+using namespace TarvoVideo;
+
+namespace
+{
+
+constexpr uint64_t Keys[] = { 4, 2, 9, 5 };
+
+VFrameContent Content( uint64_t i_Key, uint8_t i_Version = 0 )
+{
+  const auto Byte = static_cast<uint8_t>( i_Key * 16 + i_Version );
+  return { VBytes( 4, Byte ), VBytes( 6, static_cast<uint8_t>( Byte + 1 ) ) };
+}
+
+struct VResult
+{
+  bool m_bHeader = false;
+  bool m_bClosed = false;
+  size_t m_Written = 0;   // frames whose call gave true
+  bool m_bLaterRefused = true;
+};
+
+// Four frames, and the second one once more. Goes on after a failure as no client would.
+VResult WriteSmallFile( VSmallFile& io_rFile )
+{
+  VResult Result;
+  Result.m_bHeader = io_rFile.OpenAndWriteHeader();
+  bool bFailed = !Result.m_bHeader;
+  const auto WriteFrame = [&]( uint64_t i_Key, uint8_t i_Version )
+  {
+    const bool bWritten = io_rFile.WriteFrame( i_Key, Content( i_Key, i_Version ) );
+    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
+    Result.m_Written += bWritten;
+    bFailed = bFailed || !bWritten;
+  };
+  for( const uint64_t Key : Keys )
+  {
+    WriteFrame( Key, 0 );
+  }
+  WriteFrame( Keys[1], 1 );
+  Result.m_bClosed = io_rFile.m_Writer.Close();
+  return Result;
+}
+
+// Every frame that a reader finds by its key is one that was written, and whole.
+void CheckLeftBehind( const VSmallFile& i_rFile, const VResult& i_rResult )
+{
+  EXPECT_FALSE( i_rResult.m_bClosed );
+  EXPECT_TRUE( i_rResult.m_bLaterRefused );
+  EXPECT_FALSE( i_rFile.m_Writer.IsOpen() );
+  const VFound Found = ReadAll( *i_rFile.m_pBytes );
+  if( Found.m_bFinished )
+  {
+    EXPECT_EQ( Found.m_Error, "" );
+    for( const auto& [Key, rContent] : Found.m_Frames )
+    {
+      EXPECT_TRUE( rContent == Content( Key ) || rContent == Content( Key, 1 ) ) << "key " << Key;
+    }
+  }
+  else if( i_rResult.m_bHeader )
+  {
+    EXPECT_EQ( Found.m_Error, "" );
+    EXPECT_GE( Found.m_Frames.size(), std::min<size_t>( i_rResult.m_Written, std::size( Keys ) ) - ( i_rResult.m_Written ? 1 : 0 ) );
+  }
+}
+
+}
+
+TEST( TarvoWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame )
+{
+  VSmallFile Whole;
+  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
+  EXPECT_EQ( ReadAll( *Whole.m_pBytes ).m_Frames.size(), std::size( Keys ) );
+  for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
+  {
+    SCOPED_TRACE( Offset );
+    VSmallFile File( { .m_Offset = Offset } );
+    const VResult Result = WriteSmallFile( File );
+    EXPECT_LE( File.m_pBytes->size(), Offset );
+    CheckLeftBehind( File, Result );
+  }
+}
+
+// Here the stream works again after the failure, so that only the writer's own memory keeps it.
+TEST( TarvoWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
+{
+  VSmallFile Whole;
+  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
+  const uint64_t Operations = Whole.m_Operations;
+  ASSERT_GT( Operations, 10u );
+  size_t Finished = 0;
+  for( uint64_t Operation = 0; Operation < Operations; ++Operation )
+  {
+    SCOPED_TRACE( Operation );
+    VSmallFile File( { .m_Operation = Operation } );
+    const VResult Result = WriteSmallFile( File );
+    CheckLeftBehind( File, Result );
+    Finished += ReadAll( *File.m_pBytes ).m_bFinished;
+  }
+  // The frames before the failure are still brought into an index.
+  EXPECT_GT( Finished, Operations / 2 );
+}
+
+TEST( TarvoWriterFailures, OnARealDisk )
+{
+  VWriter Full;
+  ASSERT_TRUE( Full.Open( "/dev/full" ) );
+  EXPECT_FALSE( Full.WriteHeader( SmallVideo(), {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
+  EXPECT_FALSE( Full.Close() );
+
+  const TestSupport::VTemporaryFolder Folder;
+  const TestSupport::VFileSizeLimit Limit( 2000 );
+  VideoFrameInfo Info = SmallVideo();
+  Info.m_ImageHeight = 100;
+  VWriter Writer;
+  ASSERT_TRUE( Writer.Open( Folder.File( "cut.tvid" ) ) );
+  ASSERT_TRUE( Writer.WriteHeader( Info, {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
+  uint64_t Written = 0;
+  while( Writer.WriteFrame( VFrameSet{ Buffer( VBytes( 400, 'x' ) ), Info, {}, {} }, Written ) )
+  {
+    ++Written;
+  }
+  EXPECT_EQ( Written, 3u );
+  EXPECT_FALSE( Writer.Close() );
+
+  VReader Reader;
+  ASSERT_TRUE( Reader.Open( Folder.File( "cut.tvid" ) ) ) << Reader.GetError();
+  EXPECT_FALSE( Reader.IsFinished() );
+  uint64_t Count = 0;
+  EXPECT_TRUE( Reader.CountFrames( Count ) );
+  EXPECT_EQ( Count, Written );
+}
