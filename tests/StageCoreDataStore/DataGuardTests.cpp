@@ -1,0 +1,106 @@
+#include "StageCoreDataStore/DataVerifyWriter.h"
+#include "host/DataStore.h"
+#include "tests/support/AssertionCapture.h"
+
+#include <gtest/gtest.h>
+
+namespace
+{
+
+const std::vector<std::string> FatalWrite = { "!\"Fatal attempt to acquire a write lock from within a read lock.\"" };
+
+class DataGuards : public testing::Test
+{
+protected:
+  // Whether this thread holds the exclusive lock.
+  bool IsWriting()
+  {
+    uint32_t State = 0;
+    m_Store.AcquireReadLock( State );
+    m_Store.ReleaseReadLock();
+    return State == 2;
+  }
+
+  VDataWriter MakeWriter() { return VDataWriter( m_Store ); }
+
+  StageHost::VDataStore m_Store;
+  const VDataPath m_Path{ "A", "B" };
+  TestSupport::VAssertionCapture m_Assertions;
+};
+
+}
+
+TEST_F( DataGuards, AMovedWriterKeepsTheLockUntilItsLastOwnerEnds )
+{
+  {
+    VDataWriter Last = MakeWriter();
+    {
+      VDataWriter First( std::move( Last ) );
+      EXPECT_TRUE( First.SetValue( m_Path, KVZ::Variant::Make( 1 ) ) );
+      VDataWriter Second( std::move( First ) );
+      EXPECT_TRUE( IsWriting() );
+    }
+    EXPECT_FALSE( IsWriting() );
+  }
+  EXPECT_FALSE( IsWriting() );
+  EXPECT_TRUE( m_Assertions.Expressions().empty() );
+}
+
+TEST_F( DataGuards, AMovedVerifyWriterAndReadersPassTheirLockOn )
+{
+  {
+    VDataVerifyWriter Writer( m_Store );
+    const VDataVerifyWriter Owner( std::move( Writer ) );
+    VDataReader Reader( m_Store );
+    const VDataReader ReaderOwner( std::move( Reader ) );
+    VDataVerifyReader VerifyReader( m_Store );
+    const VDataVerifyReader VerifyReaderOwner( std::move( VerifyReader ) );
+    EXPECT_TRUE( IsWriting() );
+  }
+  EXPECT_FALSE( IsWriting() );
+  EXPECT_TRUE( m_Assertions.Expressions().empty() );
+}
+
+TEST_F( DataGuards, AMovedFromGuardFindsAndStoresNothing )
+{
+  VDataVerifyWriter Writer( m_Store );
+  EXPECT_TRUE( Writer.SetValue( m_Path, KVZ::Variant::Make( 1 ) ) );
+  const VDataVerifyWriter Owner( std::move( Writer ) );
+
+  KVZ::Variant Value;
+  EXPECT_FALSE( Writer.Exists( m_Path ) );
+  EXPECT_FALSE( Writer.GetVerifiedValue( m_Path, Value ) );
+  EXPECT_FALSE( Writer.SetVerifiedValue( m_Path, KVZ::Variant::Make( 2 ) ) );
+  EXPECT_EQ( Writer.GetNode( m_Path ), nullptr );
+  EXPECT_TRUE( m_Assertions.Expressions().empty() );
+  EXPECT_EQ( Writer.GetDataStore(), nullptr );
+  EXPECT_EQ( m_Assertions.Expressions(), std::vector<std::string>{ "m_pDataStore != nullptr" } );
+  EXPECT_EQ( Owner.GetDataStore(), &m_Store );
+}
+
+TEST_F( DataGuards, AWriterInsideAReaderIsAnAssertionAndStoresNothing )
+{
+  VDataWriter( m_Store ).SetValue( m_Path, KVZ::Variant::Make( 1 ) );
+  {
+    const VDataReader Reader( m_Store );
+    VDataWriter Writer( m_Store );
+    EXPECT_EQ( m_Assertions.Expressions(), FatalWrite );
+    EXPECT_FALSE( Writer.SetValue( m_Path, KVZ::Variant::Make( 2 ) ) );
+    EXPECT_EQ( Reader.GetValue( m_Path ), KVZ::Variant::Make( 1 ) );
+  }
+  EXPECT_TRUE( VDataWriter( m_Store ).SetValue( m_Path, KVZ::Variant::Make( 3 ) ) );
+  EXPECT_EQ( m_Assertions.Expressions(), FatalWrite );
+}
+
+TEST_F( DataGuards, AValueOfAnotherTypeCountsAsAbsent )
+{
+  VDataWriter Writer( m_Store );
+  Writer.SetValue( m_Path, KVZ::Variant::Make( 1.5 ) );
+  int32_t Number = 7;
+  double Real = 0.0;
+  EXPECT_FALSE( GetTyped( Writer, m_Path, Number ) );
+  EXPECT_EQ( Number, 7 );
+  EXPECT_TRUE( GetTyped( Writer, m_Path, Real ) );
+  EXPECT_EQ( Real, 1.5 );
+  EXPECT_TRUE( Writer.GetValue( VDataPath{ "A" } ).IsEmpty() );
+}

@@ -1,0 +1,154 @@
+#include "host/DataStoreLock.h"
+
+#include "StageCoreDataStore/DataVerifyWriter.h"
+#include "host/DataStore.h"
+#include "tests/support/AssertionCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <future>
+#include <thread>
+
+namespace
+{
+
+using EHeld = StageHost::VDataStoreLock::EHeld;
+
+class DataStoreLock : public testing::Test
+{
+protected:
+  EHeld Release()
+  {
+    return m_Lock.Release( [this] { ++m_LastReleases; } );
+  }
+
+  // Held on a thread of its own from construction until End.
+  class VOtherThread
+  {
+  public:
+    VOtherThread( DataStoreLock& i_rTest, bool i_bExclusive )
+      : m_Thread(
+          [this, &i_rTest, i_bExclusive]
+          {
+            i_bExclusive ? (void)i_rTest.m_Lock.AcquireExclusive() : (void)i_rTest.m_Lock.AcquireShared();
+            m_Taken.set_value();
+            m_End.get_future().wait();
+            i_rTest.Release();
+          } )
+    {
+    }
+    void WaitUntilTaken() { m_Taken.get_future().wait(); }
+    void End()
+    {
+      m_End.set_value();
+      m_Thread.join();
+    }
+
+  private:
+    std::promise<void> m_Taken;
+    std::promise<void> m_End;
+    std::thread m_Thread;
+  };
+
+  StageHost::VDataStoreLock m_Lock;
+  std::atomic<int> m_LastReleases{ 0 };
+};
+
+}
+
+TEST_F( DataStoreLock, NestsReadersButRefusesAWriterInsideThem )
+{
+  EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Shared );
+  EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Shared );
+  EXPECT_FALSE( m_Lock.AcquireExclusive() );
+  EXPECT_EQ( Release(), EHeld::Shared );
+  EXPECT_FALSE( m_Lock.AcquireExclusive() );
+  EXPECT_EQ( Release(), EHeld::Shared );
+  EXPECT_EQ( Release(), EHeld::None );
+  EXPECT_TRUE( m_Lock.AcquireExclusive() );
+  EXPECT_EQ( Release(), EHeld::Exclusive );
+}
+
+TEST_F( DataStoreLock, IsExclusiveUntilTheWritersLastNestedLockEndsInWhateverOrder )
+{
+  EXPECT_TRUE( m_Lock.AcquireExclusive() );
+  EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Exclusive );
+  EXPECT_TRUE( m_Lock.AcquireExclusive() );
+  Release();
+  Release();
+  EXPECT_EQ( m_LastReleases, 0 );
+  EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::Exclusive );
+  Release();
+  EXPECT_EQ( m_LastReleases, 1 );
+  EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::None );
+}
+
+TEST_F( DataStoreLock, ReadersShareAndANestedReaderPassesAWaitingWriter )
+{
+  m_Lock.AcquireShared();
+  VOtherThread Reader( *this, false );
+  Reader.WaitUntilTaken();
+  VOtherThread Writer( *this, true );
+  // Whether or not the writer waits by now: this thread's second lock may not wait behind it.
+  m_Lock.AcquireShared();
+  Release();
+  Reader.End();
+  Release();
+  Writer.WaitUntilTaken();
+  EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::None );
+  Writer.End();
+  EXPECT_EQ( m_LastReleases, 1 );
+}
+
+TEST( DataStoreThreads, ReadersNeverSeeHalfAWrite )
+{
+  constexpr int Rounds = 2000;
+  StageHost::VDataStore Store;
+  const VDataPathHandle First( VDataPath{ "Pair", "First" } );
+  const VDataPathHandle Second( VDataPath{ "Pair", "Second" } );
+  std::atomic<int> Torn{ 0 };
+  std::atomic<int> Heard{ 0 };
+  VDataWriter( Store ).GetNode( VDataPath{ "Pair", "*" } )->OnValueChanged().AddImmediate( [&Heard] { ++Heard; } );
+
+  const auto Write = [&]( int i_Offset )
+  {
+    for( int Round = 1; Round <= Rounds; ++Round )
+    {
+      const KVZ::Variant Value = KVZ::Variant::Make( Round * 2 + i_Offset );
+      VDataWriter Outer( Store );
+      Outer.SetValue( First, Value );
+      VDataVerifyWriter( Store ).SetValue( Second, Value );
+    }
+  };
+  const auto Read = [&]
+  {
+    for( int Round = 0; Round < Rounds; ++Round )
+    {
+      const VDataReader Reader( Store );
+      const VDataReader Nested( Store );
+      Torn += Reader.GetValue( First ) == Nested.GetValue( Second ) ? 0 : 1;
+    }
+  };
+  std::thread Threads[] = { std::thread( Write, 0 ), std::thread( Write, 1 ), std::thread( Read ), std::thread( Read ) };
+  for( std::thread& rThread : Threads )
+  {
+    rThread.join();
+  }
+  EXPECT_EQ( Torn, 0 );
+  EXPECT_EQ( Heard, 2 * Rounds );
+}
+
+TEST( DataStoreThreads, AMovedGuardsLockIsFreeForOthersAfterItsLastOwner )
+{
+  StageHost::VDataStore Store;
+  const VDataPath Path{ "A" };
+  auto pWriter = std::make_unique<VDataWriter>( Store );
+  auto pOwner = std::make_unique<VDataWriter>( std::move( *pWriter ) );
+  pWriter.reset();
+  std::thread Other( [&] { VDataWriter( Store ).SetValue( Path, KVZ::Variant::Make( 2 ) ); } );
+  pOwner->SetValue( Path, KVZ::Variant::Make( 1 ) );
+  pOwner.reset();
+  Other.join();
+  EXPECT_EQ( VDataReader( Store ).GetValue( Path ), KVZ::Variant::Make( 2 ) );
+}
