@@ -24,7 +24,7 @@ target_include_directories( StageCoreIncludes INTERFACE "${CMAKE_SOURCE_DIR}/src
 target_link_libraries( StageCoreIncludes INTERFACE Boost::headers Threads::Threads )
 
 # What every linked target of ours needs besides its DEPENDS.
-set( STAGECORE_COMMON_LIBRARIES StageCoreIncludes Boost::thread Boost::filesystem )
+set( STAGECORE_COMMON_LIBRARIES StageCoreIncludes Boost::thread Boost::chrono Boost::filesystem )
 
 # Tests have a precompiled header of their own, with GoogleTest in it.
 add_library( StageCorePrecompiled STATIC "${CMAKE_CURRENT_LIST_DIR}/Precompiled.cpp" )

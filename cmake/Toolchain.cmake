@@ -44,6 +44,6 @@ if( STAGECORE_CCACHE )
   set( CMAKE_CXX_COMPILER_LAUNCHER env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime ${STAGECORE_CCACHE} )
 endif()
 
-find_package( Boost 1.74 REQUIRED COMPONENTS thread filesystem )
+find_package( Boost 1.74 REQUIRED COMPONENTS chrono thread filesystem )
 find_package( Threads REQUIRED )
 find_package( GTest REQUIRED )

@@ -1,0 +1,161 @@
+#include "host/CaptureTargets.h"
+
+#include "Core/VideoInterface/Schemas.h"
+#include "Core/VideoInterface/VideoContainer.h"
+#include "StageCoreDataStore/DataReader.h"
+#include "StageCoreDataStoreTypes/DeviceSchemas.h"
+#include "StageCoreRuntime/GlobalLog.h"
+
+#include <boost/filesystem/operations.hpp>
+#include <boost/filesystem/path.hpp>
+#include <boost/thread/lock_guard.hpp>
+
+#include <algorithm>
+
+using StageCorePluginInterface::VCaptureFileReport;
+using StageCorePluginInterface::VCaptureTarget;
+
+namespace StageHost
+{
+
+namespace
+{
+
+template<class T>
+T ReadOr( const VDataReader& i_rReader, const VDataPath& i_rPath, T i_Default )
+{
+  GetTyped( i_rReader, i_rPath, i_Default );
+  return i_Default;
+}
+
+std::string FilePath( const VCaptureTarget& i_rTarget )
+{
+  const std::string Stem = i_rTarget.m_BaseName + "_" + i_rTarget.m_DeviceLabel;
+  return ( boost::filesystem::path( i_rTarget.m_Folder ) / ( i_rTarget.m_Extension.empty() ? Stem : Stem + "." + i_rTarget.m_Extension ) ).string();
+}
+
+// A name as one component of a path.
+std::string FileNamePart( std::string i_Text )
+{
+  std::replace_if( i_Text.begin(), i_Text.end(),
+    []( char i_Character ) { return i_Character == '/' || i_Character == ':' || static_cast<unsigned char>( i_Character ) < 0x20; }, '-' );
+  return i_Text;
+}
+
+}
+
+std::string MakeDeviceLabel( const std::string& i_rDeviceURN, const std::string& i_rName )
+{
+  if( !i_rName.empty() )
+  {
+    return FileNamePart( i_rName );
+  }
+  std::string Label = i_rDeviceURN;
+  Label.erase( std::remove( Label.begin(), Label.end(), ':' ), Label.end() );
+  return Label;
+}
+
+VCaptureTargets::VCaptureTargets( std::shared_ptr<IDataStore> i_pDataStore )
+  : m_pDataStore( std::move( i_pDataStore ) )
+{
+}
+
+void VCaptureTargets::Configure( VCaptureTargetOptions i_Options )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Options = std::move( i_Options );
+}
+
+std::vector<int32_t> VCaptureTargets::GetContainers( const std::string& i_rDeviceURN )
+{
+  const VDataReader Reader( *m_pDataStore );
+  const auto Path = DeviceSchemas::VideoContainer( DeviceSchemas::VideoInput::Path( i_rDeviceURN ) );
+  return { ReadOr( Reader, Path, KVZ::IVideoContainer::ETVID ) };
+}
+
+VCaptureTarget VCaptureTargets::MakeTarget( const std::string& i_rName, const std::string& i_rDeviceURN, int32_t i_Container ) const
+{
+  const VDataPath Device = DeviceSchemas::VideoInput::Path( i_rDeviceURN );
+  VCaptureTarget Target;
+  {
+    const VDataReader Reader( *m_pDataStore );
+    Target.m_DeviceLabel = MakeDeviceLabel( i_rDeviceURN, ReadOr( Reader, DeviceSchemas::Name( Device ), std::string() ) );
+    Target.m_VideoPayload = ReadOr( Reader, DeviceSchemas::VideoPayload( Device ), KVZ::IVideoPayload::EUncompressed );
+    Target.m_AudioPayload = ReadOr( Reader, DeviceSchemas::AudioPayload( Device ), KVZ::IAudioPayload::EUncompressed );
+  }
+  Target.m_Container = i_Container;
+  Target.m_BaseName = FileNamePart( i_rName );
+  Target.m_Extension = KVZ::GetFileExtension( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) );
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  Target.m_Folder = m_Options.m_Folder;
+  Target.m_AudioChannels = m_Options.m_AudioChannels;
+  return Target;
+}
+
+std::string VCaptureTargets::WhyRefused( const VCaptureTarget& i_rTarget ) const
+{
+  bool bOverwrite = false;
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    bOverwrite = m_Options.m_bOverwrite;
+  }
+  if( i_rTarget.m_Folder.empty() )
+  {
+    return "There is no folder for captures.";
+  }
+  boost::system::error_code Error;
+  const std::string Path = FilePath( i_rTarget );
+  if( !bOverwrite && boost::filesystem::exists( Path, Error ) )
+  {
+    return "The file \"" + Path + "\" is there already; --overwrite replaces it.";
+  }
+  return {};
+}
+
+bool VCaptureTargets::GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std::string& i_rDeviceURN, int32_t i_Container, VCaptureTarget& o_rTarget )
+{
+  VCaptureTarget Target = MakeTarget( i_rHeader.m_Name, i_rDeviceURN, i_Container );
+  const std::string Refusal = WhyRefused( Target );
+  if( !Refusal.empty() )
+  {
+    KVZ_LOG_ERROR( "Capture", "%1%", Refusal );
+    return false;
+  }
+  o_rTarget = std::move( Target );
+  return true;
+}
+
+std::string VCaptureTargets::WhyRefused( const std::string& i_rName, const std::string& i_rDeviceURN )
+{
+  for( const int32_t Container : GetContainers( i_rDeviceURN ) )
+  {
+    std::string Refusal = WhyRefused( MakeTarget( i_rName, i_rDeviceURN, Container ) );
+    if( !Refusal.empty() )
+    {
+      return Refusal;
+    }
+  }
+  return {};
+}
+
+void VCaptureTargets::GetFolderAliases( std::vector<std::string>& o_rAliases )
+{
+  o_rAliases = { "Default" };
+}
+
+void VCaptureTargets::OnFileFinished( const VCaptureFileReport& i_rReport )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Reports.push_back( i_rReport );
+}
+
+std::vector<VCaptureFileReport> VCaptureTargets::GetReports( KVZ::VCaptureSessionId i_Id ) const
+{
+  std::vector<VCaptureFileReport> Reports;
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  std::copy_if( m_Reports.begin(), m_Reports.end(), std::back_inserter( Reports ),
+    [&]( const VCaptureFileReport& i_rReport ) { return i_rReport.m_CaptureSessionId == i_Id; } );
+  return Reports;
+}
+
+}

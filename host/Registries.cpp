@@ -1,0 +1,159 @@
+#include "host/Registries.h"
+
+#include <boost/thread/lock_guard.hpp>
+
+#include <algorithm>
+
+using namespace StageCorePluginInterface;
+
+namespace StageHost
+{
+
+void VShutdownManager::AddShutdownObject( std::unique_ptr<KVZ::Detail::IShutdownObject> i_pObject )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Objects.push_back( std::move( i_pObject ) );
+}
+
+void VShutdownManager::Shutdown()
+{
+  std::vector<std::unique_ptr<KVZ::Detail::IShutdownObject>> Objects;
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    Objects.swap( m_Objects );
+  }
+  while( !Objects.empty() )
+  {
+    Objects.pop_back();
+  }
+}
+
+void VParameterRegistry::AddParameterGroup( std::shared_ptr<IParameterGroup> i_pGroup )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Groups.push_back( std::move( i_pGroup ) );
+}
+
+void VParameterRegistry::RemoveParameterGroup( const std::shared_ptr<IParameterGroup>& i_pGroup )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Groups.erase( std::remove( m_Groups.begin(), m_Groups.end(), i_pGroup ), m_Groups.end() );
+}
+
+std::vector<std::shared_ptr<IParameterGroup>> VParameterRegistry::GetGroups() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Groups;
+}
+
+void VParameterRegistry::Clear()
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Groups.clear();
+}
+
+void VFlowNodeRegistry::AddFactory( std::shared_ptr<IFlowNodeFactory> i_pFactory )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Factories.push_back( std::move( i_pFactory ) );
+}
+
+void VFlowNodeRegistry::Clear()
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Factories.clear();
+}
+
+void VHardwareStartEvent::Add( std::function<void()> i_Callback, std::shared_ptr<KVZ::IPostalService> i_pService )
+{
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    if( !m_bFired )
+    {
+      m_Callbacks.Add( std::move( i_Callback ), std::move( i_pService ) );
+      return;
+    }
+  }
+  if( i_pService )
+  {
+    i_pService->Post( std::move( i_Callback ), 0 );
+  }
+  else
+  {
+    i_Callback();
+  }
+}
+
+void VHardwareStartEvent::Fire()
+{
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    if( m_bFired )
+    {
+      return;
+    }
+    m_bFired = true;
+  }
+  m_Callbacks();
+}
+
+void VHardwareRegistry::RegisterManager( std::shared_ptr<IHardwareManager> i_pManager )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Managers.push_back( std::move( i_pManager ) );
+}
+
+void VHardwareRegistry::UnregisterManager( const std::shared_ptr<IHardwareManager>& i_pManager )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Managers.erase( std::remove( m_Managers.begin(), m_Managers.end(), i_pManager ), m_Managers.end() );
+}
+
+void VHardwareRegistry::SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Sections[ i_rSection ].m_Root = i_rPath;
+}
+
+void VHardwareRegistry::AddSection( const std::string& i_rSection, VSectionPredicate i_Predicate, int i_SortPosition )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Sections[ i_rSection ].m_Predicate = std::move( i_Predicate );
+  m_Sections[ i_rSection ].m_SortPosition = i_SortPosition;
+}
+
+void VHardwareRegistry::AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
+  const std::string& i_rShortcut )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Commands.push_back( { i_rKey, i_rSections, i_rText, i_rShortcut } );
+}
+
+size_t VHardwareRegistry::ManagerCount() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Managers.size();
+}
+
+std::map<std::string, VHardwareSection> VHardwareRegistry::GetSections() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Sections;
+}
+
+std::vector<VHardwareCommand> VHardwareRegistry::GetCommands() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Commands;
+}
+
+void VHardwareRegistry::ReleaseManagers()
+{
+  std::vector<std::shared_ptr<IHardwareManager>> Managers;   // destroyed without the lock
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    Managers.swap( m_Managers );
+  }
+}
+
+}

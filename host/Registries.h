@@ -1,0 +1,133 @@
+// The registers that a module fills at its start. Plain lists behind one lock each; any thread may call.
+#pragma once
+
+#include "StageCorePluginInterface/HardwareRegistry.h"
+#include "StageCorePluginInterface/StageCoreHost.h"
+#include "StageCoreRuntime/ThreadAnnotations.h"
+
+#include <boost/thread/mutex.hpp>
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace StageHost
+{
+
+class VShutdownManager : public StageCorePluginInterface::IShutdownManager
+{
+public:
+  ~VShutdownManager() override { Shutdown(); }
+
+  void AddShutdownObject( std::unique_ptr<KVZ::Detail::IShutdownObject> i_pObject ) override;
+  // Destroys the objects, the last one first, on the calling thread.
+  void Shutdown();
+
+private:
+  boost::mutex m_Mutex;
+  std::vector<std::unique_ptr<KVZ::Detail::IShutdownObject>> m_Objects GUARDED_BY( m_Mutex );
+};
+
+class VParameterRegistry : public StageCorePluginInterface::IParameterRegistry
+{
+public:
+  void AddParameterGroup( std::shared_ptr<IParameterGroup> i_pGroup ) override;
+  void RemoveParameterGroup( const std::shared_ptr<IParameterGroup>& i_pGroup ) override;
+
+  // In the order of arrival.
+  std::vector<std::shared_ptr<IParameterGroup>> GetGroups() const;
+  void Clear();
+
+private:
+  mutable boost::mutex m_Mutex;
+  std::vector<std::shared_ptr<IParameterGroup>> m_Groups GUARDED_BY( m_Mutex );
+};
+
+class VFlowNodeRegistry : public StageCorePluginInterface::IFlowNodeRegistry
+{
+public:
+  void RegisterFactory( std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory> i_pFactory ) override { AddFactory( std::move( i_pFactory ) ); }
+  void AddFactory( std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory> i_pFactory ) override;
+  void Clear();
+
+private:
+  boost::mutex m_Mutex;
+  std::vector<std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory>> m_Factories GUARDED_BY( m_Mutex );
+};
+
+// Fires each callback once: at Fire, or at once when it is added after that.
+class VHardwareStartEvent : public StageCorePluginInterface::IHardwareStartEvent
+{
+public:
+  void Add( std::function<void()> i_Callback, std::shared_ptr<KVZ::IPostalService> i_pService ) override;
+  void Fire();
+
+private:
+  boost::mutex m_Mutex;
+  NotificationSystem::VMultiCallbackPostal<void()> m_Callbacks;
+  bool m_bFired GUARDED_BY( m_Mutex ) = false;
+};
+
+struct VHardwareSection
+{
+  StageCorePluginInterface::IHardwareRegistry::VSectionPredicate m_Predicate;
+  int m_SortPosition = 0;
+  VDataPath m_Root;
+};
+
+struct VHardwareCommand
+{
+  std::string m_Key;
+  std::vector<std::string> m_Sections;
+  std::string m_Text;
+  std::string m_Shortcut;
+};
+
+class VHardwareRegistry
+  : public StageCorePluginInterface::IHardwareRegistry
+{
+public:
+  void RegisterManager( std::shared_ptr<StageCorePluginInterface::IHardwareManager> i_pManager ) override;
+  void UnregisterManager( const std::shared_ptr<StageCorePluginInterface::IHardwareManager>& i_pManager ) override;
+  void SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath ) override;
+  void AddSection( const std::string& i_rSection, VSectionPredicate i_Predicate, int i_SortPosition ) override;
+  void AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
+    const std::string& i_rShortcut ) override;
+
+  size_t ManagerCount() const;
+  std::map<std::string, VHardwareSection> GetSections() const;
+  std::vector<VHardwareCommand> GetCommands() const;
+  void ReleaseManagers();
+
+private:
+  mutable boost::mutex m_Mutex;
+  std::vector<std::shared_ptr<StageCorePluginInterface::IHardwareManager>> m_Managers GUARDED_BY( m_Mutex );
+  std::map<std::string, VHardwareSection> m_Sections GUARDED_BY( m_Mutex );
+  std::vector<VHardwareCommand> m_Commands GUARDED_BY( m_Mutex );
+};
+
+class VHardwareHost : public StageCorePluginInterface::IHardwareHost
+{
+public:
+  explicit VHardwareHost( std::shared_ptr<VHardwareRegistry> i_pRegistry ) : m_pRegistry( std::move( i_pRegistry ) ) {}
+  std::shared_ptr<StageCorePluginInterface::IHardwareRegistry> GetHardwareRegistry() override { return m_pRegistry; }
+
+private:
+  const std::shared_ptr<VHardwareRegistry> m_pRegistry;
+};
+
+// A service that only has a name: what the host offers where its own plug-ins would find more.
+class VNamedService : public StageCorePluginInterface::IServiceObject
+{
+public:
+  explicit VNamedService( std::string i_Name ) : m_Name( std::move( i_Name ) ) {}
+  std::string GetServiceName() const override { return m_Name; }
+  void Release() override {}
+
+private:
+  const std::string m_Name;
+};
+
+}

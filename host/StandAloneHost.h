@@ -1,0 +1,90 @@
+// The host that a module runs in without the closed one: every service real and working, composed in one place.
+//
+// Made, driven and destroyed on one thread.
+#pragma once
+
+#include "StageCorePluginInterface/StageCoreHost.h"
+#include "host/CaptureTargets.h"
+#include "host/ModuleLoader.h"
+#include "host/Registries.h"
+#include "host/SyncEngine.h"
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace NotificationSystem
+{
+class VAsioPostalService;
+}
+
+namespace StageHost
+{
+
+struct VHostOptions
+{
+  size_t m_MemoryMiB = 1024;   // for the frames of all devices
+};
+
+// The budget is counted in blocks of this size: room for the largest frame, 4096 by 2160 in 32 bits with 16 channels of sound.
+constexpr size_t FrameBlockSize = 40u << 20;
+
+// The smallest budget with which a device can go on while one block is being drained.
+constexpr size_t MinimumMemoryMiB = 3 * ( FrameBlockSize >> 20 );
+
+class VStandAloneHost : public StageCorePluginInterface::IStageCoreHost
+{
+public:
+  explicit VStandAloneHost( const VHostOptions& i_rOptions );
+  ~VStandAloneHost() override;
+
+  // Loads a module and takes it through the whole start up to the hardware start event. False with the reason in o_rError.
+  bool StartModule( const std::string& i_rPath, std::string& o_rError );
+  // Ends the module; nothing of it runs after this. Done by the destructor too.
+  void StopModule();
+
+  VSyncEngine& Engine() { return *m_pEngine; }
+  VCaptureTargets& Targets() { return *m_pTargets; }
+  VParameterRegistry& Parameters() { return *m_pParameters; }
+  StageCorePluginInterface::ITimeService& Time() { return *m_pTime; }
+
+  std::shared_ptr<StageCorePluginInterface::IShutdownManager> GetShutdownManager() override { return m_pShutdown; }
+  std::shared_ptr<UtilsMemory::VBalancingAllocator> GetBalancingAllocator() override { return m_pAllocator; }
+  std::shared_ptr<IDataStore> GetDataStore() override { return m_pDataStore; }
+  std::shared_ptr<StageCorePluginInterface::ITimeService> GetTimeService() override { return m_pTime; }
+  std::shared_ptr<StageCorePluginInterface::IFlowNodeRegistry> GetFlowNodeRegistry() override { return m_pFlowNodes; }
+  std::shared_ptr<StageCorePluginInterface::IParameterRegistry> GetParameterRegistry() override { return m_pParameters; }
+  std::shared_ptr<StageCorePluginInterface::IHardwareStartEvent> GetHardwareStartEvent() override { return m_pHardwareStart; }
+  std::shared_ptr<StageCorePluginInterface::IServiceObject> GetTriggerService() override { return m_pTriggerService; }
+  std::shared_ptr<StageCorePluginInterface::IServiceObject> GetFirstSourceService() override { return m_pFirstService; }
+  std::shared_ptr<StageCorePluginInterface::IServiceObject> GetSecondSourceService() override { return m_pSecondService; }
+  std::shared_ptr<StageCorePluginInterface::ICaptureTargets> GetCaptureTargetService() override { return m_pTargets; }
+  std::shared_ptr<StageCorePluginInterface::ISourceRegistry> GetSourceRegistry() override { return m_pEngine; }
+  std::shared_ptr<StageCorePluginInterface::ICaptureTargets> GetCaptureTargets() override { return m_pTargets; }
+  void SetFileFilters( int i_Kind, const std::vector<std::string>& i_rFilters ) override;
+
+  // What the module offers to open, by kind.
+  const std::map<int, std::vector<std::string>>& GetFileFilters() const { return m_FileFilters; }
+  const VHardwareRegistry& Hardware() const { return *m_pHardware; }
+
+private:
+  const std::shared_ptr<IDataStore> m_pDataStore;
+  const std::shared_ptr<StageCorePluginInterface::ITimeService> m_pTime;
+  const std::shared_ptr<UtilsMemory::VBalancingAllocator> m_pAllocator;
+  const std::shared_ptr<VShutdownManager> m_pShutdown;
+  const std::shared_ptr<VFlowNodeRegistry> m_pFlowNodes;
+  const std::shared_ptr<VParameterRegistry> m_pParameters;
+  const std::shared_ptr<VHardwareStartEvent> m_pHardwareStart;
+  const std::shared_ptr<VHardwareRegistry> m_pHardware;
+  const std::shared_ptr<VCaptureTargets> m_pTargets;
+  const std::shared_ptr<StageCorePluginInterface::IServiceObject> m_pTriggerService;
+  const std::shared_ptr<StageCorePluginInterface::IServiceObject> m_pFirstService;
+  const std::shared_ptr<StageCorePluginInterface::IServiceObject> m_pSecondService;
+  const std::shared_ptr<NotificationSystem::VAsioPostalService> m_pEngineService;   // ends after the engine, whose calls it runs
+  const std::shared_ptr<VSyncEngine> m_pEngine;
+  std::map<int, std::vector<std::string>> m_FileFilters;
+  std::unique_ptr<VLoadedModule> m_pModule;
+};
+
+}
