@@ -1,0 +1,19 @@
+// What this build of the plug-in is composed of, as rows: drivers, containers that can be written.
+#pragma once
+
+#include "Core/VideoInterface/VideoWriter.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDevice.h"
+
+#include <memory>
+#include <vector>
+
+namespace Composition
+{
+
+// In the order of the device indices.
+std::vector<VideoInputHAL::VDriverMaker> DriverMakers();
+
+// A writer for each container that captures can go to.
+std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory();
+
+}

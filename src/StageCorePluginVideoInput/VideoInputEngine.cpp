@@ -1,0 +1,173 @@
+#include "StageCorePluginVideoInput/VideoInputEngine.h"
+
+#include "HardwareSupport/VideoInput/VideoInputDataSource/DeviceUrnMap.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSourceTriggered.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
+#include "NotificationSystem/AsioPostalService.h"
+#include "NotificationSystem/WeakBinder.h"
+#include "StageCorePluginInterface/StageCoreHost.h"
+#include "StageCorePluginVideoInput/Composition.h"
+#include "StageCorePluginVideoInput/VideoInputDeviceParameterHandler.h"
+#include "StageCorePluginVideoInput/VideoInputSystemParameterHandler.h"
+#include "StageCoreRuntime/Shared.h"
+#include "StageCoreRuntime/ShutdownObject.h"
+#include "SyncSystem/CaptureBufferAllocator.h"
+#include "Utils/UtilsMemory/BalancingAllocator.h"
+
+using namespace StageCorePluginInterface;
+using VideoInputHAL::IVideoInputDevice;
+using VideoInputHAL::VDeviceUrnMap;
+using VideoInputHAL::VVideoInputDataSource;
+using VideoInputHAL::VVideoInputDataSourceAllocator;
+using VideoInputHAL::VVideoInputDeviceManager;
+
+namespace
+{
+
+// Bytes of frames that each device's buffer may claim for itself.
+constexpr size_t DeviceShareBytes = 0x10000000;
+constexpr size_t FrameAlignment = 16;
+constexpr int VideoFileKind = 2;
+
+template<class T>
+void HandOver( IShutdownManager& i_rManager, const std::shared_ptr<T>& i_pObject, const char* i_pFile, int i_Line )
+{
+  i_rManager.AddShutdownObject( std::make_unique<KVZ::Detail::VShutdownObject<T>>( i_pObject, i_pFile, i_Line ) );
+}
+
+}
+
+// The maps have no lock: they change on the engine's thread, and in the destructor once the device manager has been shut down.
+class VVideoInputEngine::VImpl : public KVZ::VShared
+{
+public:
+  explicit VImpl( IStageCoreHost& i_rHost );
+  ~VImpl() override;
+
+  void Start();
+  const std::shared_ptr<VVideoInputDeviceParameterHandler>* FindHandler( const std::string& i_rDeviceURN ) const
+  {
+    return m_ParameterHandlers.Find( i_rDeviceURN );
+  }
+
+private:
+  std::weak_ptr<VImpl> WeakThis() { return std::static_pointer_cast<VImpl>( shared_from_this() ); }
+  void StartDrivers() { m_pDeviceManager->StartDiscovery(); }
+  void OnDeviceAdded( std::shared_ptr<IVideoInputDevice> i_pDevice );
+  std::shared_ptr<VVideoInputDataSourceAllocator> MakeFrameAllocator();
+  std::shared_ptr<VVideoInputDataSource> MakeDataSource( const std::shared_ptr<IVideoInputDevice>& i_pDevice,
+    const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator );
+
+  IStageCoreHost* const m_pHost;
+  const std::shared_ptr<NotificationSystem::VAsioPostalService> m_pPostalService;
+  std::shared_ptr<VVideoInputDeviceManager> m_pDeviceManager;
+  VDeviceUrnMap<std::shared_ptr<VVideoInputDeviceParameterHandler>> m_ParameterHandlers;
+  std::shared_ptr<VDeviceUrnMap<std::shared_ptr<VVideoInputDataSource>>> m_pVideoInputDataSources;   // shared with flow node factories
+  std::shared_ptr<VVideoInputSystemParameterHandler> m_pSystemParameterHandler;
+};
+
+VVideoInputEngine::VImpl::VImpl( IStageCoreHost& i_rHost )
+  : m_pHost( &i_rHost )
+  , m_pPostalService( std::make_shared<NotificationSystem::VAsioPostalService>( "Video Input Engine" ) )
+  , m_pDeviceManager( KVZ::MakeShared<VVideoInputDeviceManager>( Composition::DriverMakers() ) )
+{
+  const std::shared_ptr<IShutdownManager> pShutdown = m_pHost->GetShutdownManager();
+  HandOver( *pShutdown, m_pDeviceManager, __FILE__, __LINE__ );
+  m_pHost->SetFileFilters( VideoFileKind, { "*.avi", "*.mov", "*.mp4", "*.tvid", "*.mkv" } );
+  m_pSystemParameterHandler =
+    KVZ::MakeShared<VVideoInputSystemParameterHandler>( m_pPostalService, m_pHost->GetDataStore(), m_pHost->GetParameterRegistry() );
+  HandOver( *pShutdown, m_pSystemParameterHandler, __FILE__, __LINE__ );
+  m_pVideoInputDataSources = std::make_shared<VDeviceUrnMap<std::shared_ptr<VVideoInputDataSource>>>();
+}
+
+VVideoInputEngine::VImpl::~VImpl()
+{
+  std::vector<std::shared_ptr<IVideoInputDevice>> Devices;
+  m_pDeviceManager->GetDevices( Devices );
+  m_pDeviceManager->Shutdown();
+  // The data sources keep their devices, whose cards go on streaming: without a receiver no frame arrives.
+  for( const std::shared_ptr<IVideoInputDevice>& pDevice : Devices )
+  {
+    pDevice->SetDataCallback( {} );
+  }
+  m_ParameterHandlers.Clear();
+  const std::shared_ptr<ISourceRegistry> pSources = m_pHost->GetSourceRegistry();
+  for( const auto& rEntry : *m_pVideoInputDataSources )
+  {
+    pSources->RemoveSource( rEntry.second );
+  }
+  m_pVideoInputDataSources->Clear();
+  m_pSystemParameterHandler.reset();
+}
+
+void VVideoInputEngine::VImpl::Start()
+{
+  m_pDeviceManager->GetDeviceAddedCallback().Add( NotificationSystem::BindWeak( WeakThis(), &VImpl::OnDeviceAdded ), m_pPostalService );
+  m_pHost->GetHardwareStartEvent()->Add( NotificationSystem::BindWeak( WeakThis(), &VImpl::StartDrivers ), {} );
+}
+
+// Engine's thread. The device gets its receiver and allocator last, when all that a first frame can touch is in place.
+void VVideoInputEngine::VImpl::OnDeviceAdded( std::shared_ptr<IVideoInputDevice> i_pDevice )
+{
+  const std::string URN = i_pDevice->GetDeviceURN();
+  const std::shared_ptr<VVideoInputDataSourceAllocator> pAllocator = MakeFrameAllocator();
+  const std::shared_ptr<VVideoInputDataSource> pSource = MakeDataSource( i_pDevice, pAllocator );
+  const std::shared_ptr<ISourceRegistry> pSources = m_pHost->GetSourceRegistry();
+
+  m_ParameterHandlers.Insert( URN,
+    KVZ::MakeShared<VVideoInputDeviceParameterHandler>( m_pPostalService, m_pHost->GetDataStore(), m_pHost->GetParameterRegistry(),
+      m_pHost->GetCaptureTargets(), pSources, i_pDevice, pSource ) );
+  pSources->AddSource( pSource );
+  m_pVideoInputDataSources->Insert( URN, pSource );
+  i_pDevice->SetDataCallback( pSource );
+  i_pDevice->SetAllocator( pAllocator );
+}
+
+std::shared_ptr<VVideoInputDataSourceAllocator> VVideoInputEngine::VImpl::MakeFrameAllocator()
+{
+  const std::shared_ptr<UtilsMemory::VBalancingAllocator> pBalancing = m_pHost->GetBalancingAllocator();
+  const auto pFirstClient = pBalancing->MakeClient();   // takes part in the balance while the device's own client is made
+  const auto pClient = pBalancing->MakeClient();
+  pClient->SetShare( DeviceShareBytes / pBalancing->GetBlockSize() );
+  return std::make_shared<VVideoInputDataSourceAllocator>( std::make_shared<SyncSystem::VCaptureBufferAllocator>( pClient, FrameAlignment ) );
+}
+
+std::shared_ptr<VVideoInputDataSource> VVideoInputEngine::VImpl::MakeDataSource( const std::shared_ptr<IVideoInputDevice>& i_pDevice,
+  const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator )
+{
+  VideoInputHAL::VVideoInputDataSourceOptions Options;
+  Options.m_pWriterFactory = Composition::WriterFactory();
+  if( i_pDevice->IsTriggered() )
+  {
+    return KVZ::MakeShared<VideoInputHAL::VVideoInputDataSourceTriggered>( m_pDeviceManager, i_pDevice, i_pAllocator, m_pHost->GetTriggerService(),
+      m_pHost->GetFirstSourceService(), m_pHost->GetSecondSourceService(), m_pHost->GetCaptureTargetService(), m_pHost->GetTimeService(), Options );
+  }
+  return KVZ::MakeShared<VVideoInputDataSource>( m_pDeviceManager, i_pDevice, i_pAllocator, m_pHost->GetFirstSourceService(),
+    m_pHost->GetSecondSourceService(), m_pHost->GetCaptureTargetService(), m_pHost->GetTimeService(), Options );
+}
+
+VVideoInputEngine::VVideoInputEngine( IStageCoreHost& i_rHost )
+  : m_pImpl( KVZ::MakeShared<VImpl>( i_rHost ) )
+{
+  HandOver( *i_rHost.GetShutdownManager(), m_pImpl, __FILE__, __LINE__ );
+}
+
+VVideoInputEngine::~VVideoInputEngine() = default;
+
+void VVideoInputEngine::Start()
+{
+  m_pImpl->Start();
+}
+
+bool VVideoInputEngine::StartCapture( const std::string& i_rDeviceURN )
+{
+  const auto* pHandler = m_pImpl->FindHandler( i_rDeviceURN );
+  return pHandler && ( *pHandler )->StartCapture();
+}
+
+bool VVideoInputEngine::StopCapture( const std::string& i_rDeviceURN )
+{
+  const auto* pHandler = m_pImpl->FindHandler( i_rDeviceURN );
+  return pHandler && ( *pHandler )->StopCapture();
+}

@@ -1,0 +1,36 @@
+// The life of the plug-in: one notification thread, the devices that appear, and for each of them a data source and a parameter handler
+// that stay until the engine ends. The engine owns no frame path: frames go from the device to its data source.
+#pragma once
+
+#include "StageCorePluginInterface/Plugin.h"
+
+#include <memory>
+#include <string>
+
+namespace StageCorePluginInterface
+{
+class IStageCoreHost;
+}
+
+class VVideoInputEngine : public StageCorePluginInterface::IHardwareManager
+{
+public:
+  // Builds everything and hands the shutdown objects to the host, the engine's own last. The host object must outlive the engine.
+  explicit VVideoInputEngine( StageCorePluginInterface::IStageCoreHost& i_rHost );
+  ~VVideoInputEngine() override;
+
+  void OnSystemStarted() override {}
+  void OnSystemStopping() override {}
+  void OnSettingsLoaded() override {}
+
+  // Subscribes to device arrival and to the host's start of hardware. Nothing looks for hardware before the host fires that event.
+  void Start();
+
+  // Of one device's capture from the card. False for an unknown URN, which is not reported, and where the device refuses.
+  bool StartCapture( const std::string& i_rDeviceURN );
+  bool StopCapture( const std::string& i_rDeviceURN );
+
+private:
+  class VImpl;
+  std::shared_ptr<VImpl> m_pImpl;
+};
