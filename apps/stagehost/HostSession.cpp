@@ -1,0 +1,128 @@
+#include "apps/stagehost/HostSession.h"
+
+#include "StageCoreRuntime/GlobalLog.h"
+#include "apps/stagehost/ExitCode.h"
+#include "apps/stagehost/Interrupt.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <cstdio>
+
+using StageHost::VDeviceInfo;
+
+namespace
+{
+
+constexpr double PollSeconds = 0.02;
+// Real drivers announce their cards within this time.
+constexpr double ArrivalSeconds = 1.5;
+constexpr double SignalSeconds = 5.0;
+
+std::string JoinURNs( const std::vector<VDeviceInfo>& i_rDevices )
+{
+  std::string Text;
+  for( const VDeviceInfo& rDevice : i_rDevices )
+  {
+    Text += ( Text.empty() ? "" : ", " ) + rDevice.m_URN;
+  }
+  return Text;
+}
+
+}
+
+void Complain( const std::string& i_rText )
+{
+  std::fprintf( stderr, "stagehost: %s\n", i_rText.c_str() );
+}
+
+void AddSessionOptions( CLI::App& io_rCommand, VSessionOptions& io_rOptions )
+{
+  io_rCommand
+    .add_option( "--card", io_rOptions.m_Cards, "A virtual card, KIND[:KEY=VALUE[,KEY=VALUE]...], for example decklink:standard=HD_1920_1080P_2500" )
+    ->type_name( "CARD" )
+    ->allow_extra_args( false );
+  io_rCommand.add_flag( "--verbose", io_rOptions.m_bVerbose, "Show the log's information on standard error" );
+}
+
+int VHostSession::Start( const VSessionOptions& i_rOptions )
+{
+  m_Options = i_rOptions;
+  KVZ::VLogOptions Log;
+  Log.m_ConsoleLevel = i_rOptions.m_bVerbose ? KVZ::LogLevel::Detail : KVZ::LogLevel::Warning;
+  KVZ::ConfigureLog( Log );
+
+  std::string Error;
+  for( const std::string& rCard : i_rOptions.m_Cards )
+  {
+    if( !m_Cards.Add( rCard, Error ) )
+    {
+      Complain( Error );
+      return ExitUsage;
+    }
+  }
+  StageHost::VHostOptions Options;
+  Options.m_MemoryMiB = i_rOptions.m_MemoryMiB;
+  m_pHost = std::make_unique<StageHost::VStandAloneHost>( Options );
+  m_pSettings = std::make_unique<StageHost::VDeviceSettings>( m_pHost->GetDataStore(), m_pHost->Parameters() );
+  if( !m_pHost->StartModule( StageHost::ProgramFolder() + "/StageCorePluginVideoInput.tpm", Error ) )
+  {
+    Complain( Error );
+    return ExitFailed;
+  }
+  return ExitComplete;
+}
+
+std::vector<VDeviceInfo> VHostSession::Choose( const std::vector<VDeviceInfo>& i_rDevices ) const
+{
+  if( m_Options.m_DeviceURNs.empty() )
+  {
+    return i_rDevices;
+  }
+  std::vector<VDeviceInfo> Chosen;
+  std::copy_if( i_rDevices.begin(), i_rDevices.end(), std::back_inserter( Chosen ),
+    [&]( const VDeviceInfo& i_rDevice )
+    { return std::count( m_Options.m_DeviceURNs.begin(), m_Options.m_DeviceURNs.end(), i_rDevice.m_URN ) != 0; } );
+  return Chosen;
+}
+
+std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
+{
+  const double Begin = m_pHost->Time().Now();
+  std::vector<VDeviceInfo> Devices;
+  do
+  {
+    Devices = m_pSettings->GetDevices();
+    const double Waited = m_pHost->Time().Now() - Begin;
+    const bool bAllThere = m_Cards.Count() > 0 ? Devices.size() >= m_Cards.Count() : !Devices.empty() && Waited > ArrivalSeconds;
+    const bool bAllSignals = std::all_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal(); } );
+    if( ( bAllThere && bAllSignals ) || Waited > ( Devices.empty() ? ArrivalSeconds : SignalSeconds ) )
+    {
+      break;
+    }
+  } while( WaitUninterrupted( PollSeconds ) );
+
+  if( Devices.empty() )
+  {
+    Complain( m_Cards.Count() > 0 ? "No device has appeared." : "No device was found. A virtual one comes with --card, for example --card decklink" );
+    return {};
+  }
+  for( const std::string& rURN : m_Options.m_DeviceURNs )
+  {
+    if( std::none_of( Devices.begin(), Devices.end(), [&]( const VDeviceInfo& i_rDevice ) { return i_rDevice.m_URN == rURN; } ) )
+    {
+      Complain( "There is no device \"" + rURN + "\"; there are: " + JoinURNs( Devices ) );
+      return {};
+    }
+  }
+  Devices = Choose( Devices );
+  for( const VDeviceInfo& rDevice : Devices )
+  {
+    if( i_bNeedSignal && !rDevice.HasSignal() )
+    {
+      Complain( "Device " + rDevice.m_URN + " (" + rDevice.m_Name + ") has no signal." );
+      return {};
+    }
+  }
+  return Devices;
+}

@@ -1,0 +1,333 @@
+// stagehost record: writes a range of frames of one or more devices to files.
+#include "Core/VideoInterface/Timecode.h"
+#include "apps/stagehost/Commands.h"
+#include "apps/stagehost/ExitCode.h"
+#include "apps/stagehost/HostSession.h"
+#include "apps/stagehost/Interrupt.h"
+#include "apps/stagehost/RecordReport.h"
+#include "host/Recording.h"
+
+#include <CLI/CLI.hpp>
+#include <boost/filesystem/operations.hpp>
+#include <boost/filesystem/path.hpp>
+
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+
+using StageHost::VDeviceInfo;
+using StageHost::VDeviceSettings;
+
+namespace
+{
+
+constexpr double PollSeconds = 0.02;
+constexpr double ReadySeconds = 10.0;
+constexpr double SettleSeconds = 5.0;
+
+struct VOptions
+{
+  VSessionOptions m_Session;
+  VReportOptions m_Report;
+  double m_Seconds = 0.0;
+  uint64_t m_Frames = 0;
+  double m_PreRoll = 0.0;
+  std::string m_Container = "tvid";
+  std::string m_Video = "uncompressed";
+  std::string m_Audio = "uncompressed";
+  uint32_t m_AudioChannels = 0;
+  bool m_bAudioChannels = false;
+  std::string m_AudioFormat;
+  std::string m_PixelFormat;
+  std::string m_Output;
+  std::string m_Name = "take";
+  bool m_bOverwrite = false;
+};
+
+// The words of the command line and the enumerators that the settings hold.
+struct VWord
+{
+  const char* m_pWord;
+  const char* m_pName;
+};
+constexpr VWord Containers[] = { { "tvid", "TVID" }, { "mov", "MOV" }, { "mp4", "MP4" }, { "avi", "AVI" }, { "mkv", "MKV" }, { "images", "IMAGES" } };
+constexpr VWord VideoPayloads[] = { { "uncompressed", "Uncompressed" }, { "jpeg", "ImageJPEG" }, { "png", "ImagePNG" }, { "tiff", "ImageTIFF" } };
+constexpr VWord AudioPayloads[] = { { "uncompressed", "Uncompressed" }, { "none", "None" } };
+
+template<size_t Count>
+std::string NameFor( const VWord ( &i_rWords )[ Count ], const std::string& i_rWord )
+{
+  const auto Found = std::find_if( std::begin( i_rWords ), std::end( i_rWords ), [&]( const VWord& i_rRow ) { return i_rWord == i_rRow.m_pWord; } );
+  return Found == std::end( i_rWords ) ? i_rWord : Found->m_pName;
+}
+
+template<size_t Count>
+std::vector<std::string> WordsOf( const VWord ( &i_rWords )[ Count ] )
+{
+  std::vector<std::string> Words;
+  for( const VWord& rRow : i_rWords )
+  {
+    Words.push_back( rRow.m_pWord );
+  }
+  return Words;
+}
+
+// Before anything is started: what can be seen to be wrong from the command line and the file system.
+int CheckOutput( const VOptions& i_rOptions )
+{
+  boost::system::error_code Error;
+  boost::filesystem::create_directories( i_rOptions.m_Output, Error );
+  if( Error || !boost::filesystem::is_directory( i_rOptions.m_Output, Error ) )
+  {
+    Complain( "The output folder \"" + i_rOptions.m_Output + "\" cannot be made: " + ( Error ? Error.message() : "a file of that name is there" ) + "." );
+    return ExitFailed;
+  }
+  return ExitComplete;
+}
+
+bool WaitUntil( VHostSession& i_rSession, double i_Seconds, const std::function<bool()>& i_Condition )
+{
+  const double Until = i_rSession.Host().Time().Now() + i_Seconds;
+  while( !i_Condition() )
+  {
+    if( i_rSession.Host().Time().Now() > Until || !WaitUninterrupted( PollSeconds ) )
+    {
+      return i_Condition();
+    }
+  }
+  return true;
+}
+
+// The smallest number of channels that the device offers and that holds those asked for.
+std::string DeviceChannels( const VDeviceInfo& i_rDevice, uint32_t i_Channels )
+{
+  uint32_t Best = 0;
+  bool bFound = false;
+  for( const std::string& rCount : i_rDevice.m_AudioChannelCounts )
+  {
+    const uint32_t Count = static_cast<uint32_t>( std::strtoul( rCount.c_str(), nullptr, 10 ) );
+    if( Count >= i_Channels && ( !bFound || Count < Best ) )
+    {
+      Best = Count;
+      bFound = true;
+    }
+  }
+  return bFound ? std::to_string( Best ) : std::to_string( i_Channels );
+}
+
+std::vector<std::pair<std::string, std::string>> WantedSettings( const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+{
+  std::vector<std::pair<std::string, std::string>> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ) } };
+  if( !i_rOptions.m_PixelFormat.empty() )
+  {
+    Wanted.emplace_back( "PixelFormat", i_rOptions.m_PixelFormat );
+  }
+  if( i_rOptions.m_bAudioChannels )
+  {
+    Wanted.emplace_back( "AudioChannelCount", DeviceChannels( i_rDevice, i_rOptions.m_AudioChannels ) );
+  }
+  if( !i_rOptions.m_AudioFormat.empty() )
+  {
+    Wanted.emplace_back( "AudioSampleFormat", i_rOptions.m_AudioFormat );
+  }
+  Wanted.emplace_back( "VideoPayload", NameFor( VideoPayloads, i_rOptions.m_Video ) );
+  Wanted.emplace_back( "AudioPayload", NameFor( AudioPayloads, i_rOptions.m_Audio ) );
+  return Wanted;
+}
+
+bool SetEnabled( VHostSession& i_rSession, const std::string& i_rURN, bool i_bEnabled )
+{
+  const std::string Path = VDeviceSettings::SettingPath( i_rURN, "Enabled" );
+  std::string Error;
+  return i_rSession.Settings().Set( Path, i_bEnabled ? "true" : "false", Error ) && WaitUntil( i_rSession, SettleSeconds, [&] {
+    const bool bReady = i_rSession.Settings().Find( "VideoInput." + i_rURN + ".Hardware.Status" )->m_Value == "Ready";
+    return i_rSession.Settings().IsSettled( Path ) && bReady != i_bEnabled;
+  } );
+}
+
+// While the device is stopped, so that the next buffer session holds frames of these settings alone.
+int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+{
+  if( !SetEnabled( i_rSession, i_rDevice.m_URN, false ) )
+  {
+    Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
+    return ExitFailed;
+  }
+  for( const auto& rSetting : WantedSettings( i_rOptions, i_rDevice ) )
+  {
+    std::string Error;
+    if( !i_rSession.Settings().Set( VDeviceSettings::SettingPath( i_rDevice.m_URN, rSetting.first ), rSetting.second, Error ) )
+    {
+      Complain( Error );
+      return ExitUsage;
+    }
+  }
+  if( !SetEnabled( i_rSession, i_rDevice.m_URN, true ) )
+  {
+    Complain( "Device " + i_rDevice.m_URN + " does not start with these settings." );
+    return ExitFailed;
+  }
+  return ExitComplete;
+}
+
+int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+{
+  StageHost::VCaptureTargetOptions Targets;
+  Targets.m_Folder = i_rOptions.m_Output;
+  Targets.m_bOverwrite = i_rOptions.m_bOverwrite;
+  if( i_rOptions.m_bAudioChannels )
+  {
+    Targets.m_AudioChannels = i_rOptions.m_AudioChannels;
+  }
+  i_rSession.Host().Targets().Configure( Targets );
+  for( const VDeviceInfo& rDevice : i_rDevices )
+  {
+    const std::string Refusal = i_rSession.Host().Targets().WhyRefused( i_rOptions.m_Name, rDevice.m_URN );
+    if( !Refusal.empty() )
+    {
+      Complain( Refusal );
+      return ExitFailed;
+    }
+  }
+  return ExitComplete;
+}
+
+StageHost::VRecordingRequest MakeRequest( const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+{
+  StageHost::VRecordingRequest Request;
+  for( const VDeviceInfo& rDevice : i_rDevices )
+  {
+    Request.m_DeviceURNs.push_back( rDevice.m_URN );
+  }
+  if( i_rOptions.m_Frames != 0 )
+  {
+    Request.m_Frames = i_rOptions.m_Frames;
+  }
+  Request.m_Duration = KVZ::VTick::FromSeconds( i_rOptions.m_Seconds );
+  Request.m_PreRoll = KVZ::VTick::FromSeconds( i_rOptions.m_PreRoll );
+  Request.m_Name = i_rOptions.m_Name;
+  return Request;
+}
+
+int ExitCodeOf( const std::vector<StageHost::VDeviceOutcome>& i_rOutcomes )
+{
+  int Code = ExitComplete;
+  for( const StageHost::VDeviceOutcome& rOutcome : i_rOutcomes )
+  {
+    if( rOutcome.HasFailed() )
+    {
+      return ExitFailed;
+    }
+    if( rOutcome.m_Lost.Total() != 0 )
+    {
+      Code = ExitLostFrames;
+    }
+  }
+  return Code;
+}
+
+int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+{
+  StageHost::VRecording Recording( i_rSession.Host().Engine(), i_rSession.Host().Targets(), i_rSession.Host().Time() );
+  const StageHost::VRecordingRequest Request = MakeRequest( i_rOptions, i_rDevices );
+  if( !WaitUntil( i_rSession, ReadySeconds + i_rOptions.m_PreRoll, [&] { return Recording.IsReady( Request ); } ) )
+  {
+    Complain( IsInterrupted() ? "Interrupted before the recording began." : "The devices deliver no steady signal to record." );
+    return IsInterrupted() ? ExitFailed : ExitNoDevice;
+  }
+  std::string Error;
+  if( !Recording.Start( Request, Error ) )
+  {
+    Complain( Error );
+    return ExitFailed;
+  }
+  VRecordReport Report( i_rOptions.m_Report, i_rDevices );
+  bool bStopped = false;
+  for( Recording.Poll(); !Recording.IsFinished(); Recording.Poll() )
+  {
+    Report.ShowProgress( Recording.GetOutcomes(), i_rSession.Host().Time().Now() );
+    if( bStopped )
+    {
+      WaitAfterInterrupt( PollSeconds );
+    }
+    else if( !WaitUninterrupted( PollSeconds ) )
+    {
+      Recording.Stop();
+      bStopped = true;
+    }
+  }
+  const auto Outcomes = Recording.GetOutcomes();
+  Report.EndProgress();
+  return Report.Print( Outcomes ) ? ExitCodeOf( Outcomes ) : ExitFailed;
+}
+
+int Run( const VOptions& i_rOptions )
+{
+  if( ( i_rOptions.m_Frames != 0 ) == ( i_rOptions.m_Seconds > 0.0 ) )
+  {
+    Complain( "record needs one of --seconds S (above 0) and --frames N (above 0)." );
+    return ExitUsage;
+  }
+  if( const int Result = CheckOutput( i_rOptions ) )
+  {
+    return Result;
+  }
+  VHostSession Session;
+  if( const int Result = Session.Start( i_rOptions.m_Session ) )
+  {
+    return Result;
+  }
+  const std::vector<VDeviceInfo> Devices = Session.WaitForDevices( true );
+  if( Devices.empty() )
+  {
+    return ExitNoDevice;
+  }
+  for( const VDeviceInfo& rDevice : Devices )
+  {
+    if( const int Result = ApplySettings( Session, i_rOptions, rDevice ) )
+    {
+      return Result;
+    }
+  }
+  if( const int Result = CheckTargets( Session, i_rOptions, Devices ) )
+  {
+    return Result;
+  }
+  return RunRecording( Session, i_rOptions, Devices );
+}
+
+void AddFormatOptions( CLI::App& io_rCommand, VOptions& io_rOptions )
+{
+  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format" )->check( CLI::IsMember( WordsOf( Containers ) ) )->capture_default_str();
+  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload" )->check( CLI::IsMember( WordsOf( VideoPayloads ) ) )->capture_default_str();
+  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload" )->check( CLI::IsMember( WordsOf( AudioPayloads ) ) )->capture_default_str();
+  io_rCommand.add_option( "--audio-channels", io_rOptions.m_AudioChannels, "Channels to keep" )
+    ->check( CLI::Range( 0u, 16u ) )
+    ->each( [&io_rOptions]( const std::string& ) { io_rOptions.m_bAudioChannels = true; } );
+  io_rCommand.add_option( "--audio-format", io_rOptions.m_AudioFormat, "Sample format, for example Int16" );
+  io_rCommand.add_option( "--pixel-format", io_rOptions.m_PixelFormat, "Pixel format of the capture buffer, for example U10Y10V10Y10" );
+}
+
+}
+
+VCommand AddRecordCommand( CLI::App& io_rApp )
+{
+  CLI::App& rCommand = *io_rApp.add_subcommand( "record", "Record devices to files" );
+  auto pOptions = std::make_shared<VOptions>();
+  AddSessionOptions( rCommand, pOptions->m_Session );
+  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all when absent" )->type_name( "URN" )->allow_extra_args( false );
+  rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )->type_name( "S" )->check( CLI::PositiveNumber );
+  rCommand.add_option( "--frames", pOptions->m_Frames, "How many frames of each device to record" )->type_name( "N" )->check( CLI::PositiveNumber );
+  rCommand.add_option( "--pre-roll", pOptions->m_PreRoll, "Begin so many seconds before the request" )->type_name( "S" )->check( CLI::NonNegativeNumber );
+  AddFormatOptions( rCommand, *pOptions );
+  rCommand.add_option( "--memory", pOptions->m_Session.m_MemoryMiB, "Memory for frames of all devices, in MiB" )
+    ->type_name( "MIB" )
+    ->check( CLI::Range( StageHost::MinimumMemoryMiB, size_t{ 1 } << 20 ) )
+    ->capture_default_str();
+  rCommand.add_option( "--output", pOptions->m_Output, "The folder that the files go to" )->type_name( "DIR" )->required();
+  rCommand.add_option( "--name", pOptions->m_Name, "What the file names begin with" )->type_name( "STEM" )->capture_default_str();
+  rCommand.add_flag( "--overwrite", pOptions->m_bOverwrite, "Replace files that are there" );
+  rCommand.add_flag( "--json", pOptions->m_Report.m_bJson, "Print one JSON document" );
+  rCommand.add_flag( "--progress", pOptions->m_Report.m_bProgressBlocks, "Print blocks of key=value lines on standard error while recording" );
+  return [pOptions] { return Run( *pOptions ); };
+}

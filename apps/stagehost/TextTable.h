@@ -1,0 +1,25 @@
+// Text for people: columns, sizes, times.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+class VTextTable
+{
+public:
+  explicit VTextTable( std::vector<std::string> i_Heads );
+  // As many cells as there are heads.
+  void AddRow( std::vector<std::string> i_Cells );
+  // Columns padded to their widest cell, two spaces between them, a line each.
+  std::string ToText() const;
+
+private:
+  std::vector<std::vector<std::string>> m_Rows;
+};
+
+std::string JoinTexts( const std::vector<std::string>& i_rTexts, const std::string& i_rBetween );
+
+// "412.3 MB": powers of ten, one decimal.
+std::string BytesToText( uint64_t i_Bytes );
