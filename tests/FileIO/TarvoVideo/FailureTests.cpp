@@ -1,5 +1,5 @@
 // What the writer says, and what it leaves behind, when the disk fails.
-#include "SmallFile.h"
+#include "tests/FileIO/TarvoVideo/SmallFile.h"
 #include "tests/support/FileSizeLimit.h"
 #include "tests/support/TemporaryFolder.h"
 

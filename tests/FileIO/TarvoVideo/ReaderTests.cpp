@@ -1,4 +1,4 @@
-#include "SmallFile.h"
+#include "tests/FileIO/TarvoVideo/SmallFile.h"
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
