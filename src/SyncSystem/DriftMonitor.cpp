@@ -25,16 +25,10 @@ VMatrix2 operator+( const VMatrix2& i_rA, const VMatrix2& i_rB )
   return { i_rA.m_00 + i_rB.m_00, i_rA.m_01 + i_rB.m_01, i_rA.m_10 + i_rB.m_10, i_rA.m_11 + i_rB.m_11 };
 }
 
-VMatrix2 Transposed( const VMatrix2& i_rA )
-{
-  return { i_rA.m_00, i_rA.m_10, i_rA.m_01, i_rA.m_11 };
-}
+VMatrix2 Transposed( const VMatrix2& i_rA ) { return { i_rA.m_00, i_rA.m_10, i_rA.m_01, i_rA.m_11 }; }
 
 // F P F transposed + Q
-VMatrix2 Propagated( const VMatrix2& i_rF, const VMatrix2& i_rP, const VMatrix2& i_rQ )
-{
-  return i_rF * i_rP * Transposed( i_rF ) + i_rQ;
-}
+VMatrix2 Propagated( const VMatrix2& i_rF, const VMatrix2& i_rP, const VMatrix2& i_rQ ) { return i_rF * i_rP * Transposed( i_rF ) + i_rQ; }
 
 std::ostream& operator<<( std::ostream& o_rStream, const VMatrix2& i_rA )
 {
@@ -66,8 +60,8 @@ void VDriftMonitor::Reset()
   m_Segments.clear();
 }
 
-bool VDriftMonitor::Update(
-  uint32_t i_Session, uint32_t i_TicksPerSecond, uint32_t i_Period, uint64_t i_FirstIndex, uint64_t i_Sample, double i_Time )
+bool VDriftMonitor::Update( uint32_t i_Session, uint32_t i_TicksPerSecond, uint32_t i_Period, uint64_t i_FirstIndex, uint64_t i_Sample,
+  double i_Time )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   if( i_Session != 0 && i_Session == m_SessionId )
@@ -106,8 +100,8 @@ bool VDriftMonitor::GetSampleTime( uint64_t i_Sample, double& o_rTime ) const
     o_rTime = FittedTime( i_Sample );
     return true;
   }
-  const auto Next = std::upper_bound(
-    m_Segments.begin(), m_Segments.end(), i_Sample, []( uint64_t i_Value, const VPoint& i_rPoint ) { return i_Value < i_rPoint.m_Sample; } );
+  const auto Next = std::upper_bound( m_Segments.begin(), m_Segments.end(), i_Sample,
+    []( uint64_t i_Value, const VPoint& i_rPoint ) { return i_Value < i_rPoint.m_Sample; } );
   o_rTime = TimeOnLine( Next == m_Segments.begin() ? *Next : *std::prev( Next ), i_Sample );
   return true;
 }
@@ -119,9 +113,9 @@ std::string VDriftMonitor::Dump() const
   Text << std::setprecision( std::numeric_limits<double>::max_digits10 );
   Text << "NominalSampleRateInTicks = " << m_NominalSampleRateInTicks << "\n";
   Text << "ObservationModel = (1, 0)\n";
-  Text << "SystemModel = " << m_SystemModel[ 0 ].m_F << "\n";
+  Text << "SystemModel = " << m_SystemModel[0].m_F << "\n";
   Text << "MeasurementNoise = " << m_Configuration.m_MeasurementNoise << "\n";
-  Text << "ProcessNoise = " << m_SystemModel[ 0 ].m_Q << "\n";
+  Text << "ProcessNoise = " << m_SystemModel[0].m_Q << "\n";
   Text << "MinUncertaintyToUpdateStartTime = " << m_MinUncertaintyToUpdateStartTime << "\n";
   return Text.str();
 }
@@ -155,10 +149,7 @@ bool VDriftMonitor::AddSample( uint32_t i_Session, uint64_t i_Sample, double i_T
 
 void VDriftMonitor::OnNewSession() {}
 
-double VDriftMonitor::FittedTime( uint64_t i_Sample ) const
-{
-  return TimeOnLine( m_LastAccepted, i_Sample );
-}
+double VDriftMonitor::FittedTime( uint64_t i_Sample ) const { return TimeOnLine( m_LastAccepted, i_Sample ); }
 
 bool VDriftMonitor::BeginFit( uint32_t i_Session, uint64_t i_FirstIndex, uint64_t i_Sample, double i_Time )
 {
@@ -182,11 +173,11 @@ bool VDriftMonitor::BeginFit( uint32_t i_Session, uint64_t i_FirstIndex, uint64_
 
 void VDriftMonitor::BuildSystemModel()
 {
-  m_SystemModel[ 0 ] = MakeStep( 1.0 );
+  m_SystemModel[0] = MakeStep( 1.0 );
   for( size_t Index = 1; Index < m_SystemModel.size(); ++Index )
   {
-    const VSystemStep& rHalf = m_SystemModel[ Index - 1 ];
-    m_SystemModel[ Index ] = { rHalf.m_F * rHalf.m_F, Propagated( rHalf.m_F, rHalf.m_Q, rHalf.m_Q ) };
+    const VSystemStep& rHalf = m_SystemModel[Index - 1];
+    m_SystemModel[Index] = { rHalf.m_F * rHalf.m_F, Propagated( rHalf.m_F, rHalf.m_Q, rHalf.m_Q ) };
   }
 }
 
@@ -218,7 +209,7 @@ void VDriftMonitor::Predict( uint32_t i_Steps )
     {
       if( i_Steps >> Bit & 1u )
       {
-        Apply( m_SystemModel[ Bit ] );
+        Apply( m_SystemModel[Bit] );
       }
     }
   }
@@ -226,7 +217,7 @@ void VDriftMonitor::Predict( uint32_t i_Steps )
   {
     for( uint32_t Step = 0; Step < i_Steps; ++Step )
     {
-      Apply( m_SystemModel[ 0 ] );
+      Apply( m_SystemModel[0] );
     }
   }
   else

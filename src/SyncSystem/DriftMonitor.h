@@ -20,14 +20,14 @@ namespace Drift
 
 struct VDriftMonitorConfiguration
 {
-  double m_ProcessNoise = 1e-18;         // spectral density
-  double m_InitialRateVariance = 1.0;    // (seconds per sample) squared
-  double m_MeasurementNoise = 0.0001;    // seconds squared
-  double m_SegmentTolerance = 0.005;     // seconds that the history may stand off the filter
-  uint32_t m_SettleSeconds = 90;         // search for the best start time
-  uint64_t m_MaxSegments = 10000;        // of the history
-  double m_GapFactor = 100.0;            // multiples of the expected time above which a gap is a jump
-  uint32_t m_PredictMode = 0;            // 0 table by powers of two, 1 stepwise, other direct
+  double m_ProcessNoise = 1e-18;        // spectral density
+  double m_InitialRateVariance = 1.0;   // (seconds per sample) squared
+  double m_MeasurementNoise = 0.0001;   // seconds squared
+  double m_SegmentTolerance = 0.005;    // seconds that the history may stand off the filter
+  uint32_t m_SettleSeconds = 90;        // search for the best start time
+  uint64_t m_MaxSegments = 10000;       // of the history
+  double m_GapFactor = 100.0;           // multiples of the expected time above which a gap is a jump
+  uint32_t m_PredictMode = 0;           // 0 table by powers of two, 1 stepwise, other direct
 };
 
 struct VMatrix2
@@ -49,12 +49,12 @@ public:
   struct VFit
   {
     uint32_t m_SessionId = 0;
-    double m_StartTime = 0.0;     // fitted host time of the first index, seconds
-    VPoint m_Last;                // after the last sample taken in
-    uint64_t m_Samples = 0;       // taken into the filter
-    uint64_t m_Skipped = 0;       // left out by the gate
-    double m_TimeVariance = 0.0;  // of m_Last.m_Time
-    uint64_t m_Segments = 0;      // of the history
+    double m_StartTime = 0.0;      // fitted host time of the first index, seconds
+    VPoint m_Last;                 // after the last sample taken in
+    uint64_t m_Samples = 0;        // taken into the filter
+    uint64_t m_Skipped = 0;        // left out by the gate
+    double m_TimeVariance = 0.0;   // of m_Last.m_Time
+    uint64_t m_Segments = 0;       // of the history
   };
 
   explicit VDriftMonitor( const VDriftMonitorConfiguration& i_rConfiguration );

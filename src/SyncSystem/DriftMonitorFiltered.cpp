@@ -3,8 +3,8 @@
 namespace Drift
 {
 
-VDriftMonitorFiltered::VDriftMonitorFiltered(
-  const VDriftMonitorConfiguration& i_rConfiguration, const VDriftMonitorFilteredConfiguration& i_rFiltered )
+VDriftMonitorFiltered::VDriftMonitorFiltered( const VDriftMonitorConfiguration& i_rConfiguration,
+  const VDriftMonitorFilteredConfiguration& i_rFiltered )
   : VDriftMonitor( i_rConfiguration ), m_Filtered( i_rFiltered )
 {
   m_Ring.reserve( m_Filtered.m_OutlierWindow );
@@ -72,8 +72,8 @@ void VDriftMonitorFiltered::CountOutlier( bool i_bOutlier )
   }
   else if( !m_Ring.empty() )
   {
-    m_Outliers -= m_Ring[ m_RingNext ] ? 1 : 0;
-    m_Ring[ m_RingNext ] = i_bOutlier;
+    m_Outliers -= m_Ring[m_RingNext] ? 1 : 0;
+    m_Ring[m_RingNext] = i_bOutlier;
     m_RingNext = ( m_RingNext + 1 ) % m_Ring.size();
   }
 }

@@ -14,10 +14,10 @@ namespace Drift
 
 struct VDriftMonitorFilteredConfiguration
 {
-  uint64_t m_OutlierWindow = 600;     // samples
-  double m_OutlierFraction = 0.5;     // of the window, unlocks the gate
-  double m_OutlierLimit = 0.005;      // seconds above the fit
-  double m_MinSpacing = 0.01;         // fraction of a sample period
+  uint64_t m_OutlierWindow = 600;   // samples
+  double m_OutlierFraction = 0.5;   // of the window, unlocks the gate
+  double m_OutlierLimit = 0.005;    // seconds above the fit
+  double m_MinSpacing = 0.01;       // fraction of a sample period
 };
 
 class VDriftMonitorFiltered : public VDriftMonitor
@@ -50,7 +50,7 @@ private:
   VHeldSample m_Held GUARDED_BY( m_Mutex );
   std::vector<bool> m_Ring GUARDED_BY( m_Mutex );   // reserved for the whole window
   size_t m_RingNext GUARDED_BY( m_Mutex ) = 0;
-  uint64_t m_Outliers GUARDED_BY( m_Mutex ) = 0;    // set bits of the ring
+  uint64_t m_Outliers GUARDED_BY( m_Mutex ) = 0;   // set bits of the ring
   bool m_bLocked GUARDED_BY( m_Mutex ) = false;
 };
 

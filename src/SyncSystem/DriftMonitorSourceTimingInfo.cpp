@@ -36,7 +36,7 @@ VDeliveryStatistics ComputeDeliveryStatistics( std::vector<double> i_Offsets )
   }
   const size_t Rank = i_Offsets.size() < RecentMaximumRank ? 0 : RecentMaximumRank - 1;
   std::nth_element( i_Offsets.begin(), i_Offsets.begin() + static_cast<ptrdiff_t>( Rank ), i_Offsets.end(), std::greater<>() );
-  Statistics.m_RecentMaximum = i_Offsets[ Rank ];
+  Statistics.m_RecentMaximum = i_Offsets[Rank];
   return Statistics;
 }
 

@@ -20,13 +20,15 @@ struct VDeliveryStatistics
 // All zero for no offsets. Sorts its copy in part.
 VDeliveryStatistics ComputeDeliveryStatistics( std::vector<double> i_Offsets );
 
-template<class TMonitor> class VDriftMonitorSourceTimingInfo : public TMonitor
+template<class TMonitor>
+class VDriftMonitorSourceTimingInfo : public TMonitor
 {
 public:
   // Offsets that the statistics reach back over: ten seconds at 60 frames a second.
   static constexpr size_t WindowLength = 600;
 
-  template<class... TArgs> explicit VDriftMonitorSourceTimingInfo( const TArgs&... i_rArgs ) : TMonitor( i_rArgs... )
+  template<class... TArgs>
+  explicit VDriftMonitorSourceTimingInfo( const TArgs&... i_rArgs ) : TMonitor( i_rArgs... )
   {
     m_Offsets.reserve( WindowLength );
   }
@@ -75,7 +77,7 @@ protected:
     }
     else
     {
-      m_Offsets[ m_NextOffset ] = Offset;
+      m_Offsets[m_NextOffset] = Offset;
       m_NextOffset = ( m_NextOffset + 1 ) % WindowLength;
     }
     return true;

@@ -10,8 +10,8 @@ constexpr uint32_t Period25 = 5400000;
 struct VDeliveryTimes
 {
   double m_Start = 1000.0;
-  double m_Rate = 0.04;       // seconds per sample
-  double m_Jitter = 0.0;      // seconds, lateness is spread evenly over 0 to this
+  double m_Rate = 0.04;    // seconds per sample
+  double m_Jitter = 0.0;   // seconds, lateness is spread evenly over 0 to this
   std::mt19937_64 m_Random{ 7 };
 
   double operator()( uint64_t i_Sample )

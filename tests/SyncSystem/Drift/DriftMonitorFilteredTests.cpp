@@ -64,7 +64,7 @@ TEST_F( DriftMonitorFiltered, LeavesOutTheFirstOfTwoThatComeTogether )
 
 TEST_F( DriftMonitorFiltered, LocksAfterACleanWindowAndOpensWhenOutliersFillHalf )
 {
-  AddMany( 601 );                        // the first is in the filter from the start, the last is held
+  AddMany( 601 );   // the first is in the filter from the start, the last is held
   EXPECT_FALSE( m_Monitor.IsGateLocked() );
   AddMany( 1 );
   EXPECT_TRUE( m_Monitor.IsGateLocked() );
@@ -75,13 +75,14 @@ TEST_F( DriftMonitorFiltered, LocksAfterACleanWindowAndOpensWhenOutliersFillHalf
   AddMany( 299, 0.020 );
   EXPECT_TRUE( m_Monitor.IsGateLocked() );
   EXPECT_NEAR( Fit().m_Last.m_Time, 1000.0 + static_cast<double>( Fit().m_Last.m_Sample ) * 0.04, 1e-6 );
-  AddMany( 1, 0.020 );                   // the 300th outlier passes the gate
+  AddMany( 1, 0.020 );   // the 300th outlier passes the gate
   EXPECT_FALSE( m_Monitor.IsGateLocked() );
   EXPECT_EQ( Fit().m_Skipped, 300u );
 
   AddMany( 4000, 0.020 );
   EXPECT_EQ( Fit().m_Skipped, 300u );
-  EXPECT_NEAR( Fit().m_Last.m_Time, 1000.0 + static_cast<double>( Fit().m_Last.m_Sample ) * 0.04 + 0.020, 0.008 ) << "the fit follows, with the overshoot of a long memory";
+  EXPECT_NEAR( Fit().m_Last.m_Time, 1000.0 + static_cast<double>( Fit().m_Last.m_Sample ) * 0.04 + 0.020, 0.008 )
+    << "the fit follows, with the overshoot of a long memory";
 }
 
 TEST_F( DriftMonitorFiltered, ANewSessionOpensTheGate )
@@ -100,7 +101,7 @@ TEST_F( DriftMonitorFiltered, TellsTheDeliveryOffsetsOfTheWindow )
   EXPECT_FALSE( m_Monitor.GetTimingInfo( Info ) );
   AddMany( 1 );
   EXPECT_FALSE( m_Monitor.GetTimingInfo( Info ) );
-  AddMany( 700 );                        // locked: what follows does not touch the fit
+  AddMany( 700 );   // locked: what follows does not touch the fit
   for( int Count = 0; Count < 30; ++Count )
   {
     Add( 0.010 + Count * 0.001 );
@@ -113,7 +114,7 @@ TEST_F( DriftMonitorFiltered, TellsTheDeliveryOffsetsOfTheWindow )
   std::vector<double> Expected( VTimingMonitor::WindowLength, 0.0 );
   for( size_t Count = 0; Count < 30; ++Count )
   {
-    Expected[ Count ] = 0.010 + static_cast<double>( Count ) * 0.001;
+    Expected[Count] = 0.010 + static_cast<double>( Count ) * 0.001;
   }
   const double Mean = std::accumulate( Expected.begin(), Expected.end(), 0.0 ) / 600.0;
   double Variance = 0.0;

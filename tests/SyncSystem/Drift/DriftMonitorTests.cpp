@@ -19,8 +19,8 @@ struct VReferenceFilter
   VDriftMonitorConfiguration m_Configuration;
   long double m_Period = 0.04L;
   uint64_t m_Sample = 0;
-  long double m_X[ 2 ] = { 0.0L, 0.0L };
-  long double m_P[ 2 ][ 2 ] = { { 1.0L, 0.0L }, { 0.0L, 1.0L } };
+  long double m_X[2] = { 0.0L, 0.0L };
+  long double m_P[2][2] = { { 1.0L, 0.0L }, { 0.0L, 1.0L } };
   uint64_t m_Accepted = 0;
   long double m_Start = 0.0L;
   long double m_Best = 1e9L;
@@ -28,9 +28,9 @@ struct VReferenceFilter
   void Begin( uint64_t i_Sample, double i_Time )
   {
     m_Sample = i_Sample;
-    m_X[ 0 ] = i_Time;
-    m_X[ 1 ] = m_Period;
-    m_P[ 1 ][ 1 ] = m_Configuration.m_InitialRateVariance;
+    m_X[0] = i_Time;
+    m_X[1] = m_Period;
+    m_P[1][1] = m_Configuration.m_InitialRateVariance;
     m_Start = i_Time - i_Sample * m_Period;
   }
 
@@ -38,24 +38,24 @@ struct VReferenceFilter
   {
     const long double q = m_Configuration.m_ProcessNoise;
     const long double a = m_Period * m_Period / 2.0L;
-    m_X[ 0 ] += m_X[ 1 ];
-    const long double P00 = m_P[ 0 ][ 0 ] + m_P[ 0 ][ 1 ] + m_P[ 1 ][ 0 ] + m_P[ 1 ][ 1 ] + q * a * a;
-    const long double P01 = m_P[ 0 ][ 1 ] + m_P[ 1 ][ 1 ] + q * a * m_Period;
-    const long double P10 = m_P[ 1 ][ 0 ] + m_P[ 1 ][ 1 ] + q * a * m_Period;
-    m_P[ 1 ][ 1 ] += q * m_Period * m_Period;
-    m_P[ 0 ][ 0 ] = P00;
-    m_P[ 0 ][ 1 ] = P01;
-    m_P[ 1 ][ 0 ] = P10;
+    m_X[0] += m_X[1];
+    const long double P00 = m_P[0][0] + m_P[0][1] + m_P[1][0] + m_P[1][1] + q * a * a;
+    const long double P01 = m_P[0][1] + m_P[1][1] + q * a * m_Period;
+    const long double P10 = m_P[1][0] + m_P[1][1] + q * a * m_Period;
+    m_P[1][1] += q * m_Period * m_Period;
+    m_P[0][0] = P00;
+    m_P[0][1] = P01;
+    m_P[1][0] = P10;
   }
 
   void Add( uint64_t i_Sample, double i_Time )
   {
     const uint64_t Steps = i_Sample - m_Sample;
-    if( i_Time - m_X[ 0 ] > m_Configuration.m_GapFactor * m_Period * Steps )
+    if( i_Time - m_X[0] > m_Configuration.m_GapFactor * m_Period * Steps )
     {
-      m_P[ 0 ][ 0 ] = 1.0L;
-      m_P[ 0 ][ 1 ] = m_P[ 1 ][ 0 ] = 0.0L;
-      m_X[ 0 ] = i_Time - Steps * m_X[ 1 ];
+      m_P[0][0] = 1.0L;
+      m_P[0][1] = m_P[1][0] = 0.0L;
+      m_X[0] = i_Time - Steps * m_X[1];
       m_Best = 1e9L;
     }
     for( uint64_t Index = 0; Index < Steps; ++Index )
@@ -63,23 +63,23 @@ struct VReferenceFilter
       Step();
     }
     m_Sample = i_Sample;
-    const long double S = m_P[ 0 ][ 0 ] + m_Configuration.m_MeasurementNoise;
-    const long double K[ 2 ] = { m_P[ 0 ][ 0 ] / S, m_P[ 1 ][ 0 ] / S };
-    const long double Residual = i_Time - m_X[ 0 ];
-    m_X[ 0 ] += K[ 0 ] * Residual;
-    m_X[ 1 ] += K[ 1 ] * Residual;
-    const long double Row[ 2 ] = { m_P[ 0 ][ 0 ], m_P[ 0 ][ 1 ] };
+    const long double S = m_P[0][0] + m_Configuration.m_MeasurementNoise;
+    const long double K[2] = { m_P[0][0] / S, m_P[1][0] / S };
+    const long double Residual = i_Time - m_X[0];
+    m_X[0] += K[0] * Residual;
+    m_X[1] += K[1] * Residual;
+    const long double Row[2] = { m_P[0][0], m_P[0][1] };
     for( int Column = 0; Column < 2; ++Column )
     {
-      m_P[ 0 ][ Column ] -= K[ 0 ] * Row[ Column ];
-      m_P[ 1 ][ Column ] -= K[ 1 ] * Row[ Column ];
+      m_P[0][Column] -= K[0] * Row[Column];
+      m_P[1][Column] -= K[1] * Row[Column];
     }
     const long double Back = -static_cast<long double>( m_Sample );
-    const long double Uncertainty = m_P[ 0 ][ 0 ] + Back * ( m_P[ 0 ][ 1 ] + m_P[ 1 ][ 0 ] ) + Back * Back * m_P[ 1 ][ 1 ];
+    const long double Uncertainty = m_P[0][0] + Back * ( m_P[0][1] + m_P[1][0] ) + Back * Back * m_P[1][1];
     if( Uncertainty < m_Best )
     {
       m_Best = Uncertainty;
-      m_Start = m_X[ 0 ] + Back * m_X[ 1 ];
+      m_Start = m_X[0] + Back * m_X[1];
     }
   }
 };
@@ -122,9 +122,9 @@ TEST( DriftMonitor, FollowsTheFilterWrittenDownStepByStep )
       ASSERT_TRUE( Add( Monitor, Sample, Time ) );
       Reference.Add( Sample, Time );
       const VDriftMonitor::VFit Fit = FitOf( Monitor );
-      ASSERT_NEAR( Fit.m_Last.m_Time, static_cast<double>( Reference.m_X[ 0 ] ), 1e-9 ) << Count;
-      ASSERT_NEAR( Fit.m_Last.m_Rate, static_cast<double>( Reference.m_X[ 1 ] ), 1e-12 ) << Count;
-      ASSERT_NEAR( Fit.m_TimeVariance, static_cast<double>( Reference.m_P[ 0 ][ 0 ] ), 1e-12 ) << Count;
+      ASSERT_NEAR( Fit.m_Last.m_Time, static_cast<double>( Reference.m_X[0] ), 1e-9 ) << Count;
+      ASSERT_NEAR( Fit.m_Last.m_Rate, static_cast<double>( Reference.m_X[1] ), 1e-12 ) << Count;
+      ASSERT_NEAR( Fit.m_TimeVariance, static_cast<double>( Reference.m_P[0][0] ), 1e-12 ) << Count;
       ASSERT_NEAR( Fit.m_StartTime, static_cast<double>( Reference.m_Start ), 1e-7 ) << Count;
     }
     EXPECT_EQ( FitOf( Monitor ).m_Samples, 151u );
@@ -244,7 +244,7 @@ TEST( DriftMonitor, HistoryStaysWithinItsToleranceOfTheFilter )
   {
     double FromHistory = 0.0;
     ASSERT_TRUE( Monitor.GetSampleTime( Sample, FromHistory ) );
-    ASSERT_NEAR( FromHistory, Filtered[ Sample ], Configuration.m_SegmentTolerance + 1e-12 ) << Sample;
+    ASSERT_NEAR( FromHistory, Filtered[Sample], Configuration.m_SegmentTolerance + 1e-12 ) << Sample;
   }
 }
 
@@ -272,8 +272,8 @@ TEST( DriftMonitor, DumpNamesItsSettingsInOrder )
   Add( Monitor, 0, 1.0 );
   const std::string Text = Monitor.Dump();
   size_t Position = 0;
-  for( const char* pName : { "NominalSampleRateInTicks = 5400000", "ObservationModel = ", "SystemModel = ((1, 1), (0, 1))", "MeasurementNoise = ",
-         "ProcessNoise = ", "MinUncertaintyToUpdateStartTime = 1000000000" } )
+  for( const char* pName : { "NominalSampleRateInTicks = 5400000", "ObservationModel = ", "SystemModel = ((1, 1), (0, 1))",
+         "MeasurementNoise = ", "ProcessNoise = ", "MinUncertaintyToUpdateStartTime = 1000000000" } )
   {
     Position = Text.find( pName, Position );
     ASSERT_NE( Position, std::string::npos ) << pName << "\n" << Text;

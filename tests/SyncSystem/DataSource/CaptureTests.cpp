@@ -1,0 +1,332 @@
+#include "tests/SyncSystem/DataSource/TestSource.h"
+
+#include "tests/support/LogCapture.h"
+
+namespace
+{
+
+using SyncSystem::CaptureSessionType;
+using SyncSystem::ECaptureFailure;
+using SyncSystem::ECaptureState;
+using SyncSystem::EClientResult;
+
+const VTick CounterStart( 123456789 );
+
+// The global tick of frame i_Index of the first session.
+VTick At( int64_t i_Index ) { return CounterStart + Period * i_Index; }
+
+class DataSourceCaptures : public ::testing::Test
+{
+protected:
+  void SetUp() override
+  {
+    m_Client = m_Rig.m_pSource->Buffer()->RegisterClient( [] {} );
+    m_Rig.m_pSource->AddMany( 10 );
+    m_Rig.Join( 1, CounterStart );
+  }
+
+  bool Start( uint32_t i_Id, VTick i_Start, VTick i_End, bool i_bReserve = false, uint32_t i_Session = 1 )
+  {
+    bool bResult = false;
+    const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( i_Id ), "Take", 5, KVZ::VGlobalSyncSessionId( i_Session ) };
+    m_Rig.OnStrand( [&] { bResult = m_Rig.m_pSource->StartCapture( Header, i_Start, i_End, i_bReserve, 0 ); } );
+    return bResult;
+  }
+  KVZ::ICaptureStatus Status() { return m_Rig.m_pSource->GetCaptureStatus(); }
+  void EndAt( VTick i_End )
+  {
+    m_Rig.OnStrand( [&] { m_Rig.m_pSource->EndCapture( i_End ); } );
+  }
+
+  // What the client can read just now.
+  std::vector<int64_t> Drain()
+  {
+    std::vector<int64_t> Indices;
+    SyncSystem::VRefCountedToken Frame;
+    SyncSystem::VClientRead Read;
+    do {
+      m_Rig.m_pSource->Buffer()->ClientNextFrame( m_Client, Frame, Read );
+      if( Frame )
+      {
+        Indices.push_back( IndexOf( Frame ) );
+      }
+    } while( Read.m_Result == EClientResult::MoreToCome );
+    if( Read.m_Result == EClientResult::Finished )
+    {
+      m_Rig.m_pSource->Buffer()->ClientNextFrame( m_Client, Frame, Read );
+    }
+    return Indices;
+  }
+
+  static std::vector<int64_t> Range( int64_t i_First, int64_t i_End )
+  {
+    std::vector<int64_t> Indices;
+    for( int64_t Index = i_First; Index < i_End; ++Index )
+    {
+      Indices.push_back( Index );
+    }
+    return Indices;
+  }
+
+  VSourceRig m_Rig;
+  uint32_t m_Client = 0;
+};
+
+TEST_F( DataSourceCaptures, TakesTheFramesFromStartToBeforeEnd )
+{
+  const TestSupport::VLogCapture Log( "Hal.Test" );
+  ASSERT_TRUE( Start( 1, At( 2 ), At( 7 ) ) );
+  EXPECT_TRUE( Log.Has( "StartCapture: Local Start Tick is " + std::to_string( Period.Count() * 2 ) + ". (Lastest tick is " +
+    std::to_string( Period.Count() * 9 ) + ")" ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  EXPECT_EQ( Status().m_AvailableDuration, Period * 5 );
+  EXPECT_EQ( Drain(), Range( 2, 7 ) );
+  const KVZ::ICaptureStatus Done = Status();
+  EXPECT_EQ( Done.m_State, ECaptureState::Complete );
+  EXPECT_EQ( Done.m_Failure, ECaptureFailure::None );
+  EXPECT_EQ( Done.m_RequestedStart, At( 2 ) );
+  EXPECT_EQ( Done.m_Start, At( 2 ) );
+  EXPECT_EQ( Done.m_CapturedDuration, Period * 5 );
+  EXPECT_EQ( m_Rig.m_pSource->m_Busy, ( std::vector<bool>{ true, false } ) );
+}
+
+TEST_F( DataSourceCaptures, TicksBetweenFramesGoToTheNextFrame )
+{
+  ASSERT_TRUE( Start( 1, At( 2 ) + VTick( 1 ), At( 6 ) + VTick( 1 ) ) );
+  EXPECT_EQ( Drain(), Range( 3, 7 ) );
+  ASSERT_TRUE( Start( 2, At( 3 ) - VTick( 1 ), At( 7 ) - VTick( 1 ) ) );
+  EXPECT_EQ( Drain(), Range( 3, 7 ) );
+}
+
+TEST_F( DataSourceCaptures, ReachesFromThePastIntoTheFuture )
+{
+  ASSERT_TRUE( Start( 1, At( 5 ), At( 15 ) ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Capturing );
+  EXPECT_EQ( Drain(), Range( 5, 10 ) );
+  m_Rig.m_pSource->AddMany( 10 );
+  EXPECT_EQ( Drain(), Range( 10, 15 ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 10 );
+}
+
+TEST_F( DataSourceCaptures, WaitsForAStartInTheFuture )
+{
+  ASSERT_TRUE( Start( 1, At( 12 ), At( 15 ) ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::WaitingForStart );
+  m_Rig.m_pSource->AddMany( 2 );
+  EXPECT_EQ( Drain(), Range( 0, 0 ) );
+  m_Rig.m_pSource->AddMany( 5 );
+  EXPECT_EQ( Drain(), Range( 12, 15 ) );
+  EXPECT_EQ( Status().m_Start, At( 12 ) );
+}
+
+TEST_F( DataSourceCaptures, AnOpenEndIsClosedAtTheNewestFrameOrAtATick )
+{
+  ASSERT_TRUE( Start( 1, At( 8 ), VTick::Open() ) );
+  m_Rig.m_pSource->AddMany( 3 );
+  EXPECT_EQ( Status().m_CapturedDuration, VTick::Open() ) << "not known yet";
+  EndAt( VTick::Open() );
+  EXPECT_EQ( m_Rig.m_pSource->m_Ends, ( std::vector<VTick>{ Period * 12 } ) );
+  m_Rig.m_pSource->AddMany( 3 );
+  EXPECT_EQ( Drain(), Range( 8, 13 ) );
+
+  ASSERT_TRUE( Start( 2, At( 14 ), VTick::Open() ) );
+  EndAt( At( 18 ) );
+  m_Rig.m_pSource->AddMany( 5 );
+  EXPECT_EQ( Drain(), Range( 14, 18 ) );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 4 );
+}
+
+TEST_F( DataSourceCaptures, AStartBeforeTheOldestFrameIsClipped )
+{
+  m_Rig.m_pSource->AddMany( 300 );
+  SyncSystem::VToken Oldest;
+  ASSERT_TRUE( m_Rig.m_pSource->Buffer()->GetFirstToken( m_Rig.m_pSource->Buffer()->GetCurrentBufferSession(), Oldest ) );
+  const int64_t First = Oldest.m_FrameNumber - 1;
+  ASSERT_GT( First, 50 );
+  ASSERT_TRUE( Start( 1, At( 20 ), At( 305 ) ) );
+  EXPECT_EQ( Drain(), Range( First, 305 ) );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::None );
+  EXPECT_EQ( Status().m_RequestedStart, At( 20 ) );
+  EXPECT_EQ( Status().m_Start, At( First ) );
+}
+
+// The counter of the present sync session began in the middle of the buffer session.
+TEST_F( DataSourceCaptures, ReachesBackAcrossSyncSessionsOfTheSameRun )
+{
+  VSourceRig Rig;
+  const uint32_t Client = Rig.m_pSource->Buffer()->RegisterClient( [] {} );
+  Rig.m_pSource->m_Timecode = Period * 100;
+  Rig.m_pSource->AddMany( 10 );
+  Rig.m_pSource->m_Timecode = Period * 5000;   // the frame number goes on: a new sync session
+  Rig.m_pSource->AddMany( 10 );
+  Rig.Join( 1, CounterStart );   // of frame 10
+  EXPECT_EQ( Rig.m_pSource->Buffer()->GetCurrentBufferSession(), KVZ::VBufferSessionId( 1 ) );
+  const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) };
+  Rig.OnStrand( [&] { EXPECT_TRUE( Rig.m_pSource->StartCapture( Header, At( -6 ) + VTick( 5 ), At( 3 ), false, 0 ) ); } );
+  SyncSystem::VRefCountedToken Frame;
+  SyncSystem::VClientRead Read;
+  ASSERT_TRUE( Rig.m_pSource->Buffer()->ClientNextFrame( Client, Frame, Read ) );
+  EXPECT_EQ( IndexOf( Frame ), 5 );
+  EXPECT_EQ( Rig.m_pSource->GetCaptureStatus().m_Start, At( -5 ) );
+  EXPECT_EQ( Rig.m_pSource->GetCaptureStatus().m_CapturedDuration, Period * 8 );
+}
+
+TEST_F( DataSourceCaptures, AStatusStaysTrueAfterLaterSessionsAndEviction )
+{
+  ASSERT_TRUE( Start( 1, At( 4 ), At( 8 ) ) );
+  Drain();
+  m_Rig.m_pSource->Miss( 3 );
+  m_Rig.m_pSource->AddMany( 400 );
+  m_Rig.Join( 2, VTick( 5 ) );
+  const KVZ::ICaptureStatus Done = Status();
+  EXPECT_EQ( Done.m_State, ECaptureState::Complete );
+  EXPECT_EQ( Done.m_Start, At( 4 ) );
+  EXPECT_EQ( Done.m_CapturedDuration, Period * 4 );
+}
+
+TEST_F( DataSourceCaptures, ABreakInTheFramesEndsTheCaptureEarly )
+{
+  ASSERT_TRUE( Start( 1, At( 6 ), At( 30 ) ) );
+  m_Rig.m_pSource->AddMany( 2 );
+  m_Rig.m_pSource->Miss( 1 );
+  m_Rig.m_pSource->AddMany( 2 );
+  EXPECT_EQ( Drain(), Range( 6, 12 ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::EndedEarly );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 6 );
+}
+
+TEST_F( DataSourceCaptures, CancelsWhileWaitingAndWhileRunning )
+{
+  ASSERT_TRUE( Start( 1, At( 20 ), At( 30 ) ) );
+  m_Rig.OnStrand( [&] { m_Rig.m_pSource->CancelCapture(); } );
+  Drain();
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_Start, VTick::Open() );
+
+  ASSERT_TRUE( Start( 2, At( 5 ), At( 30 ) ) );
+  m_Rig.OnStrand( [&] { m_Rig.m_pSource->CancelCapture(); } );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelling );
+  Drain();
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::Cancelled );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 5 ) << "what there was when it was cancelled";
+  EXPECT_EQ( m_Rig.m_pSource->m_CancelledCaptures, ( std::vector<uint32_t>{ 1, 2 } ) );
+}
+
+TEST_F( DataSourceCaptures, AReservationBecomesAStreamedCaptureOfTheSameId )
+{
+  const TestSupport::VLogCapture Log( "Hal.Test" );
+  ASSERT_TRUE( Start( 1, At( 3 ), VTick::Open(), true ) );
+  EXPECT_TRUE( Log.Has( "Attempting to reserve capture from buffer entry 4 (First entry is 1)" ) );
+  EXPECT_TRUE( Log.Has( "Reserved capture from tick " + std::to_string( At( 3 ).Count() ) + " (buffer entry 4)" ) );
+  EXPECT_TRUE( m_Rig.m_pSource->m_Begun.empty() );
+  EXPECT_EQ( Drain(), Range( 0, 0 ) );
+  m_Rig.m_pSource->AddMany( 5 );
+  ASSERT_TRUE( Start( 1, At( 3 ), At( 13 ) ) );
+  EXPECT_EQ( m_Rig.m_pSource->m_Begun, ( std::vector<uint32_t>{ 1 } ) );
+  EXPECT_EQ( Drain(), Range( 3, 13 ) );
+}
+
+TEST_F( DataSourceCaptures, RefusesAnotherWhileOneIsRunning )
+{
+  EXPECT_FALSE( Start( 0, At( 2 ), At( 4 ) ) );
+  ASSERT_TRUE( Start( 1, At( 2 ), At( 20 ) ) );
+  EXPECT_FALSE( Start( 2, At( 2 ), At( 20 ) ) );
+  EXPECT_FALSE( Start( 1, At( 2 ), At( 20 ) ) );
+  EXPECT_EQ( m_Rig.m_pSource->m_Begun, ( std::vector<uint32_t>{ 1 } ) ) << "the running capture's preparation is not disturbed";
+  EXPECT_EQ( Status().m_State, ECaptureState::Capturing );
+}
+
+TEST_F( DataSourceCaptures, FailuresOfThePreparationReachTheStatus )
+{
+  m_Rig.m_pSource->m_BeginErrors = { { 8, "no folder" } };
+  ASSERT_TRUE( Start( 1, At( 2 ), At( 5 ) ) );
+  EXPECT_EQ( Drain(), Range( 2, 5 ) );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "no folder" } ) );
+
+  m_Rig.m_pSource->m_bBegins = false;
+  ASSERT_TRUE( Start( 2, At( 2 ), At( 5 ) ) );
+  EXPECT_EQ( Drain(), Range( 0, 0 ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Idle );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+}
+
+TEST_F( DataSourceCaptures, ARangeThatCannotBeHadFailsWithItsFlag )
+{
+  for( const auto& [Id, StartTick, EndTick, Session] :
+    { std::tuple( 1u, At( 2 ), At( 5 ), 99u ), std::tuple( 2u, VTick::Open(), VTick::Open(), 1u ), std::tuple( 3u, At( 5 ), At( 4 ), 1u ) } )
+  {
+    ASSERT_TRUE( Start( Id, StartTick, EndTick, false, Session ) ) << Id;
+    EXPECT_EQ( Status().m_State, ECaptureState::Idle ) << Id;
+    EXPECT_EQ( Status().m_Failure, ECaptureFailure::StartLost ) << Id;
+    EXPECT_EQ( Status().m_Start, VTick::Open() ) << Id;
+  }
+}
+
+TEST( DataSourceMemory, ExhaustionEndsTheCaptureAndRefusesFramesUntilItIsDrained )
+{
+  VSourceRig Rig( 40 );
+  VTestSource& rSource = *Rig.m_pSource;
+  const uint32_t Client = rSource.Buffer()->RegisterClient( [] {} );
+  rSource.AddMany( 8 );
+  Rig.Join( 1, CounterStart );
+  const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) };
+  Rig.OnStrand( [&] { EXPECT_TRUE( rSource.StartCapture( Header, At( 0 ), VTick::Open(), false, 0 ) ); } );
+  int64_t Stored = 8;
+  while( rSource.Add() )
+  {
+    ASSERT_LT( ++Stored, 100 );
+  }
+  EXPECT_EQ( rSource.GetCaptureStatus().m_State, ECaptureState::Captured );
+  EXPECT_EQ( rSource.GetCaptureStatus().m_Failure, ECaptureFailure::MemoryExhausted );
+  EXPECT_EQ( rSource.GetCaptureStatus().m_CapturedDuration, Period * Stored );
+  EXPECT_GT( rSource.GetCaptureStatus().m_BufferFill, 0.9 );
+
+  SyncSystem::VRefCountedToken Frame;
+  SyncSystem::VClientRead Read;
+  for( int64_t Index = 0; Index < Stored; ++Index )
+  {
+    EXPECT_FALSE( rSource.Add() ) << "not before the last frame is written, though there is room";
+    ASSERT_TRUE( rSource.Buffer()->ClientNextFrame( Client, Frame, Read ) );
+    ASSERT_EQ( IndexOf( Frame ), Index );
+  }
+  rSource.Buffer()->ClientNextFrame( Client, Frame, Read );
+  EXPECT_EQ( rSource.GetCaptureStatus().m_State, ECaptureState::Complete );
+  EXPECT_TRUE( rSource.Add() );
+  const auto Status = Rig.SyncStatus();
+  EXPECT_EQ( Status.m_RefusedFrames, static_cast<uint64_t>( Stored ) + 1 );
+  EXPECT_EQ( Status.m_Session.m_Id, 2u ) << "what follows the gap is another session";
+}
+
+// A device that finds no memory delivers nothing, and its frame count goes on as if nothing had been lost.
+TEST( DataSourceMemory, AFrameThatFoundNoMemoryBreaksTheRun )
+{
+  VSourceRig Rig( 40 );
+  Rig.m_pSource->AddMany( 20 );
+  std::vector<SyncSystem::VRefCountedToken> Pinned( 20 );
+  SyncSystem::VToken Token;
+  ASSERT_TRUE( Rig.m_pSource->Buffer()->GetFirstToken( KVZ::VBufferSessionId( 1 ), Token ) );
+  for( auto& rFrame : Pinned )
+  {
+    ASSERT_TRUE( Rig.m_pSource->Buffer()->Read( Token, rFrame ) );
+    Rig.m_pSource->Buffer()->Advance( Token, 1 );
+  }
+  std::vector<void*> Blocks;
+  while( void* pBlock = Rig.m_Memory.m_pAllocator->Allocate( Rig.m_Memory.m_pAllocator->MaxAllocation() ) )
+  {
+    Blocks.push_back( pBlock );
+  }
+  EXPECT_EQ( Rig.SyncStatus().m_RefusedFrames, 1u );
+  for( void* pBlock : Blocks )
+  {
+    Rig.m_Memory.m_pAllocator->Free( pBlock );
+  }
+  Pinned.clear();
+  ASSERT_TRUE( Rig.m_pSource->Add() );
+  EXPECT_EQ( Rig.SyncStatus().m_Session.m_Id, 2u );
+}
+
+}

@@ -1,0 +1,145 @@
+#include "tests/SyncSystem/DataSource/TestSource.h"
+
+#include "tests/support/LogCapture.h"
+
+namespace
+{
+
+using SyncSystem::EReadResult;
+using SyncSystem::VReadFrames;
+
+constexpr uint64_t Plenty = 1000;
+
+std::vector<int64_t> Indices( const VReadFrames& i_rRead )
+{
+  std::vector<int64_t> Indices;
+  for( const auto& rFrame : i_rRead.m_Frames )
+  {
+    Indices.push_back( IndexOf( rFrame.m_Frame ) );
+  }
+  return Indices;
+}
+
+TEST( DataSourceReading, GivesEachFrameOnceFromTheFirstAtOrAfterTheStart )
+{
+  VSourceRig Rig;
+  VReadFrames Read;
+  EXPECT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::None ) << "no session";
+  Rig.m_pSource->AddMany( 5 );
+  const auto Session = Rig.Declare( 1 );
+  ASSERT_TRUE( Session );
+  EXPECT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::None ) << "declared and not started";
+
+  const VTick Start( 1000000007 );
+  Rig.m_pSource->StartGlobalSyncSession( Rig.ReadingsAt( *Session, Start, Start + Period * 2 + VTick( 1 ) ), VTick() );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 3, 4 } ) ) << "one tick after frame 2";
+  EXPECT_EQ( Read.m_Frames[0].m_Tick, Start + Period * 3 );
+  EXPECT_EQ( Read.m_Frames[1].m_GlobalSession, KVZ::VGlobalSyncSessionId( 1 ) );
+  EXPECT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::None );
+  Rig.m_pSource->AddMany( 1 );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 5 } ) );
+}
+
+TEST( DataSourceReading, WaitsForAStartThatLiesAhead )
+{
+  VSourceRig Rig;
+  Rig.m_pSource->AddMany( 1 );
+  Rig.Join( 1, VTick( 0 ), Period * 3 );
+  VReadFrames Read;
+  Rig.m_pSource->AddMany( 2 );
+  EXPECT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::None );
+  Rig.m_pSource->AddMany( 1 );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 3 } ) );
+}
+
+TEST( DataSourceReading, ThinsABacklogAndSaysSo )
+{
+  VSourceRig Rig;
+  Rig.m_pSource->m_BeatPeriod = Period;
+  Rig.m_pSource->AddMany( 1 );
+  Rig.Join( 1, VTick( 0 ) );
+  Rig.m_pSource->AddMany( 39 );
+  const TestSupport::VLogCapture Log( "Hal.Test" );
+  VReadFrames Read;
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( 10, Read ), EReadResult::Frames );
+  ASSERT_EQ( Read.m_Frames.size(), 40u );
+  EXPECT_EQ( std::count_if( Read.m_Frames.begin(), Read.m_Frames.end(), []( const auto& i_rFrame ) { return i_rFrame.m_DropRun == 0; } ), 10 );
+  EXPECT_EQ( Read.m_Beat.m_Period, Period );
+  EXPECT_TRUE( Log.Has( "Backlog is 40 frames long" ) );
+  EXPECT_TRUE( Log.Has( "Evenly dropped 30 frames" ) );
+}
+
+TEST( DataSourceReading, AReaderThatWasAwayFindsTheOldestFrameAtItsTrueTime )
+{
+  VSourceRig Rig( 40 );
+  Rig.m_pSource->AddMany( 1 );
+  Rig.Join( 1, VTick( 500 ) );
+  Rig.m_pSource->AddMany( 300 );
+  VReadFrames Read;
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  ASSERT_LE( Read.m_Frames.size(), 40u );
+  for( const auto& rFrame : Read.m_Frames )
+  {
+    ASSERT_EQ( rFrame.m_Tick, VTick( 500 ) + Period * IndexOf( rFrame.m_Frame ) );
+  }
+  EXPECT_EQ( IndexOf( Read.m_Frames.back().m_Frame ), 300 );
+}
+
+TEST( DataSourceReading, ChangesOverWhenANewSessionHasStarted )
+{
+  VSourceRig Rig;
+  Rig.m_pSource->AddMany( 3 );
+  Rig.Join( 1, VTick( 0 ) );
+  VReadFrames Read;
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  Rig.m_pSource->Miss( 5 );
+  Rig.m_pSource->AddMany( 4 );
+  EXPECT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::None ) << "frames of a session that is not declared yet";
+  Rig.Join( 2, Period * 8, Period * 10 );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 10, 11 } ) );
+  EXPECT_EQ( Read.m_Frames[0].m_Tick, Period * 10 );
+  EXPECT_EQ( Read.m_pInfo->m_Id, KVZ::VGlobalSyncSessionId( 2 ) );
+}
+
+TEST( DataSourceReading, TellsTheTimecodeOfItsFirstPosition )
+{
+  VSourceRig Rig;
+  Rig.m_pSource->m_Timecode = Period * ( 25 * 3600 );   // 01:00:00:00
+  Rig.m_pSource->AddMany( 10 );
+  Rig.Join( 1, VTick( 777 ), VTick( 777 ) + Period * 4 );
+  VReadFrames Read;
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( KVZ::ToText( Read.m_FirstTimecode ), "01:00:00:04" );
+  Rig.m_pSource->AddMany( 3 );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
+  EXPECT_EQ( KVZ::ToText( Read.m_FirstTimecode ), "01:00:00:10" );
+}
+
+TEST( DataSourceReading, TheNextFrameWakesASleeperOnceWithItsToken )
+{
+  VSourceRig Rig;
+  std::vector<uint64_t> Woken;
+  Rig.m_pSource->OnNewFrames().Set( [&]( uint64_t i_Token ) { Woken.push_back( i_Token ); } );
+  Rig.m_pSource->AddMany( 1 );
+  Rig.Join( 1, VTick( 0 ) );
+  VReadFrames Read;
+  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 41, Read ), EReadResult::Frames );
+  Rig.m_pSource->AddMany( 1 );
+  Rig.m_pService->RunAll();
+  EXPECT_TRUE( Woken.empty() ) << "nobody slept";
+
+  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 42, Read ), EReadResult::Frames );
+  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 43, Read ), EReadResult::Asleep );
+  Rig.m_pSource->AddMany( 2 );
+  EXPECT_TRUE( Woken.empty() ) << "the wake goes through the strand";
+  Rig.m_pService->RunAll();
+  EXPECT_EQ( Woken, ( std::vector<uint64_t>{ 43 } ) );
+  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 44, Read ), EReadResult::Frames );
+  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 2, 3 } ) );
+}
+
+}
