@@ -1,0 +1,289 @@
+// How a video input reacts to its device, its user and the system.
+#include "tests/StageCorePluginVideoInput/Parameters/HandlerFixture.h"
+
+#include "Core/VideoInterface/Schemas.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
+
+namespace
+{
+
+using EStatus = VideoInputHAL::IVideoInputDevice::EStatus;
+using KVZ::IAudioSampleFormat;
+using KVZ::IGenlockStandard;
+using KVZ::IPixelFormat;
+using KVZ::ITimecodeSource;
+using KVZ::IVideoStandard;
+using KVZ::Variant;
+using Labels = std::vector<std::string>;
+using VReactions = VHandlerFixture;
+namespace Keys = DeviceSchemas::VideoInput;
+
+KVZ::ITimecode Timecode( int32_t i_Standard, uint8_t i_Minutes, uint8_t i_Seconds, uint8_t i_Frames )
+{
+  KVZ::ITimecode Timecode;
+  Timecode.m_Standard = i_Standard;
+  Timecode.m_Minutes = i_Minutes;
+  Timecode.m_Seconds = i_Seconds;
+  Timecode.m_Frames = i_Frames;
+  return Timecode;
+}
+
+}
+
+TEST_F( VReactions, EnabledStartsAndStopsTheDevice )
+{
+  m_pDevice->SetSignal( IVideoStandard::EHD_1920_1080P_2500 );
+  Create();
+  ASSERT_EQ( m_pDevice->m_Starts.size(), 1u );
+  EXPECT_EQ( m_pDevice->m_Starts[0],
+    ( TestSupport::VFakeVideoInputDevice::VSettings{ m_pDevice->GetPixelFormat(), ITimecodeSource::EAny, IAudioSampleFormat::EInt16, 16 } ) );
+  EXPECT_EQ( Value<EStatus::Enum>( "Status" ), EStatus::ECapturing );
+  EXPECT_EQ( m_pSource->m_Enabled, true );
+
+  Set( "Enabled", true );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
+  Set( "Enabled", false );
+  EXPECT_EQ( m_pDevice->m_Stops, 1 );
+  EXPECT_EQ( Value<EStatus::Enum>( "Status" ), EStatus::EReady );
+  EXPECT_EQ( m_pSource->m_Enabled, false );
+  Set( "Enabled", false );
+  EXPECT_EQ( m_pDevice->m_Stops, 1 );
+  Set( "Enabled", true );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 2u );
+}
+
+TEST_F( VReactions, EnabledSettlesOnlyAfterTheDeviceHasBeenTold )
+{
+  Create();
+  int Settled = 0;
+  m_pHandler->GetParameter( "Enabled" )
+    ->GetValueChangedCallback()
+    .AddImmediate(
+      [&]
+      {
+        ++Settled;
+        EXPECT_EQ( m_pDevice->m_Stops, 1 );
+      } );
+  m_pHandler->GetParameter( "Enabled" )->SetValue( Variant::Make( false ) );
+  EXPECT_EQ( Settled, 0 );
+  EXPECT_FALSE( VDataReader( *m_pStore ).IsSettled( DeviceSchemas::Enabled( m_Device ) ) );
+  m_pService->RunAll();
+  EXPECT_EQ( Settled, 1 );
+}
+
+TEST_F( VReactions, EnabledTellsTheWishAndStatusTheFact )
+{
+  m_pDevice->m_bRefuseStart = true;
+  Create();
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
+  EXPECT_TRUE( Value<bool>( "Enabled" ) );
+  EXPECT_TRUE( VDataReader( *m_pStore ).IsSettled( DeviceSchemas::Enabled( m_Device ) ) );
+  EXPECT_EQ( Value<EStatus::Enum>( "Status" ), EStatus::EReady );
+  EXPECT_FALSE( m_pHandler->StartCapture() );
+  m_pDevice->m_bRefuseStart = false;
+  Set( "Enabled", true );
+  EXPECT_EQ( Value<EStatus::Enum>( "Status" ), EStatus::ECapturing );
+}
+
+TEST_F( VReactions, AChangedFormatRestartsAStreamingDeviceAndNoOther )
+{
+  Create();
+  ASSERT_EQ( m_pDevice->m_Starts.size(), 1u ) << "the defaults restart nothing";
+  Set( "AudioChannelCount", uint32_t{ 2 } );
+  Set( "AudioSampleFormat", IAudioSampleFormat::EInt32 );
+  Set( "TimecodeSource", ITimecodeSource::ERP188_LTC );
+  Set( "PixelFormat", *m_pDevice->m_PixelFormats.begin() );
+  ASSERT_EQ( m_pDevice->m_Starts.size(), 5u );
+  EXPECT_EQ( m_pDevice->m_Starts.back(),
+    ( TestSupport::VFakeVideoInputDevice::VSettings{ *m_pDevice->m_PixelFormats.begin(), ITimecodeSource::ERP188_LTC, IAudioSampleFormat::EInt32,
+      2 } ) );
+  Set( "AudioChannelCount", uint32_t{ 2 } );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 5u ) << "the same value is no change";
+
+  Set( "Enabled", false );
+  Set( "AudioChannelCount", uint32_t{ 8 } );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 5u );
+  EXPECT_TRUE( m_pHandler->StartCapture() );
+  EXPECT_EQ( m_pDevice->m_Starts.back().m_AudioChannels, 8u );
+  EXPECT_TRUE( m_pHandler->StopCapture() );
+}
+
+TEST_F( VReactions, WhatIsNotOfferedIsRefused )
+{
+  Create();
+  EXPECT_FALSE( Set( "PixelFormat", IPixelFormat::ELuminance8 ) );
+  EXPECT_FALSE( Set( "AudioChannelCount", uint32_t{ 3 } ) );
+  EXPECT_FALSE( Set( "AudioSampleRate", uint32_t{ 44100 } ) );
+  EXPECT_FALSE( Set( "Status", EStatus::EUnavailable ) );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
+}
+
+TEST_F( VReactions, ADeviceIsNotStartedWithoutAPixelFormat )
+{
+  Create();
+  const size_t Starts = m_pDevice->m_Starts.size();
+  Save( Keys::PixelFormat( m_Device ), 1.5 );
+  EXPECT_FALSE( m_pHandler->StartCapture() );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), Starts );
+}
+
+TEST_F( VReactions, OtherSettingsOfAnotherTypeStartWithTheirFallbacks )
+{
+  Create();
+  Set( "Enabled", false );
+  Save( Keys::TimecodeSource( m_Device ), 1.5 );
+  Save( Keys::AudioSampleFormat( m_Device ), 1.5 );
+  Save( Keys::AudioChannelCount( m_Device ), 1.5 );
+  EXPECT_TRUE( m_pHandler->StartCapture() );
+  EXPECT_EQ( m_pDevice->m_Starts.back(),
+    ( TestSupport::VFakeVideoInputDevice::VSettings{ m_pDevice->GetPixelFormat(), ITimecodeSource::EUnspecified, IAudioSampleFormat::Enum{}, 0 } ) );
+}
+
+TEST_F( VReactions, PixelFormatsFollowTheDevice )
+{
+  Create();
+  m_pDevice->SetPixelFormats( { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ELuminance8 } );
+  m_pService->RunAll();
+  Labels Expected;
+  for( const auto Format : m_pDevice->m_PixelFormats )
+  {
+    Expected.push_back( ToName( Format ) );
+  }
+  EXPECT_EQ( LabelsOf( "PixelFormat" ), Expected );
+  EXPECT_GT( m_pDevice->m_PixelFormats.count( Value<IPixelFormat::Enum>( "PixelFormat" ) ), 0u );
+
+  m_pDevice->SetPixelFormats( {} );
+  m_pService->RunAll();
+  EXPECT_EQ( LabelsOf( "PixelFormat" ), Expected ) << "an empty list changes nothing";
+}
+
+TEST_F( VReactions, AValueThatIsNoLongerOfferedGivesWayToTheFirst )
+{
+  m_pDevice->m_PixelFormats = { IPixelFormat::EU8Y8V8Y8 };
+  Create();
+  m_pDevice->SetPixelFormats( { IPixelFormat::ER8G8B8, IPixelFormat::ELuminance8 } );
+  m_pService->RunAll();
+  EXPECT_EQ( Value<IPixelFormat::Enum>( "PixelFormat" ), *m_pDevice->m_PixelFormats.begin() );
+  EXPECT_EQ( m_pDevice->m_Starts.back().m_PixelFormat, *m_pDevice->m_PixelFormats.begin() ) << "and the device restarts with it";
+}
+
+TEST_F( VReactions, TheTimecodeSourceDefaultsToTheWidestThatThereIs )
+{
+  using E = ITimecodeSource;
+  struct VCase
+  {
+    std::set<E::Enum> m_Sources;
+    E::Enum m_Default;
+  };
+  for( const VCase& rCase : { VCase{ { E::ERP188_LTC, E::ERP188_Any, E::EAny }, E::EAny }, VCase{ { E::ERP188_LTC, E::ERP188_Any }, E::ERP188_Any },
+         VCase{ { E::EVITC_Field2, E::ESerial }, E::EVITC_Field2 } } )
+  {
+    VDataWriter( *m_pStore ).RemoveValue( Keys::TimecodeSource( m_Device ) );
+    m_pDevice->m_TimecodeSources = rCase.m_Sources;
+    Create();
+    EXPECT_EQ( Value<E::Enum>( "TimecodeSource" ), rCase.m_Default );
+  }
+}
+
+TEST_F( VReactions, TimecodeIsReceivedOrNotDetected )
+{
+  Create();
+  EXPECT_EQ( Value<std::string>( "TimecodeStandard" ), "Not Detected" );
+  struct VCase
+  {
+    KVZ::ITimecode m_Timecode;
+    const char* m_pText;
+  };
+  for( const VCase& rCase : { VCase{ Timecode( 2, 59, 59, 24 ), "Receiving 25 fps" }, VCase{ Timecode( 2, 59, 59, 25 ), "Not Detected" },
+         VCase{ Timecode( 5, 10, 0, 0 ), "Receiving 29.97 fps DF" }, VCase{ Timecode( 5, 11, 0, 1 ), "Not Detected" },
+         VCase{ Timecode( -1, 0, 0, 0 ), "Not Detected" } } )
+  {
+    m_pDevice->SetTimecode( rCase.m_Timecode );
+    m_pService->RunAll();
+    EXPECT_EQ( Value<std::string>( "TimecodeStandard" ), rCase.m_pText );
+  }
+}
+
+TEST_F( VReactions, TheTimeOffsetIsAWholeNumberOfMasterBeats )
+{
+  Create();
+  Set( "TimeOffsetTicks", int64_t{ 3000000 } );
+  EXPECT_FALSE( m_pSource->m_Adjustment ) << "there is no master clock";
+  m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  m_pService->RunAll();
+  EXPECT_EQ( m_pSource->m_Adjustment, 2 * 1350000 );
+  Set( "TimeOffsetTicks", int64_t{ -2025000 } );
+  EXPECT_EQ( m_pSource->m_Adjustment, -2 * 1350000 ) << "halves go away from zero";
+  m_pSources->SetMasterPeriod( KVZ::VTick( 2252250 ) );
+  m_pService->RunAll();
+  EXPECT_EQ( m_pSource->m_Adjustment, -2252250 );
+  m_pSources->SetMasterPeriod( KVZ::VTick( 0 ) );
+  m_pService->RunAll();
+  EXPECT_EQ( m_pSource->m_Adjustment, -2252250 );
+}
+
+TEST_F( VReactions, UseOfTimecodeReachesTheSource )
+{
+  Create();
+  Set( "UseTimecodeForSync", false );
+  EXPECT_EQ( m_pSource->m_UseTimecode, false );
+  Set( "UseTimecodeForSync", true );
+  EXPECT_EQ( m_pSource->m_UseTimecode, true );
+}
+
+TEST_F( VReactions, AFrameRateThatCannotLockIsToldToTheUser )
+{
+  const VDataPath& rGenlock = DeviceSchemas::Gn6System::GenlockStandard();
+  const VDataPath& rRate = DeviceSchemas::Gn6System::FrameRateActual();
+  m_pDevice->SetSignal( IVideoStandard::EHD_1920_1080P_2398 );
+  Create();
+  EXPECT_EQ( Warning(),
+    "The system rate (0.00 Hz) is incompatible with this video input's frame rate (23.98 Hz). Disable the input, or change the "
+    "system frame rate to multiple of a standard SDI base rate." );
+  Save( rGenlock, IGenlockStandard::EGenlockStandardVESA60 );
+  EXPECT_EQ( Warning(),
+    "The genlock standard (60.00 Hz) is incompatible with this video input's frame rate (23.98 Hz).  Disable the video input, "
+    "or change the genlock standard to a compatible rate." );
+  Set( "Enabled", false );
+  EXPECT_EQ( Warning(), "" );
+  Set( "Enabled", true );
+  EXPECT_NE( Warning(), "" );
+  SetSignal( IVideoStandard::EUnspecified );
+  EXPECT_EQ( Warning(), "" );
+
+  Save( rGenlock, IGenlockStandard::EGenlockStandardNTSC );
+  SetSignal( IVideoStandard::EHD_1920_1080P_5994 );
+  EXPECT_EQ( Warning(), "" );
+  Save( rGenlock, IGenlockStandard::EGenlockStandardNone );
+  Save( rRate, 100.0 );
+  SetSignal( IVideoStandard::EHD_1920_1080P_2500 );
+  EXPECT_EQ( Warning(), "" );
+  Save( rRate, 120.0 );
+  EXPECT_EQ( Warning().find( "The system rate (120.00 Hz) is incompatible with this video input's frame rate (25.00 Hz)." ), 0u );
+  Save( rGenlock, std::string( "PAL" ) );
+  EXPECT_NE( Warning(), "" ) << "a genlock of another type counts as none";
+}
+
+TEST_F( VReactions, AStandardWithoutAPeriodAlwaysWarns )
+{
+  Save( DeviceSchemas::Gn6System::FrameRateActual(), 30.0 );
+  m_pDevice->SetSignal( IVideoStandard::EHD_2048_1556PSF_1500 );
+  Create();
+  EXPECT_NE( Warning().find( "frame rate (0.00 Hz)" ), std::string::npos );
+}
+
+TEST_F( VReactions, NothingReactsOnceTheHandlerHasGone )
+{
+  Create();
+  m_pDevice->SetSignal( IVideoStandard::EHD_1920_1080P_2500 );
+  VDataWriter( *m_pStore ).SetValue( DeviceSchemas::Enabled( m_Device ), Variant::Make( false ) );
+  m_pHandler.reset();
+  m_pService->RunAll();
+  EXPECT_EQ( m_pDevice->m_Stops, 0 );
+  EXPECT_TRUE( m_pRegistry->m_Groups.empty() );
+  EXPECT_EQ( m_pDevice->GetVideoStandardChangedCallback().Count(), 0u );
+  m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  m_pDevice->SetPixelFormats( { IPixelFormat::ELuminance8 } );
+  m_pTargets->SetAliases( {} );
+  m_pService->RunAll();
+}

@@ -1,0 +1,113 @@
+#include "StageCorePluginVideoInput/FrameRateCheck.h"
+
+#include "Core/VideoInterface/VideoStandard.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+#include <map>
+#include <optional>
+
+namespace
+{
+
+using KVZ::IGenlockStandard;
+using KVZ::IVideoStandard;
+
+// A rate in exact frames a second
+struct VRate
+{
+  int64_t m_Numerator;
+  int64_t m_Denominator;
+};
+
+// From the name alone: the digits behind the scan letters are hundredths of the rate, of fields where the letter is I.
+std::optional<VRate> RateFromName( const std::string& i_rName )
+{
+  static const std::map<std::string, VRate> s_Rates = { { "2398", { 24000, 1001 } }, { "2400", { 24, 1 } }, { "2500", { 25, 1 } },
+    { "2997", { 30000, 1001 } }, { "3000", { 30, 1 } }, { "4800", { 48, 1 } }, { "5000", { 50, 1 } }, { "5994", { 60000, 1001 } },
+    { "6000", { 60, 1 } } };
+  const size_t Split = i_rName.rfind( '_' );
+  if( Split == std::string::npos || s_Rates.count( i_rName.substr( Split + 1 ) ) == 0 )
+  {
+    return {};
+  }
+  VRate Rate = s_Rates.at( i_rName.substr( Split + 1 ) );
+  Rate.m_Denominator *= i_rName[Split - 1] == 'I' ? 2 : 1;
+  return Rate;
+}
+
+std::optional<VRate> RateOfGenlock( int i_Genlock )
+{
+  static const std::map<int, VRate> s_Rates = { { 1, { 50, 1 } }, { 2, { 60000, 1001 } }, { 3, { 24, 1 } }, { 4, { 24000, 1001 } }, { 5, { 30, 1 } },
+    { 6, { 50, 1 } }, { 7, { 60, 1 } }, { 8, { 100, 1 } }, { 9, { 120, 1 } }, { 10, { 200, 1 } }, { 11, { 24000, 1001 } }, { 12, { 24, 1 } },
+    { 13, { 25, 1 } }, { 14, { 30000, 1001 } }, { 15, { 30, 1 } }, { 16, { 120, 1 } } };
+  const auto Found = s_Rates.find( i_Genlock );
+  return Found == s_Rates.end() ? std::optional<VRate>() : Found->second;
+}
+
+bool IsWholeMultiple( const VRate& i_rRate, const VRate& i_rBase )
+{
+  return ( i_rRate.m_Numerator * i_rBase.m_Denominator ) % ( i_rRate.m_Denominator * i_rBase.m_Numerator ) == 0;
+}
+
+// Both rates are whole multiples of one SDI base rate.
+bool CanLock( const VRate& i_rA, const VRate& i_rB )
+{
+  for( const VRate& rBase : { VRate{ 30, 1 }, VRate{ 30000, 1001 }, VRate{ 25, 1 }, VRate{ 24, 1 }, VRate{ 24000, 1001 } } )
+  {
+    if( IsWholeMultiple( i_rA, rBase ) && IsWholeMultiple( i_rB, rBase ) )
+    {
+      return true;
+    }
+  }
+  return false;
+}
+
+}
+
+TEST( FrameRateCheck, AgreesWithExactArithmeticForAllStandardsAndGenlocks )
+{
+  int Compatible = 0;
+  for( int Value = 0; Value < KVZ::VideoStandardCount; ++Value )
+  {
+    const auto Standard = static_cast<IVideoStandard::Enum>( Value );
+    const auto VideoRate = RateFromName( ToName( Standard ) );
+    for( int Genlock = 1; Genlock <= 16; ++Genlock )
+    {
+      SCOPED_TRACE( ToName( Standard ) + " with genlock " + std::to_string( Genlock ) );
+      const int64_t GenlockPeriod = FrameRateCheck::GenlockPeriod( static_cast<IGenlockStandard::Enum>( Genlock ) );
+      const bool bExpected = VideoRate && CanLock( *VideoRate, *RateOfGenlock( Genlock ) );
+      EXPECT_EQ( FrameRateCheck::AreCompatible( GenlockPeriod, KVZ::GetFramePeriod( Standard ) ), bExpected );
+      Compatible += bExpected ? 1 : 0;
+    }
+  }
+  EXPECT_GT( Compatible, 100 );
+}
+
+TEST( FrameRateCheck, AnUnknownGenlockCountsAsFiftyHertz )
+{
+  EXPECT_EQ( FrameRateCheck::GenlockPeriod( static_cast<IGenlockStandard::Enum>( 99 ) ), 2700000 );
+}
+
+TEST( FrameRateCheck, AFreeSystemsRateGivesTheNearestPeriod )
+{
+  EXPECT_EQ( FrameRateCheck::SystemPeriod( 100.0 ), 1350000 );
+  EXPECT_EQ( FrameRateCheck::SystemPeriod( 60000.0 / 1001.0 ), 2252250 );
+  EXPECT_EQ( FrameRateCheck::SystemPeriod( 24000.0 / 1001.0 ), 5630625 );
+  EXPECT_EQ( FrameRateCheck::SystemPeriod( 70000.0 ), 1929 );
+  for( const double Unusable : { 0.0, -0.0, std::nan( "" ), std::numeric_limits<double>::infinity(), 1e-300, -1e-300 } )
+  {
+    EXPECT_EQ( FrameRateCheck::SystemPeriod( Unusable ), 0 ) << Unusable;
+  }
+  EXPECT_FALSE( FrameRateCheck::AreCompatible( FrameRateCheck::SystemPeriod( -25.0 ), 0 ) );
+}
+
+TEST( FrameRateCheck, NoPeriodIsCompatibleWithNothing )
+{
+  EXPECT_FALSE( FrameRateCheck::AreCompatible( 0, 5400000 ) );
+  EXPECT_FALSE( FrameRateCheck::AreCompatible( 5400000, 0 ) );
+  EXPECT_TRUE( FrameRateCheck::AreCompatible( 5400000, 1350000 ) );
+  EXPECT_FALSE( FrameRateCheck::AreCompatible( 5400000, 1125000 ) );
+}
