@@ -15,7 +15,7 @@ using KVZ::IPixelFormat;
 using KVZ::ITimecodeSource;
 
 VBlackmagicDeckLinkDevice::VBlackmagicDeckLinkDevice( DeckLinkAPI::IDeckLink* i_pCard, int32_t i_CardNumber,
-  std::shared_ptr<KVZ::IPostalService> i_pPostalService )
+  const std::shared_ptr<KVZ::IPostalService>& i_pPostalService )
   : m_pImpl( TakeReference( new VImpl( i_pCard, i_CardNumber, i_pPostalService ) ) )
 {
 }

@@ -22,7 +22,7 @@ namespace VideoInputHAL
 class VBlackmagicDeckLinkDevice : public KVZ::VShared, public IVideoInputDevice
 {
 public:
-  VBlackmagicDeckLinkDevice( DeckLinkAPI::IDeckLink* i_pCard, int32_t i_CardNumber, std::shared_ptr<KVZ::IPostalService> i_pPostalService );
+  VBlackmagicDeckLinkDevice( DeckLinkAPI::IDeckLink* i_pCard, int32_t i_CardNumber, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService );
   // Closes.
   ~VBlackmagicDeckLinkDevice() override;
 
