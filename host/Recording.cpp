@@ -159,6 +159,7 @@ void VRecording::PollDevice( VDevice& io_rDevice )
   io_rDevice.m_Status = io_rDevice.m_pSource->Capture().GetCaptureStatus();
   io_rDevice.m_Sync = io_rDevice.m_pSource->Temporal().GetSourceSyncStatus();
   io_rDevice.m_PeakFill = std::max( io_rDevice.m_PeakFill, io_rDevice.m_Status.m_BufferFill );
+  io_rDevice.m_PeakBacklog = std::max( io_rDevice.m_PeakBacklog, FramesOf( io_rDevice.m_Status.m_AvailableDuration, io_rDevice.m_Period ) );
 }
 
 void VRecording::EndStalled( VDevice& io_rDevice, double i_Now )
@@ -213,6 +214,7 @@ VDeviceOutcome VRecording::MakeOutcome( const VDevice& i_rDevice ) const
   Outcome.m_Status = i_rDevice.m_Status;
   Outcome.m_Period = i_rDevice.m_Period;
   Outcome.m_PeakFill = i_rDevice.m_PeakFill;
+  Outcome.m_PeakBacklog = i_rDevice.m_PeakBacklog;
   Outcome.m_Timing = i_rDevice.m_pSource->Temporal().GetSourceTimingInfo();
   Outcome.m_Files = m_rTargets.GetReports( i_rDevice.m_CaptureId );
   Outcome.m_FramesCaptured = FramesOf( i_rDevice.m_Status.m_CapturedDuration, i_rDevice.m_Period );

@@ -46,7 +46,8 @@ struct VDeviceOutcome
   VLostFrames m_Lost;
   KVZ::ICaptureStatus m_Status;
   KVZ::VTick m_Period;
-  double m_PeakFill = 0.0;          // 0 to 1
+  double m_PeakFill = 0.0;          // 0 to 1; a buffer keeps old frames, so full is its usual state
+  uint64_t m_PeakBacklog = 0;       // frames captured and not yet written, at most
   boost::optional<KVZ::ISourceTemporal::ISourceTimingInfo> m_Timing;
   std::vector<StageCorePluginInterface::VCaptureFileReport> m_Files;
 
@@ -86,6 +87,7 @@ private:
     KVZ::ICaptureStatus m_Status;
     KVZ::ISourceTemporal::ISourceSyncStatus m_Sync;
     double m_PeakFill = 0.0;
+    uint64_t m_PeakBacklog = 0;
     bool m_bStopped = false;
   };
 

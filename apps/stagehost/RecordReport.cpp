@@ -86,6 +86,7 @@ nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::stri
     i_rOutcome.m_Status.m_Start.IsOpen() ? nlohmann::ordered_json( nullptr ) : nlohmann::ordered_json( i_rOutcome.m_Status.m_Start.Count() );
   Json[ "period" ] = i_rOutcome.m_Period.Count();
   Json[ "buffer_peak_fill" ] = i_rOutcome.m_PeakFill;
+  Json[ "backlog_peak" ] = i_rOutcome.m_PeakBacklog;
   Json[ "drift" ] = DriftToJson( i_rOutcome );
   return Json;
 }
@@ -148,9 +149,8 @@ void VRecordReport::ShowProgress( const std::vector<VDeviceOutcome>& i_rOutcomes
   for( const VDeviceOutcome& rOutcome : i_rOutcomes )
   {
     char Part[ 128 ];
-    std::snprintf( Part, sizeof( Part ), "  %s %llu/%llu frames, buffer %.0f %%", rOutcome.m_DeviceURN.c_str(),
-      static_cast<unsigned long long>( rOutcome.m_FramesCaptured ), static_cast<unsigned long long>( rOutcome.m_FramesRequested ),
-      rOutcome.m_Status.m_BufferFill * 100.0 );
+    std::snprintf( Part, sizeof( Part ), "  %s %llu/%llu frames", rOutcome.m_DeviceURN.c_str(),
+      static_cast<unsigned long long>( rOutcome.m_FramesCaptured ), static_cast<unsigned long long>( rOutcome.m_FramesRequested ) );
     Line += Part;
   }
   std::fprintf( stderr, WantsPlainOutput() ? "\rrec%s   " : "\r\x1b[31mrec\x1b[0m%s\x1b[K", Line.c_str() );
@@ -184,7 +184,7 @@ void VRecordReport::PrintText( const VDeviceOutcome& i_rOutcome ) const
   std::snprintf( Rate, sizeof( Rate ), "%.2f", 1.0 / i_rOutcome.m_Period.Seconds() );
   std::cout << "  frames    " << i_rOutcome.m_FramesWritten << " of " << i_rOutcome.m_FramesRequested << " written, " << Rate << " a second\n"
             << "  lost      " << LostText( i_rOutcome.m_Lost ) << "\n"
-            << "  buffer    " << std::lround( i_rOutcome.m_PeakFill * 100.0 ) << " % at its fullest\n"
+            << "  backlog   " << i_rOutcome.m_PeakBacklog << " frames at most\n"
             << "  state     " << StateName( i_rOutcome.m_Status.m_State ) << "\n";
 }
 
