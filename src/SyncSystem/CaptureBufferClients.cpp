@@ -47,6 +47,7 @@ bool VCaptureBuffer::ClientNextFrame( uint32_t i_ClientId, VRefCountedToken& io_
 
 EClientResult::Enum VCaptureBuffer::ReadNextUnlocked( VClient& io_rClient, VRefCountedToken& o_rFrame )
 {
+  io_rClient.m_bWaiting = false;
   if( IsStateUnlocked( ECaptureState::Cancelling ) )
   {
     LeaveUnlocked( io_rClient );

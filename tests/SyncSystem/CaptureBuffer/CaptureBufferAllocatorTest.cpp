@@ -1,0 +1,176 @@
+#include "SyncSystem/CaptureBufferAllocator.h"
+
+#include "tests/support/FrameMemory.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <set>
+#include <thread>
+#include <vector>
+
+namespace
+{
+
+using SyncSystem::VCaptureBufferAllocator;
+
+struct VMemory
+{
+  explicit VMemory( size_t i_Blocks, size_t i_BlockBytes = 1024, size_t i_Alignment = 16 )
+    : m_pPool( std::make_shared<UtilsMemory::VBalancingAllocator>( i_BlockBytes ) ),
+      m_pClient( m_pPool->MakeClient() ),
+      m_Allocator( m_pClient, i_Alignment )
+  {
+    m_pPool->Configure( i_Blocks, 0, 0 );
+  }
+
+  std::shared_ptr<UtilsMemory::VBalancingAllocator> m_pPool;
+  std::shared_ptr<UtilsMemory::VBalancedClientAllocator> m_pClient;
+  VCaptureBufferAllocator m_Allocator;
+};
+
+TEST( CaptureBufferAllocator, LargestRequestFitsWhateverTheAlignment )
+{
+  for( const size_t Alignment : { size_t{ 16 }, size_t{ 64 }, size_t{ 512 } } )
+  {
+    VMemory Memory( 1, 4096, Alignment );
+    const size_t Max = Memory.m_Allocator.MaxAllocation();
+    EXPECT_EQ( Memory.m_Allocator.Allocate( Max + 1 ), nullptr );
+    void* pMemory = Memory.m_Allocator.Allocate( Max );
+    ASSERT_NE( pMemory, nullptr );
+    EXPECT_EQ( reinterpret_cast<uintptr_t>( pMemory ) % Alignment, 0u );
+    std::memset( pMemory, 1, Max );
+    Memory.m_Allocator.Free( pMemory );
+    EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 0u );
+  }
+  VMemory Memory( 1 );
+  EXPECT_EQ( Memory.m_Allocator.MaxAllocation(), 1024u - 64 - 16 );
+}
+
+TEST( CaptureBufferAllocator, BlockGoesBackWithItsLastAllocation )
+{
+  VMemory Memory( 2 );
+  std::vector<void*> Frames;
+  for( int Frame = 0; Frame < 3; ++Frame ) Frames.push_back( Memory.m_Allocator.Allocate( 304 ) );   // three to a block
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
+  Frames.push_back( Memory.m_Allocator.Allocate( 1 ) );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );
+  EXPECT_EQ( Memory.m_Allocator.Allocate( 930 ), nullptr );
+  Memory.m_Allocator.Free( Frames[1] );
+  Memory.m_Allocator.Free( Frames[0] );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );
+  Memory.m_Allocator.Free( Frames[2] );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
+  // The failed request has ended the second block's time as the current one, so this needs a fresh block.
+  void* pLast = Memory.m_Allocator.Allocate( 16 );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );
+  Memory.m_Allocator.Free( pLast );   // a current block goes back as well
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
+  Memory.m_pClient->Free( Frames[3] );   // through any holder
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 0u );
+  EXPECT_EQ( Memory.m_Allocator.GetReleasedBlocks(), 3u );
+}
+
+TEST( CaptureBufferAllocator, PinnedBlockStaysUntilUnpinned )
+{
+  VMemory Memory( 2 );
+  void* pPinned = Memory.m_Allocator.Allocate( 600 );
+  void* pSecond = Memory.m_Allocator.Allocate( 600 );
+  Memory.m_Allocator.Pin( pPinned, true );
+  Memory.m_Allocator.Pin( pPinned, true );
+  EXPECT_TRUE( Memory.m_Allocator.IsPinned( pPinned ) );
+  EXPECT_FALSE( Memory.m_Allocator.IsPinned( pSecond ) );
+  Memory.m_Allocator.Pin( pPinned, false );
+  Memory.m_Allocator.Free( pPinned );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );
+  EXPECT_FALSE( Memory.m_Allocator.ReleaseIfUnpinned() );
+  Memory.m_Allocator.Pin( pPinned, false );
+  EXPECT_TRUE( Memory.m_Allocator.ReleaseIfUnpinned() );
+  EXPECT_FALSE( Memory.m_Allocator.ReleaseIfUnpinned() );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
+  Memory.m_Allocator.Free( pSecond );
+}
+
+TEST( CaptureBufferAllocator, LinkedAllocationsHaveOneLast )
+{
+  VMemory Memory( 2 );
+  void* pData = Memory.m_Allocator.Allocate( 400 );
+  EXPECT_EQ( Memory.m_Allocator.LastInBlock( pData ), pData );
+  void* pMore = Memory.m_Allocator.Allocate( 400 );
+  EXPECT_EQ( Memory.m_Allocator.LastInBlock( pData ), pMore );
+  void* pEntry = Memory.m_Allocator.Allocate( 100 );
+  Memory.m_Allocator.LinkBlocks( pMore, pEntry );
+  void* pNotLinkedYet = Memory.m_Allocator.Allocate( 100 );
+  EXPECT_EQ( Memory.m_Allocator.LastInBlock( pData ), pEntry );
+  EXPECT_EQ( Memory.m_Allocator.LastInBlock( pEntry ), pEntry );
+  for( void* pMemory : { pData, pMore, pEntry, pNotLinkedYet } ) Memory.m_Allocator.Free( pMemory );
+}
+
+TEST( CaptureBufferAllocator, RecoveryMakesRoom )
+{
+  VMemory Memory( 3 );
+  std::vector<void*> Frames;
+  size_t Next = 0;
+  Memory.m_Allocator.SetRecovery(
+    [&]
+    {
+      const uint64_t Before = Memory.m_Allocator.GetReleasedBlocks();
+      while( Next < Frames.size() && Memory.m_Allocator.GetReleasedBlocks() == Before ) Memory.m_Allocator.Free( Frames[Next++] );
+      return Memory.m_Allocator.GetReleasedBlocks() != Before;
+    } );
+  for( int Frame = 0; Frame < 1000; ++Frame )
+  {
+    void* pFrame = Memory.m_Allocator.Allocate( 200 );   // four to a block
+    ASSERT_NE( pFrame, nullptr );
+    std::memset( pFrame, Frame & 0xFF, 200 );
+    Frames.push_back( pFrame );
+    ASSERT_LE( Frames.size() - Next, 12u );
+  }
+  EXPECT_GE( Frames.size() - Next, 9u );   // no more was freed than was needed
+  while( Next < Frames.size() ) Memory.m_Allocator.Free( Frames[Next++] );
+}
+
+// Allocations of several threads never overlap, whoever frees them, and no block is lost.
+TEST( CaptureBufferAllocator, Threads )
+{
+  VMemory Memory( 100000 );
+  struct VNote
+  {
+    uint32_t m_Thread;
+    uint32_t m_Index;
+  };
+  constexpr uint32_t Count = 20000;
+  constexpr uint32_t Threads = 3;
+  std::vector<std::atomic<VNote*>> Handed( Threads * Count );
+  const auto Allocate = [&]( uint32_t i_Thread )
+  {
+    for( uint32_t Index = 0; Index < Count; ++Index )
+    {
+      auto* pNote = static_cast<VNote*>( Memory.m_Allocator.Allocate( 96 ) );
+      *pNote = { i_Thread, Index };
+      Handed[i_Thread * Count + Index].store( pNote, std::memory_order_release );
+    }
+  };
+  std::atomic<uint32_t> Wrong{ 0 };
+  const auto Free = [&]( uint32_t i_Thread )
+  {
+    for( uint32_t Index = 0; Index < Count; ++Index )
+    {
+      VNote* pNote = nullptr;
+      while( !( pNote = Handed[i_Thread * Count + Index].load( std::memory_order_acquire ) ) ) std::this_thread::yield();
+      if( pNote->m_Thread != i_Thread || pNote->m_Index != Index ) ++Wrong;
+      Memory.m_Allocator.Free( pNote );
+    }
+  };
+  std::vector<std::thread> Running;
+  for( uint32_t Thread = 0; Thread < Threads; ++Thread )
+  {
+    Running.emplace_back( Allocate, Thread );
+    Running.emplace_back( Free, Thread );
+  }
+  for( std::thread& rThread : Running ) rThread.join();
+  EXPECT_EQ( Wrong, 0u );
+  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 0u );
+}
+
+}

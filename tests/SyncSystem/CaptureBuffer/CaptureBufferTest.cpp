@@ -1,0 +1,564 @@
+// Captures as a recording meets them, each told from its start to its end.
+#include "SyncSystem/CaptureBuffer.h"
+
+#include "tests/support/FrameMemory.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/ManualPostalService.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <numeric>
+#include <vector>
+
+namespace
+{
+
+using namespace SyncSystem;
+using KVZ::VCaptureSessionId;
+using TestSupport::NumberedPayload;
+
+// A client that reads whenever it is told to, on the test's thread.
+class VReader
+{
+public:
+  explicit VReader( VCaptureBuffer& i_rBuffer ) : m_rBuffer( i_rBuffer ), m_Id( i_rBuffer.RegisterClient( [this] { m_bNotified = true; } ) ) {}
+  ~VReader() { m_rBuffer.UnregisterClient( m_Id ); }
+
+  // Answers a notification by reading up to this many frames, or until it is to wait.
+  void Run( size_t i_Frames = ~size_t{ 0 } )
+  {
+    if( !m_bNotified ) return;
+    while( i_Frames-- > 0 )
+    {
+      ReadOne();
+      if( m_Read.m_Result == EClientResult::MoreToCome ) continue;
+      m_bNotified = false;
+      if( m_Read.m_Result == EClientResult::Finished && !m_bHoldsFilesOpen ) Close();
+      return;
+    }
+  }
+  void Close()
+  {
+    ReadOne();
+    EXPECT_EQ( m_Read.m_Result, EClientResult::Finished );
+    m_bFinished = true;
+  }
+  void ReadOne()
+  {
+    ASSERT_TRUE( m_rBuffer.ClientNextFrame( m_Id, m_Frame, m_Read, &m_Info ) );
+    if( !m_Frame ) return;
+    m_Frames.push_back( m_Frame.Token().m_FrameNumber );
+    EXPECT_TRUE( NumberedPayload( m_Frame.Frame() ).Holds( m_Frames.back() ) );
+  }
+
+  VCaptureBuffer& m_rBuffer;
+  bool m_bNotified = false;
+  const uint32_t m_Id;
+  VRefCountedToken m_Frame;
+  VClientRead m_Read;
+  VCaptureSessionInfo m_Info;
+  std::vector<int64_t> m_Frames;
+  bool m_bHoldsFilesOpen = false;
+  bool m_bFinished = false;
+};
+
+std::vector<int64_t> Numbers( int64_t i_First, int64_t i_Last )
+{
+  std::vector<int64_t> Result( static_cast<size_t>( i_Last - i_First + 1 ) );
+  std::iota( Result.begin(), Result.end(), i_First );
+  return Result;
+}
+
+class CaptureBuffer : public testing::Test
+{
+protected:
+  void Add( int i_Frames )
+  {
+    for( int Frame = 0; Frame < i_Frames; ++Frame ) ASSERT_TRUE( m_pBuffer->Add().IsValid() );
+  }
+  VToken At( int64_t i_Number ) const { return { m_pBuffer->GetCurrentBufferSession(), i_Number, nullptr }; }
+  bool Start( const VToken& i_rStart, const VToken& i_rEnd, CaptureSessionType::Enum i_Type = CaptureSessionType::Streamed )
+  {
+    VCaptureRequest Request;
+    Request.m_Id = VCaptureSessionId( m_Id );
+    Request.m_Type = i_Type;
+    Request.m_Info = { Request.m_Id, "Take", 7, 3 };
+    Request.m_Start = i_rStart;
+    Request.m_End = i_rEnd;
+    return m_pBuffer->StartCapture( Request );
+  }
+  bool End( const VToken& i_rEnd, uint32_t i_Failure = 0 ) { return m_pBuffer->SetCaptureEnd( VCaptureSessionId( m_Id ), { i_rEnd, i_Failure } ); }
+  bool Cancel() { return m_pBuffer->CancelCapture( VCaptureSessionId( m_Id ) ); }
+  VCaptureSessionStatus Status() const
+  {
+    VCaptureSessionStatus Status;
+    m_pBuffer->Status( Status );
+    return Status;
+  }
+
+  uint32_t m_Id = 1;
+  std::shared_ptr<TestSupport::VManualPostalService> m_pPostalService = std::make_shared<TestSupport::VManualPostalService>();
+  TestSupport::VFrameMemory m_Memory{ 10, 2 };   // twenty frames
+  std::shared_ptr<TestSupport::VNumberedCaptureBuffer> m_pBuffer = VCaptureBuffer::Make<TestSupport::VNumberedCaptureBuffer>(
+    TestSupport::VNumberedCaptureBuffer::Settings( m_Memory, m_pPostalService ) );
+};
+
+TEST_F( CaptureBuffer, FileWriterSlowerThanTheSourceGetsEveryFrameOfItsRange )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 12 );
+  ASSERT_TRUE( Start( At( 4 ), {} ) );
+  EXPECT_TRUE( Reader.m_bNotified );
+  for( int Frame = 0; Frame < 16; ++Frame )
+  {
+    Add( 2 );
+    Reader.Run( 1 );
+    EXPECT_EQ( Reader.m_Info.m_Name, "Take" );
+    if( Frame == 7 ) break;
+  }
+  EXPECT_EQ( Status().m_CapturedFrames, 25u );
+  EXPECT_EQ( Status().m_AvailableFrames, 17u );
+  // Memory holds frames 12 to 28 for the writer; when it is full, the source ends the capture.
+  int Refused = 0;
+  for( ; Refused == 0; )
+    if( !m_pBuffer->Add().IsValid() ) ++Refused;
+  VToken Newest;
+  ASSERT_TRUE( m_pBuffer->GetNewestToken( Newest ) );
+  ASSERT_TRUE( End( Newest, ECaptureFailure::MemoryExhausted ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( 4, Newest.m_FrameNumber ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::MemoryExhausted } );
+  EXPECT_EQ( Status().m_AvailableFrames, 0u );
+  Add( 30 );   // and the buffer is at the live edge again
+}
+
+TEST_F( CaptureBuffer, RangeInThePastIsReadToItsEndWhileTheSourceRunsOn )
+{
+  VReader Fast( *m_pBuffer );
+  VReader Slow( *m_pBuffer );
+  Add( 15 );
+  ASSERT_TRUE( Start( At( 3 ), At( 9 ) ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  Fast.m_bHoldsFilesOpen = true;
+  Fast.Run();
+  EXPECT_EQ( Fast.m_Frames, Numbers( 3, 9 ) );
+  Slow.Run( 2 );
+  Add( 7 );
+  EXPECT_FALSE( Fast.m_bNotified );   // what lies behind the end is none of its business
+  EXPECT_EQ( Status().m_AvailableFrames, 5u );
+  Slow.m_bNotified = true;
+  Slow.Run();
+  EXPECT_EQ( Slow.m_Frames, Numbers( 3, 9 ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );   // one still has its files open
+  Fast.Close();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_CapturedFrames, 7u );
+  Fast.ReadOne();
+  EXPECT_EQ( Fast.m_Read.m_Result, EClientResult::NoFrameYet );
+}
+
+TEST_F( CaptureBuffer, RangeInTheFutureStartsAndEndsByItself )
+{
+  VReader Early( *m_pBuffer );
+  Add( 2 );
+  ASSERT_TRUE( Start( At( 5 ), At( 8 ) ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::WaitingForStart );
+  VReader BeforeStart( *m_pBuffer );
+  for( int Frame = 0; Frame < 4; ++Frame )
+  {
+    Add( 1 );
+    Early.Run();
+  }
+  VReader AfterStart( *m_pBuffer );
+  EXPECT_EQ( Status().m_State, ECaptureState::Capturing );
+  EXPECT_EQ( Status().m_CapturedFrames, 2u );
+  Add( 5 );
+  Early.Run();
+  BeforeStart.Run();
+  EXPECT_EQ( Early.m_Frames, Numbers( 5, 8 ) );
+  EXPECT_EQ( BeforeStart.m_Frames, Numbers( 5, 8 ) );
+  EXPECT_FALSE( AfterStart.m_bNotified );   // it takes part from the next capture on
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 10 ), At( 11 ) ) );
+  for( VReader* pReader : { &Early, &BeforeStart, &AfterStart } )
+  {
+    pReader->m_Frames.clear();
+    pReader->Run();
+    EXPECT_EQ( pReader->m_Frames, Numbers( 10, 11 ) );
+  }
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+}
+
+TEST_F( CaptureBuffer, EndThatAllClientsHavePassedStillLetsThemFinish )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 5 );
+  ASSERT_TRUE( Start( At( 2 ), {} ) );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Read.m_Result, EClientResult::NoFrameYet );
+  ASSERT_TRUE( End( At( 3 ) ) );   // has passed: becomes the newest frame
+  EXPECT_TRUE( Reader.m_bNotified );
+  Add( 3 );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( 2, 5 ) );
+  EXPECT_TRUE( Reader.m_bFinished );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_End.m_FrameNumber, 5 );
+  EXPECT_EQ( Status().m_RequestedEnd.m_FrameNumber, 3 );
+}
+
+TEST_F( CaptureBuffer, OneFrameAfterTheOtherWakesAndFinishes )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 1 );
+  ASSERT_TRUE( Start( At( 2 ), At( 4 ) ) );
+  for( int64_t Frame = 2; Frame <= 4; ++Frame )
+  {
+    Add( 1 );
+    EXPECT_TRUE( Reader.m_bNotified );
+    EXPECT_EQ( Status().m_AvailableFrames, 1u );
+    Reader.ReadOne();
+    EXPECT_EQ( Reader.m_Read.m_Result, Frame < 4 ? EClientResult::NoFrameYet : EClientResult::Finished );
+    Reader.m_bNotified = false;
+  }
+  EXPECT_EQ( Reader.m_Frames, Numbers( 2, 4 ) );
+}
+
+TEST_F( CaptureBuffer, StartBeforeTheOldestFrameIsClipped )
+{
+  Add( 30 );
+  VToken Oldest;
+  ASSERT_TRUE( m_pBuffer->GetFirstToken( KVZ::VBufferSessionId( 1 ), Oldest ) );
+  ASSERT_GT( Oldest.m_FrameNumber, 5 );
+  VReader Reader( *m_pBuffer );
+  ASSERT_TRUE( Start( At( 5 ), At( 25 ) ) );
+  EXPECT_EQ( Status().m_Failure, 0u );
+  EXPECT_EQ( Status().m_RequestedStart.m_FrameNumber, 5 );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( Oldest.m_FrameNumber, 25 ) );
+}
+
+TEST_F( CaptureBuffer, RangesThatCannotBeHad )
+{
+  Add( 4 );
+  const VToken Old = At( 2 );
+  m_pBuffer->StartNewBufferSession();
+  Add( 40 );
+  const auto Refused = [this]( const VToken& i_rStart, const VToken& i_rEnd )
+  {
+    ++m_Id;
+    EXPECT_TRUE( Start( i_rStart, i_rEnd ) );
+    const auto Now = Status();
+    return Now.m_State == ECaptureState::Idle && Now.m_Failure == ECaptureFailure::StartLost && !Now.m_Start.IsValid() && Now.m_CapturedFrames == 0;
+  };
+  EXPECT_TRUE( Refused( Old, {} ) );              // its session has been evicted
+  EXPECT_TRUE( Refused( At( 40 ), At( 40 ) ) );   // no positive number of frames
+  EXPECT_TRUE( Refused( At( 40 ), At( 39 ) ) );
+  EXPECT_TRUE( Refused( At( 10 ), At( 12 ) ) );                                      // evicted to the last frame
+  EXPECT_TRUE( Refused( At( 40 ), { KVZ::VBufferSessionId( 3 ), 50, nullptr } ) );   // two sessions
+  m_pBuffer->StartNewBufferSession();
+  EXPECT_TRUE( Refused( {}, {} ) );                                            // "from here on", where there is nothing yet
+  EXPECT_TRUE( Refused( { KVZ::VBufferSessionId( 2 ), 45, nullptr }, {} ) );   // behind the end of a finished session
+  EXPECT_FALSE( Refused( m_pBuffer->GetNextToken(), {} ) );                    // the first frame of the session to come
+  EXPECT_EQ( Status().m_State, ECaptureState::WaitingForStart );
+}
+
+TEST_F( CaptureBuffer, FinishedSessionEndsARangeEarly )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 6 );
+  const VToken Begin = At( 3 ), Beyond = At( 9 );
+  m_pBuffer->StartNewBufferSession();
+  for( const VToken& rEnd : { Beyond, VToken() } )
+  {
+    ASSERT_TRUE( Start( Begin, rEnd ) );
+    EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::EndedEarly } );
+    Reader.Run();
+    EXPECT_EQ( Reader.m_Frames, Numbers( 3, 6 ) );
+    EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+    Reader.m_Frames.clear();
+    ++m_Id;
+  }
+}
+
+TEST_F( CaptureBuffer, NewSessionEndsARunningCaptureAndDropsAWaitingOne )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 3 );
+  ASSERT_TRUE( Start( At( 2 ), At( 100 ) ) );
+  Reader.Run();
+  Add( 2 );
+  m_pBuffer->StartNewBufferSession();
+  Add( 2 );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::EndedEarly } );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( 2, 5 ) );
+  EXPECT_TRUE( Reader.m_bFinished );
+  EXPECT_EQ( Status().m_CapturedFrames, 4u );
+
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 20 ), {} ) );
+  m_pBuffer->StartNewBufferSession();
+  EXPECT_EQ( Status().m_State, ECaptureState::Idle );
+  EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::StartLost } );
+  EXPECT_FALSE( Reader.m_bNotified );
+  // A failure that was there first is kept as the reason.
+  Add( 1 );
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 8 ), {} ) );
+  m_pBuffer->ClientFinished( Reader.m_Id, ECaptureFailure::ReportedErrors, VCaptureError{ 1, "disk" }, true );
+  m_pBuffer->StartNewBufferSession();
+  EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::ReportedErrors } );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );   // nobody is left to read
+}
+
+TEST_F( CaptureBuffer, CancelReachesEveryClient )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 3 );
+  // Running, with a client
+  ASSERT_TRUE( Start( At( 2 ), {} ) );
+  Reader.Run();
+  ASSERT_TRUE( Cancel() );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelling );
+  Add( 2 );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Read.m_Result, EClientResult::Cancelled );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_CapturedFrames, 2u );
+  EXPECT_FALSE( Cancel() );
+  // Waiting for its start
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 50 ), {} ) );
+  ASSERT_TRUE( Cancel() );
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Read.m_Result, EClientResult::Cancelled );
+  EXPECT_EQ( Reader.m_Read.m_CaptureSessionId.Value(), m_Id );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_CapturedFrames, 0u );
+  // Captured, not yet read; then one that asks for an older capture
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 2 ), At( 4 ) ) );
+  Reader.Run( 1 );
+  EXPECT_FALSE( m_pBuffer->CancelCapture( VCaptureSessionId( m_Id - 1 ) ) );
+  ASSERT_TRUE( Cancel() );
+  EXPECT_EQ( Status().m_CapturedFrames, 3u );
+  EXPECT_EQ( Status().m_AvailableFrames, 0u );
+  Reader.ReadOne();
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  // No client at all
+  ASSERT_TRUE( m_pBuffer->UnregisterClient( Reader.m_Id ) );
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 2 ), {} ) );
+  ASSERT_TRUE( Cancel() );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_Failure, uint32_t{ ECaptureFailure::Cancelled } );
+}
+
+TEST_F( CaptureBuffer, ReservationKeepsItsRangeAndBecomesACapture )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 10 );
+  ASSERT_TRUE( Start( At( 4 ), {}, CaptureSessionType::Reservation ) );
+  EXPECT_FALSE( Reader.m_bNotified );
+  int Stored = 0;
+  while( m_pBuffer->Add().IsValid() ) ++Stored;
+  VToken Oldest;
+  ASSERT_TRUE( m_pBuffer->GetFirstToken( KVZ::VBufferSessionId( 1 ), Oldest ) );
+  EXPECT_LE( Oldest.m_FrameNumber, 4 );
+  EXPECT_GE( Oldest.m_FrameNumber, 3 );
+  EXPECT_EQ( Status().m_AvailableFrames, static_cast<uint64_t>( Stored + 7 ) );
+  ASSERT_TRUE( Start( At( 4 ), At( 8 ) ) );   // the same id
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( 4, 8 ) );
+  EXPECT_FALSE( Start( At( 4 ), At( 8 ) ) );   // a streamed one has been made of it
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 9 ), At( 12 ), CaptureSessionType::Reservation ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  EXPECT_EQ( Status().m_AvailableFrames, 4u );
+  ASSERT_TRUE( Cancel() );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  Add( 20 );
+}
+
+TEST_F( CaptureBuffer, FailedClientLeavesTheCaptureToTheOthers )
+{
+  VReader Bad( *m_pBuffer );
+  VReader Good( *m_pBuffer );
+  Add( 4 );
+  ASSERT_TRUE( Start( At( 1 ), {} ) );
+  Bad.Run( 2 );
+  Good.Run();
+  EXPECT_EQ( Status().m_AvailableFrames, 2u );
+  ASSERT_TRUE( m_pBuffer->ClientFinished( Bad.m_Id, ECaptureFailure::ReportedErrors, VCaptureError{ 5, "disk full" }, true ) );
+  EXPECT_EQ( Status().m_AvailableFrames, 0u );
+  for( int Frame = 0; Frame < 30; ++Frame )   // the one that stopped protects nothing
+  {
+    Add( 1 );
+    Good.Run();
+  }
+  Add( 2 );
+  ASSERT_TRUE( End( At( 36 ) ) );
+  Good.Run();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  ASSERT_EQ( Status().m_Errors, ( std::vector<VCaptureError>{ { 5, "disk full" } } ) );
+  Bad.ReadOne();
+  EXPECT_EQ( Bad.m_Read.m_Result, EClientResult::NoFrameYet );
+  EXPECT_EQ( Bad.m_Read.m_Errors.size(), 1u );
+  EXPECT_FALSE( m_pBuffer->ClientFinished( 99, 0, {}, true ) );
+  // The next capture begins with a clean sheet.
+  ++m_Id;
+  ASSERT_TRUE( Start( At( 30 ), At( 32 ) ) );
+  EXPECT_TRUE( Status().m_Errors.empty() );
+  EXPECT_EQ( Status().m_Failure, 0u );
+}
+
+TEST_F( CaptureBuffer, AdmitsOneCaptureAtATime )
+{
+  VReader Reader( *m_pBuffer );
+  Add( 5 );
+  m_Id = 0;
+  EXPECT_FALSE( Start( At( 1 ), {} ) );
+  VCaptureSessionStatus None;
+  EXPECT_FALSE( m_pBuffer->Status( None ) );
+  EXPECT_FALSE( Cancel() );
+  EXPECT_FALSE( End( At( 3 ) ) );
+  m_Id = 3;
+  ASSERT_TRUE( Start( At( 9 ), At( 12 ) ) );
+  EXPECT_FALSE( End( At( 9 ) ) );   // must lie behind the start
+  ASSERT_TRUE( End( At( 11 ) ) );
+  ASSERT_TRUE( Start( At( 7 ), At( 12 ) ) );   // may be told again while it waits
+  m_Id = 4;
+  EXPECT_FALSE( Start( At( 1 ), {} ) );
+  Add( 3 );
+  EXPECT_FALSE( m_pBuffer->FailCapture( { VCaptureSessionId( 4 ), CaptureSessionType::Streamed, {}, {}, {}, 8, {} } ) );
+  m_Id = 3;
+  EXPECT_FALSE( Start( At( 1 ), {} ) );
+  EXPECT_FALSE( m_pBuffer->SetCaptureEnd( VCaptureSessionId( 2 ), { At( 20 ) } ) );
+  EXPECT_FALSE( End( { KVZ::VBufferSessionId( 9 ), 1, nullptr } ) );
+  ASSERT_TRUE( End( {} ) );   // open
+  Add( 10 );
+  EXPECT_EQ( Status().m_State, ECaptureState::Capturing );
+  ASSERT_TRUE( End( At( 18 ) ) );
+  Reader.Run();
+  m_Id = 4;
+  ASSERT_TRUE( m_pBuffer->FailCapture( { VCaptureSessionId( 4 ), CaptureSessionType::Streamed, {}, {}, {}, 8, { { 1, "no target" } } } ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Idle );
+  EXPECT_EQ( Status().m_Failure, 8u );
+  EXPECT_EQ( Status().m_Errors.size(), 1u );
+}
+
+TEST_F( CaptureBuffer, PinnedFrameOutlivesItsSessionAndItsOwners )
+{
+  Add( 2 );
+  VToken Token = At( 1 );
+  VRefCountedToken Pinned, Copy;
+  ASSERT_TRUE( m_pBuffer->Read( Token, Pinned ) );
+  m_pBuffer->StartNewBufferSession();
+  Add( 60 );
+  std::vector<KVZ::VBufferSessionId> Sessions;
+  EXPECT_EQ( m_pBuffer->GetBufferSessions( Sessions ), 1u );
+  EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );
+  EXPECT_FALSE( m_pBuffer->Read( Token, Copy ) );   // it has left the buffer, whoever holds it
+  Copy = Pinned;
+  Pinned = Copy;
+  Copy.Clear();
+  Add( 60 );
+  EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );
+  m_pBuffer.reset();
+  m_Memory = TestSupport::VFrameMemory( 1, 1 );
+  EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );
+  Pinned = VRefCountedToken();
+}
+
+// A reader that stands still costs its block and stops nobody else.
+TEST_F( CaptureBuffer, ForgottenPinDoesNotStopTheSource )
+{
+  Add( 20 );
+  VToken Token = At( 1 );
+  VRefCountedToken Pinned;
+  ASSERT_TRUE( m_pBuffer->Read( Token, Pinned ) );
+  Add( 100 );
+  VToken Oldest, Newest;
+  ASSERT_TRUE( m_pBuffer->GetFirstToken( KVZ::VBufferSessionId( 1 ), Oldest ) && m_pBuffer->GetNewestToken( Newest ) );
+  EXPECT_GE( Newest.m_FrameNumber - Oldest.m_FrameNumber, 15 );
+  Pinned.Clear();
+  Add( 4 );
+  ASSERT_TRUE( m_pBuffer->GetFirstToken( KVZ::VBufferSessionId( 1 ), Oldest ) && m_pBuffer->GetNewestToken( Newest ) );
+  EXPECT_GE( Newest.m_FrameNumber - Oldest.m_FrameNumber, 17 );   // its block is in use again
+}
+
+TEST_F( CaptureBuffer, SessionThatRunsEmptyLeaves )
+{
+  TestSupport::VLogCapture Log( "CaptureBuffer" );
+  std::vector<uint32_t> Removed;
+  m_pBuffer->BufferSessionRemovedCallback().Add( [&Removed]( KVZ::VBufferSessionId i_Id ) { Removed.push_back( i_Id.Value() ); } );
+  Add( 3 );
+  m_pBuffer->StartNewBufferSession();
+  Add( 3 );
+  m_pBuffer->StartNewBufferSession();
+  Add( 18 );
+  m_pPostalService->RunAll();
+  EXPECT_EQ( Removed, std::vector<uint32_t>{ 1 } );
+  EXPECT_TRUE( Log.Has( "Test Buffer:Session 1 has been removed from buffer. There are 2 sessions remaining" ) );
+  EXPECT_EQ( Log.Lines().size(), 1u );
+}
+
+// One frame fills the memory: whatever comes evicts all there is, and the session goes on all the same.
+TEST( CaptureBufferTiny, RunningSessionSurvivesWithoutFrames )
+{
+  TestSupport::VFrameMemory Memory( 1, 1 );
+  const auto pBuffer = VCaptureBuffer::Make<TestSupport::VNumberedCaptureBuffer>( TestSupport::VNumberedCaptureBuffer::Settings( Memory ) );
+  VReader Reader( *pBuffer );
+  ASSERT_TRUE( pBuffer->Add().IsValid() );
+  VCaptureRequest Request;
+  Request.m_Id = VCaptureSessionId( 1 );
+  ASSERT_TRUE( pBuffer->StartCapture( Request ) );
+  EXPECT_FALSE( pBuffer->Add().IsValid() );   // the client has not taken the first one
+  for( int64_t Frame = 2; Frame <= 50; ++Frame )
+  {
+    Reader.Run();
+    Reader.m_Frame.Clear();
+    ASSERT_EQ( pBuffer->Add().m_FrameNumber, Frame );
+  }
+  Reader.Run();
+  EXPECT_EQ( Reader.m_Frames, Numbers( 1, 50 ) );
+  EXPECT_EQ( pBuffer->GetCurrentBufferSession().Value(), 1u );
+}
+
+TEST_F( CaptureBuffer, DrainLimitHoldsBackWhoIsAhead )
+{
+  m_pBuffer->SetDataDrainLimit( 2 );
+  VReader Slow( *m_pBuffer );
+  VReader Fast( *m_pBuffer );
+  Add( 4 );
+  ASSERT_TRUE( Start( At( 1 ), At( 12 ) ) );
+  Fast.Run();
+  Slow.Run( 1 );
+  Add( 4 );
+  EXPECT_FALSE( Fast.m_bNotified );   // 5 is three frames ahead of 2
+  Slow.ReadOne();
+  EXPECT_TRUE( Fast.m_bNotified );
+  Fast.Run();
+  Add( 4 );
+  EXPECT_FALSE( Fast.m_bNotified );
+  ASSERT_TRUE( m_pBuffer->ClientFinished( Slow.m_Id, 0, {}, true ) );
+  Fast.Run();
+  EXPECT_EQ( Fast.m_Frames, Numbers( 1, 12 ) );
+}
+
+TEST_F( CaptureBuffer, EntryThatIsNotAddedLeavesNoTrace )
+{
+  VFrameEntry* pEntry = m_pBuffer->NewEntry( 16 );
+  ASSERT_NE( pEntry, nullptr );
+  m_pBuffer->DiscardEntry( pEntry );
+  EXPECT_EQ( m_Memory.m_pClient->GetHeldBlocks(), 0u );
+  EXPECT_EQ( m_pBuffer->NewEntry( m_pBuffer->Allocator().MaxAllocation() ), nullptr );
+}
+
+}
