@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 #include <sstream>
 #include <tuple>
 
@@ -107,6 +108,20 @@ std::optional<VClipInput> ProbeFile( const std::string& i_rText, std::string& o_
   return Input;
 }
 
+// In FFmpeg's description of its inputs: "  Stream #1:0: Audio: pcm_s16le, 44100 Hz, mono".
+void FindSound( const std::string& i_rDescription, VClipInput& o_rInput )
+{
+  constexpr std::string_view Stream = "Stream #";
+  const std::string Inputs = i_rDescription.substr( 0, i_rDescription.find( "\nOutput #0" ) );
+  const size_t Sound = Inputs.find( ": Audio: " );
+  const size_t Begin = Sound != std::string::npos ? Inputs.rfind( Stream, Sound ) : std::string::npos;
+  if( Begin != std::string::npos )
+  {
+    o_rInput.m_AudioInput = static_cast<uint32_t>( std::strtoul( Inputs.c_str() + Begin + Stream.size(), nullptr, 10 ) );
+    o_rInput.m_AudioChannels = OptionsFormChannels;
+  }
+}
+
 // ffprobe does not know all of ffmpeg's input options, so ffmpeg itself is asked for one picture.
 std::optional<VClipInput> ProbeOptions( const std::string& i_rText, std::string& o_rError )
 {
@@ -128,9 +143,7 @@ std::optional<VClipInput> ProbeOptions( const std::string& i_rText, std::string&
     o_rError = LastLine( Output.m_Errors ) + Accepted;
     return std::nullopt;
   }
-  // The description of the inputs ends where that of the output begins
-  const std::string Inputs = Output.m_Errors.substr( 0, Output.m_Errors.find( "\nOutput #0" ) );
-  Input.m_AudioChannels = Inputs.find( ": Audio: " ) != std::string::npos ? OptionsFormChannels : 0;
+  FindSound( Output.m_Errors, Input );
   return Input;
 }
 
@@ -254,7 +267,7 @@ std::vector<std::string> ClipCommand( const VClipInput& i_rInput, const VPicture
   Append( Command, { "-f", "rawvideo", "pipe:1" } );
   if( i_rInput.m_AudioChannels > 0 )
   {
-    Append( Command, { "-map", "0:a:0", "-ar", "48000", "-ac", std::to_string( i_rInput.m_AudioChannels ), "-c:a", "pcm_s32le", "-f", "s32le",
+    Append( Command, { "-map", std::to_string( i_rInput.m_AudioInput ) + ":a:0", "-ar", "48000", "-ac", std::to_string( i_rInput.m_AudioChannels ), "-c:a", "pcm_s32le", "-f", "s32le",
                        "pipe:" + std::to_string( ClipSoundDescriptor ) } );
   }
   return Command;

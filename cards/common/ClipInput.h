@@ -20,6 +20,7 @@ struct VClipInput
   double m_FrameRate = 0;               // frames a second; 0 for not known
   bool m_bInterlaced = false;
   uint32_t m_AudioChannels = 0;         // of the first sound track; 0 for none
+  uint32_t m_AudioInput = 0;            // which of several inputs has it; pictures are those of the first
 };
 
 // Splits text as a shell does: blanks part the words; '...', "..." and \ quote. Empty for an unfinished quotation.

@@ -16,12 +16,16 @@ constexpr uint32_t CellCount = 32;   // one a bit
 constexpr uint32_t CellsWidth = CellSize * CellCount;
 constexpr uint32_t CellsHeight = 2 * CellSize;
 
+uint32_t DepthAt( const VPictureFormat& i_rFormat, uint32_t i_Y )
+{
+  return i_Y < CellsHeight ? 0 : ( i_Y - CellsHeight ) * 255 / ( i_rFormat.Height() - CellsHeight );
+}
+
 // Grey from left to right, with less and less blue towards the bottom: a shift either way shows.
-VColour GradientAt( const VPictureFormat& i_rFormat, uint32_t i_X, uint32_t i_Y )
+VColour GradientAt( const VPictureFormat& i_rFormat, uint32_t i_X, uint32_t i_Depth )
 {
   const uint32_t Grey = i_X * 255 / ( i_rFormat.Width() - 1 );
-  const uint32_t Depth = i_Y < CellsHeight ? 0 : ( i_Y - CellsHeight ) * 255 / ( i_rFormat.Height() - CellsHeight );
-  const uint32_t Blue = Grey * ( 255 - Depth ) / 255;
+  const uint32_t Blue = Grey * ( 255 - i_Depth ) / 255;
   return MakeColour( static_cast<uint8_t>( Grey ), static_cast<uint8_t>( Grey ), static_cast<uint8_t>( Blue ), i_rFormat.Height() );
 }
 
@@ -55,13 +59,19 @@ private:
   void PaintGradient( uint8_t* o_pBytes ) const
   {
     std::vector<VColour> Row( m_Format.Width() );
-    for( uint32_t y = 0; y < m_Format.Height(); ++y )
+    for( uint32_t y = 0; y < m_Format.Height(); ++y, o_pBytes += m_RowBytes )
     {
+      const uint32_t Depth = DepthAt( m_Format, y );
+      if( y > 0 && Depth == DepthAt( m_Format, y - 1 ) )
+      {
+        std::memcpy( o_pBytes, o_pBytes - m_RowBytes, m_RowBytes );
+        continue;
+      }
       for( uint32_t x = 0; x < m_Format.Width(); ++x )
       {
-        Row[ x ] = GradientAt( m_Format, x, y );
+        Row[ x ] = GradientAt( m_Format, x, Depth );
       }
-      EncodePixels( m_Format.m_PixelFormat, Row, o_pBytes + size_t{ y } * m_RowBytes );
+      EncodePixels( m_Format.m_PixelFormat, Row, o_pBytes );
     }
   }
 

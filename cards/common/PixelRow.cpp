@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <cstring>
 
 namespace VirtualCards
@@ -58,9 +57,9 @@ void EncodeV210( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
   }
 }
 
-uint8_t Clamp( double i_Value )
+uint8_t Round( double i_Value )
 {
-  return static_cast<uint8_t>( std::clamp( std::lround( i_Value ), 0L, 255L ) );
+  return static_cast<uint8_t>( i_Value + 0.5 );   // of full-range colours, all three stay within 16 to 240
 }
 
 }
@@ -71,9 +70,9 @@ VColour MakeColour( uint8_t i_Red, uint8_t i_Green, uint8_t i_Blue, uint32_t i_L
   const double Kb = i_Lines > 576 ? 0.0722 : 0.114;
   const double Luma = Kr * i_Red + ( 1.0 - Kr - Kb ) * i_Green + Kb * i_Blue;
   VColour Colour{ i_Red, i_Green, i_Blue, 16, 128, 128 };
-  Colour.m_Y = Clamp( 16.0 + 219.0 * Luma / 255.0 );
-  Colour.m_Cb = Clamp( 128.0 + 112.0 * ( i_Blue - Luma ) / ( 1.0 - Kb ) / 255.0 );
-  Colour.m_Cr = Clamp( 128.0 + 112.0 * ( i_Red - Luma ) / ( 1.0 - Kr ) / 255.0 );
+  Colour.m_Y = Round( 16.0 + 219.0 * Luma / 255.0 );
+  Colour.m_Cb = Round( 128.0 + 112.0 * ( i_Blue - Luma ) / ( 1.0 - Kb ) / 255.0 );
+  Colour.m_Cr = Round( 128.0 + 112.0 * ( i_Red - Luma ) / ( 1.0 - Kr ) / 255.0 );
   return Colour;
 }
 

@@ -1,0 +1,260 @@
+// A client of the virtual library as a program with the vendor's kit would be: through the exported names and the interfaces alone.
+#pragma once
+
+#include "VendorInterfaces/DeckLinkAPI.h"
+#include "cards/common/VirtualCardControl.h"
+
+#include "tests/support/CounterReader.h"
+#include "tests/support/RampReader.h"
+
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/mutex.hpp>
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <dlfcn.h>
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace CardsTests
+{
+
+using namespace DeckLinkAPI;
+using namespace VirtualCards;
+
+constexpr int64_t Scale = 135000000;
+constexpr uint32_t Mode1080p25 = FourCharacterCode( "Hp25" );
+constexpr uint32_t ModeNTSC = FourCharacterCode( "ntsc" );
+
+// A function that the library exports
+template<class TFunction> TFunction* Exported( const char* i_pName )
+{
+  static void* const s_pLibrary = dlopen( VIRTUAL_DECKLINK, RTLD_NOW );
+  return s_pLibrary ? reinterpret_cast<TFunction*>( dlsym( s_pLibrary, i_pName ) ) : nullptr;
+}
+
+inline IVirtualCardControl& Control()
+{
+  return *Exported<GetVirtualCardControlFunction>( GetVirtualCardControlName )();
+}
+
+template<class TInterface> struct VReleaser
+{
+  void operator()( TInterface* i_pObject ) const { i_pObject->Release(); }
+};
+template<class TInterface> using VPointer = std::unique_ptr<TInterface, VReleaser<TInterface>>;
+
+template<class TInterface> VPointer<TInterface> Query( IUnknown& i_rObject, REFIID i_Id )
+{
+  void* pFound = nullptr;
+  return VPointer<TInterface>( i_rObject.QueryInterface( i_Id, &pFound ) == S_OK ? static_cast<TInterface*>( pFound ) : nullptr );
+}
+
+inline std::string TakeText( const char* i_pText )
+{
+  const std::string Text = i_pText ? i_pText : "(null)";
+  std::free( const_cast<char*>( i_pText ) );
+  return Text;
+}
+
+inline VPointer<IDeckLinkDiscovery> MakeDiscovery()
+{
+  return VPointer<IDeckLinkDiscovery>( Exported<IDeckLinkDiscovery*()>( "CreateDeckLinkDiscoveryInstance_0001" )() );
+}
+
+inline VPointer<IDeckLinkIterator> MakeIterator()
+{
+  return VPointer<IDeckLinkIterator>( Exported<IDeckLinkIterator*()>( "CreateDeckLinkIteratorInstance_0002" )() );
+}
+
+// What a frame callback saw
+struct VSeen
+{
+  bool m_bSignal = false;
+  uint32_t m_Flags = 0;
+  long m_Width = 0;
+  long m_Height = 0;
+  uint32_t m_PixelFormat = 0;
+  std::optional<uint32_t> m_Counter;
+  int64_t m_StreamTime = 0;
+  int64_t m_HardwareTime = 0;
+  int64_t m_Duration = 0;
+  std::string m_Timecode;      // of any RP188 packet; empty for none
+  uint32_t m_TimecodeFlags = 0;
+  bool m_bPacket = false;
+  long m_Samples = 0;
+};
+
+inline KVZ::IPixelFormat::Enum LayoutOf( uint32_t i_PixelFormat )
+{
+  switch( i_PixelFormat )
+  {
+    case PixelFormat::YUV8Bit: return KVZ::IPixelFormat::EU8Y8V8Y8;
+    case PixelFormat::YUV10Bit: return KVZ::IPixelFormat::EU10Y10V10Y10;
+    default: return KVZ::IPixelFormat::EB8G8R8u8;
+  }
+}
+
+inline TestSupport::VPixels PixelsOf( IDeckLinkVideoInputFrame& i_rFrame )
+{
+  void* pBytes = nullptr;
+  EXPECT_EQ( i_rFrame.GetBytes( &pBytes ), S_OK );
+  return { LayoutOf( i_rFrame.GetPixelFormat() ), static_cast<const uint8_t*>( pBytes ), static_cast<size_t>( i_rFrame.GetRowBytes() ) };
+}
+
+inline VSeen Look( IDeckLinkVideoInputFrame& i_rFrame, IDeckLinkAudioInputPacket* i_pPacket )
+{
+  VSeen Seen;
+  Seen.m_Flags = i_rFrame.GetFlags();
+  Seen.m_bSignal = !( Seen.m_Flags & FrameFlag::NoInputSource );
+  Seen.m_Width = i_rFrame.GetWidth();
+  Seen.m_Height = i_rFrame.GetHeight();
+  Seen.m_PixelFormat = i_rFrame.GetPixelFormat();
+  Seen.m_Counter = ReadCounter( PixelsOf( i_rFrame ) );
+  EXPECT_EQ( i_rFrame.GetStreamTime( &Seen.m_StreamTime, &Seen.m_Duration, Scale ), S_OK );
+  EXPECT_EQ( i_rFrame.GetHardwareReferenceTimestamp( Scale, &Seen.m_HardwareTime, &Seen.m_Duration ), S_OK );
+  IDeckLinkTimecode* pTimecode = nullptr;
+  if( i_rFrame.GetTimecode( TimecodeFormat::RP188Any, &pTimecode ) == S_OK )
+  {
+    const char* pText = nullptr;
+    pTimecode->GetString( &pText );
+    Seen.m_Timecode = TakeText( pText );
+    Seen.m_TimecodeFlags = pTimecode->GetFlags();
+    pTimecode->Release();
+  }
+  Seen.m_bPacket = i_pPacket != nullptr;
+  Seen.m_Samples = i_pPacket ? i_pPacket->GetSampleFrameCount() : 0;
+  return Seen;
+}
+
+// Counts references, and hands every call to functions that a test sets.
+class VClient final : public IDeckLinkInputCallback
+{
+public:
+  virtual ~VClient() = default;
+
+  HRESULT QueryInterface( REFIID i_Id, void** o_ppObject ) override
+  {
+    const bool bKnown = i_Id == IID_IUnknown || i_Id == IID_IDeckLinkInputCallback;
+    *o_ppObject = bKnown ? this : nullptr;
+    m_References += bKnown ? 1 : 0;
+    return bKnown ? S_OK : E_NOINTERFACE;
+  }
+  ULONG AddRef() override { return static_cast<ULONG>( ++m_References ); }
+  ULONG Release() override { return static_cast<ULONG>( --m_References ); }
+
+  HRESULT VideoInputFormatChanged( uint32_t i_Events, IDeckLinkDisplayMode* i_pMode, uint32_t i_Detected ) override
+  {
+    ++m_FormatCalls;
+    m_LastEvents = i_Events;
+    m_LastDetected = i_Detected;
+    if( m_OnFormat )
+    {
+      m_OnFormat( i_pMode->GetDisplayMode() );
+    }
+    return S_OK;
+  }
+
+  HRESULT VideoInputFrameArrived( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket ) override
+  {
+    ++m_FrameCalls;
+    if( m_OnFrame )
+    {
+      m_OnFrame( i_pFrame, i_pPacket );
+    }
+    return E_FAIL;   // nobody looks at it
+  }
+
+  // Keeps what every frame showed.
+  void Record()
+  {
+    m_OnFrame = [ this ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+    { m_Seen.push_back( Look( *i_pFrame, i_pPacket ) ); };
+  }
+
+  std::function<void( uint32_t )> m_OnFormat;
+  std::function<void( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )> m_OnFrame;
+  std::atomic<int> m_References{ 1 };
+  std::atomic<int> m_FormatCalls{ 0 };
+  std::atomic<int> m_FrameCalls{ 0 };
+  uint32_t m_LastEvents = 0;
+  uint32_t m_LastDetected = 0;
+  std::vector<VSeen> m_Seen;
+};
+
+// One card in the machine, found through the iterator. Whatever a test does, it must leave nothing behind.
+class VCardFixture : public testing::Test
+{
+protected:
+  void Plug( const std::string& i_rText, bool i_bManualClock = true )
+  {
+    std::string Error;
+    m_Card = Control().AddCard( i_rText.c_str(), { i_bManualClock }, Error );
+    ASSERT_NE( m_Card, 0u ) << Error;
+    IDeckLink* pCard = nullptr;
+    ASSERT_EQ( MakeIterator()->Next( &pCard ), S_OK );
+    m_pCard.reset( pCard );
+    m_pInput = Query<IDeckLinkInput>( *m_pCard, IID_IDeckLinkInput );
+    ASSERT_NE( m_pInput, nullptr );
+    ASSERT_EQ( m_pInput->SetCallback( &m_Client ), S_OK );
+  }
+
+  void Step( uint64_t i_Frames = 1 ) { ASSERT_TRUE( Control().Step( m_Card, i_Frames ) ); }
+
+  void Event( const char* i_pEvent )
+  {
+    std::string Error;
+    ASSERT_TRUE( Control().RunEvent( m_Card, i_pEvent, Error ) ) << Error;
+  }
+
+  void Enable( uint32_t i_Mode = Mode1080p25, uint32_t i_PixelFormat = PixelFormat::YUV8Bit, uint32_t i_Flags = InputFlag::Default )
+  {
+    ASSERT_EQ( m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, i_Flags ), S_OK );
+  }
+
+  void Start() { ASSERT_EQ( m_pInput->StartStreams(), S_OK ); }
+
+  // What drivers do with a new format, inside the callback
+  void RestartOnFormat( uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  {
+    m_Client.m_OnFormat = [ this, i_PixelFormat ]( uint32_t i_Mode )
+    {
+      EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
+      EXPECT_EQ( m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, InputFlag::FormatDetection ), S_OK );
+      EXPECT_EQ( m_pInput->FlushStreams(), S_OK );
+      EXPECT_EQ( m_pInput->StartStreams(), S_OK );
+    };
+  }
+
+  VCardCounters Counters()
+  {
+    VCardCounters Counters;
+    EXPECT_TRUE( Control().GetCounters( m_Card, Counters ) );
+    return Counters;
+  }
+
+  void TearDown() override
+  {
+    if( m_pInput )
+    {
+      m_pInput->StopStreams();
+      m_pInput->SetCallback( nullptr );
+    }
+    EXPECT_EQ( m_Client.m_References, 1 );
+    m_pInput.reset();
+    m_pCard.reset();
+    Control().RemoveCard( m_Card );
+    EXPECT_EQ( Control().ReferencesHeld(), 0 );
+    EXPECT_EQ( Control().CallbacksInFlight(), 0 );
+  }
+
+  VClient m_Client;
+  VCardId m_Card = 0;
+  VPointer<IDeckLink> m_pCard;
+  VPointer<IDeckLinkInput> m_pInput;
+};
+
+}

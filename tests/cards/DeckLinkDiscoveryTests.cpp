@@ -1,0 +1,195 @@
+// Cards that come and go.
+#include "tests/cards/DeckLinkClient.h"
+
+#include "tests/support/TemporaryFolder.h"
+
+#include <fstream>
+
+using namespace CardsTests;
+
+namespace
+{
+
+class VWatcher final : public IDeckLinkDeviceNotificationCallback
+{
+public:
+  virtual ~VWatcher() = default;
+  HRESULT QueryInterface( REFIID, void** o_ppObject ) override
+  {
+    *o_ppObject = nullptr;
+    return E_NOINTERFACE;
+  }
+  ULONG AddRef() override { return static_cast<ULONG>( ++m_References ); }
+  ULONG Release() override { return static_cast<ULONG>( --m_References ); }
+
+  HRESULT DeckLinkDeviceArrived( IDeckLink* i_pCard ) override
+  {
+    const char* pName = nullptr;
+    EXPECT_EQ( i_pCard->GetDisplayName( &pName ), S_OK );
+    m_News.push_back( "+" + TakeText( pName ) );
+    m_Arrived.push_back( i_pCard );
+    if( m_OnArrival )
+    {
+      m_OnArrival( i_pCard );
+    }
+    return S_OK;
+  }
+
+  HRESULT DeckLinkDeviceRemoved( IDeckLink* i_pCard ) override
+  {
+    m_News.push_back( "-" + std::to_string( std::count( m_Arrived.begin(), m_Arrived.end(), i_pCard ) ) );
+    return S_OK;
+  }
+
+  std::function<void( IDeckLink* )> m_OnArrival;
+  std::vector<std::string> m_News;
+  std::vector<IDeckLink*> m_Arrived;
+  std::atomic<int> m_References{ 1 };
+};
+
+class DeckLinkDiscovery : public testing::Test
+{
+protected:
+  VCardId Add( const std::string& i_rText = "decklink" )
+  {
+    std::string Error;
+    const VCardId Card = Control().AddCard( i_rText.c_str(), { true }, Error );
+    EXPECT_NE( Card, 0u ) << Error;
+    m_Cards.push_back( Card );
+    return Card;
+  }
+
+  std::string NameOf( VCardId i_Card ) { return "+DeckLink Virtual (" + std::to_string( i_Card ) + ")"; }
+
+  void TearDown() override
+  {
+    for( const VCardId Card : m_Cards )
+    {
+      Control().RemoveCard( Card );
+    }
+    EXPECT_EQ( Control().ReferencesHeld(), 0 );
+    EXPECT_EQ( m_Watcher.m_References, 1 );
+  }
+
+  VWatcher m_Watcher;
+  std::vector<VCardId> m_Cards;
+};
+
+}
+
+TEST_F( DeckLinkDiscovery, ReportsCardsThatAreThereAndThoseThatComeLater )
+{
+  const VCardId First = Add();
+  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), S_OK );
+  EXPECT_EQ( m_Watcher.m_News, std::vector<std::string>( { NameOf( First ) } ) );
+  EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), E_ACCESSDENIED );
+
+  const VCardId Second = Add();
+  EXPECT_EQ( m_Watcher.m_News.back(), NameOf( Second ) );
+  EXPECT_TRUE( Control().RemoveCard( First ) );
+  EXPECT_EQ( m_Watcher.m_News.back(), "-1" ) << "the same pointer that arrived";
+  EXPECT_FALSE( Control().RemoveCard( First ) );
+
+  EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_OK );
+  EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_FALSE );
+  Add();
+  EXPECT_EQ( m_Watcher.m_News.size(), 3u );
+}
+
+TEST_F( DeckLinkDiscovery, AScriptTakesACardOutAndPutsItBackAsANewOne )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  std::ofstream( Folder.File( "script.json" ) ) << R"([{ "frame": 3, "do": "remove" }, { "frame": 5, "do": "arrive" }])";
+  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  pDiscovery->InstallDeviceNotifications( &m_Watcher );
+  VPointer<IDeckLinkInput> pInput;
+  m_Watcher.m_OnArrival = [ & ]( IDeckLink* i_pCard ) { pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
+  VClient Client;
+  const VCardId Card = Add( "decklink:script=" + Folder.File( "script.json" ) );
+
+  const VPointer<IDeckLinkInput> pFirst = std::move( pInput );
+  pFirst->SetCallback( &Client );
+  pFirst->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
+  pFirst->StartStreams();
+  EXPECT_TRUE( Control().Step( Card, 5 ) );
+  EXPECT_EQ( Client.m_FrameCalls, 3 );
+  EXPECT_EQ( m_Watcher.m_News.size(), 2u );
+  EXPECT_EQ( pFirst->StartStreams(), E_FAIL );
+  EXPECT_EQ( pFirst->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 ), E_FAIL );
+
+  EXPECT_TRUE( Control().Step( Card, 1 ) );
+  ASSERT_NE( pInput, nullptr );
+  EXPECT_NE( pInput.get(), pFirst.get() );
+  EXPECT_EQ( m_Watcher.m_News.size(), 3u );
+  pInput->SetCallback( &Client );
+  pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
+  pInput->StartStreams();
+  EXPECT_TRUE( Control().Step( Card, 2 ) );
+  EXPECT_EQ( Client.m_FrameCalls, 5 );
+  pInput->SetCallback( nullptr );
+  pFirst->SetCallback( nullptr );
+}
+
+TEST_F( DeckLinkDiscovery, AnArrivalMayUninstallOrAddMore )
+{
+  VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  m_Watcher.m_OnArrival = [ & ]( IDeckLink* )
+  {
+    if( m_Watcher.m_News.size() == 1 )
+    {
+      Add();   // told after this one
+      EXPECT_EQ( m_Watcher.m_News.size(), 1u );
+    }
+    else
+    {
+      EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_OK );
+    }
+  };
+  pDiscovery->InstallDeviceNotifications( &m_Watcher );
+  Add();
+  EXPECT_EQ( m_Watcher.m_News.size(), 2u );
+  Add();
+  EXPECT_EQ( m_Watcher.m_News.size(), 2u );
+}
+
+TEST_F( DeckLinkDiscovery, AllGenerationsOfTheFactoriesAndTheIterator )
+{
+  for( const char* pName : { "CreateDeckLinkDiscoveryInstance_0001", "CreateDeckLinkDiscoveryInstance_0002", "CreateDeckLinkDiscoveryInstance_0003" } )
+  {
+    const VPointer<IDeckLinkDiscovery> pDiscovery( Exported<IDeckLinkDiscovery*()>( pName )() );
+    EXPECT_NE( ( Query<IDeckLinkDiscovery>( *pDiscovery, IID_IDeckLinkDiscovery ) ), nullptr );
+  }
+  Add();
+  Add();
+  for( const char* pName : { "CreateDeckLinkIteratorInstance_0002", "CreateDeckLinkIteratorInstance_0003", "CreateDeckLinkIteratorInstance_0004" } )
+  {
+    const VPointer<IDeckLinkIterator> pIterator( Exported<IDeckLinkIterator*()>( pName )() );
+    int Count = 0;
+    for( IDeckLink* pCard = nullptr; pIterator->Next( &pCard ) == S_OK; pCard->Release() )
+    {
+      ++Count;
+    }
+    EXPECT_EQ( Count, 2 );
+  }
+  const VPointer<IDeckLinkAPIInformation> pInformation(
+    Exported<IDeckLinkAPIInformation*()>( "CreateDeckLinkAPIInformationInstance_0001" )() );
+  int64_t Version = 0;
+  EXPECT_EQ( pInformation->GetInt( AttributeId::APIVersion, &Version ), S_OK );
+  EXPECT_EQ( Version >> 24, 10 );
+}
+
+TEST_F( DeckLinkDiscovery, ATextThatCannotBeUnderstoodAddsNothing )
+{
+  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  pDiscovery->InstallDeviceNotifications( &m_Watcher );
+  std::string Error;
+  EXPECT_EQ( Control().AddCard( "decklink:pattern=plaid", {}, Error ), 0u );
+  EXPECT_NE( Error.find( "pattern" ), std::string::npos );
+  EXPECT_EQ( Control().AddCard( "bluefish444", {}, Error ), 0u );
+  EXPECT_NE( Error.find( "accepted: decklink" ), std::string::npos );
+  EXPECT_EQ( Control().AddCard( "decklink:script=/no/such/script.json", {}, Error ), 0u );
+  EXPECT_NE( Error.find( "script: \"/no/such/script.json\"" ), std::string::npos ) << Error;
+  EXPECT_FALSE( Control().RunEvent( 4711, "{}", Error ) );
+  EXPECT_TRUE( m_Watcher.m_News.empty() );
+}
