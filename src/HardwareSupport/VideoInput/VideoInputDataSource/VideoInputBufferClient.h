@@ -1,0 +1,102 @@
+// Turns one capture of a source into files. It is a client of the capture buffer: it takes the frames in order on a thread of its own, at its
+// own pace, so that a slow disk costs memory in the buffer and no frames.
+//
+// AddDevice and AddFile come first, then Start, once. Stop may be called from any thread but the client's own. Nothing of the source is
+// needed: files are finished even if the source goes.
+#pragma once
+
+#include "Core/VideoInterface/VideoWriter.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
+#include "StageCorePluginInterface/StageCoreHost.h"
+#include "StageCoreRuntime/ThreadAnnotations.h"
+#include "SyncSystem/DataSourceSession.h"
+
+#include <boost/thread/mutex.hpp>
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace UtilsMemory
+{
+class VPooledBufferAllocator;
+}
+
+namespace VideoInputHAL
+{
+
+class VVideoInputBufferClient : public std::enable_shared_from_this<VVideoInputBufferClient>
+{
+public:
+  struct VSettings
+  {
+    std::shared_ptr<SyncSystem::VCaptureBuffer> m_pBuffer{};
+    KVZ::ICaptureHeader m_Header{};
+    std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo> m_pSession{};
+    std::shared_ptr<StageCorePluginInterface::ICaptureTargets> m_pCaptureTargets{};   // told of every finished file
+    std::shared_ptr<const KVZ::VVideoWriterFactory> m_pWriterFactory{};
+    VVideoEncoderSettings m_Encoder{};
+    std::shared_ptr<KVZ::IPostalService> m_pPostalService{};   // empty: a service of its own
+  };
+
+  struct VDeviceRecord
+  {
+    std::string m_URN;
+    std::string m_ManufacturerName;
+    std::string m_DriverName;
+    std::string m_DeviceName;
+  };
+
+  explicit VVideoInputBufferClient( VSettings i_Settings );
+  ~VVideoInputBufferClient();
+
+  void AddDevice( VDeviceRecord i_Device );
+  void AddFile( const StageCorePluginInterface::VCaptureTarget& i_rTarget );
+  // Joins the buffer's next capture. Files are made when its first frame comes.
+  void Start();
+  // Leaves the capture and closes what is open, at the length it has reached.
+  void Stop();
+  // Files are being made or written. They are closed, and their reports given, before the capture hears of the client's end; but a
+  // cancelled capture hears of it first.
+  bool HasOpenFiles() const { return m_bFilesOpen; }
+
+private:
+  class VFileRecord;
+  struct VFrameView;
+
+  // What is to be told once the client's lock is free.
+  struct VNews
+  {
+    std::vector<StageCorePluginInterface::VCaptureFileReport> m_Reports;
+    bool m_bGoOn = false;
+    bool m_bFinished = false;   // the buffer is to hear that the client has finished
+    std::string m_Failure;      // empty: none
+  };
+
+  void WriteFrames();
+  void TakeFrame( VNews& o_rNews ) REQUIRES( m_Mutex );
+  bool WriteFrame( const SyncSystem::VRefCountedToken& i_rFrame, VNews& o_rNews ) REQUIRES( m_Mutex );
+  bool Begin( const VFrameView& i_rFrame, VNews& o_rNews ) REQUIRES( m_Mutex );
+  bool CreateFiles( VNews& o_rNews ) REQUIRES( m_Mutex );
+  void CloseFiles( VNews& o_rNews ) REQUIRES( m_Mutex );
+  void LogEnd( const char* i_pFormat ) const REQUIRES( m_Mutex );
+  void Tell( const VNews& i_rNews );
+
+  // Fixed after Start
+  const VSettings m_Settings;
+  const std::shared_ptr<KVZ::IPostalService> m_pPostalService;
+  VDeviceRecord m_Device;
+  uint32_t m_ClientId = 0;
+
+  std::atomic<bool> m_bFilesOpen{ false };
+
+  boost::mutex m_Mutex;   // held while a frame is written; taken before the buffer's lock
+  std::vector<std::unique_ptr<VFileRecord>> m_Files GUARDED_BY( m_Mutex );
+  bool m_bStarted GUARDED_BY( m_Mutex ) = false;   // the first frame has been seen and the files made
+  bool m_bEnded GUARDED_BY( m_Mutex ) = false;
+  uint64_t m_Frames GUARDED_BY( m_Mutex ) = 0;   // written to every file
+};
+
+}

@@ -1,0 +1,266 @@
+#include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputFileRecord.h"
+
+#include "Core/VideoInterface/VideoAttributes.h"
+#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "StageCoreRuntime/GlobalLog.h"
+#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+
+#include <boost/filesystem/operations.hpp>
+#include <boost/filesystem/path.hpp>
+
+#include <algorithm>
+#include <cstring>
+#include <utility>
+
+namespace VideoInputHAL
+{
+
+using StageCorePluginInterface::VCaptureTarget;
+
+namespace
+{
+
+std::string MakePath( const VCaptureTarget& i_rTarget )
+{
+  std::string Name = i_rTarget.m_BaseName + "_" + i_rTarget.m_DeviceLabel;
+  if( !i_rTarget.m_Extension.empty() )
+  {
+    Name += "." + i_rTarget.m_Extension;
+  }
+  return ( boost::filesystem::path( i_rTarget.m_Folder ) / Name ).string();
+}
+
+KVZ::IVideoContainer::Enum ContainerOf( const VCaptureTarget& i_rTarget ) { return static_cast<KVZ::IVideoContainer::Enum>( i_rTarget.m_Container ); }
+
+KVZ::IVideoPayload::Enum VideoPayloadOf( const VCaptureTarget& i_rTarget )
+{
+  return static_cast<KVZ::IVideoPayload::Enum>( i_rTarget.m_VideoPayload );
+}
+
+KVZ::IAudioPayload::Enum AudioPayloadOf( const VCaptureTarget& i_rTarget )
+{
+  return static_cast<KVZ::IAudioPayload::Enum>( i_rTarget.m_AudioPayload );
+}
+
+std::string NameOrUnspecified( std::string i_Name ) { return i_Name.empty() ? "Unspecified" : i_Name; }
+
+bool HasVideo( const VVideoInputDataSourceFrame* i_pFrame )
+{
+  if( !i_pFrame )
+  {
+    KVZ_LOG_ERROR( "VideoInputDataSource", "No video data." );
+    return false;
+  }
+  if( i_pFrame->m_ImageBytes == 0 )
+  {
+    KVZ_LOG_ERROR( "VideoInputDatasource", "No video data." );
+    return false;
+  }
+  return true;
+}
+
+bool IsSameImage( const KVZ::VideoFrameInfo& i_rA, const KVZ::VideoFrameInfo& i_rB )
+{
+  return i_rA.m_ImageWidth == i_rB.m_ImageWidth && i_rA.m_ImageHeight == i_rB.m_ImageHeight && i_rA.m_PixelFormat == i_rB.m_PixelFormat;
+}
+
+// "1920 x 1080 U8Y8V8Y8, 16 channels of Int16 at 48000 Hz"
+std::string FormatText( const KVZ::VideoFrameInfo& i_rVideo, const KVZ::AudioFrameInfo& i_rAudio )
+{
+  std::string Text = std::to_string( i_rVideo.m_ImageWidth ) + " x " + std::to_string( i_rVideo.m_ImageHeight ) + " " +
+    NameOrUnspecified( KVZ::ToName( i_rVideo.m_PixelFormat ) );
+  if( !i_rAudio.HasAudio() )
+  {
+    return Text + " without audio";
+  }
+  return Text + ", " + std::to_string( i_rAudio.m_Channels ) + " channels of " + NameOrUnspecified( KVZ::ToName( i_rAudio.m_SampleFormat ) ) +
+    " at " + std::to_string( i_rAudio.m_SampleRate ) + " Hz";
+}
+
+KVZ::VConversionRecord RecordingStep( const VCaptureTarget& i_rTarget, KVZ::IPixelFormat::Enum i_Captured )
+{
+  KVZ::IPixelFormat::Enum Stored = i_Captured;
+  VideoEncoding::PixelFormatForPayloadFormat( VideoPayloadOf( i_rTarget ), i_Captured, Stored );
+  KVZ::VConversionRecord Record;
+  Record.m_Container = NameOrUnspecified( KVZ::ToName( ContainerOf( i_rTarget ) ) );
+  Record.m_AudioPayload = NameOrUnspecified( KVZ::ToName( AudioPayloadOf( i_rTarget ) ) );
+  Record.m_VideoPayload = NameOrUnspecified( KVZ::ToName( VideoPayloadOf( i_rTarget ) ) );
+  Record.m_PixelFormat = NameOrUnspecified( KVZ::ToName( Stored ) );
+  return Record;
+}
+
+}
+
+VVideoInputBufferClient::VFileRecord::VFileRecord( const VCaptureTarget& i_rTarget, std::shared_ptr<KVZ::IVideoWriter> i_pWriter )
+  : m_Target( i_rTarget ),
+    m_pWriter( std::move( i_pWriter ) ),
+    m_pAudioAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Capture audio" ) )
+{
+  m_Report.m_Path = MakePath( m_Target );
+  m_Report.m_Container = m_Target.m_Container;
+}
+
+VVideoInputBufferClient::VFileRecord::~VFileRecord() = default;
+
+bool VVideoInputBufferClient::VFileRecord::Create()
+{
+  boost::system::error_code Error;
+  boost::filesystem::create_directories( m_Target.m_Folder, Error );
+  if( Error )
+  {
+    KVZ_LOG_ERROR( "VideoInputDataSource", "The folder \"%1%\" could not be made: %2%", m_Target.m_Folder, Error.message() );
+  }
+  m_bCreated = !Error && m_pWriter && m_pWriter->Open( m_Report.m_Path );
+  return m_bCreated || Fail( "Could not create capture file: \"" + m_Report.m_Path + "\"" );
+}
+
+bool VVideoInputBufferClient::VFileRecord::Write( const VFrameView& i_rFrame, const VSettings& i_rSettings, const VDeviceRecord& i_rDevice )
+{
+  if( !HasVideo( i_rFrame.m_pFrame ) )
+  {
+    return Fail( WriteFailureText() );
+  }
+  const VVideoInputDataSourceFrame& rFrame = *i_rFrame.m_pFrame;
+  if( !( m_bHeaderWritten ? HasHeaderFormat( rFrame ) : WriteHeader( i_rFrame, i_rSettings, i_rDevice ) ) )
+  {
+    return false;
+  }
+  CollectBuffers( i_rFrame );
+  // The frame's own description, but for the channels that the file does not keep.
+  const bool bWritten = m_pWriter->WriteFrame( m_VideoBuffers, rFrame.m_VideoInfo, m_AudioBuffers, m_Kept, m_Report.m_FramesWritten );
+  for( const auto& pBuffer : m_VideoBuffers )
+  {
+    m_PayloadBytes += bWritten ? pBuffer->Size() : 0;
+  }
+  m_VideoBuffers.clear();
+  m_AudioBuffers.clear();
+  m_Report.m_FramesWritten += bWritten ? 1 : 0;
+  return bWritten || FailWriter();
+}
+
+bool VVideoInputBufferClient::VFileRecord::WriteHeader( const VFrameView& i_rFrame, const VSettings& i_rSettings, const VDeviceRecord& i_rDevice )
+{
+  const VVideoInputDataSourceFrame& rFrame = *i_rFrame.m_pFrame;
+  m_Video = rFrame.m_VideoInfo;
+  m_Captured = rFrame.m_AudioInfo;
+  m_Kept = KeptAudio( m_Captured );
+  m_Report.m_StartTimecode = rFrame.m_Timecode;
+  m_Report.m_StartTick = i_rFrame.m_Tick;
+  m_Report.m_Period = i_rFrame.m_Period;
+  KVZ::VTimingRecord Timing;
+  Timing.m_FramePeriodInTicks = static_cast<uint32_t>( i_rFrame.m_Period.Count() );
+  Timing.m_StartOffsetInTicks = i_rFrame.m_Tick.Count();
+  m_bHeaderWritten = m_pWriter->WriteHeader( m_Video, m_Kept, Timing, rFrame.m_Timecode, KVZ::VColourRecord(),
+    MakeAttributes( i_rFrame, i_rSettings, i_rDevice ), VideoPayloadOf( m_Target ),
+    m_Kept.HasAudio() ? AudioPayloadOf( m_Target ) : KVZ::IAudioPayload::ENone );
+  if( m_bHeaderWritten )
+  {
+    return true;
+  }
+  KVZ_LOG_ERROR( "VideoInputDataSource", "Failed writing video file header information." );
+  return FailWriter();
+}
+
+KVZ::IVideoAttributes VVideoInputBufferClient::VFileRecord::MakeAttributes( const VFrameView& i_rFrame, const VSettings& i_rSettings,
+  const VDeviceRecord& i_rDevice ) const
+{
+  KVZ::IVideoAttributes Attributes;
+  KVZ::VCameraHardwareRecord Camera;
+  Camera.m_DeviceURN = i_rDevice.m_URN;
+  Camera.m_Type = i_rDevice.m_DriverName;
+  Camera.m_DisplayType = i_rDevice.m_DeviceName;
+  Camera.m_SensorWidthInPixels = m_Video.m_ImageWidth;
+  Camera.m_SensorHeightInPixels = m_Video.m_ImageHeight;
+  Camera.m_PixelAspectRatio = m_Video.m_PixelAspectRatio;
+  Camera.WriteAttributes( Attributes );
+  KVZ::WriteAttributes( { RecordingStep( m_Target, m_Video.m_PixelFormat ) }, Attributes );
+  Attributes.Set( "Capture.Name", i_rSettings.m_Header.m_Name );
+  Attributes.Set( "Capture.Id", i_rSettings.m_Header.m_CaptureSessionId.Value() );
+  Attributes.Set( "Capture.GlobalSyncSessionId", i_rSettings.m_Header.m_GlobalSyncSessionId.Value() );
+  Attributes.Set( "Capture.StartTick", i_rFrame.m_Tick.Count() );
+  Attributes.Set( "Capture.Manufacturer", i_rDevice.m_ManufacturerName );
+  Attributes.Set( "Capture.DeviceLabel", m_Target.m_DeviceLabel );
+  Attributes.Set( "Capture.CapturedChannels", m_Captured.m_Channels );
+  return Attributes;
+}
+
+KVZ::AudioFrameInfo VVideoInputBufferClient::VFileRecord::KeptAudio( const KVZ::AudioFrameInfo& i_rCaptured ) const
+{
+  KVZ::AudioFrameInfo Kept = i_rCaptured;
+  Kept.m_Channels = std::min( i_rCaptured.m_Channels, m_Target.m_AudioChannels );
+  return Kept.HasAudio() && AudioPayloadOf( m_Target ) != KVZ::IAudioPayload::ENone ? Kept : KVZ::AudioFrameInfo();
+}
+
+// A frame of another format would make a file that is wrong without saying so.
+bool VVideoInputBufferClient::VFileRecord::HasHeaderFormat( const VVideoInputDataSourceFrame& i_rFrame )
+{
+  const bool bSameAudio = i_rFrame.m_AudioInfo == m_Captured;
+  if( IsSameImage( i_rFrame.m_VideoInfo, m_Video ) && bSameAudio )
+  {
+    return true;
+  }
+  return Fail( WriteFailureText() + ": the format of the frames changed from " + FormatText( m_Video, m_Captured ) + " to " +
+    FormatText( i_rFrame.m_VideoInfo, i_rFrame.m_AudioInfo ) );
+}
+
+void VVideoInputBufferClient::VFileRecord::CollectBuffers( const VFrameView& i_rFrame )
+{
+  m_VideoBuffers.assign( 1, i_rFrame.m_pVideo );
+  m_AudioBuffers.clear();
+  if( m_Kept.HasAudio() && i_rFrame.m_pAudio )
+  {
+    m_AudioBuffers.push_back( m_Kept.m_Channels == m_Captured.m_Channels ? i_rFrame.m_pAudio : KeepChannels( *i_rFrame.m_pAudio ) );
+  }
+}
+
+// The first channels of every sample.
+std::shared_ptr<const KVZ::IBufferConst> VVideoInputBufferClient::VFileRecord::KeepChannels( const KVZ::IBufferConst& i_rAudio )
+{
+  const size_t SampleBytes = KVZ::GetBytesPerSample( m_Captured.m_SampleFormat );
+  const size_t From = SampleBytes * m_Captured.m_Channels;
+  const size_t To = SampleBytes * m_Kept.m_Channels;
+  const size_t Samples = From == 0 ? 0 : i_rAudio.Size() / From;
+  const auto pKept = m_pAudioAllocator->AllocateBuffer( Samples * To );
+  for( size_t Sample = 0; Sample < Samples; ++Sample )
+  {
+    std::memcpy( pKept->Data() + Sample * To, i_rAudio.Data() + Sample * From, To );
+  }
+  return pKept;
+}
+
+void VVideoInputBufferClient::VFileRecord::Close()
+{
+  if( !m_bCreated )
+  {
+    return;
+  }
+  const bool bClosed = !m_pWriter->IsOpen() || m_pWriter->Close();
+  if( !bClosed && m_bHeaderWritten && !m_Report.m_bFailed )
+  {
+    FailWriter();
+  }
+  boost::system::error_code Error;
+  const uint64_t Size = boost::filesystem::is_regular_file( m_Report.m_Path, Error ) ? boost::filesystem::file_size( m_Report.m_Path, Error ) : 0;
+  m_Report.m_Bytes = Size != 0 && !Error ? Size : m_PayloadBytes;
+}
+
+bool VVideoInputBufferClient::VFileRecord::FailWriter()
+{
+  KVZ_LOG_ERROR( "VideoInputDataSource", "Error writing capture file with container format '%s'.",
+    NameOrUnspecified( KVZ::ToName( ContainerOf( m_Target ) ) ) );
+  return Fail( WriteFailureText() );
+}
+
+std::string VVideoInputBufferClient::VFileRecord::WriteFailureText() const
+{
+  return "Failed attempting to write data to file \"" + m_Report.m_Path + "\"";
+}
+
+bool VVideoInputBufferClient::VFileRecord::Fail( std::string i_Error )
+{
+  m_Report.m_bFailed = true;
+  m_Report.m_Error = std::move( i_Error );
+  return false;
+}
+
+}
