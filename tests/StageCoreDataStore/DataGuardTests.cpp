@@ -9,7 +9,7 @@ namespace
 
 const std::vector<std::string> FatalWrite = { "!\"Fatal attempt to acquire a write lock from within a read lock.\"" };
 
-class DataGuards : public testing::Test
+class GuardedStore : public testing::Test
 {
 protected:
   // Whether this thread holds the exclusive lock.
@@ -30,7 +30,7 @@ protected:
 
 }
 
-TEST_F( DataGuards, AMovedWriterKeepsTheLockUntilItsLastOwnerEnds )
+TEST_F( GuardedStore, AMovedWriterKeepsTheLockUntilItsLastOwnerEnds )
 {
   {
     VDataWriter Last = MakeWriter();
@@ -46,7 +46,7 @@ TEST_F( DataGuards, AMovedWriterKeepsTheLockUntilItsLastOwnerEnds )
   EXPECT_TRUE( m_Assertions.Expressions().empty() );
 }
 
-TEST_F( DataGuards, AMovedVerifyWriterAndReadersPassTheirLockOn )
+TEST_F( GuardedStore, AMovedVerifyWriterAndReadersPassTheirLockOn )
 {
   {
     VDataVerifyWriter Writer( m_Store );
@@ -61,7 +61,7 @@ TEST_F( DataGuards, AMovedVerifyWriterAndReadersPassTheirLockOn )
   EXPECT_TRUE( m_Assertions.Expressions().empty() );
 }
 
-TEST_F( DataGuards, AMovedFromGuardFindsAndStoresNothing )
+TEST_F( GuardedStore, AMovedFromGuardFindsAndStoresNothing )
 {
   VDataVerifyWriter Writer( m_Store );
   EXPECT_TRUE( Writer.SetValue( m_Path, KVZ::Variant::Make( 1 ) ) );
@@ -78,7 +78,7 @@ TEST_F( DataGuards, AMovedFromGuardFindsAndStoresNothing )
   EXPECT_EQ( Owner.GetDataStore(), &m_Store );
 }
 
-TEST_F( DataGuards, AWriterInsideAReaderIsAnAssertionAndStoresNothing )
+TEST_F( GuardedStore, AWriterInsideAReaderIsAnAssertionAndStoresNothing )
 {
   VDataWriter( m_Store ).SetValue( m_Path, KVZ::Variant::Make( 1 ) );
   {
@@ -92,7 +92,7 @@ TEST_F( DataGuards, AWriterInsideAReaderIsAnAssertionAndStoresNothing )
   EXPECT_EQ( m_Assertions.Expressions(), FatalWrite );
 }
 
-TEST_F( DataGuards, AValueOfAnotherTypeCountsAsAbsent )
+TEST_F( GuardedStore, AValueOfAnotherTypeCountsAsAbsent )
 {
   VDataWriter Writer( m_Store );
   Writer.SetValue( m_Path, KVZ::Variant::Make( 1.5 ) );

@@ -3,6 +3,9 @@
 
 #include "Core/VideoInterface/Schemas.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
+#include "NotificationSystem/AsioPostalService.h"
+
+#include <thread>
 
 namespace
 {
@@ -270,6 +273,33 @@ TEST_F( VReactions, AStandardWithoutAPeriodAlwaysWarns )
   m_pDevice->SetSignal( IVideoStandard::EHD_2048_1556PSF_1500 );
   Create();
   EXPECT_NE( Warning().find( "frame rate (0.00 Hz)" ), std::string::npos );
+}
+
+TEST_F( VReactions, UsersOnOtherThreadsNeverLeaveAWishUnanswered )
+{
+  constexpr int Rounds = 200;
+  const auto pService = std::make_shared<NotificationSystem::VAsioPostalService>( "Engine" );
+  m_pHandler = KVZ::MakeShared<VVideoInputDeviceParameterHandler>( pService, m_pStore, m_pRegistry, m_pTargets, m_pSources, m_pDevice, m_pSource );
+  const auto Toggle = [this]( const char* i_pKey, const Variant& i_rFirst, const Variant& i_rSecond )
+  {
+    const auto pParameter = m_pHandler->GetParameter( i_pKey );
+    for( int Round = 0; Round < Rounds; ++Round )
+    {
+      EXPECT_TRUE( pParameter->SetValue( i_rFirst ) && pParameter->SetValue( i_rSecond ) );
+    }
+  };
+  std::thread Users[] = { std::thread( Toggle, "Enabled", Variant::Make( true ), Variant::Make( false ) ),
+    std::thread( Toggle, "AudioChannelCount", Variant::Make<uint32_t>( 2 ), Variant::Make<uint32_t>( 8 ) ),
+    std::thread( Toggle, "UseTimecodeForSync", Variant::Make( true ), Variant::Make( false ) ) };
+  for( std::thread& rUser : Users )
+  {
+    rUser.join();
+  }
+  pService->Stop();
+  EXPECT_TRUE( VDataReader( *m_pStore ).IsSettled( DeviceSchemas::Enabled( m_Device ) ) );
+  EXPECT_FALSE( Value<bool>( "Enabled" ) );
+  EXPECT_EQ( m_pDevice->GetStatus(), EStatus::EReady );
+  EXPECT_EQ( m_pSource->m_UseTimecode, false );
 }
 
 TEST_F( VReactions, NothingReactsOnceTheHandlerHasGone )
