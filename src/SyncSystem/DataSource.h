@@ -142,9 +142,8 @@ protected:
   }
   virtual void OnCaptureEndChanged( KVZ::VCaptureSessionId, const KVZ::IClock&, const KVZ::ITickInClocks& ) {}
   virtual void OnCaptureCancelled( KVZ::VCaptureSessionId ) {}
-  // These two on any thread, without a lock.
   virtual void OnBusyChanged( bool ) {}
-  // A cancelled capture still has something to close.
+  // A cancelled capture still has something to close. Any thread.
   virtual bool IsCaptureDraining() { return false; }
 
 private:
@@ -214,6 +213,7 @@ private:
   void FillStatus( const VCaptureSessionStatus& i_rBuffer, const VGlobalSyncSessionInfo* i_pInfo, KVZ::ICaptureStatus& io_rStatus ) const;
   double BufferFill() const;
   void UpdateBusy( uint32_t i_State );
+  void TellBusy();
   VCaptureState CurrentCapture() const;
 
   // Fixed after construction
@@ -237,6 +237,7 @@ private:
 
   // Strand only
   KVZ::VCaptureSessionId m_PreparedCapture;   // BeginCapture has run for it
+  bool m_bBusyTold = false;
 
   mutable boost::mutex m_Mutex;
   KVZ::ISourceSyncSession m_Session GUARDED_BY( m_Mutex );   // to be offered; m_Id 0 for none

@@ -274,6 +274,7 @@ double VDataSource::BufferFill() const
   return Total > 0.0 ? Used / Total : 0.0;
 }
 
+// Whoever asks for the status may find the change; the hook hears of it on the strand, in order.
 void VDataSource::UpdateBusy( uint32_t i_State )
 {
   const bool bBusy = ( i_State & BusyStates ) != 0;
@@ -285,7 +286,28 @@ void VDataSource::UpdateBusy( uint32_t i_State )
     }
     m_bBusy = bBusy;
   }
-  OnBusyChanged( bBusy );
+  PostToStrand(
+    [pWeak = KVZ::WeakFrom( this )]
+    {
+      if( const auto pThis = pWeak.lock() )
+      {
+        pThis->TellBusy();
+      }
+    } );
+}
+
+void VDataSource::TellBusy()
+{
+  bool bBusy = false;
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    bBusy = m_bBusy;
+  }
+  if( bBusy != m_bBusyTold )
+  {
+    m_bBusyTold = bBusy;
+    OnBusyChanged( bBusy );
+  }
 }
 
 }

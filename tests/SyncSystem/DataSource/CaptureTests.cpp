@@ -32,7 +32,12 @@ protected:
     m_Rig.OnStrand( [&] { bResult = m_Rig.m_pSource->StartCapture( Header, i_Start, i_End, i_bReserve, 0 ); } );
     return bResult;
   }
-  KVZ::ICaptureStatus Status() { return m_Rig.m_pSource->GetCaptureStatus(); }
+  KVZ::ICaptureStatus Status()
+  {
+    const KVZ::ICaptureStatus Status = m_Rig.m_pSource->GetCaptureStatus();
+    m_Rig.m_pService->RunAll();
+    return Status;
+  }
   void EndAt( VTick i_End )
   {
     m_Rig.OnStrand( [&] { m_Rig.m_pSource->EndCapture( i_End ); } );

@@ -1,0 +1,295 @@
+// Captures into files, with writers that fail where they are told to.
+#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
+
+#include "SyncSystem/CaptureTypes.h"
+#include "tests/support/LogCapture.h"
+
+namespace
+{
+
+using SyncSystem::ECaptureFailure;
+using SyncSystem::ECaptureState;
+
+class BufferClient : public ::testing::Test
+{
+protected:
+  void SetUp() override
+  {
+    m_Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
+    m_Rig.m_Timecode.m_Hours = 10;
+    m_Rig.DeliverMany( 10 );
+    m_Rig.Join( *m_pSource, 1 );
+  }
+  void Start( uint32_t i_Id, int64_t i_First, int64_t i_End, const std::string& i_rName = "Take" )
+  {
+    const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( i_Id ), i_rName, 0, KVZ::VGlobalSyncSessionId( 1 ) };
+    m_Rig.OnStrand( *m_pSource, [&] { EXPECT_TRUE( m_pSource->StartCapture( Header, At( i_First ), At( i_End ), false, 0 ) ); } );
+  }
+  void Cancel()
+  {
+    m_Rig.OnStrand( *m_pSource, [&] { m_pSource->CancelCapture(); } );
+  }
+  // The writing thread's turn.
+  void Write() { m_Rig.m_pWriterService->RunAll(); }
+  KVZ::ICaptureStatus Status() { return m_pSource->GetCaptureStatus(); }
+  VFakeFile& File( const std::string& i_rExtension = "tvid" ) { return ( *m_Rig.m_pDisk )[m_Rig.Path( "Take", i_rExtension )]; }
+  void UseTwoContainers() { m_Rig.m_pTargets->m_Containers = { KVZ::IVideoContainer::EMOV, KVZ::IVideoContainer::ETVID }; }
+
+  VVideoRig m_Rig;
+  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make<VTestVideoSource>();
+};
+
+TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
+{
+  const TestSupport::VLogCapture Log( "VideoInputDataSource" );
+  Start( 3, 4, 14 );
+  EXPECT_TRUE( m_Rig.m_pDisk->empty() ) << "the writing thread makes the files";
+  Write();
+  EXPECT_EQ( File().m_Frames.size(), 6u );
+  m_Rig.DeliverMany( 10 );
+  Write();
+  const VFakeFile& rFile = File();
+  ASSERT_EQ( rFile.m_Frames.size(), 10u );
+  for( size_t Index = 0; Index < rFile.m_Frames.size(); ++Index )
+  {
+    EXPECT_EQ( rFile.m_Frames[Index], std::vector<uint8_t>( 64, static_cast<uint8_t>( Index + 4 ) ) );
+    EXPECT_EQ( rFile.m_Keys[Index], Index );
+    ASSERT_EQ( rFile.m_Sound[Index].size(), 160u );
+    EXPECT_EQ( rFile.m_Sound[Index][7], Index + 4 + 7 );
+  }
+  EXPECT_EQ( rFile.m_Closes, 1 );
+  EXPECT_EQ( rFile.m_Timing, ( KVZ::VTimingRecord{ 135000000, 5400000, At( 4 ).Count() } ) );
+  EXPECT_EQ( KVZ::ToText( rFile.m_Timecode ), "10:00:00:04" );
+  EXPECT_EQ( rFile.m_Audio.m_Channels, 4u );
+  EXPECT_EQ( rFile.m_CaptureName, "Take" );
+  EXPECT_EQ( rFile.m_Camera, ( KVZ::VCameraHardwareRecord{ "vi:0", "TestDriver", "Test Card (1)", 8, 4, 0.0 } ) );
+  EXPECT_EQ( rFile.m_Conversion, ( std::vector<KVZ::VConversionRecord>{ { "TVID", "Uncompressed", "Uncompressed", "U8Y8V8Y8" } } ) );
+  EXPECT_TRUE( Log.Has( "Writing file with start timecode = 10:0:0:4 . 0" ) );
+  EXPECT_TRUE( Log.Has( "Client 1 finished writing 0.4 seconds of data." ) );
+
+  ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+  const auto Report = m_Rig.m_pTargets->Reports()[0];
+  EXPECT_EQ( Report.m_Path, m_Rig.Path() );
+  EXPECT_EQ( Report.m_CaptureSessionId, KVZ::VCaptureSessionId( 3 ) );
+  EXPECT_EQ( Report.m_DeviceURN, "vi:0" );
+  EXPECT_EQ( Report.m_FramesWritten, 10u );
+  EXPECT_FALSE( Report.m_bFailed );
+  EXPECT_EQ( Report.m_StartTick, At( 4 ) );
+  EXPECT_EQ( Report.m_Period, Period );
+  EXPECT_EQ( KVZ::ToText( Report.m_StartTimecode ), "10:00:00:04" );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::None );
+}
+
+TEST_F( BufferClient, HandsTheStoredBytesOnWithoutACopy )
+{
+  Start( 1, 2, 6 );
+  SyncSystem::VToken Token{ KVZ::VBufferSessionId( 1 ), 3, nullptr };
+  SyncSystem::VRefCountedToken Frame;
+  ASSERT_TRUE( m_pSource->Buffer()->Read( Token, Frame ) );
+  Write();
+  EXPECT_EQ( File().m_Addresses.at( 0 ), VVideoInputDataSource::FrameOf( Frame.Frame() )->Image() );
+}
+
+TEST_F( BufferClient, KeepsTheChannelsThatTheTargetAsksFor )
+{
+  m_Rig.m_pTargets->m_Channels = 3;
+  Start( 1, 2, 4 );
+  Write();
+  EXPECT_EQ( File().m_Audio.m_Channels, 3u );
+  std::vector<uint8_t> Expected;
+  for( int Sample = 0; Sample < 20; ++Sample )
+  {
+    for( int Byte = 0; Byte < 6; ++Byte )
+    {
+      Expected.push_back( static_cast<uint8_t>( 2 + Sample * 8 + Byte ) );
+    }
+  }
+  EXPECT_EQ( File().m_Sound.at( 0 ), Expected );
+
+  m_Rig.m_pTargets->m_Channels = 0;
+  m_Rig.m_pDisk->clear();
+  Start( 2, 2, 4 );
+  Write();
+  EXPECT_EQ( File().m_Audio, KVZ::AudioFrameInfo() );
+  EXPECT_EQ( File().m_AudioPayload, KVZ::IAudioPayload::ENone );
+  EXPECT_TRUE( File().m_Sound.at( 0 ).empty() );
+}
+
+TEST_F( BufferClient, OneFileThatFailsEndsTheClientAndClosesTheOther )
+{
+  UseTwoContainers();
+  File( "tvid" ).m_FailingCall = 2 + 3;   // its fourth frame
+  const TestSupport::VLogCapture Log( "VideoInputDataSource", 2 );
+  Start( 1, 0, 8 );
+  Write();
+  EXPECT_EQ( File( "mov" ).m_Frames.size(), 4u );
+  EXPECT_EQ( File( "mov" ).m_Closes, 1 );
+  EXPECT_EQ( File( "tvid" ).m_Frames.size(), 3u );
+  EXPECT_EQ( File( "tvid" ).m_Closes, 1 ) << "playable up to there";
+  EXPECT_TRUE( Log.Has( "Error writing capture file with container format 'TVID'." ) );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Failed attempting to write data to file \"" + m_Rig.Path() + "\"" } ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  const auto Reports = m_Rig.m_pTargets->Reports();
+  ASSERT_EQ( Reports.size(), 2u );
+  EXPECT_FALSE( Reports[0].m_bFailed );
+  EXPECT_EQ( Reports[0].m_FramesWritten, 4u );
+  EXPECT_TRUE( Reports[1].m_bFailed );
+  EXPECT_EQ( Reports[1].m_FramesWritten, 3u );
+  EXPECT_EQ( Reports[1].m_Error, Status().m_Errors[0] );
+}
+
+// Wherever the writer fails, the capture says so once, with the path, and nothing stays open.
+TEST_F( BufferClient, AFailureAnywhereIsTold )
+{
+  for( uint64_t Call = 0; Call <= 6; ++Call )
+  {
+    SCOPED_TRACE( Call );
+    m_Rig.m_pDisk->clear();
+    File().m_FailingCall = Call == 6 ? VFakeFile::Never : Call;
+    File().m_bCloseFails = Call == 6;
+    const size_t ReportsBefore = m_Rig.m_pTargets->Reports().size();
+    Start( static_cast<uint32_t>( Call + 1 ), 0, 4 );
+    Write();
+    const std::string Expected = Call == 0 ? "Could not create capture file: \"" + m_Rig.Path() + "\""
+                                           : "Failed attempting to write data to file \"" + m_Rig.Path() + "\"";
+    EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ Expected } ) );
+    EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+    EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+    EXPECT_FALSE( File().m_bOpen );
+    EXPECT_EQ( File().m_Closes, Call == 0 ? 0 : 1 );
+    ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), ReportsBefore + 1 );
+    const auto Report = m_Rig.m_pTargets->Reports().back();
+    EXPECT_TRUE( Report.m_bFailed );
+    EXPECT_EQ( Report.m_Error, Expected );
+    EXPECT_EQ( Report.m_FramesWritten, Call < 2 ? 0 : Call - 2 );
+  }
+}
+
+TEST_F( BufferClient, FailingToMakeOneOfTwoFilesWritesNeither )
+{
+  UseTwoContainers();
+  File( "tvid" ).m_FailingCall = 0;
+  Start( 1, 0, 4 );
+  Write();
+  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Could not create capture file: \"" + m_Rig.Path() + "\"" } ) );
+  EXPECT_EQ( File( "mov" ).m_Closes, 1 );
+  EXPECT_TRUE( File( "mov" ).m_Frames.empty() );
+  EXPECT_FALSE( m_Rig.m_pTargets->Reports().at( 0 ).m_bFailed );
+  EXPECT_TRUE( m_Rig.m_pTargets->Reports().at( 1 ).m_bFailed );
+}
+
+TEST_F( BufferClient, AFolderThatCannotBeMadeIsTold )
+{
+  m_Rig.m_pTargets->m_Folder = "/dev/null/takes";
+  Start( 1, 0, 4 );
+  Write();
+  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Could not create capture file: \"/dev/null/takes/Take_Label.tvid\"" } ) );
+  EXPECT_TRUE( m_Rig.m_pDisk->empty() );
+}
+
+TEST_F( BufferClient, AnotherFormatInMidCaptureEndsItAndNamesBoth )
+{
+  Start( 1, 5, 40 );
+  m_Rig.m_Format.m_Width = 16;
+  m_Rig.m_Format.m_PixelFormat = KVZ::IPixelFormat::ER8G8B8;
+  m_Rig.DeliverMany( 3 );
+  Write();
+  EXPECT_EQ( File().m_Frames.size(), 5u );
+  EXPECT_EQ( File().m_Closes, 1 );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+  EXPECT_EQ( Status().m_Errors,
+    ( std::vector<std::string>{ "Failed attempting to write data to file \"" + m_Rig.Path() +
+      "\": the format of the frames changed from 8 x 4 U8Y8V8Y8, 4 channels of Int16 at 48000 Hz to 16 x 4 R8G8B8, 4 channels of Int16 at 48000 Hz" } ) );
+
+  m_Rig.OnStrand( *m_pSource, [&] { m_pSource->EndCapture( VTick::Open() ); } );
+  m_Rig.m_Format = {};
+  m_Rig.DeliverMany( 2 );
+  Start( 2, 13, 30, "Second" );
+  m_Rig.m_Format.m_Audio = {};
+  m_Rig.DeliverMany( 1 );
+  Write();
+  ASSERT_EQ( Status().m_Errors.size(), 1u );
+  EXPECT_NE( Status().m_Errors[0].find( "to 8 x 4 U8Y8V8Y8 without audio" ), std::string::npos ) << Status().m_Errors[0];
+}
+
+TEST_F( BufferClient, ACancelledWaitMakesNoFile )
+{
+  const TestSupport::VLogCapture Log( "VideoInputDataSource" );
+  Start( 1, 20, 30 );
+  Cancel();
+  Write();
+  EXPECT_EQ( Log.Texts(), ( std::vector<std::string>{ "Client 1 cancelled after writing 0 seconds of data." } ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_TRUE( m_Rig.m_pDisk->empty() );
+  EXPECT_TRUE( m_Rig.m_pTargets->Reports().empty() );
+}
+
+TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWritten )
+{
+  const TestSupport::VLogCapture Log( "VideoInputDataSource" );
+  Start( 1, 0, 30 );
+  Write();
+  Cancel();
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelling );
+  m_Rig.DeliverMany( 2 );
+  Write();
+  EXPECT_TRUE( Log.Has( "Client 1 cancelled after writing 0.4 seconds of data." ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( File().m_Frames.size(), 10u );
+  EXPECT_EQ( File().m_Closes, 1 );
+  EXPECT_EQ( m_Rig.m_pTargets->Reports().at( 0 ).m_FramesWritten, 10u );
+}
+
+TEST_F( BufferClient, TargetsThatCannotBeHadAreTold )
+{
+  UseTwoContainers();
+  m_Rig.m_pTargets->m_RefusedContainer = KVZ::IVideoContainer::EMOV;
+  Start( 1, 0, 4 );
+  Write();
+  EXPECT_EQ( File( "tvid" ).m_Frames.size(), 4u ) << "the other one is written";
+  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Failed to get capture target for video capture device 'Test Card (1)'." } ) );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+
+  m_Rig.m_pTargets->m_Containers = { KVZ::IVideoContainer::ETVID, KVZ::IVideoContainer::EAVI };
+  const TestSupport::VLogCapture Log( "VideoInputDataSource", 2 );
+  Start( 2, 0, 4, "Second" );
+  Write();
+  EXPECT_TRUE( Log.Has( "Unsupported video container format for capture." ) );
+  EXPECT_EQ( Status().m_State, ECaptureState::Idle );
+  EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+}
+
+TEST_F( BufferClient, ASourceThatGoesClosesItsFile )
+{
+  Start( 1, 0, 30 );
+  Write();
+  EXPECT_TRUE( File().m_bOpen );
+  m_Rig.m_pSource.reset();
+  m_pSource.reset();
+  EXPECT_EQ( File().m_Closes, 1 );
+  EXPECT_EQ( m_Rig.m_pTargets->Reports().at( 0 ).m_FramesWritten, 10u );
+  Write();
+  EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+}
+
+TEST_F( BufferClient, MemoryThatRunsOutEndsTheCaptureAtItsLastFrame )
+{
+  Start( 1, 0, 4000 );
+  int Stored = 10;
+  while( m_Rig.Deliver() )
+  {
+    ASSERT_LT( ++Stored, 1000 );
+  }
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::MemoryExhausted );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  EXPECT_FALSE( m_Rig.Deliver() );
+  Write();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( File().m_Frames.size(), static_cast<size_t>( Stored ) );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * Stored );
+  EXPECT_TRUE( m_Rig.Deliver() );
+}
+
+}
