@@ -1,0 +1,76 @@
+#include "tests/support/system/StageHost.h"
+
+#include <cstdlib>
+#include <fstream>
+
+namespace SystemTests
+{
+
+VArguments operator+( VArguments i_A, const VArguments& i_rB )
+{
+  i_A.insert( i_A.end(), i_rB.begin(), i_rB.end() );
+  return i_A;
+}
+
+const nlohmann::json& VRecordResult::Device( size_t i_Index ) const
+{
+  static const nlohmann::json s_Nothing = nlohmann::json::object();
+  return i_Index < m_Devices.size() ? m_Devices[i_Index] : s_Nothing;
+}
+
+VRecordResult Record( const std::string& i_rFolder, const VArguments& i_rArguments, const VRunOptions& i_rOptions )
+{
+  VRecordResult Result;
+  Result.m_Run = TestSupport::RunStageHost( VArguments{ "record", "--json", "--output", i_rFolder } + i_rArguments, i_rOptions );
+  nlohmann::json Document = nlohmann::json::parse( Result.m_Run.m_Output, nullptr, false );
+  if( Document.is_array() )
+  {
+    Result.m_Devices = std::move( Document );
+  }
+  return Result;
+}
+
+nlohmann::json Inspect( const std::string& i_rPath, bool i_bFrames )
+{
+  const VRunResult Run = TestSupport::RunStageHost(
+    VArguments{ "inspect", "--json", i_rPath } + ( i_bFrames ? VArguments{ "--frames" } : VArguments{} ) );
+  nlohmann::json Document = nlohmann::json::parse( Run.m_Output, nullptr, false );
+  return Document.is_object() && Run.m_ExitCode == 0 ? Document : nlohmann::json{ { "failure", Describe( Run ) } };
+}
+
+std::string Describe( const VRunResult& i_rRun )
+{
+  return "exit code " + std::to_string( i_rRun.m_ExitCode ) + ", signal " + std::to_string( i_rRun.m_Signal ) +
+    ( i_rRun.m_bTimedOut ? ", timed out" : "" ) + "\nstandard output: " + i_rRun.m_Output + "\nstandard error: " + i_rRun.m_Error;
+}
+
+std::string WriteScript( const std::string& i_rPath, const nlohmann::json& i_rEvents )
+{
+  std::ofstream( i_rPath ) << i_rEvents;
+  return i_rPath;
+}
+
+nlohmann::json EveryFrames( uint64_t i_Every, const nlohmann::json& i_rEvent )
+{
+  constexpr uint64_t LastFrame = 5000;
+  nlohmann::json Events = nlohmann::json::array();
+  for( uint64_t Frame = i_Every; Frame <= LastFrame; Frame += i_Every )
+  {
+    nlohmann::json Event = i_rEvent;
+    Event["frame"] = Frame;
+    Events.push_back( std::move( Event ) );
+  }
+  return Events;
+}
+
+std::vector<int64_t> NumbersBehind( const std::string& i_rWords, const std::string& i_rText )
+{
+  std::vector<int64_t> Numbers;
+  for( size_t Place = i_rText.find( i_rWords ); Place != std::string::npos; Place = i_rText.find( i_rWords, Place + 1 ) )
+  {
+    Numbers.push_back( std::strtoll( i_rText.c_str() + Place + i_rWords.size(), nullptr, 10 ) );
+  }
+  return Numbers;
+}
+
+}

@@ -1,0 +1,117 @@
+// Ends that were not planned: signals from outside, and a program that dies.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/TvidParser.h"
+#include "tests/support/system/CounterFile.h"
+#include "tests/support/system/Rates.h"
+#include "tests/support/system/StageHost.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+
+using namespace SystemTests;
+
+namespace
+{
+
+// Sends signals once so many frames are captured.
+VRunOptions SignalAfter( int64_t i_Frames, std::vector<int> i_Signals )
+{
+  VRunOptions Options;
+  Options.m_OnErrorText = [i_Frames, i_Signals, bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
+  {
+    const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", i_rText );
+    if( !bSent && !Captured.empty() && Captured.back() >= i_Frames )
+    {
+      bSent = true;
+      for( const int Signal : i_Signals )
+      {
+        kill( i_Child, Signal );
+      }
+    }
+  };
+  return Options;
+}
+
+const VArguments LongRecording = { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_576I_5000,speed=4", "--frames", "100000",
+  "--progress" };
+constexpr int64_t EnoughFrames = 30;
+
+}
+
+class EndTest : public testing::TestWithParam<int>
+{
+protected:
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_P( EndTest, OneSignalFinishesTheFile )
+{
+  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { GetParam() } ) );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
+  EXPECT_GE( Frames.size(), static_cast<size_t>( EnoughFrames ) );
+  ExpectUnbroken( Frames, Rate25 );
+  EXPECT_TRUE( TestSupport::VTvidParser( Result.Path() ).IsFinished() );
+  EXPECT_EQ( Frames.size(), Result.Device().value( "frames_written", 0u ) );
+  EXPECT_EQ( Frames.size(), Result.Device().value( "frames_requested", 0u ) );
+  EXPECT_EQ( "Complete", Result.Device().value( "state", "" ) );
+}
+
+INSTANTIATE_TEST_SUITE_P( Signals, EndTest, testing::Values( SIGINT, SIGTERM ) );
+
+class SuddenEndTest : public testing::Test
+{
+protected:
+  const TestSupport::VTemporaryFolder m_Folder;
+  const std::string m_Path = m_Folder.File( "out" ) + "/take_vi0.tvid";
+
+  void ExpectWholeFramesOfAnUnclosedFile()
+  {
+    const nlohmann::json Told = Inspect( m_Path, true );
+    EXPECT_EQ( false, Told.value( "finished", true ) ) << Told;
+    const std::vector<VCounterFrame> Frames = ReadCounterFile( m_Path );
+    EXPECT_FALSE( Frames.empty() );
+    EXPECT_EQ( Frames.size(), Told.value( "frame_count", 0u ) );
+    EXPECT_EQ( Frames.size(), Told.value( "frames", nlohmann::json::array() ).size() );
+    ExpectUnbroken( Frames, Rate25 );
+    const VRunResult Text = TestSupport::RunStageHost( { "inspect", m_Path } );
+    EXPECT_EQ( 0, Text.m_ExitCode );
+    EXPECT_NE( std::string::npos, Text.m_Output.find( "never closed" ) ) << Describe( Text );
+  }
+};
+
+TEST_F( SuddenEndTest, TwoSignalsEndTheProgramAtOnce )
+{
+  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { SIGINT, SIGTERM } ) );
+  EXPECT_EQ( 130, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( "", Result.m_Run.m_Output );
+}
+
+TEST_F( SuddenEndTest, AKilledRecordingCanBeRead )
+{
+  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { SIGKILL } ) );
+  EXPECT_EQ( SIGKILL, Result.m_Run.m_Signal ) << Describe( Result.m_Run );
+  ExpectWholeFramesOfAnUnclosedFile();
+}
+
+// A signal before there is anything to finish.
+TEST_F( SuddenEndTest, AnEndBeforeTheBeginning )
+{
+  VRunOptions Options;
+  Options.m_OnErrorText = [bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
+  {
+    if( !bSent && i_rText.find( "SetSourceEnabled" ) != std::string::npos )
+    {
+      bSent = true;
+      kill( i_Child, SIGINT );
+    }
+  };
+  // A card with no signal for a long time: the program waits.
+  const std::string Script = WriteScript( m_Folder.File( "script.json" ), { { { "frame", 0 }, { "do", "signal-loss" }, { "frames", 100000 } } } );
+  const VRecordResult Result = Record( m_Folder.File( "out" ),
+    { "--card", "decklink:standard=SD_720_576I_5000,script=" + Script, "--frames", "10", "--verbose" }, Options );
+  EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( "", Result.m_Run.m_Output );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: Interrupted " ) ) << Describe( Result.m_Run );
+}

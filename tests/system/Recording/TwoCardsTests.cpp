@@ -1,0 +1,95 @@
+// Several cards, one timeline.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/system/CounterFile.h"
+#include "tests/support/system/Rates.h"
+#include "tests/support/system/StageHost.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdlib>
+
+using namespace SystemTests;
+
+namespace
+{
+
+struct VCard
+{
+  VSignalRate m_Rate;
+  const char* m_pTimecode;
+};
+
+struct VPairCase
+{
+  const char* m_pName;
+  VCard m_Cards[2];
+};
+
+// By timecode, by delivery because the timecodes tell of different worlds, by delivery because there is none, and mixed.
+const VPairCase PairCases[] = {
+  { "25And5994", { { Rate25, "10:00:00:00" }, { Rate5994Drop, "10:00:00;00" } } },
+  { "25And2997Drop", { { Rate25, "10:00:00:00" }, { Rate2997Drop, "10:00:00;00" } } },
+  { "OtherTimecode", { { Rate25, "01:00:00:00" }, { Rate5994, "07:00:00:00" } } },
+  { "NoTimecode", { { Rate50, "none" }, { Rate2398, "none" } } },
+  { "OneTimecode", { { Rate25, "10:00:00:00" }, { Rate60, "none" } } },
+};
+
+// The cards of one program are made one after another; their first frames are that far apart, at most.
+constexpr int64_t StartSpread = 135000000 / 4;
+
+}
+
+class TwoCardsTest : public testing::TestWithParam<VPairCase>
+{
+protected:
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_P( TwoCardsTest, FirstFramesLieWithinOneFrameOfEachOther )
+{
+  VArguments Arguments = { "--seconds", "1", "--pre-roll", "0.5" };
+  for( const VCard& rCard : GetParam().m_Cards )
+  {
+    Arguments = Arguments +
+      VArguments{ "--card",
+        std::string( "decklink:pattern=counter,audio=ramp,standard=" ) + rCard.m_Rate.m_pStandard + ",timecode=" + rCard.m_pTimecode };
+  }
+  const VRecordResult Result = Record( m_Folder.File( "out" ), Arguments );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ASSERT_EQ( 2u, Result.m_Devices.size() ) << Describe( Result.m_Run );
+
+  int64_t Starts[2] = {};
+  int64_t CardTimes[2] = {};   // of the first frame since its card's own first
+  for( size_t Card = 0; Card < 2; ++Card )
+  {
+    const VSignalRate& rRate = GetParam().m_Cards[Card].m_Rate;
+    const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path( Card ) );
+    ASSERT_FALSE( Frames.empty() );
+    ExpectUnbroken( Frames, rRate );
+    EXPECT_EQ( Frames.size(), Result.Device( Card ).value( "frames_requested", 0u ) );
+    Starts[Card] = Result.Device( Card ).value( "start_tick", int64_t{ 0 } );
+    CardTimes[Card] = Frames.front().m_Counter * rRate.m_Period;
+  }
+  const int64_t FramePeriod = std::max( GetParam().m_Cards[0].m_Rate.m_Period, GetParam().m_Cards[1].m_Rate.m_Period );
+  EXPECT_LT( std::abs( Starts[0] - Starts[1] ), FramePeriod ) << Starts[0] << " " << Starts[1];
+  EXPECT_LT( std::abs( CardTimes[0] - CardTimes[1] ), FramePeriod + StartSpread ) << CardTimes[0] << " " << CardTimes[1];
+}
+
+INSTANTIATE_TEST_SUITE_P( Pairs, TwoCardsTest, testing::ValuesIn( PairCases ),
+  []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pName ); } );
+
+// A card that is told to be left out is left out.
+TEST( TwoCards, OnlyTheDevicesAskedForAreRecorded )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  const VRecordResult Result = Record( Folder.File( "out" ),
+    { "--card", "decklink:standard=SD_720_576I_5000", "--card", "decklink:standard=SD_720_486P_5994,pattern=counter,audio=ramp,speed=2", "--device",
+      "vi:1", "--frames", "20" } );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ASSERT_EQ( 1u, Result.m_Devices.size() );
+  EXPECT_EQ( "vi:1", Result.Device().value( "urn", "" ) );
+  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
+  EXPECT_EQ( 20u, Frames.size() );
+  ExpectUnbroken( Frames, Rate5994 );
+}
