@@ -19,6 +19,7 @@ constexpr uint32_t StateCapturing = 4;
 constexpr uint32_t StateComplete = 32;
 constexpr uint32_t StateCancelled = 128;
 constexpr uint32_t FailureStart = 1;
+constexpr uint32_t FailureEndMoved = 2;
 constexpr uint32_t FailureMemory = 4;
 constexpr uint32_t FailureErrors = 8;
 
@@ -31,6 +32,12 @@ KVZ::VCaptureSessionId NextCaptureId()
 {
   static std::atomic<uint32_t> s_Newest{ 0 };
   return KVZ::VCaptureSessionId( ++s_Newest );
+}
+
+// Its range is known, and none of it is still to come.
+bool HasEnded( const KVZ::ICaptureStatus& i_rStatus )
+{
+  return i_rStatus.m_State != StateWaitingForStart && i_rStatus.m_State != StateCapturing && !i_rStatus.m_RequestedStart.IsOpen();
 }
 
 bool IsOver( const KVZ::ICaptureStatus& i_rStatus )
@@ -101,6 +108,8 @@ VRecording::VDevice VRecording::MakeDevice( const VStartedSource& i_rSource, con
     : static_cast<uint64_t>( CeilDivide( ( i_Start + i_rRequest.m_Duration - CounterStart ).Count(), Period.Count() ) - First );
   Device.m_Sync = i_rSource.m_pSource->Temporal().GetSourceSyncStatus();
   Device.m_DroppedAtStart = Device.m_Sync.m_DroppedFrames;
+  const KVZ::VTick Newest = CounterStart + Period * static_cast<int64_t>( Device.m_Sync.m_LatestCounterFrames );
+  Device.m_Arrived = FramesOf( Newest - Device.m_Start + Period, Period );
   Device.m_LastProgress = m_rTime.Now();
   return Device;
 }
@@ -156,10 +165,26 @@ void VRecording::Poll()
 
 void VRecording::PollDevice( VDevice& io_rDevice )
 {
+  const bool bHadEnded = HasEnded( io_rDevice.m_Status );
+  const auto Sync = io_rDevice.m_pSource->Temporal().GetSourceSyncStatus();   // first: what it counts lies before the status
   io_rDevice.m_Status = io_rDevice.m_pSource->Capture().GetCaptureStatus();
-  io_rDevice.m_Sync = io_rDevice.m_pSource->Temporal().GetSourceSyncStatus();
+  CountArrivals( io_rDevice, Sync );
+  io_rDevice.m_Sync = Sync;
+  // A signal that comes back after the end makes the card count its absence: that is behind the range.
+  const bool bCutOff = HasEnded( io_rDevice.m_Status ) && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0;
+  if( !bHadEnded && !bCutOff )
+  {
+    io_rDevice.m_Dropped = Sync.m_DroppedFrames - io_rDevice.m_DroppedAtStart;
+  }
   io_rDevice.m_PeakFill = std::max( io_rDevice.m_PeakFill, io_rDevice.m_Status.m_BufferFill );
   io_rDevice.m_PeakBacklog = std::max( io_rDevice.m_PeakBacklog, FramesOf( io_rDevice.m_Status.m_AvailableDuration, io_rDevice.m_Period ) );
+}
+
+// A new session counts from 0 again; frames that came between the last look at the old one and its end are not seen.
+void VRecording::CountArrivals( VDevice& io_rDevice, const KVZ::ISourceTemporal::ISourceSyncStatus& i_rSync )
+{
+  const bool bSameSession = i_rSync.m_Session.m_Id == io_rDevice.m_Sync.m_Session.m_Id;
+  io_rDevice.m_Arrived += bSameSession ? LessOrZero( i_rSync.m_LatestCounterFrames, io_rDevice.m_Sync.m_LatestCounterFrames ) : i_rSync.m_LatestCounterFrames + 1;
 }
 
 void VRecording::EndStalled( VDevice& io_rDevice, double i_Now )
@@ -218,6 +243,11 @@ VDeviceOutcome VRecording::MakeOutcome( const VDevice& i_rDevice ) const
   Outcome.m_Timing = i_rDevice.m_pSource->Temporal().GetSourceTimingInfo();
   Outcome.m_Files = m_rTargets.GetReports( i_rDevice.m_CaptureId );
   Outcome.m_FramesCaptured = FramesOf( i_rDevice.m_Status.m_CapturedDuration, i_rDevice.m_Period );
+  if( !HasEnded( i_rDevice.m_Status ) )
+  {
+    // The source tells the length of the whole range, what is still to come included.
+    Outcome.m_FramesCaptured = std::min( i_rDevice.m_Arrived, i_rDevice.m_FramesRequested );
+  }
   Outcome.m_FramesRequested = i_rDevice.m_bStopped ? std::min( Outcome.m_FramesCaptured, i_rDevice.m_FramesRequested ) : i_rDevice.m_FramesRequested;
   if( !Outcome.m_Files.empty() )
   {
@@ -229,7 +259,7 @@ VDeviceOutcome VRecording::MakeOutcome( const VDevice& i_rDevice ) const
   const uint64_t Clipped = i_rDevice.m_Status.m_Start.IsOpen() || i_rDevice.m_Status.m_Start <= i_rDevice.m_Start
     ? 0
     : std::min( Missing, FramesOf( i_rDevice.m_Status.m_Start - i_rDevice.m_Start, i_rDevice.m_Period ) );
-  Outcome.m_Lost.m_Card = i_rDevice.m_Sync.m_DroppedFrames - i_rDevice.m_DroppedAtStart;
+  Outcome.m_Lost.m_Card = i_rDevice.m_Dropped;
   Outcome.m_Lost.m_Memory = ( i_rDevice.m_Status.m_Failure & FailureMemory ) != 0 ? Missing : Clipped;
   Outcome.m_Lost.m_Signal = Missing - Outcome.m_Lost.m_Memory;
   Outcome.m_Lost.m_Writer = LessOrZero( Outcome.m_FramesCaptured, Outcome.m_FramesWritten );

@@ -57,7 +57,7 @@ int Run( const VOptions& i_rOptions )
   const std::vector<VDeviceInfo> Devices = Session.WaitForDevices( false );
   if( Devices.empty() )
   {
-    return ExitNoDevice;
+    return VHostSession::ExitWithoutDevices();
   }
   if( i_rOptions.m_bJson )
   {

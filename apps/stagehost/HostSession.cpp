@@ -102,6 +102,11 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
     }
   } while( WaitUninterrupted( PollSeconds ) );
 
+  if( IsInterrupted() )
+  {
+    Complain( "Interrupted while waiting for the devices." );
+    return {};
+  }
   if( Devices.empty() )
   {
     Complain( m_Cards.Count() > 0 ? "No device has appeared." : "No device was found. A virtual one comes with --card, for example --card decklink" );
@@ -125,4 +130,9 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
     }
   }
   return Devices;
+}
+
+int VHostSession::ExitWithoutDevices()
+{
+  return IsInterrupted() ? ExitFailed : ExitNoDevice;
 }

@@ -35,6 +35,8 @@ public:
   // Waits until the devices are there and, if told so, until each of them has a signal. The devices asked for, in the order of their
   // indices; empty, with the reason on standard error, where there are none, one is unknown or, if told so, one has no signal.
   std::vector<StageHost::VDeviceInfo> WaitForDevices( bool i_bNeedSignal );
+  // The exit code for an empty answer.
+  static int ExitWithoutDevices();
 
   StageHost::VStandAloneHost& Host() { return *m_pHost; }
   StageHost::VDeviceSettings& Settings() { return *m_pSettings; }

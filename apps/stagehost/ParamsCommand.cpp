@@ -87,7 +87,7 @@ int Run( const VOptions& i_rOptions )
   }
   if( Session.WaitForDevices( false ).empty() )
   {
-    return ExitNoDevice;
+    return VHostSession::ExitWithoutDevices();
   }
   const int Result = i_rOptions.m_pList->parsed() ? List( Session, i_rOptions )
     : i_rOptions.m_pGet->parsed()                 ? Get( Session, i_rOptions )

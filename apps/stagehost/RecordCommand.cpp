@@ -280,7 +280,7 @@ int Run( const VOptions& i_rOptions )
   const std::vector<VDeviceInfo> Devices = Session.WaitForDevices( true );
   if( Devices.empty() )
   {
-    return ExitNoDevice;
+    return VHostSession::ExitWithoutDevices();
   }
   for( const VDeviceInfo& rDevice : Devices )
   {

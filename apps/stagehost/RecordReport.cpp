@@ -2,6 +2,7 @@
 
 #include "Core/VideoInterface/Timecode.h"
 #include "Core/VideoInterface/VideoContainer.h"
+#include "apps/stagehost/HostSession.h"
 #include "apps/stagehost/TextTable.h"
 
 #include <boost/algorithm/string/case_conv.hpp>
@@ -52,6 +53,42 @@ std::vector<std::string> ErrorsOf( const VDeviceOutcome& i_rOutcome )
     }
   }
   return Errors;
+}
+
+// SyncSystem's failure flags, as they cross the interface.
+constexpr uint32_t FailureStart = 1;
+constexpr uint32_t FailureEndMoved = 2;
+constexpr uint32_t FailureMemory = 4;
+
+std::string FramesText( uint64_t i_Frames )
+{
+  return std::to_string( i_Frames ) + ( i_Frames == 1 ? " frame" : " frames" );
+}
+
+// Why a recording is not all that was asked for, and what helps.
+std::vector<std::string> Reasons( const VDeviceOutcome& i_rOutcome )
+{
+  std::vector<std::string> Texts;
+  const uint32_t Failure = i_rOutcome.m_Status.m_Failure;
+  const std::string Reached = "after " + std::to_string( i_rOutcome.m_FramesCaptured ) + " of " + FramesText( i_rOutcome.m_FramesRequested );
+  if( ( Failure & FailureMemory ) != 0 )
+  {
+    Texts.push_back( "Memory ran out " + Reached + ": they come faster than the file can be written. A larger --memory bridges a longer time." );
+  }
+  else if( ( Failure & FailureStart ) != 0 || i_rOutcome.m_Lost.m_Memory != 0 )
+  {
+    const std::string What = ( Failure & FailureStart ) != 0 ? "The frames asked for are" : "The first " + FramesText( i_rOutcome.m_Lost.m_Memory ) + " asked for are";
+    Texts.push_back( What + " no longer in memory. A shorter --pre-roll or a larger --memory keeps them." );
+  }
+  if( i_rOutcome.m_Lost.m_Signal != 0 && ( Failure & FailureStart ) == 0 )
+  {
+    Texts.push_back( ( ( Failure & FailureEndMoved ) != 0 ? "The signal was interrupted or changed " : "No more frames came " ) + Reached + "." );
+  }
+  if( i_rOutcome.m_Lost.m_Card != 0 )
+  {
+    Texts.push_back( "The card missed " + FramesText( i_rOutcome.m_Lost.m_Card ) + " within the recording." );
+  }
+  return Texts;
 }
 
 nlohmann::ordered_json DriftToJson( const VDeviceOutcome& i_rOutcome )
@@ -201,9 +238,12 @@ bool VRecordReport::Print( const std::vector<VDeviceOutcome>& i_rOutcomes ) cons
     {
       PrintText( rOutcome );
     }
-    for( const std::string& rError : ErrorsOf( rOutcome ) )
+    for( const std::vector<std::string>& rTexts : { ErrorsOf( rOutcome ), Reasons( rOutcome ) } )
     {
-      std::fprintf( stderr, "stagehost: %s: %s\n", rOutcome.m_DeviceURN.c_str(), rError.c_str() );
+      for( const std::string& rText : rTexts )
+      {
+        Complain( rOutcome.m_DeviceURN + ": " + rText );
+      }
     }
   }
   if( m_Options.m_bJson )
