@@ -101,6 +101,8 @@ void VVideoInputDeviceParameterHandler::CreateParameters()
   CreateTimecodeSetup();
   CreatePixelAspectRatio();
 
+  // Before the first reading: what changes in between is then read again.
+  SubscribeToDevice();
   UpdateStatus();
   OnVideoStandardChanged();
   OnTimecodeChanged();
@@ -112,7 +114,6 @@ void VVideoInputDeviceParameterHandler::CreateParameters()
   CreateOpticalSettings();
   CreateDeviceControls();
   SubscribeToStartSettings();
-  SubscribeToDevice();
   SubscribeToSystem();
   Publish<uint32_t>( DeviceSchemas::ConnectionCountKey(), 1 );   // the first appearance, with or without a signal
 }
