@@ -1,19 +1,46 @@
 #include "FileIO/WriterSupport/WatchedStream.h"
 
+#include "StageCoreRuntime/GlobalLog.h"
 #include "Utils/UtilsIO/LargeFile.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <system_error>
 
 namespace WriterSupport
 {
 
+namespace
+{
+
+// The system's reason, where the stream is one of its files: to the person who reads it a full disk is something else than a revoked right.
+void LogSystemReason( const char* i_pWhat )
+{
+  if( errno != 0 )
+  {
+    KVZ_LOG_ERROR( "WriterSupport", "%1%: %2%.", i_pWhat, std::generic_category().message( errno ) );
+  }
+}
+
+}
+
 std::unique_ptr<UtilsIO::IClosableStream> MakeFile( const std::string& i_rPath )
 {
   auto pFile = std::make_unique<UtilsIO::VLargeFile>();
-  return pFile->Open( i_rPath, UtilsIO::EOpenMode::Truncate ) ? std::move( pFile ) : nullptr;
+  errno = 0;
+  if( !pFile->Open( i_rPath, UtilsIO::EOpenMode::Truncate ) )
+  {
+    LogSystemReason( "Opening failed" );
+    return nullptr;
+  }
+  return pFile;
 }
 
-bool VWatchedStream::Write( const void* i_pData, size_t i_Size ) { return Moved( m_pStream->Write( i_pData, i_Size ), m_Position + i_Size ); }
+bool VWatchedStream::Write( const void* i_pData, size_t i_Size )
+{
+  errno = 0;
+  return Moved( m_pStream->Write( i_pData, i_Size ), m_Position + i_Size );
+}
 
 bool VWatchedStream::Write( const std::vector<VSpan>& i_rSpans )
 {
@@ -22,6 +49,7 @@ bool VWatchedStream::Write( const std::vector<VSpan>& i_rSpans )
   {
     Size += rSpan.second;
   }
+  errno = 0;
   return Moved( m_pStream->Write( i_rSpans ), m_Position + Size );
 }
 
@@ -63,6 +91,10 @@ bool VWatchedStream::Moved( bool i_bDone, uint64_t i_Position )
     m_Position = i_Position;
     m_End = std::max( m_End, m_Position );
     return true;
+  }
+  if( !i_bDone && !m_bFailed )
+  {
+    LogSystemReason( "Writing failed" );
   }
   m_bFailed = m_bFailed || !i_bDone;
   m_bPositionKnown = false;
