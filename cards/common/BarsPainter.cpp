@@ -42,7 +42,7 @@ std::vector<VColour> BarPixels( const VPictureFormat& i_rFormat )
   for( uint32_t x = 0; x < i_rFormat.Width(); ++x )
   {
     // In pairs, so that a bar's edge never falls inside one
-    const auto& [ Red, Green, Blue ] = BarColours[ x / 2 * 2 * BarColours.size() / i_rFormat.Width() ];
+    const auto& [Red, Green, Blue] = BarColours[x / 2 * 2 * BarColours.size() / i_rFormat.Width()];
     Pixels.push_back( MakeColour( Red, Green, Blue, i_rFormat.Height() ) );
   }
   return Pixels;
@@ -63,10 +63,15 @@ class VBarsPainter final : public IPainter
 {
 public:
   explicit VBarsPainter( const VPictureFormat& i_rFormat )
-    : m_Format( i_rFormat ), m_RowBytes( i_rFormat.RowBytes() ), m_RampTop( i_rFormat.Height() * 3 / 4 ), m_BandTop( i_rFormat.Height() * 5 / 6 ),
-      m_Bars( Encode( i_rFormat, BarPixels( i_rFormat ) ) ), m_Ramp( Encode( i_rFormat, RampPixels( i_rFormat ) ) ),
+    : m_Format( i_rFormat ),
+      m_RowBytes( i_rFormat.RowBytes() ),
+      m_RampTop( i_rFormat.Height() * 3 / 4 ),
+      m_BandTop( i_rFormat.Height() * 5 / 6 ),
+      m_Bars( Encode( i_rFormat, BarPixels( i_rFormat ) ) ),
+      m_Ramp( Encode( i_rFormat, RampPixels( i_rFormat ) ) ),
       m_Band( Encode( i_rFormat, std::vector<VColour>( i_rFormat.Width(), Black ) ) ),
-      m_Moving( BytesOf( i_rFormat.m_PixelFormat, MovingWidth ) ), m_Large( i_rFormat, i_rFormat.Height() / 108 ),
+      m_Moving( BytesOf( i_rFormat.m_PixelFormat, MovingWidth ) ),
+      m_Large( i_rFormat, i_rFormat.Height() / 108 ),
       m_Small( i_rFormat, std::max( 1u, i_rFormat.Height() / 216 ) )
   {
     EncodePixels( i_rFormat.m_PixelFormat, std::vector<VColour>( MovingWidth, White ), m_Moving.data() );
@@ -91,10 +96,7 @@ public:
   }
 
 private:
-  const uint8_t* BackgroundRow( uint32_t i_Y ) const
-  {
-    return ( i_Y < m_RampTop ? m_Bars : i_Y < m_BandTop ? m_Ramp : m_Band ).data();
-  }
+  const uint8_t* BackgroundRow( uint32_t i_Y ) const { return ( i_Y < m_RampTop ? m_Bars : i_Y < m_BandTop ? m_Ramp : m_Band ).data(); }
 
   void PaintBackground( uint8_t* o_pBytes ) const
   {
@@ -133,10 +135,7 @@ private:
     m_Small.Draw( o_pBytes, Number.data(), m_Format.Width() - ( NumberDigits + 1 ) * m_Small.CellWidth(), CentreInBand( m_Small ) );
   }
 
-  uint32_t CentreInBand( const VGlyphs& i_rGlyphs ) const
-  {
-    return m_BandTop + ( m_Format.Height() - m_BandTop - i_rGlyphs.CellHeight() ) / 2;
-  }
+  uint32_t CentreInBand( const VGlyphs& i_rGlyphs ) const { return m_BandTop + ( m_Format.Height() - m_BandTop - i_rGlyphs.CellHeight() ) / 2; }
 
   const VPictureFormat m_Format;
   const size_t m_RowBytes;
@@ -152,9 +151,6 @@ private:
 
 }
 
-std::unique_ptr<IPainter> MakeBarsPainter( const VPictureFormat& i_rFormat )
-{
-  return std::make_unique<VBarsPainter>( i_rFormat );
-}
+std::unique_ptr<IPainter> MakeBarsPainter( const VPictureFormat& i_rFormat ) { return std::make_unique<VBarsPainter>( i_rFormat ); }
 
 }

@@ -102,14 +102,11 @@ constexpr std::array Kinds = {
 
 }
 
-std::span<const VCardKind> CardKinds()
-{
-  return Kinds;
-}
+std::span<const VCardKind> CardKinds() { return Kinds; }
 
 const VCardKind* FindCardKind( std::string_view i_Name )
 {
-  const auto Found = std::find_if( Kinds.begin(), Kinds.end(), [ & ]( const VCardKind& i_rKind ) { return i_Name == i_rKind.m_pName; } );
+  const auto Found = std::find_if( Kinds.begin(), Kinds.end(), [&]( const VCardKind& i_rKind ) { return i_Name == i_rKind.m_pName; } );
   return Found != Kinds.end() ? &*Found : nullptr;
 }
 

@@ -28,10 +28,7 @@ VCardRunner::VCardRunner( VSignalTimeline i_Timeline, const VPaceSettings& i_rSe
 {
 }
 
-VCardRunner::~VCardRunner()
-{
-  Stop();
-}
+VCardRunner::~VCardRunner() { Stop(); }
 
 void VCardRunner::Start()
 {
@@ -39,7 +36,7 @@ void VCardRunner::Start()
   m_Start = VPaceClock::now();
   if( !m_Settings.m_bManualClock )
   {
-    m_Thread = boost::thread( [ this ] { Run(); } );
+    m_Thread = boost::thread( [this] { Run(); } );
     m_CardThread = m_Thread.get_id();
   }
 }

@@ -11,7 +11,8 @@ namespace VirtualCards
 namespace
 {
 
-template<class TEnum> struct VChoice
+template<class TEnum>
+struct VChoice
 {
   const char* m_pName;
   TEnum m_Value;
@@ -33,7 +34,8 @@ std::string Refusal( const std::string& i_rValue, const std::string& i_rAccepted
 }
 
 // Each of these gives the reason for a refusal, or an empty text.
-template<class TChoices, class TValue> std::string ParseChoice( const TChoices& i_rChoices, const std::string& i_rText, TValue& o_rValue )
+template<class TChoices, class TValue>
+std::string ParseChoice( const TChoices& i_rChoices, const std::string& i_rText, TValue& o_rValue )
 {
   std::string Accepted;
   for( const auto& rChoice : i_rChoices )
@@ -48,10 +50,11 @@ template<class TChoices, class TValue> std::string ParseChoice( const TChoices& 
   return Refusal( i_rText, Accepted );
 }
 
-template<class TNumber> bool ParseWhole( const std::string& i_rText, TNumber& o_rNumber )
+template<class TNumber>
+bool ParseWhole( const std::string& i_rText, TNumber& o_rNumber )
 {
   const char* pEnd = i_rText.data() + i_rText.size();
-  const auto [ pRead, Error ] = std::from_chars( i_rText.data(), pEnd, o_rNumber );
+  const auto [pRead, Error] = std::from_chars( i_rText.data(), pEnd, o_rNumber );
   return Error == std::errc() && pRead == pEnd;
 }
 
@@ -66,10 +69,7 @@ std::string SetStandard( VCardSpec& o_rSpec, const std::string& i_rText )
   return Reason;
 }
 
-std::string SetPattern( VCardSpec& o_rSpec, const std::string& i_rText )
-{
-  return ParseChoice( Patterns, i_rText, o_rSpec.m_Pattern );
-}
+std::string SetPattern( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseChoice( Patterns, i_rText, o_rSpec.m_Pattern ); }
 
 std::string SetTimecode( VCardSpec& o_rSpec, const std::string& i_rText )
 {
@@ -77,10 +77,7 @@ std::string SetTimecode( VCardSpec& o_rSpec, const std::string& i_rText )
   return o_rSpec.m_Timecode || i_rText == "none" ? std::string() : Refusal( i_rText, "HH:MM:SS:FF, HH:MM:SS;FF (drop-frame), none" );
 }
 
-std::string SetAudio( VCardSpec& o_rSpec, const std::string& i_rText )
-{
-  return ParseChoice( Audios, i_rText, o_rSpec.m_Audio );
-}
+std::string SetAudio( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseChoice( Audios, i_rText, o_rSpec.m_Audio ); }
 
 std::string SetChannels( VCardSpec& o_rSpec, const std::string& i_rText )
 {
@@ -110,10 +107,7 @@ std::string SetSpeed( VCardSpec& o_rSpec, const std::string& i_rText )
   return {};
 }
 
-std::string SetLoop( VCardSpec& o_rSpec, const std::string& i_rText )
-{
-  return ParseChoice( Loops, i_rText, o_rSpec.m_bLoop );
-}
+std::string SetLoop( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseChoice( Loops, i_rText, o_rSpec.m_bLoop ); }
 
 std::string SetInput( VCardSpec& o_rSpec, const std::string& i_rText )
 {
@@ -156,7 +150,7 @@ std::string ParseNext( std::string_view& io_rRest, VCardSpec& o_rSpec, std::set<
   const std::string_view Item = bInput ? io_rRest : io_rRest.substr( 0, io_rRest.find( ',' ) );
   const size_t Equals = Item.find( '=' );
   const std::string Name( Item.substr( 0, Equals ) );
-  const auto Found = std::find_if( Keys.begin(), Keys.end(), [ & ]( const VKey& i_rKey ) { return Name == i_rKey.m_pName; } );
+  const auto Found = std::find_if( Keys.begin(), Keys.end(), [&]( const VKey& i_rKey ) { return Name == i_rKey.m_pName; } );
   if( Found == Keys.end() )
   {
     return "no key is called \"" + Name + "\"; accepted: " + ListKeys();

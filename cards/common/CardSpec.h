@@ -46,7 +46,7 @@ struct VCardSpec
   std::optional<KVZ::IVideoStandard::Enum> m_Standard;   // empty: as the default says
   EPattern m_Pattern = EPattern::Bars;
   std::optional<VTimecodeLabel> m_Timecode = VTimecodeLabel();   // empty: the signal carries none
-  std::optional<EAudio> m_Audio;                         // empty: as the default says
+  std::optional<EAudio> m_Audio;                                 // empty: as the default says
   uint32_t m_Channels = 16;
   std::string m_Script;
   double m_Speed = 1.0;

@@ -19,8 +19,8 @@ namespace VirtualCards
 namespace
 {
 
-constexpr int PipeBytes = 1 << 20;      // fewer wake-ups for a stream of pictures; what the system allows anyone
-constexpr int FirstFreeDescriptor = 16; // our ends lie above every descriptor that a child is given
+constexpr int PipeBytes = 1 << 20;        // fewer wake-ups for a stream of pictures; what the system allows anyone
+constexpr int FirstFreeDescriptor = 16;   // our ends lie above every descriptor that a child is given
 
 // Closes the child's ends in this process whatever happens.
 struct VPipeEnds
@@ -37,14 +37,14 @@ struct VPipeEnds
 
 bool MakePipe( int& o_rRead, int& o_rWrite )
 {
-  int Ends[ 2 ];
+  int Ends[2];
   if( pipe2( Ends, O_CLOEXEC ) != 0 )
   {
     return false;
   }
-  o_rRead = Ends[ 0 ];
-  o_rWrite = fcntl( Ends[ 1 ], F_DUPFD_CLOEXEC, FirstFreeDescriptor );
-  close( Ends[ 1 ] );
+  o_rRead = Ends[0];
+  o_rWrite = fcntl( Ends[1], F_DUPFD_CLOEXEC, FirstFreeDescriptor );
+  close( Ends[1] );
   fcntl( o_rRead, F_SETFL, O_NONBLOCK );
   fcntl( o_rRead, F_SETPIPE_SZ, PipeBytes );
   return o_rWrite >= 0;
@@ -170,8 +170,8 @@ VProgramOutput RunProgram( const std::vector<std::string>& i_rCommand, int i_Sec
     return Output;
   }
   std::array<pollfd, 2> Polls = { pollfd{ pChild->Pipe( 0 ), POLLIN, 0 }, pollfd{ pChild->Pipe( 1 ), POLLIN, 0 } };
-  std::string* const Texts[ 2 ] = { &Output.m_Output, &Output.m_Errors };
-  while( Polls[ 0 ].fd >= 0 || Polls[ 1 ].fd >= 0 )
+  std::string* const Texts[2] = { &Output.m_Output, &Output.m_Errors };
+  while( Polls[0].fd >= 0 || Polls[1].fd >= 0 )
   {
     const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( End - VClock::now() ).count();
     if( Left <= 0 )
@@ -182,9 +182,9 @@ VProgramOutput RunProgram( const std::vector<std::string>& i_rCommand, int i_Sec
     poll( Polls.data(), Polls.size(), static_cast<int>( Left ) );
     for( size_t i = 0; i < Polls.size(); ++i )
     {
-      if( Polls[ i ].fd >= 0 && Polls[ i ].revents != 0 && !ReadSome( Polls[ i ].fd, *Texts[ i ] ) )
+      if( Polls[i].fd >= 0 && Polls[i].revents != 0 && !ReadSome( Polls[i].fd, *Texts[i] ) )
       {
-        Polls[ i ].fd = -1;
+        Polls[i].fd = -1;
       }
     }
   }

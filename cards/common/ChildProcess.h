@@ -15,7 +15,8 @@ class VChildProcess
 {
 public:
   // Looks for the program on the PATH. Makes one pipe for each of the child's descriptors. Null, with one line of reason, on failure.
-  static std::unique_ptr<VChildProcess> Start( const std::vector<std::string>& i_rCommand, const std::vector<int>& i_rDescriptors, std::string& o_rError );
+  static std::unique_ptr<VChildProcess> Start( const std::vector<std::string>& i_rCommand, const std::vector<int>& i_rDescriptors,
+    std::string& o_rError );
 
   // Kills what still runs, and waits for its end.
   ~VChildProcess();
@@ -24,7 +25,7 @@ public:
   VChildProcess& operator=( const VChildProcess& ) = delete;
 
   // This end of a pipe, in the order of the descriptors given; never blocks. Owned by this object.
-  int Pipe( size_t i_Index ) const { return m_Pipes[ i_Index ]; }
+  int Pipe( size_t i_Index ) const { return m_Pipes[i_Index]; }
 
   // Waits for the end; true for exit status 0.
   bool Wait();

@@ -164,7 +164,7 @@ std::string PictureFilter( const VClipInput& i_rInput, const VPictureFormat& i_r
   if( !IsSameRate( i_rInput.m_FrameRate, *i_rFormat.m_pStandard ) )
   {
     Filter += ( Filter.empty() ? "fps=" : ",fps=" ) + std::to_string( i_rFormat.m_pStandard->m_RateNumerator ) + "/" +
-              std::to_string( i_rFormat.m_pStandard->m_RateDenominator );
+      std::to_string( i_rFormat.m_pStandard->m_RateDenominator );
   }
   return Filter;
 }
@@ -193,7 +193,7 @@ std::optional<std::vector<std::string>> SplitOptions( const std::string& i_rText
   char Quote = 0;
   for( size_t i = 0; i < i_rText.size(); ++i )
   {
-    const char Char = i_rText[ i ];
+    const char Char = i_rText[i];
     if( Quote == 0 && ( Char == ' ' || Char == '\t' || Char == '\n' ) )
     {
       bWord = false;
@@ -218,7 +218,7 @@ std::optional<std::vector<std::string>> SplitOptions( const std::string& i_rText
       {
         return std::nullopt;
       }
-      Words.back() += i_rText[ i ];
+      Words.back() += i_rText[i];
     }
     else
     {
@@ -239,17 +239,19 @@ KVZ::IVideoStandard::Enum NearestStandard( const VCardKind& i_rKind, const VClip
   {
     return DefaultStandard;
   }
-  const auto Distance = [ & ]( KVZ::IVideoStandard::Enum i_Standard )
+  const auto Distance = [&]( KVZ::IVideoStandard::Enum i_Standard )
   {
     const KVZ::VVideoStandardRow& rRow = *KVZ::FindVideoStandard( i_Standard );
-    const double Size = std::abs( std::log( 1.0 * i_rInput.m_Width / rRow.m_Width ) ) + std::abs( std::log( 1.0 * i_rInput.m_Height / rRow.m_Height ) );
-    const double Rate =
-      IsSameRate( i_rInput.m_FrameRate, rRow ) ? 0.0 : std::abs( std::log( i_rInput.m_FrameRate * rRow.m_RateDenominator / rRow.m_RateNumerator ) );
+    const double Size = std::abs( std::log( 1.0 * i_rInput.m_Width / rRow.m_Width ) ) +
+      std::abs( std::log( 1.0 * i_rInput.m_Height / rRow.m_Height ) );
+    const double Rate = IsSameRate( i_rInput.m_FrameRate, rRow )
+      ? 0.0
+      : std::abs( std::log( i_rInput.m_FrameRate * rRow.m_RateDenominator / rRow.m_RateNumerator ) );
     const int Scan = i_rInput.m_bInterlaced == ( rRow.m_Scan == KVZ::EScan::Interlaced ) ? ( rRow.m_Scan == KVZ::EScan::SegmentedFrame ? 1 : 0 ) : 2;
     return std::tuple( Size, Rate, Scan );
   };
   return *std::min_element( i_rKind.m_Standards.begin(), i_rKind.m_Standards.end(),
-    [ & ]( KVZ::IVideoStandard::Enum i_A, KVZ::IVideoStandard::Enum i_B ) { return Distance( i_A ) < Distance( i_B ); } );
+    [&]( KVZ::IVideoStandard::Enum i_A, KVZ::IVideoStandard::Enum i_B ) { return Distance( i_A ) < Distance( i_B ); } );
 }
 
 std::vector<std::string> ClipCommand( const VClipInput& i_rInput, const VPictureFormat& i_rFormat )
@@ -267,8 +269,9 @@ std::vector<std::string> ClipCommand( const VClipInput& i_rInput, const VPicture
   Append( Command, { "-f", "rawvideo", "pipe:1" } );
   if( i_rInput.m_AudioChannels > 0 )
   {
-    Append( Command, { "-map", std::to_string( i_rInput.m_AudioInput ) + ":a:0", "-ar", "48000", "-ac", std::to_string( i_rInput.m_AudioChannels ), "-c:a", "pcm_s32le", "-f", "s32le",
-                       "pipe:" + std::to_string( ClipSoundDescriptor ) } );
+    Append( Command,
+      { "-map", std::to_string( i_rInput.m_AudioInput ) + ":a:0", "-ar", "48000", "-ac", std::to_string( i_rInput.m_AudioChannels ), "-c:a",
+        "pcm_s32le", "-f", "s32le", "pipe:" + std::to_string( ClipSoundDescriptor ) } );
   }
   return Command;
 }

@@ -17,10 +17,10 @@ struct VClipInput
   bool m_bOptionsForm = false;          // given as options: may be live, and what FFmpeg found is known only in part
   uint32_t m_Width = 0;                 // pixels as shown; 0 for not known
   uint32_t m_Height = 0;
-  double m_FrameRate = 0;               // frames a second; 0 for not known
+  double m_FrameRate = 0;   // frames a second; 0 for not known
   bool m_bInterlaced = false;
-  uint32_t m_AudioChannels = 0;         // of the first sound track; 0 for none
-  uint32_t m_AudioInput = 0;            // which of several inputs has it; pictures are those of the first
+  uint32_t m_AudioChannels = 0;   // of the first sound track; 0 for none
+  uint32_t m_AudioInput = 0;      // which of several inputs has it; pictures are those of the first
 };
 
 // Splits text as a shell does: blanks part the words; '...', "..." and \ quote. Empty for an unfinished quotation.

@@ -22,13 +22,13 @@ namespace VirtualCards
 namespace
 {
 
-constexpr size_t PicturesReady = 6;          // enough to bridge the start of the next pass
-constexpr size_t MostPictures = 64;          // while sound is awaited
+constexpr size_t PicturesReady = 6;   // enough to bridge the start of the next pass
+constexpr size_t MostPictures = 64;   // while sound is awaited
 constexpr uint64_t SoundReadySamples = 2 * AudioRate;
 constexpr uint64_t MostLiveSamples = AudioRate / 2;   // what a live input runs ahead beyond this is left out
 constexpr int PatienceSeconds = 20;
 constexpr size_t MostErrorText = 65536;
-constexpr size_t CompactAbove = 1 << 20;     // bytes of sound already taken
+constexpr size_t CompactAbove = 1 << 20;   // bytes of sound already taken
 
 }
 
@@ -39,15 +39,19 @@ struct VClipReader::VRun
   int m_Pictures = -1;   // pipes; -1 once they have ended
   int m_Sound = -1;
   int m_Errors = -1;
-  VPicture m_Picture;    // being filled
+  VPicture m_Picture;   // being filled
   size_t m_Filled = 0;
-  uint64_t m_Count = 0;  // whole pictures
+  uint64_t m_Count = 0;   // whole pictures
   std::string m_ErrorText;
 };
 
 VClipReader::VClipReader( VClipInput i_Input, const VPictureFormat& i_rFormat, bool i_bLoop, bool i_bWait )
-  : m_Input( std::move( i_Input ) ), m_Format( i_rFormat ), m_bLoop( i_bLoop ), m_bWait( i_bWait ), m_Wake( eventfd( 0, EFD_CLOEXEC | EFD_NONBLOCK ) ),
-    m_Thread( [ this ] { Read(); } )
+  : m_Input( std::move( i_Input ) ),
+    m_Format( i_rFormat ),
+    m_bLoop( i_bLoop ),
+    m_bWait( i_bWait ),
+    m_Wake( eventfd( 0, EFD_CLOEXEC | EFD_NONBLOCK ) ),
+    m_Thread( [this] { Read(); } )
 {
 }
 
@@ -99,7 +103,7 @@ bool VClipReader::Take( uint32_t i_Samples, VPicture& io_rPicture, std::vector<i
 
 bool VClipReader::WaitForPictureLocked( boost::unique_lock<boost::mutex>& io_rLock, int i_Seconds ) NO_LOCK_ANALYSIS
 {
-  const auto IsOver = [ this ]() NO_LOCK_ANALYSIS { return !m_Ready.empty() || m_bEnded || m_bClosed; };
+  const auto IsOver = [this]() NO_LOCK_ANALYSIS { return !m_Ready.empty() || m_bEnded || m_bClosed; };
   if( !IsOver() && i_Seconds > 0 )
   {
     m_bPictureAwaited = true;
@@ -134,7 +138,8 @@ void VClipReader::TakePictureLocked( VPicture& io_rPicture ) NO_LOCK_ANALYSIS
 
 size_t VClipReader::SoundReadyLocked() const
 {
-  const auto Pass = std::find_if( m_Passes.begin(), m_Passes.end(), [ this ]( const VPass& i_rPass ) NO_LOCK_ANALYSIS { return i_rPass.m_Number == m_PassShown; } );
+  const auto Pass = std::find_if( m_Passes.begin(), m_Passes.end(),
+    [this]( const VPass& i_rPass ) NO_LOCK_ANALYSIS { return i_rPass.m_Number == m_PassShown; } );
   return Pass == m_Passes.end() ? 0 : Pass->m_Sound.size() - Pass->m_SoundRead;
 }
 
@@ -151,7 +156,7 @@ void VClipReader::TakeSound( boost::unique_lock<boost::mutex>& io_rLock, uint32_
     return;
   }
   const size_t Wanted = i_Samples * FrameBytes;
-  const auto IsOver = [ & ]() NO_LOCK_ANALYSIS { return SoundReadyLocked() >= Wanted || m_Passes.front().m_bSoundComplete || m_bClosed; };
+  const auto IsOver = [&]() NO_LOCK_ANALYSIS { return SoundReadyLocked() >= Wanted || m_Passes.front().m_bSoundComplete || m_bClosed; };
   if( m_bWait && !IsOver() )
   {
     m_bSoundAwaited = true;
@@ -244,15 +249,15 @@ void VClipReader::PollOnce( VRun& io_rRun )
 {
   const bool bPicture = io_rRun.m_Pictures >= 0 && WantsPicture();
   const bool bSound = io_rRun.m_Sound >= 0 && WantsSound( io_rRun );
-  std::array<pollfd, 4> Polls = { pollfd{ m_Wake, POLLIN, 0 }, pollfd{ io_rRun.m_Errors, POLLIN, 0 }, pollfd{ bPicture ? io_rRun.m_Pictures : -1, POLLIN, 0 },
-    pollfd{ bSound ? io_rRun.m_Sound : -1, POLLIN, 0 } };
+  std::array<pollfd, 4> Polls = { pollfd{ m_Wake, POLLIN, 0 }, pollfd{ io_rRun.m_Errors, POLLIN, 0 },
+    pollfd{ bPicture ? io_rRun.m_Pictures : -1, POLLIN, 0 }, pollfd{ bSound ? io_rRun.m_Sound : -1, POLLIN, 0 } };
   poll( Polls.data(), Polls.size(), -1 );
-  if( Polls[ 0 ].revents != 0 )
+  if( Polls[0].revents != 0 )
   {
     uint64_t Count = 0;
     [[maybe_unused]] const ssize_t Got = read( m_Wake, &Count, sizeof( Count ) );
   }
-  if( Polls[ 1 ].revents != 0 )
+  if( Polls[1].revents != 0 )
   {
     std::array<char, 4096> Text;
     const ssize_t Got = read( io_rRun.m_Errors, Text.data(), Text.size() );
@@ -262,11 +267,11 @@ void VClipReader::PollOnce( VRun& io_rRun )
       io_rRun.m_ErrorText.append( Text.data(), static_cast<size_t>( Got ) );
     }
   }
-  if( Polls[ 2 ].revents != 0 )
+  if( Polls[2].revents != 0 )
   {
     ReadPicture( io_rRun );
   }
-  if( Polls[ 3 ].revents != 0 )
+  if( Polls[3].revents != 0 )
   {
     ReadSound( io_rRun );
   }

@@ -49,9 +49,9 @@ private:
   struct VPass
   {
     uint64_t m_Number = 0;
-    std::vector<uint8_t> m_Sound;    // bytes as they came
+    std::vector<uint8_t> m_Sound;   // bytes as they came
     size_t m_SoundRead = 0;
-    uint64_t m_SoundTotal = 0;       // bytes that ever came
+    uint64_t m_SoundTotal = 0;   // bytes that ever came
     bool m_bSoundComplete = false;
   };
   struct VReady

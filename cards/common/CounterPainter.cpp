@@ -69,7 +69,7 @@ private:
       }
       for( uint32_t x = 0; x < m_Format.Width(); ++x )
       {
-        Row[ x ] = GradientAt( m_Format, x, Depth );
+        Row[x] = GradientAt( m_Format, x, Depth );
       }
       EncodePixels( m_Format.m_PixelFormat, Row, o_pBytes );
     }
@@ -100,9 +100,6 @@ private:
 
 }
 
-std::unique_ptr<IPainter> MakeCounterPainter( const VPictureFormat& i_rFormat )
-{
-  return std::make_unique<VCounterPainter>( i_rFormat );
-}
+std::unique_ptr<IPainter> MakeCounterPainter( const VPictureFormat& i_rFormat ) { return std::make_unique<VCounterPainter>( i_rFormat ); }
 
 }

@@ -23,10 +23,7 @@ struct VRefusal
   std::string m_Reason;
 };
 
-[[noreturn]] void Refuse( const std::string& i_rKey, const std::string& i_rReason )
-{
-  throw VRefusal{ "\"" + i_rKey + "\": " + i_rReason };
-}
+[[noreturn]] void Refuse( const std::string& i_rKey, const std::string& i_rReason ) { throw VRefusal{ "\"" + i_rKey + "\": " + i_rReason }; }
 
 constexpr uint64_t MostFrames = 1000000000;   // half a year at 60 frames a second
 constexpr uint64_t MostMilliseconds = 60000;
@@ -123,7 +120,7 @@ const VEventRow& ParseDo( const json& i_rEvent )
     Accepted += std::string( Accepted.empty() ? "" : ", " ) + rRow.m_pName;
   }
   const std::string Name = ParseText( i_rEvent, "do", Accepted );
-  const auto Found = std::find_if( EventRows.begin(), EventRows.end(), [ & ]( const VEventRow& i_rRow ) { return Name == i_rRow.m_pName; } );
+  const auto Found = std::find_if( EventRows.begin(), EventRows.end(), [&]( const VEventRow& i_rRow ) { return Name == i_rRow.m_pName; } );
   if( Found == EventRows.end() )
   {
     Refuse( "do", "no event is called \"" + Name + "\"; accepted: " + Accepted );
@@ -182,15 +179,15 @@ void CheckLabels( const std::vector<VCardEvent>& i_rEvents, KVZ::IVideoStandard:
 {
   std::vector<size_t> Order( i_rEvents.size() );
   std::iota( Order.begin(), Order.end(), size_t{ 0 } );
-  std::stable_sort( Order.begin(), Order.end(), [ & ]( size_t i_A, size_t i_B ) { return i_rEvents[ i_A ].m_Frame < i_rEvents[ i_B ].m_Frame; } );
+  std::stable_sort( Order.begin(), Order.end(), [&]( size_t i_A, size_t i_B ) { return i_rEvents[i_A].m_Frame < i_rEvents[i_B].m_Frame; } );
   for( const size_t Index : Order )
   {
     o_rIndex = Index;
-    if( i_rEvents[ Index ].m_Do == EEvent::Format )
+    if( i_rEvents[Index].m_Do == EEvent::Format )
     {
-      i_Standard = i_rEvents[ Index ].m_Standard;
+      i_Standard = i_rEvents[Index].m_Standard;
     }
-    CheckLabel( i_rEvents[ Index ], i_Standard );
+    CheckLabel( i_rEvents[Index], i_Standard );
   }
 }
 
@@ -219,7 +216,7 @@ std::optional<std::vector<VCardEvent>> ParseEvents( const VCardKind& i_rKind, KV
     std::vector<VCardEvent> Events;
     for( ; Index < List.size(); ++Index )
     {
-      Events.push_back( ParseObject( List[ Index ], i_rKind, true ) );
+      Events.push_back( ParseObject( List[Index], i_rKind, true ) );
     }
     CheckLabels( Events, i_Standard, Index );
     return Events;

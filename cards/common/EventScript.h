@@ -20,7 +20,8 @@ std::optional<std::vector<VCardEvent>> ParseEvents( const VCardKind& i_rKind, KV
   std::string& o_rError );
 
 // One event without "frame", to happen at once.
-std::optional<VCardEvent> ParseEvent( const VCardKind& i_rKind, KVZ::IVideoStandard::Enum i_Standard, std::string_view i_Text, std::string& o_rError );
+std::optional<VCardEvent> ParseEvent( const VCardKind& i_rKind, KVZ::IVideoStandard::Enum i_Standard, std::string_view i_Text,
+  std::string& o_rError );
 
 // The same as ParseEvents for the content of a file; a reason names the file.
 std::optional<std::vector<VCardEvent>> ReadEvents( const VCardKind& i_rKind, KVZ::IVideoStandard::Enum i_Standard, const std::string& i_rPath,

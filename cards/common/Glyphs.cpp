@@ -39,7 +39,7 @@ size_t GlyphIndex( char i_Character )
 {
   for( size_t i = 0; i < Font.size(); ++i )
   {
-    if( Font[ i ].m_Character == i_Character )
+    if( Font[i].m_Character == i_Character )
     {
       return i;
     }
@@ -50,8 +50,12 @@ size_t GlyphIndex( char i_Character )
 }
 
 VGlyphs::VGlyphs( const VPictureFormat& i_rFormat, uint32_t i_Scale )
-  : m_Format( i_rFormat ), m_Scale( i_Scale ), m_CellWidth( CellColumns * i_Scale ), m_CellHeight( CellRows * i_Scale ),
-    m_CellBytes( BytesOf( i_rFormat.m_PixelFormat, m_CellWidth ) ), m_Rows( Font.size() * CellRows * m_CellBytes )
+  : m_Format( i_rFormat ),
+    m_Scale( i_Scale ),
+    m_CellWidth( CellColumns * i_Scale ),
+    m_CellHeight( CellRows * i_Scale ),
+    m_CellBytes( BytesOf( i_rFormat.m_PixelFormat, m_CellWidth ) ),
+    m_Rows( Font.size() * CellRows * m_CellBytes )
 {
   std::vector<VColour> Pixels( m_CellWidth );
   uint8_t* pRow = m_Rows.data();
@@ -62,7 +66,7 @@ VGlyphs::VGlyphs( const VPictureFormat& i_rFormat, uint32_t i_Scale )
       for( uint32_t x = 0; x < m_CellWidth; ++x )
       {
         const uint32_t Column = x / m_Scale;
-        Pixels[ x ] = Column < 5 && ( Dots >> ( 4 - Column ) & 1 ) ? White : Black;
+        Pixels[x] = Column < 5 && ( Dots >> ( 4 - Column ) & 1 ) ? White : Black;
       }
       EncodePixels( m_Format.m_PixelFormat, Pixels, pRow );
       pRow += m_CellBytes;

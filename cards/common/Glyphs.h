@@ -28,8 +28,8 @@ private:
   const uint32_t m_Scale;
   const uint32_t m_CellWidth;
   const uint32_t m_CellHeight;
-  const uint32_t m_CellBytes;      // of one row of a cell
-  std::vector<uint8_t> m_Rows;     // one encoded row a row of dots, glyph after glyph
+  const uint32_t m_CellBytes;    // of one row of a cell
+  std::vector<uint8_t> m_Rows;   // one encoded row a row of dots, glyph after glyph
 };
 
 }

@@ -74,9 +74,6 @@ private:
 
 }
 
-std::unique_ptr<IPainter> MakeNoisePainter( const VPictureFormat& i_rFormat )
-{
-  return std::make_unique<VNoisePainter>( i_rFormat );
-}
+std::unique_ptr<IPainter> MakeNoisePainter( const VPictureFormat& i_rFormat ) { return std::make_unique<VNoisePainter>( i_rFormat ); }
 
 }

@@ -59,9 +59,6 @@ std::unique_ptr<IPainter> MakePainter( EPattern i_Pattern, const VPictureFormat&
   }
 }
 
-std::unique_ptr<IPainter> MakeBlackPainter( const VPictureFormat& i_rFormat )
-{
-  return std::make_unique<VBlackPainter>( i_rFormat );
-}
+std::unique_ptr<IPainter> MakeBlackPainter( const VPictureFormat& i_rFormat ) { return std::make_unique<VBlackPainter>( i_rFormat ); }
 
 }

@@ -34,7 +34,7 @@ public:
   {
     if( m_Size != i_Size )
     {
-      m_pBytes.reset( new( Alignment ) uint8_t[ i_Size ]() );
+      m_pBytes.reset( new( Alignment ) uint8_t[i_Size]() );
       m_Size = i_Size;
       m_Background = 0;
     }

@@ -19,9 +19,9 @@ void EncodeUYVY( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
 {
   for( size_t i = 0; i < i_Pixels.size(); ++i )
   {
-    const VColour& rPair = i_Pixels[ i & ~size_t{ 1 } ];
+    const VColour& rPair = i_Pixels[i & ~size_t{ 1 }];
     *o_pBytes++ = i % 2 == 0 ? rPair.m_Cb : rPair.m_Cr;
-    *o_pBytes++ = i_Pixels[ i ].m_Y;
+    *o_pBytes++ = i_Pixels[i].m_Y;
   }
 }
 
@@ -29,7 +29,7 @@ void EncodeBGRA( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
 {
   for( const VColour& rPixel : i_Pixels )
   {
-    const uint8_t Bytes[ 4 ] = { rPixel.m_Blue, rPixel.m_Green, rPixel.m_Red, 255 };
+    const uint8_t Bytes[4] = { rPixel.m_Blue, rPixel.m_Green, rPixel.m_Red, 255 };
     std::memcpy( o_pBytes, Bytes, sizeof( Bytes ) );
     o_pBytes += sizeof( Bytes );
   }
@@ -44,13 +44,13 @@ void EncodeV210( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
     const size_t Count = std::min<size_t>( V210GroupPixels, i_Pixels.size() - Start );
     for( size_t i = 0; i < Count; ++i )
     {
-      const VColour& rPair = i_Pixels[ Start + ( i & ~size_t{ 1 } ) ];
-      Components[ 2 * i ] = ( i % 2 == 0 ? rPair.m_Cb : rPair.m_Cr ) * 4u;
-      Components[ 2 * i + 1 ] = i_Pixels[ Start + i ].m_Y * 4u;
+      const VColour& rPair = i_Pixels[Start + ( i & ~size_t{ 1 } )];
+      Components[2 * i] = ( i % 2 == 0 ? rPair.m_Cb : rPair.m_Cr ) * 4u;
+      Components[2 * i + 1] = i_Pixels[Start + i].m_Y * 4u;
     }
     for( size_t Word = 0; Word < 4; ++Word )
     {
-      const uint32_t Value = Components[ 3 * Word ] | Components[ 3 * Word + 1 ] << 10 | Components[ 3 * Word + 2 ] << 20;
+      const uint32_t Value = Components[3 * Word] | Components[3 * Word + 1] << 10 | Components[3 * Word + 2] << 20;
       std::memcpy( o_pBytes, &Value, sizeof( Value ) );
       o_pBytes += sizeof( Value );
     }

@@ -14,7 +14,8 @@ namespace VirtualCards
 
 // Any thread may take and give back. The one given back last is taken first: it is still in the processor's cache, and a client that
 // keeps nothing makes only one of them be used at all.
-template<class T> class VRecycler
+template<class T>
+class VRecycler
 {
 public:
   explicit VRecycler( size_t i_Most ) : m_Most( i_Most ) { m_Idle.reserve( i_Most ); }

@@ -69,7 +69,10 @@ class VClipContent final : public ISignalContent
 {
 public:
   VClipContent( const VCardSpec& i_rSpec, VClipInput i_Input, bool i_bWait )
-    : m_Input( std::move( i_Input ) ), m_Audio( i_rSpec.m_Audio ), m_Channels( i_rSpec.m_Channels ), m_bLoop( i_rSpec.m_bLoop ),
+    : m_Input( std::move( i_Input ) ),
+      m_Audio( i_rSpec.m_Audio ),
+      m_Channels( i_rSpec.m_Channels ),
+      m_bLoop( i_rSpec.m_bLoop ),
       m_bWait( i_bWait || !m_Input.m_bOptionsForm )
   {
   }
@@ -163,9 +166,6 @@ VSignalSource OpenSource( const VCardSpec& i_rSpec, bool i_bWait, std::string& o
   return { std::make_shared<VPatternContent>( i_rSpec ), i_rSpec.m_Standard.value_or( DefaultStandard ) };
 }
 
-void SetSilence( const VSignalFrame& i_rSignal, VSound& o_rSound )
-{
-  SetMadeSound( i_rSignal, EAudio::Silence, 0, o_rSound );
-}
+void SetSilence( const VSignalFrame& i_rSignal, VSound& o_rSound ) { SetMadeSound( i_rSignal, EAudio::Silence, 0, o_rSound ); }
 
 }

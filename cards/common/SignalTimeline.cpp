@@ -13,10 +13,7 @@ namespace
 
 constexpr uint64_t ForGood = std::numeric_limits<uint64_t>::max();
 
-bool IsComingOrGoing( const VCardEvent& i_rEvent )
-{
-  return i_rEvent.m_Do == EEvent::Arrive || i_rEvent.m_Do == EEvent::Remove;
-}
+bool IsComingOrGoing( const VCardEvent& i_rEvent ) { return i_rEvent.m_Do == EEvent::Arrive || i_rEvent.m_Do == EEvent::Remove; }
 
 }
 

@@ -37,10 +37,10 @@ struct VCardEvent
 
 struct VSignalFrame
 {
-  uint64_t m_Number = 0;     // the card's running frame number
+  uint64_t m_Number = 0;   // the card's running frame number
   const KVZ::VVideoStandardRow* m_pStandard = nullptr;
-  int64_t m_Time = 0;        // ticks of 1/135000000 s since frame 0
-  bool m_bPresent = true;    // the card is in the machine
+  int64_t m_Time = 0;       // ticks of 1/135000000 s since frame 0
+  bool m_bPresent = true;   // the card is in the machine
   bool m_bSignal = true;
   bool m_bDropped = false;   // the card fails to deliver this one
   uint32_t m_LateMilliseconds = 0;
@@ -76,13 +76,13 @@ private:
 
   uint64_t m_Number = 0;
   int64_t m_Time = 0;
-  uint64_t m_StandardSince = 0;        // frame and sample at which the present standard began
+  uint64_t m_StandardSince = 0;   // frame and sample at which the present standard began
   uint64_t m_SamplesBefore = 0;
   bool m_bPresent = true;
-  uint64_t m_SignalLostUntil = 0;      // frame numbers
+  uint64_t m_SignalLostUntil = 0;   // frame numbers
   uint64_t m_DroppedUntil = 0;
   uint64_t m_TimecodeLostUntil = 0;
-  uint32_t m_LateMilliseconds = 0;     // of the next frame only
+  uint32_t m_LateMilliseconds = 0;   // of the next frame only
 };
 
 }

@@ -24,24 +24,22 @@ std::array<int32_t, TonePeriod> MakeToneTable()
   const double Amplitude = 2147483647.0 * std::pow( 10.0, -18.0 / 20.0 );
   for( uint32_t i = 0; i < TonePeriod; ++i )
   {
-    Table[ i ] = static_cast<int32_t>( std::lround( Amplitude * std::sin( 2.0 * std::numbers::pi * i / TonePeriod ) ) );
+    Table[i] = static_cast<int32_t>( std::lround( Amplitude * std::sin( 2.0 * std::numbers::pi * i / TonePeriod ) ) );
   }
   return Table;
 }
 
 const std::array<int32_t, TonePeriod> ToneTable = MakeToneTable();
 
-int32_t ToneAt( uint64_t i_Sample, uint32_t i_Channel )
-{
-  return ToneTable[ ( i_Sample + i_Channel * ToneShift ) % TonePeriod ];
-}
+int32_t ToneAt( uint64_t i_Sample, uint32_t i_Channel ) { return ToneTable[( i_Sample + i_Channel * ToneShift ) % TonePeriod]; }
 
 int32_t RampAt( uint64_t i_Sample, uint32_t i_Channel )
 {
   return static_cast<int32_t>( static_cast<uint32_t>( ( i_Sample + RampChannelStep * i_Channel ) & 0xFFFF ) << 16 );
 }
 
-template<class TSample, class TAt> void Fill( const VSound& i_rSound, uint32_t i_SignalChannels, uint32_t i_Channels, uint8_t* o_pBytes, TAt i_At )
+template<class TSample, class TAt>
+void Fill( const VSound& i_rSound, uint32_t i_SignalChannels, uint32_t i_Channels, uint8_t* o_pBytes, TAt i_At )
 {
   constexpr int Shift = 32 - 8 * static_cast<int>( sizeof( TSample ) );
   const uint32_t Carried = std::min( i_SignalChannels, i_Channels );
@@ -55,7 +53,8 @@ template<class TSample, class TAt> void Fill( const VSound& i_rSound, uint32_t i
   }
 }
 
-template<class TSample> void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
+template<class TSample>
+void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
 {
   const uint64_t First = i_rSound.m_FirstSample;
   if( i_rSound.m_bClip )
@@ -64,11 +63,11 @@ template<class TSample> void WriteAs( const VSound& i_rSound, uint32_t i_Channel
     const uint32_t ClipChannels = i_rSound.m_ClipChannels;
     const uint32_t Carried = std::min( i_rSound.m_SignalChannels, ClipChannels );
     Fill<TSample>( i_rSound, Carried, i_Channels, o_pBytes,
-      [ = ]( uint32_t i_Sample, uint32_t i_Channel ) { return pClip[ size_t{ i_Sample } * ClipChannels + i_Channel ]; } );
+      [=]( uint32_t i_Sample, uint32_t i_Channel ) { return pClip[size_t{ i_Sample } * ClipChannels + i_Channel]; } );
     return;
   }
-  const auto Tone = [ = ]( uint32_t i_Sample, uint32_t i_Channel ) { return ToneAt( First + i_Sample, i_Channel ); };
-  const auto Ramp = [ = ]( uint32_t i_Sample, uint32_t i_Channel ) { return RampAt( First + i_Sample, i_Channel ); };
+  const auto Tone = [=]( uint32_t i_Sample, uint32_t i_Channel ) { return ToneAt( First + i_Sample, i_Channel ); };
+  const auto Ramp = [=]( uint32_t i_Sample, uint32_t i_Channel ) { return RampAt( First + i_Sample, i_Channel ); };
   switch( i_rSound.m_Audio )
   {
     case EAudio::Tone: Fill<TSample>( i_rSound, i_rSound.m_SignalChannels, i_Channels, o_pBytes, Tone ); break;

@@ -12,7 +12,7 @@ namespace VirtualCards
 // How a client wants interleaved samples.
 struct VSoundLayout
 {
-  uint32_t m_Bits = 16;       // 16 or 32, signed
+  uint32_t m_Bits = 16;   // 16 or 32, signed
   uint32_t m_Channels = 2;
 
   size_t BytesPerFrame() const { return size_t{ m_Bits } / 8 * m_Channels; }
@@ -22,11 +22,11 @@ struct VSoundLayout
 struct VSound
 {
   EAudio m_Audio = EAudio::None;
-  bool m_bClip = false;                  // m_Clip counts instead of m_Audio
-  uint32_t m_SignalChannels = 0;         // embedded in the signal; further ones that a client asks for are silent
+  bool m_bClip = false;            // m_Clip counts instead of m_Audio
+  uint32_t m_SignalChannels = 0;   // embedded in the signal; further ones that a client asks for are silent
   uint64_t m_FirstSample = 0;
-  uint32_t m_Samples = 0;                // per channel
-  std::vector<int32_t> m_Clip;           // interleaved, of m_ClipChannels
+  uint32_t m_Samples = 0;        // per channel
+  std::vector<int32_t> m_Clip;   // interleaved, of m_ClipChannels
   uint32_t m_ClipChannels = 0;
 
   bool Exists() const { return m_bClip || m_Audio != EAudio::None; }

@@ -33,7 +33,7 @@ constexpr std::array Rates = {
 
 const VRate* FindRate( int64_t i_VideoPeriod )
 {
-  const auto Found = std::find_if( Rates.begin(), Rates.end(), [ & ]( const VRate& i_r ) { return i_r.m_VideoPeriod == i_VideoPeriod; } );
+  const auto Found = std::find_if( Rates.begin(), Rates.end(), [&]( const VRate& i_r ) { return i_r.m_VideoPeriod == i_VideoPeriod; } );
   return Found != Rates.end() ? &*Found : nullptr;
 }
 
@@ -57,11 +57,11 @@ KVZ::ITimecode ToTimecode( const VTimecodeLabel& i_rLabel, int32_t i_Standard )
 bool ParseTwoDigits( std::string_view i_Text, uint8_t& o_rValue )
 {
   const auto IsDigit = []( char i_Char ) { return i_Char >= '0' && i_Char <= '9'; };
-  if( !IsDigit( i_Text[ 0 ] ) || !IsDigit( i_Text[ 1 ] ) )
+  if( !IsDigit( i_Text[0] ) || !IsDigit( i_Text[1] ) )
   {
     return false;
   }
-  o_rValue = static_cast<uint8_t>( ( i_Text[ 0 ] - '0' ) * 10 + i_Text[ 1 ] - '0' );
+  o_rValue = static_cast<uint8_t>( ( i_Text[0] - '0' ) * 10 + i_Text[1] - '0' );
   return true;
 }
 
@@ -70,14 +70,14 @@ bool ParseTwoDigits( std::string_view i_Text, uint8_t& o_rValue )
 std::optional<VTimecodeLabel> ParseTimecodeLabel( std::string_view i_Text )
 {
   VTimecodeLabel Label;
-  const bool bForm = i_Text.size() == 11 && i_Text[ 2 ] == ':' && i_Text[ 5 ] == ':' && ( i_Text[ 8 ] == ':' || i_Text[ 8 ] == ';' );
+  const bool bForm = i_Text.size() == 11 && i_Text[2] == ':' && i_Text[5] == ':' && ( i_Text[8] == ':' || i_Text[8] == ';' );
   if( !bForm || !ParseTwoDigits( i_Text.substr( 0, 2 ), Label.m_Hours ) || !ParseTwoDigits( i_Text.substr( 3, 2 ), Label.m_Minutes ) ||
-      !ParseTwoDigits( i_Text.substr( 6, 2 ), Label.m_Seconds ) || !ParseTwoDigits( i_Text.substr( 9, 2 ), Label.m_Frames ) ||
-      Label.m_Hours > 23 || Label.m_Minutes > 59 || Label.m_Seconds > 59 || Label.m_Frames > 29 )
+    !ParseTwoDigits( i_Text.substr( 6, 2 ), Label.m_Seconds ) || !ParseTwoDigits( i_Text.substr( 9, 2 ), Label.m_Frames ) || Label.m_Hours > 23 ||
+    Label.m_Minutes > 59 || Label.m_Seconds > 59 || Label.m_Frames > 29 )
   {
     return std::nullopt;
   }
-  Label.m_bDropFrame = i_Text[ 8 ] == ';';
+  Label.m_bDropFrame = i_Text[8] == ';';
   return Label;
 }
 
@@ -128,7 +128,8 @@ void VTimecodeTrack::ChangeRate( int64_t i_VideoPeriod, uint64_t i_Frame )
     return;
   }
   const KVZ::ITimecode& rLabel = Reached->m_Label;
-  KVZ::ITimecode Next = ToTimecode( { rLabel.m_Hours, rLabel.m_Minutes, rLabel.m_Seconds, rLabel.m_Frames, false }, StandardOf( *pRate, m_bDropFrame ) );
+  KVZ::ITimecode Next = ToTimecode( { rLabel.m_Hours, rLabel.m_Minutes, rLabel.m_Seconds, rLabel.m_Frames, false },
+    StandardOf( *pRate, m_bDropFrame ) );
   Next.m_Frames = std::min<uint8_t>( Next.m_Frames, KVZ::FindTimecodeStandard( Next.m_Standard )->m_NominalFrames - 1 );
   if( !KVZ::IsValid( Next ) )
   {

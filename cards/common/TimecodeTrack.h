@@ -48,7 +48,7 @@ public:
 
 private:
   bool m_bRunning = false;
-  bool m_bDropFrame = false;       // as asked for at the start; counts only at rates that have it
+  bool m_bDropFrame = false;   // as asked for at the start; counts only at rates that have it
   KVZ::ITimecode m_StartLabel;
   uint64_t m_StartFrame = 0;
   uint32_t m_FramesPerLabel = 1;

@@ -21,11 +21,11 @@ struct VCardOptions
 
 struct VCardCounters
 {
-  uint64_t m_FramesPassed = 0;      // of the signal, whether or not anybody got them
-  uint64_t m_FramesDelivered = 0;   // handed to a client
-  uint64_t m_FramesDropped = 0;     // by the script, or because a client was seconds behind
+  uint64_t m_FramesPassed = 0;          // of the signal, whether or not anybody got them
+  uint64_t m_FramesDelivered = 0;       // handed to a client
+  uint64_t m_FramesDropped = 0;         // by the script, or because a client was seconds behind
   uint64_t m_FramesWithoutBuffer = 0;   // a client kept all of the card's buffers
-  uint64_t m_FormatChanges = 0;     // told to a client
+  uint64_t m_FormatChanges = 0;         // told to a client
 };
 
 class IVirtualCardControl

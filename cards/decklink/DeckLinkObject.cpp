@@ -49,9 +49,10 @@ std::string DisplayName( uint32_t i_Number )
   return Name;
 }
 
-template<class TRows, class TValue> HRESULT FindRow( const TRows& i_rRows, uint32_t i_Id, TValue* o_pValue )
+template<class TRows, class TValue>
+HRESULT FindRow( const TRows& i_rRows, uint32_t i_Id, TValue* o_pValue )
 {
-  for( const auto& [ Id, Value ] : i_rRows )
+  for( const auto& [Id, Value] : i_rRows )
   {
     if( Id == i_Id )
     {
@@ -64,10 +65,7 @@ template<class TRows, class TValue> HRESULT FindRow( const TRows& i_rRows, uint3
 
 }
 
-HRESULT VAttributes::GetFlag( uint32_t i_Id, bool* o_pValue )
-{
-  return o_pValue ? FindRow( Flags, i_Id, o_pValue ) : E_POINTER;
-}
+HRESULT VAttributes::GetFlag( uint32_t i_Id, bool* o_pValue ) { return o_pValue ? FindRow( Flags, i_Id, o_pValue ) : E_POINTER; }
 
 HRESULT VAttributes::GetInt( uint32_t i_Id, int64_t* o_pValue )
 {
@@ -83,10 +81,7 @@ HRESULT VAttributes::GetInt( uint32_t i_Id, int64_t* o_pValue )
   return FindRow( Ints, i_Id, o_pValue );
 }
 
-HRESULT VAttributes::GetFloat( uint32_t, double* o_pValue )
-{
-  return o_pValue ? E_INVALIDARG : E_POINTER;
-}
+HRESULT VAttributes::GetFloat( uint32_t, double* o_pValue ) { return o_pValue ? E_INVALIDARG : E_POINTER; }
 
 HRESULT VAttributes::GetString( uint32_t i_Id, const char** o_ppValue )
 {
@@ -150,14 +145,8 @@ void VDeckLinkObject::ReleaseOwn()
   }
 }
 
-HRESULT VDeckLinkObject::GetModelName( const char** o_ppName )
-{
-  return GiveText( Model, o_ppName );
-}
+HRESULT VDeckLinkObject::GetModelName( const char** o_ppName ) { return GiveText( Model, o_ppName ); }
 
-HRESULT VDeckLinkObject::GetDisplayName( const char** o_ppName )
-{
-  return GiveText( m_Name, o_ppName );
-}
+HRESULT VDeckLinkObject::GetDisplayName( const char** o_ppName ) { return GiveText( m_Name, o_ppName ); }
 
 }

@@ -13,10 +13,7 @@ using namespace DeckLinkAPI;
 
 VNotifier::VNotifier( IDeckLinkDeviceNotificationCallback* i_pCallback ) : m_Callback( i_pCallback ) {}
 
-VNotifier::~VNotifier()
-{
-  DropAll();
-}
+VNotifier::~VNotifier() { DropAll(); }
 
 void VNotifier::Post( VDeckLinkObject& i_rCard, bool i_bArrived )
 {
@@ -72,7 +69,7 @@ void VNotifier::Close() NO_LOCK_ANALYSIS
   {
     boost::unique_lock<boost::mutex> Lock( m_Mutex );
     m_bClosed = true;
-    const auto IsOver = [ this ]() NO_LOCK_ANALYSIS { return !m_bDelivering || m_Deliverer == boost::this_thread::get_id(); };
+    const auto IsOver = [this]() NO_LOCK_ANALYSIS { return !m_bDelivering || m_Deliverer == boost::this_thread::get_id(); };
     m_Idle.wait( Lock, IsOver );
   }
   DropAll();
@@ -126,9 +123,6 @@ HRESULT VDiscovery::UninstallDeviceNotifications()
   return S_OK;
 }
 
-VDiscovery::~VDiscovery()
-{
-  UninstallDeviceNotifications();
-}
+VDiscovery::~VDiscovery() { UninstallDeviceNotifications(); }
 
 }

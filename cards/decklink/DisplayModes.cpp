@@ -94,7 +94,7 @@ public:
       return E_POINTER;
     }
     const size_t Index = m_Next.fetch_add( 1 );
-    *o_ppMode = Index < Modes.size() ? MakeDisplayMode( Modes[ Index ] ) : nullptr;
+    *o_ppMode = Index < Modes.size() ? MakeDisplayMode( Modes[Index] ) : nullptr;
     return *o_ppMode ? S_OK : S_FALSE;
   }
 
@@ -106,13 +106,13 @@ private:
 
 const VDisplayModeRow* FindDisplayMode( uint32_t i_Code )
 {
-  const auto Found = std::find_if( Modes.begin(), Modes.end(), [ & ]( const VDisplayModeRow& i_r ) { return i_r.m_Code == i_Code; } );
+  const auto Found = std::find_if( Modes.begin(), Modes.end(), [&]( const VDisplayModeRow& i_r ) { return i_r.m_Code == i_Code; } );
   return Found != Modes.end() ? &*Found : nullptr;
 }
 
 const VDisplayModeRow* FindDisplayMode( KVZ::IVideoStandard::Enum i_Standard )
 {
-  const auto Found = std::find_if( Modes.begin(), Modes.end(), [ & ]( const VDisplayModeRow& i_r ) { return i_r.m_Standard == i_Standard; } );
+  const auto Found = std::find_if( Modes.begin(), Modes.end(), [&]( const VDisplayModeRow& i_r ) { return i_r.m_Standard == i_Standard; } );
   return Found != Modes.end() ? &*Found : nullptr;
 }
 
@@ -126,14 +126,8 @@ uint32_t FieldDominanceOf( const VDisplayModeRow& i_rMode )
   return rStandard.m_Height == 486 ? FieldDominance::LowerFieldFirst : FieldDominance::UpperFieldFirst;
 }
 
-IDeckLinkDisplayMode* MakeDisplayMode( const VDisplayModeRow& i_rMode )
-{
-  return new VDisplayMode( i_rMode );
-}
+IDeckLinkDisplayMode* MakeDisplayMode( const VDisplayModeRow& i_rMode ) { return new VDisplayMode( i_rMode ); }
 
-IDeckLinkDisplayModeIterator* MakeDisplayModeIterator()
-{
-  return new VDisplayModeIterator;
-}
+IDeckLinkDisplayModeIterator* MakeDisplayModeIterator() { return new VDisplayModeIterator; }
 
 }

@@ -25,7 +25,7 @@ public:
       return E_POINTER;
     }
     const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    *o_ppCard = m_Next < m_Cards.size() ? m_Cards[ m_Next++ ] : nullptr;   // its reference goes along
+    *o_ppCard = m_Next < m_Cards.size() ? m_Cards[m_Next++] : nullptr;   // its reference goes along
     return *o_ppCard ? S_OK : S_FALSE;
   }
 
@@ -34,7 +34,7 @@ private:
   {
     for( ; m_Next < m_Cards.size(); ++m_Next )
     {
-      m_Cards[ m_Next ]->Release();
+      m_Cards[m_Next]->Release();
     }
   }
 
@@ -70,44 +70,19 @@ public:
 extern "C"
 {
 
-IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0001()
-{
-  return new VDiscovery;
-}
+  IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0001() { return new VDiscovery; }
 
-IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0002()
-{
-  return new VDiscovery;
-}
+  IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0002() { return new VDiscovery; }
 
-IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0003()
-{
-  return new VDiscovery;
-}
+  IDeckLinkDiscovery* CreateDeckLinkDiscoveryInstance_0003() { return new VDiscovery; }
 
-IDeckLinkIterator* CreateDeckLinkIteratorInstance_0002()
-{
-  return new VCardIterator;
-}
+  IDeckLinkIterator* CreateDeckLinkIteratorInstance_0002() { return new VCardIterator; }
 
-IDeckLinkIterator* CreateDeckLinkIteratorInstance_0003()
-{
-  return new VCardIterator;
-}
+  IDeckLinkIterator* CreateDeckLinkIteratorInstance_0003() { return new VCardIterator; }
 
-IDeckLinkIterator* CreateDeckLinkIteratorInstance_0004()
-{
-  return new VCardIterator;
-}
+  IDeckLinkIterator* CreateDeckLinkIteratorInstance_0004() { return new VCardIterator; }
 
-IDeckLinkAPIInformation* CreateDeckLinkAPIInformationInstance_0001()
-{
-  return new VAPIInformation;
-}
+  IDeckLinkAPIInformation* CreateDeckLinkAPIInformationInstance_0001() { return new VAPIInformation; }
 
-IVirtualCardControl* GetVirtualCardControl()
-{
-  return &VRegistry::Instance();
-}
-
+  IVirtualCardControl* GetVirtualCardControl() { return &VRegistry::Instance(); }
 }

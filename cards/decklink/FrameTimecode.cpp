@@ -12,10 +12,7 @@ namespace
 
 using namespace DeckLinkAPI;
 
-uint32_t ToBCD( uint8_t i_Value )
-{
-  return static_cast<uint32_t>( i_Value / 10 << 4 | i_Value % 10 );
-}
+uint32_t ToBCD( uint8_t i_Value ) { return static_cast<uint32_t>( i_Value / 10 << 4 | i_Value % 10 ); }
 
 class VFrameTimecode final : public VHeapObject<IDeckLinkTimecode, IID_IDeckLinkTimecode>
 {

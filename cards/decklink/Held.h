@@ -5,7 +5,8 @@ namespace VirtualCards
 {
 
 // Not copied: shared through std::shared_ptr, so that no client code runs under a lock of ours when a call in flight still needs it.
-template<class TInterface> class VHeld
+template<class TInterface>
+class VHeld
 {
 public:
   explicit VHeld( TInterface* i_pObject ) : m_pObject( i_pObject ) { m_pObject->AddRef(); }

@@ -101,6 +101,9 @@ private:
   };
   class VFlight;
 
+  // Ticks of 1/135000000 s: the card has been running for an hour, as its time has no meaning in itself.
+  static constexpr int64_t HardwareTimeOrigin = 3600ll * 135000000;
+
   bool MayCallLocked() const REQUIRES( m_Mutex ) { return m_Streams == EStreams::Running && m_StopsWaiting == 0 && m_pCallback != nullptr; }
   bool BeginFlight( const VSignalFrame& i_rFrame );
   void EndFlight();
@@ -131,10 +134,10 @@ private:
   std::shared_ptr<VCallback> m_pCallback GUARDED_BY( m_Mutex );
   std::optional<int64_t> m_StreamOrigin GUARDED_BY( m_Mutex );   // signal time of the stream's first frame
 
-  bool m_bInFlight GUARDED_BY( m_Mutex ) = false;                // callbacks for one frame are being made, on m_FlightThread
+  bool m_bInFlight GUARDED_BY( m_Mutex ) = false;   // callbacks for one frame are being made, on m_FlightThread
   boost::thread::id m_FlightThread GUARDED_BY( m_Mutex );
   int m_StopsWaiting GUARDED_BY( m_Mutex ) = 0;
-  bool m_bFrameStale GUARDED_BY( m_Mutex ) = false;              // the frame in flight was overtaken while a clip began
+  bool m_bFrameStale GUARDED_BY( m_Mutex ) = false;   // the frame in flight was overtaken while a clip began
 
   bool m_bEverAnnounced GUARDED_BY( m_Mutex ) = false;
   bool m_bAnnounceOnMismatch GUARDED_BY( m_Mutex ) = false;

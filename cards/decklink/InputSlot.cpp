@@ -44,30 +44,15 @@ ULONG VInputFrame::Release()
   return Left;
 }
 
-long VInputFrame::GetWidth()
-{
-  return m_rSlot.m_Frame.Format().Width();
-}
+long VInputFrame::GetWidth() { return m_rSlot.m_Frame.Format().Width(); }
 
-long VInputFrame::GetHeight()
-{
-  return m_rSlot.m_Frame.Format().Height();
-}
+long VInputFrame::GetHeight() { return m_rSlot.m_Frame.Format().Height(); }
 
-long VInputFrame::GetRowBytes()
-{
-  return m_rSlot.m_Frame.Format().RowBytes();
-}
+long VInputFrame::GetRowBytes() { return m_rSlot.m_Frame.Format().RowBytes(); }
 
-uint32_t VInputFrame::GetPixelFormat()
-{
-  return m_rSlot.m_PixelFormat;
-}
+uint32_t VInputFrame::GetPixelFormat() { return m_rSlot.m_PixelFormat; }
 
-uint32_t VInputFrame::GetFlags()
-{
-  return m_rSlot.m_bSignal ? 0 : FrameFlag::NoInputSource;
-}
+uint32_t VInputFrame::GetFlags() { return m_rSlot.m_bSignal ? 0 : FrameFlag::NoInputSource; }
 
 HRESULT VInputFrame::GetBytes( void** o_ppBuffer )
 {
@@ -141,10 +126,7 @@ ULONG VInputPacket::Release()
   return Left;
 }
 
-long VInputPacket::GetSampleFrameCount()
-{
-  return m_rSlot.m_Frame.Sound().m_Samples;
-}
+long VInputPacket::GetSampleFrameCount() { return m_rSlot.m_Frame.Sound().m_Samples; }
 
 HRESULT VInputPacket::GetBytes( void** o_ppBuffer )
 {

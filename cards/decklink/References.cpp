@@ -13,15 +13,9 @@ std::atomic<int64_t> g_ReleaseErrors{ 0 };
 
 }
 
-int64_t ReferencesHeld()
-{
-  return g_ReferencesHeld;
-}
+int64_t ReferencesHeld() { return g_ReferencesHeld; }
 
-int64_t ReleaseErrors()
-{
-  return g_ReleaseErrors;
-}
+int64_t ReleaseErrors() { return g_ReleaseErrors; }
 
 VReferences::VReferences( EFirst i_First ) : m_State( i_First == EFirst::Own ? OwnFlag : 1 )
 {
@@ -38,8 +32,7 @@ unsigned long VReferences::AddRef()
 unsigned long VReferences::Release()
 {
   unsigned long State = m_State;
-  do
-  {
+  do {
     if( State == OwnFlag )
     {
       ++g_ReleaseErrors;
@@ -50,15 +43,9 @@ unsigned long VReferences::Release()
   return ( State & ~OwnFlag ) - 1 + ( State & OwnFlag ? 1 : 0 );
 }
 
-void VReferences::TakeOwn()
-{
-  m_State = OwnFlag;
-}
+void VReferences::TakeOwn() { m_State = OwnFlag; }
 
-bool VReferences::ReleaseOwn()
-{
-  return m_State.fetch_and( ~OwnFlag ) == OwnFlag;
-}
+bool VReferences::ReleaseOwn() { return m_State.fetch_and( ~OwnFlag ) == OwnFlag; }
 
 DeckLinkAPI::HRESULT GiveText( const std::string& i_rText, const char** o_ppText )
 {

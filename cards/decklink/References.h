@@ -43,7 +43,8 @@ private:
 };
 
 // An object of one interface that ends with its last reference.
-template<class TInterface, DeckLinkAPI::REFIID Id> class VHeapObject : public TInterface
+template<class TInterface, DeckLinkAPI::REFIID Id>
+class VHeapObject : public TInterface
 {
 public:
   DeckLinkAPI::HRESULT QueryInterface( DeckLinkAPI::REFIID i_Id, void** o_ppObject ) override

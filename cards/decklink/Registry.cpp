@@ -29,7 +29,7 @@ VCardId VRegistry::AddCard( const char* i_pText, const VCardOptions& i_rOptions,
   }
   {
     const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Cards[ Id ] = pCard;
+    m_Cards[Id] = pCard;
   }
   pCard->Begin();
   return Id;
@@ -86,20 +86,11 @@ bool VRegistry::GetCounters( VCardId i_Card, VCardCounters& o_rCounters ) const
   return pCard != nullptr;
 }
 
-int64_t VRegistry::ReferencesHeld() const
-{
-  return VirtualCards::ReferencesHeld();
-}
+int64_t VRegistry::ReferencesHeld() const { return VirtualCards::ReferencesHeld(); }
 
-int64_t VRegistry::ReleaseErrors() const
-{
-  return VirtualCards::ReleaseErrors();
-}
+int64_t VRegistry::ReleaseErrors() const { return VirtualCards::ReleaseErrors(); }
 
-int32_t VRegistry::CallbacksInFlight() const
-{
-  return VirtualCards::CallbacksInFlight();
-}
+int32_t VRegistry::CallbacksInFlight() const { return VirtualCards::CallbacksInFlight(); }
 
 void VRegistry::Subscribe( const std::shared_ptr<VNotifier>& i_rNotifier )
 {
@@ -117,7 +108,7 @@ void VRegistry::Subscribe( const std::shared_ptr<VNotifier>& i_rNotifier )
 void VRegistry::Unsubscribe( const VNotifier& i_rNotifier )
 {
   const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  std::erase_if( m_Notifiers, [ & ]( const std::shared_ptr<VNotifier>& i_rOne ) { return i_rOne.get() == &i_rNotifier; } );
+  std::erase_if( m_Notifiers, [&]( const std::shared_ptr<VNotifier>& i_rOne ) { return i_rOne.get() == &i_rNotifier; } );
 }
 
 void VRegistry::CardArrived( VDeckLinkObject& i_rCard )

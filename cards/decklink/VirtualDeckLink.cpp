@@ -43,7 +43,9 @@ std::shared_ptr<VVirtualDeckLink> VVirtualDeckLink::Make( VCardId i_Id, const ch
 }
 
 VVirtualDeckLink::VVirtualDeckLink( VCardId i_Id, VParts i_Parts, const VCardOptions& i_rOptions )
-  : m_Id( i_Id ), m_rKind( *i_Parts.m_Spec.m_pKind ), m_Source( i_Parts.m_Source ),
+  : m_Id( i_Id ),
+    m_rKind( *i_Parts.m_Spec.m_pKind ),
+    m_Source( i_Parts.m_Source ),
     m_Runner( VSignalTimeline( m_Source.m_Standard, i_Parts.m_Spec.m_Timecode, i_Parts.m_Events ),
       { i_Parts.m_Spec.m_Speed, i_rOptions.m_bManualClock, "Virtual DeckLink " + std::to_string( i_Id ) }, *this )
 {
@@ -99,9 +101,6 @@ void VVirtualDeckLink::OnPresence( bool i_bPresent )
   m_pObject = nullptr;
 }
 
-void VVirtualDeckLink::OnFrame( const VSignalFrame& i_rFrame )
-{
-  m_pObject->Input().OnFrame( i_rFrame );
-}
+void VVirtualDeckLink::OnFrame( const VSignalFrame& i_rFrame ) { m_pObject->Input().OnFrame( i_rFrame ); }
 
 }

@@ -13,7 +13,8 @@ namespace
 {
 
 // A pointer to a virtual member function holds 1 plus the byte offset in the table (Itanium C++ ABI 2.3).
-template<class TMember> long Slot( TMember i_pMember )
+template<class TMember>
+long Slot( TMember i_pMember )
 {
   static_assert( sizeof( TMember ) == 2 * sizeof( void* ) );
   uintptr_t Representation = 0;
@@ -23,7 +24,8 @@ template<class TMember> long Slot( TMember i_pMember )
 }
 
 // The slot that an operation added by a derived class gets: it counts all slots of the base, its destructor's two included.
-template<class TInterface> long SlotCount()
+template<class TInterface>
+long SlotCount()
 {
   struct VDerived : TInterface
   {
@@ -48,21 +50,21 @@ static_assert( std::is_same_v<decltype( &IUnknown::AddRef ), unsigned long ( IUn
 static_assert( std::is_same_v<decltype( &IUnknown::Release ), unsigned long ( IUnknown::* )()> );
 static_assert( std::is_same_v<decltype( &IUnknown::QueryInterface ), int ( IUnknown::* )( REFIID, void** )> );
 static_assert( std::is_trivially_copyable_v<REFIID> );
-static_assert( std::is_same_v<decltype( &IDeckLinkVideoInputFrame::GetStreamTime ),
-  int ( IDeckLinkVideoInputFrame::* )( int64_t*, int64_t*, int64_t )> );
+static_assert(
+  std::is_same_v<decltype( &IDeckLinkVideoInputFrame::GetStreamTime ), int ( IDeckLinkVideoInputFrame::* )( int64_t*, int64_t*, int64_t )> );
 static_assert( std::is_same_v<decltype( &IDeckLinkVideoInputFrame::GetHardwareReferenceTimestamp ),
   int ( IDeckLinkVideoInputFrame::* )( int64_t, int64_t*, int64_t* )> );
 static_assert( std::is_same_v<decltype( &IDeckLinkAudioInputPacket::GetPacketTime ), int ( IDeckLinkAudioInputPacket::* )( int64_t*, int64_t )> );
 static_assert( std::is_same_v<decltype( &IDeckLinkAudioInputPacket::GetSampleFrameCount ), long ( IDeckLinkAudioInputPacket::* )()> );
 static_assert( std::is_same_v<decltype( &IDeckLinkVideoFrame::GetRowBytes ), long ( IDeckLinkVideoFrame::* )()> );
 static_assert( std::is_same_v<decltype( &IDeckLinkAttributes::GetFlag ), int ( IDeckLinkAttributes::* )( uint32_t, bool* )> );
-static_assert( std::is_same_v<decltype( &IDeckLinkTimecode::GetComponents ),
-  int ( IDeckLinkTimecode::* )( uint8_t*, uint8_t*, uint8_t*, uint8_t* )> );
+static_assert(
+  std::is_same_v<decltype( &IDeckLinkTimecode::GetComponents ), int ( IDeckLinkTimecode::* )( uint8_t*, uint8_t*, uint8_t*, uint8_t* )> );
 static_assert( std::is_same_v<decltype( &IDeckLinkInput::DoesSupportVideoMode ),
   int ( IDeckLinkInput::* )( uint32_t, uint32_t, uint32_t, uint32_t*, IDeckLinkDisplayMode** )> );
 static_assert( std::is_same_v<decltype( &IDeckLinkInput::EnableAudioInput ), int ( IDeckLinkInput::* )( uint32_t, uint32_t, uint32_t )> );
-static_assert( std::is_same_v<decltype( &IDeckLinkInput::GetHardwareReferenceClock ),
-  int ( IDeckLinkInput::* )( int64_t, int64_t*, int64_t*, int64_t* )> );
+static_assert(
+  std::is_same_v<decltype( &IDeckLinkInput::GetHardwareReferenceClock ), int ( IDeckLinkInput::* )( int64_t, int64_t*, int64_t*, int64_t* )> );
 
 }
 
@@ -226,7 +228,7 @@ struct VForeignObject
 int ForeignQueryInterface( VForeignObject* i_pThis, unsigned long i_Low, unsigned long i_High, void** o_ppObject )
 {
   // A 16-byte structure of bytes travels in two integer registers, first bytes in the first.
-  unsigned char Bytes[ 16 ];
+  unsigned char Bytes[16];
   std::memcpy( Bytes, &i_Low, 8 );
   std::memcpy( Bytes + 8, &i_High, 8 );
   const bool bMine = std::memcmp( Bytes, IID_IDeckLinkVideoInputFrame.m_Bytes, 16 ) == 0;
@@ -261,7 +263,8 @@ __attribute__( ( noinline ) ) IDeckLinkVideoInputFrame* AsFrame( VForeignObject*
   return reinterpret_cast<IDeckLinkVideoInputFrame*>( i_pObject );
 }
 
-template<class TFunction> const void* Entry( TFunction* i_pFunction )
+template<class TFunction>
+const void* Entry( TFunction* i_pFunction )
 {
   return reinterpret_cast<const void*>( i_pFunction );
 }
@@ -295,10 +298,11 @@ __attribute__( ( noinline ) ) void* ReadTable( IUnknown* i_pObject, int i_Slot )
 {
   void** pTable = nullptr;
   std::memcpy( &pTable, static_cast<void*>( i_pObject ), sizeof( pTable ) );
-  return pTable[ i_Slot ];
+  return pTable[i_Slot];
 }
 
-template<class TFunction> TFunction* TableEntry( IUnknown* i_pObject, int i_Slot )
+template<class TFunction>
+TFunction* TableEntry( IUnknown* i_pObject, int i_Slot )
 {
   return reinterpret_cast<TFunction*>( ReadTable( i_pObject, i_Slot ) );
 }
@@ -329,11 +333,11 @@ __attribute__( ( no_sanitize( "vptr" ) ) ) void CallForeignFrame( IDeckLinkVideo
 
 TEST( DeckLinkAPI, CallsReachAForeignTable )
 {
-  const void* Table[ 15 ] = {};
-  Table[ 0 ] = Entry( ForeignQueryInterface );
-  Table[ 1 ] = Entry( ForeignAddRef );
-  Table[ 13 ] = Entry( ForeignStreamTime );
-  Table[ 14 ] = Entry( ForeignHardwareTime );
+  const void* Table[15] = {};
+  Table[0] = Entry( ForeignQueryInterface );
+  Table[1] = Entry( ForeignAddRef );
+  Table[13] = Entry( ForeignStreamTime );
+  Table[14] = Entry( ForeignHardwareTime );
   VForeignObject Object{ Table, 1, {} };
   CallForeignFrame( AsFrame( &Object ) );
   EXPECT_EQ( Object.m_Calls, "stream 135000000;hardware 90000;" );
@@ -344,11 +348,11 @@ TEST( DeckLinkAPI, ForeignCallsReachOurTable )
   VOurPacket Packet;
   IDeckLinkAudioInputPacket* pPacket = &Packet;
   REFIID Id = IID_IDeckLinkAudioInputPacket;
-  unsigned long Words[ 2 ];
+  unsigned long Words[2];
   std::memcpy( Words, Id.m_Bytes, sizeof( Words ) );
 
   void* pFound = nullptr;
-  EXPECT_EQ( ( TableEntry<int( void*, unsigned long, unsigned long, void** )>( pPacket, 0 )( pPacket, Words[ 0 ], Words[ 1 ], &pFound ) ), S_OK );
+  EXPECT_EQ( ( TableEntry<int( void*, unsigned long, unsigned long, void** )>( pPacket, 0 )( pPacket, Words[0], Words[1], &pFound ) ), S_OK );
   EXPECT_EQ( pFound, pPacket );
   EXPECT_EQ( ( TableEntry<unsigned long( void* )>( pPacket, 2 )( pPacket ) ), 6u );
   EXPECT_EQ( ( TableEntry<long( void* )>( pPacket, 3 )( pPacket ) ), 0x123456789 );

@@ -31,10 +31,7 @@ void ExpectRefusal( const std::string& i_rText, const std::vector<std::string>& 
   }
 }
 
-const VCardKind& DeckLink()
-{
-  return *FindCardKind( "decklink" );
-}
+const VCardKind& DeckLink() { return *FindCardKind( "decklink" ); }
 
 std::string ScriptRefusal( const std::string& i_rText )
 {
@@ -69,8 +66,9 @@ TEST( CardText, AKindAloneIsACard )
 TEST( CardText, AllKeys )
 {
   std::string Error;
-  const std::optional<VCardSpec> Spec = ParseCardSpec( "decklink:standard=HD_1280_720P_5994,pattern=counter,timecode=23:59:00;02,audio=ramp,channels=8,"
-                                                       "script=/tmp/a=b:c.json,speed=2.5",
+  const std::optional<VCardSpec> Spec = ParseCardSpec(
+    "decklink:standard=HD_1280_720P_5994,pattern=counter,timecode=23:59:00;02,audio=ramp,channels=8,"
+    "script=/tmp/a=b:c.json,speed=2.5",
     Error );
   ASSERT_TRUE( Spec ) << Error;
   EXPECT_EQ( Spec->m_Standard, IVideoStandard::EHD_1280_720P_5994 );
@@ -148,12 +146,12 @@ TEST( EventScript, AllEvents )
     Error );
   ASSERT_TRUE( Events ) << Error;
   ASSERT_EQ( Events->size(), 9u );
-  EXPECT_EQ( ( *Events )[ 0 ].m_Frames, 2u );
-  EXPECT_EQ( ( *Events )[ 1 ].m_Standard, IVideoStandard::EHD_1280_720P_5994 );
-  EXPECT_EQ( ( *Events )[ 3 ].m_To.m_Hours, 10 );
-  EXPECT_EQ( ( *Events )[ 4 ].m_Frames, 0u );
-  EXPECT_EQ( ( *Events )[ 6 ].m_Milliseconds, 40u );
-  EXPECT_EQ( ( *Events )[ 8 ].m_Do, EEvent::Arrive );
+  EXPECT_EQ( ( *Events )[0].m_Frames, 2u );
+  EXPECT_EQ( ( *Events )[1].m_Standard, IVideoStandard::EHD_1280_720P_5994 );
+  EXPECT_EQ( ( *Events )[3].m_To.m_Hours, 10 );
+  EXPECT_EQ( ( *Events )[4].m_Frames, 0u );
+  EXPECT_EQ( ( *Events )[6].m_Milliseconds, 40u );
+  EXPECT_EQ( ( *Events )[8].m_Do, EEvent::Arrive );
 }
 
 TEST( EventScript, RefusalsNameTheEventOrTheLine )
@@ -170,7 +168,8 @@ TEST( EventScript, RefusalsNameTheEventOrTheLine )
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "drop", "frames": 0 }])", { "\"frames\": cannot be 0" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "remove", "frames": 3 }])", { "\"frames\"", "no such key", "accepted: do, frame" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "late", "milliseconds": "40" }])", { "\"milliseconds\": cannot be \"40\"" } );
-  ExpectScriptRefusal( R"([{ "frame": 1, "do": "format", "standard": "HD_1920_1080P_4800" }])", { "\"standard\"", "cannot be carried", "accepted:" } );
+  ExpectScriptRefusal( R"([{ "frame": 1, "do": "format", "standard": "HD_1920_1080P_4800" }])",
+    { "\"standard\"", "cannot be carried", "accepted:" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "timecode-jump", "to": "noon" }])", { "\"to\": \"noon\"", "HH:MM:SS:FF" } );
 }
 

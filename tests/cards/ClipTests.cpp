@@ -39,8 +39,8 @@ void RunFFmpeg( std::vector<std::string> i_Arguments )
 void MakeClip( const std::string& i_rPath, const std::string& i_rSize, const std::string& i_rRate, int i_Frames, double i_SoundSeconds )
 {
   RunFFmpeg( { "-f", "lavfi", "-i", "testsrc2=size=" + i_rSize + ":rate=" + i_rRate, "-f", "lavfi", "-i",
-    "aevalsrc=0.5*sin(2000*t*t+400*t)|0.25*sin(3000*t):s=48000:d=" + std::to_string( i_SoundSeconds ), "-frames:v", std::to_string( i_Frames ), "-c:v",
-    "ffv1", "-pix_fmt", "yuv420p", "-c:a", "pcm_s24le", i_rPath } );
+    "aevalsrc=0.5*sin(2000*t*t+400*t)|0.25*sin(3000*t):s=48000:d=" + std::to_string( i_SoundSeconds ), "-frames:v", std::to_string( i_Frames ),
+    "-c:v", "ffv1", "-pix_fmt", "yuv420p", "-c:a", "pcm_s24le", i_rPath } );
 }
 
 class DeckLinkClip : public VCardFixture
@@ -50,7 +50,7 @@ protected:
 
   void KeepContent()
   {
-    m_Client.m_OnFrame = [ this ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+    m_Client.m_OnFrame = [this]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
     {
       m_Client.m_Seen.push_back( Look( *i_pFrame, i_pPacket ) );
       const TestSupport::VPixels Pixels = PixelsOf( *i_pFrame );
@@ -68,12 +68,12 @@ protected:
   // The card's pictures from i_First on, against a file of raw ones
   void ExpectPictures( size_t i_First, const VBytes& i_rExpected )
   {
-    const size_t Size = m_Pictures[ i_First ].size();
+    const size_t Size = m_Pictures[i_First].size();
     for( size_t i = 0; i < i_rExpected.size() / Size; ++i )
     {
       ASSERT_LT( i_First + i, m_Pictures.size() );
       const auto Begin = i_rExpected.begin() + static_cast<ptrdiff_t>( i * Size );
-      ASSERT_TRUE( std::equal( m_Pictures[ i_First + i ].begin(), m_Pictures[ i_First + i ].end(), Begin ) ) << "picture " << i_First + i;
+      ASSERT_TRUE( std::equal( m_Pictures[i_First + i].begin(), m_Pictures[i_First + i].end(), Begin ) ) << "picture " << i_First + i;
     }
   }
 
@@ -104,9 +104,10 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
   {
     uint32_t m_Format;
     std::vector<std::string> m_Encoding;
-  } Cases[] = { { PixelFormat::YUV8Bit, { "-pix_fmt", "uyvy422" } }, { PixelFormat::YUV10Bit, { "-c:v", "v210" } }, { PixelFormat::BGRA8Bit, { "-pix_fmt", "bgra" } } };
+  } Cases[] = { { PixelFormat::YUV8Bit, { "-pix_fmt", "uyvy422" } }, { PixelFormat::YUV10Bit, { "-c:v", "v210" } },
+    { PixelFormat::BGRA8Bit, { "-pix_fmt", "bgra" } } };
   KeepContent();
-  for( const auto& [ Format, Encoding ] : Cases )
+  for( const auto& [Format, Encoding] : Cases )
   {
     std::vector<std::string> Command{ "-i", File( "clip,a.mkv" ), "-map", "0:v" };
     Command.insert( Command.end(), Encoding.begin(), Encoding.end() );
@@ -123,7 +124,7 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
     Step( 2 * ClipFrames );
     m_pInput->StopStreams();
     ASSERT_EQ( m_Pictures.size(), 2u * ClipFrames );
-    ASSERT_EQ( Pictures.size(), ClipFrames * m_Pictures[ 0 ].size() );
+    ASSERT_EQ( Pictures.size(), ClipFrames * m_Pictures[0].size() );
     ExpectPictures( 0, Pictures );
     ExpectPictures( ClipFrames, Pictures );
     const size_t PassBytes = ClipFrames * 960 * 2 * 4;
@@ -144,9 +145,9 @@ TEST_F( DeckLinkClip, WithoutALoopTheSignalIsLostAtTheEndAndMissingSoundIsSilent
   Start();
   Step( 6 );
   ASSERT_EQ( m_Client.m_Seen.size(), 6u );
-  EXPECT_TRUE( m_Client.m_Seen[ 3 ].m_bSignal );
-  EXPECT_FALSE( m_Client.m_Seen[ 4 ].m_bSignal );
-  EXPECT_FALSE( m_Client.m_Seen[ 5 ].m_bSignal );
+  EXPECT_TRUE( m_Client.m_Seen[3].m_bSignal );
+  EXPECT_FALSE( m_Client.m_Seen[4].m_bSignal );
+  EXPECT_FALSE( m_Client.m_Seen[5].m_bSignal );
   EXPECT_EQ( TestSupport::ReadRamp( { m_Sound.data(), 4 * 1920, 2, 4 }, 2 ), 0 ) << "sound that is asked for takes the place of the clip's";
   m_pInput->StopStreams();
   Start();
@@ -178,8 +179,8 @@ TEST_F( DeckLinkClip, AnotherSizeAndRateAreFittedIntoTheStandard )
   Start();
   Step( 57 );
   ASSERT_EQ( m_Pictures.size(), 57u );
-  EXPECT_TRUE( m_Client.m_Seen[ 56 ].m_bSignal );
-  const TestSupport::VPixels Pixels{ KVZ::IPixelFormat::EU8Y8V8Y8, m_Pictures[ 20 ].data(), 1280 * 2 };
+  EXPECT_TRUE( m_Client.m_Seen[56].m_bSignal );
+  const TestSupport::VPixels Pixels{ KVZ::IPixelFormat::EU8Y8V8Y8, m_Pictures[20].data(), 1280 * 2 };
   for( const uint32_t x : { 0u, 150u, 1130u, 1279u } )
   {
     EXPECT_EQ( BrightnessAt( Pixels, x, 360 ), 16 ) << x;
@@ -190,8 +191,8 @@ TEST_F( DeckLinkClip, AnotherSizeAndRateAreFittedIntoTheStandard )
     Levels.insert( BrightnessAt( Pixels, x, 360 ) );
   }
   EXPECT_GT( Levels.size(), 5u );
-  EXPECT_TRUE( m_Pictures[ 20 ] == m_Pictures[ 21 ] || m_Pictures[ 21 ] == m_Pictures[ 22 ] );
-  EXPECT_FALSE( m_Pictures[ 20 ] == m_Pictures[ 28 ] );
+  EXPECT_TRUE( m_Pictures[20] == m_Pictures[21] || m_Pictures[21] == m_Pictures[22] );
+  EXPECT_FALSE( m_Pictures[20] == m_Pictures[28] );
 }
 
 TEST_F( DeckLinkClip, OptionsOpenWhatIsNoFile )
@@ -220,8 +221,8 @@ TEST_F( DeckLinkClip, AFormatEventShowsTheClipInTheNewStandard )
   Step( 2 );
   EXPECT_EQ( m_Client.m_FormatCalls, 2 );
   ASSERT_EQ( m_Client.m_Seen.size(), 4u );
-  EXPECT_TRUE( m_Client.m_Seen[ 3 ].m_bSignal );
-  EXPECT_EQ( m_Client.m_Seen[ 3 ].m_Height, 576 );
+  EXPECT_TRUE( m_Client.m_Seen[3].m_bSignal );
+  EXPECT_EQ( m_Client.m_Seen[3].m_Height, 576 );
 }
 
 TEST_F( DeckLinkClip, ByTheClockAClipPlaysFromItsFirstPicture )
@@ -232,7 +233,7 @@ TEST_F( DeckLinkClip, ByTheClockAClipPlaysFromItsFirstPicture )
   boost::condition_variable Changed;
   KeepContent();
   const auto Keep = m_Client.m_OnFrame;
-  m_Client.m_OnFrame = [ & ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
   {
     const boost::lock_guard<boost::mutex> Lock( Mutex );
     if( m_Pictures.size() < 31 )
@@ -245,12 +246,12 @@ TEST_F( DeckLinkClip, ByTheClockAClipPlaysFromItsFirstPicture )
   Start();
   {
     boost::unique_lock<boost::mutex> Lock( Mutex );
-    Changed.wait( Lock, [ & ] { return m_Pictures.size() == 31; } );
+    Changed.wait( Lock, [&] { return m_Pictures.size() == 31; } );
   }
   m_pInput->StopStreams();
   RunFFmpeg( { "-i", File( "clip.mkv" ), "-map", "0:v", "-pix_fmt", "uyvy422", "-f", "rawvideo", File( "raw" ) } );
   ExpectPictures( 0, ReadFile( File( "raw" ) ) );
-  EXPECT_FALSE( m_Client.m_Seen[ 30 ].m_bSignal );
+  EXPECT_FALSE( m_Client.m_Seen[30].m_bSignal );
 }
 
 TEST( ClipInput, WhatCannotBeOpenedIsRefusedWithFFmpegsReason )

@@ -30,24 +30,25 @@ constexpr uint32_t Mode1080p25 = FourCharacterCode( "Hp25" );
 constexpr uint32_t ModeNTSC = FourCharacterCode( "ntsc" );
 
 // A function that the library exports
-template<class TFunction> TFunction* Exported( const char* i_pName )
+template<class TFunction>
+TFunction* Exported( const char* i_pName )
 {
   static void* const s_pLibrary = dlopen( VIRTUAL_DECKLINK, RTLD_NOW );
   return s_pLibrary ? reinterpret_cast<TFunction*>( dlsym( s_pLibrary, i_pName ) ) : nullptr;
 }
 
-inline IVirtualCardControl& Control()
-{
-  return *Exported<GetVirtualCardControlFunction>( GetVirtualCardControlName )();
-}
+inline IVirtualCardControl& Control() { return *Exported<GetVirtualCardControlFunction>( GetVirtualCardControlName )(); }
 
-template<class TInterface> struct VReleaser
+template<class TInterface>
+struct VReleaser
 {
   void operator()( TInterface* i_pObject ) const { i_pObject->Release(); }
 };
-template<class TInterface> using VPointer = std::unique_ptr<TInterface, VReleaser<TInterface>>;
+template<class TInterface>
+using VPointer = std::unique_ptr<TInterface, VReleaser<TInterface>>;
 
-template<class TInterface> VPointer<TInterface> Query( IUnknown& i_rObject, REFIID i_Id )
+template<class TInterface>
+VPointer<TInterface> Query( IUnknown& i_rObject, REFIID i_Id )
 {
   void* pFound = nullptr;
   return VPointer<TInterface>( i_rObject.QueryInterface( i_Id, &pFound ) == S_OK ? static_cast<TInterface*>( pFound ) : nullptr );
@@ -82,7 +83,7 @@ struct VSeen
   int64_t m_StreamTime = 0;
   int64_t m_HardwareTime = 0;
   int64_t m_Duration = 0;
-  std::string m_Timecode;      // of any RP188 packet; empty for none
+  std::string m_Timecode;   // of any RP188 packet; empty for none
   uint32_t m_TimecodeFlags = 0;
   bool m_bPacket = false;
   long m_Samples = 0;
@@ -171,7 +172,7 @@ public:
   // Keeps what every frame showed.
   void Record()
   {
-    m_OnFrame = [ this ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+    m_OnFrame = [this]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
     { m_Seen.push_back( Look( *i_pFrame, i_pPacket ) ); };
   }
 
@@ -220,7 +221,7 @@ protected:
   // What drivers do with a new format, inside the callback
   void RestartOnFormat( uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
   {
-    m_Client.m_OnFormat = [ this, i_PixelFormat ]( uint32_t i_Mode )
+    m_Client.m_OnFormat = [this, i_PixelFormat]( uint32_t i_Mode )
     {
       EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
       EXPECT_EQ( m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, InputFlag::FormatDetection ), S_OK );

@@ -3,6 +3,9 @@
 
 #include "tests/support/TemporaryFolder.h"
 
+#include <boost/thread/latch.hpp>
+
+#include <chrono>
 #include <fstream>
 
 using namespace CardsTests;
@@ -104,7 +107,7 @@ TEST_F( DeckLinkDiscovery, AScriptTakesACardOutAndPutsItBackAsANewOne )
   const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   pDiscovery->InstallDeviceNotifications( &m_Watcher );
   VPointer<IDeckLinkInput> pInput;
-  m_Watcher.m_OnArrival = [ & ]( IDeckLink* i_pCard ) { pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
+  m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard ) { pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
   VClient Client;
   const VCardId Card = Add( "decklink:script=" + Folder.File( "script.json" ) );
 
@@ -131,10 +134,52 @@ TEST_F( DeckLinkDiscovery, AScriptTakesACardOutAndPutsItBackAsANewOne )
   pFirst->SetCallback( nullptr );
 }
 
+TEST_F( DeckLinkDiscovery, ALateFrameComesLateWithItsOwnTimeAndHoldsUpNoOther )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  std::ofstream( Folder.File( "script.json" ) ) << R"([{ "frame": 0, "do": "late", "milliseconds": 60 }])";
+  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  VClient Client;
+  boost::latch Enough( 3 );
+  std::vector<std::chrono::steady_clock::time_point> Times;
+  Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+  {
+    if( Times.size() < 3 )
+    {
+      Times.push_back( std::chrono::steady_clock::now() );
+      Client.m_Seen.push_back( Look( *i_pFrame, i_pPacket ) );
+      Enough.count_down();
+    }
+  };
+  // Streams run before the card's first frame
+  VPointer<IDeckLinkInput> pInput;
+  m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard )
+  {
+    pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput );
+    pInput->SetCallback( &Client );
+    pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
+    pInput->StartStreams();
+  };
+  pDiscovery->InstallDeviceNotifications( &m_Watcher );
+  const auto Before = std::chrono::steady_clock::now();
+  std::string Error;
+  m_Cards.push_back( Control().AddCard( ( "decklink:pattern=counter,script=" + Folder.File( "script.json" ) ).c_str(), {}, Error ) );
+  Enough.wait();
+  pInput->StopStreams();
+  pInput->SetCallback( nullptr );
+  EXPECT_GE( Times[0] - Before, std::chrono::milliseconds( 60 ) );
+  EXPECT_GE( Times[2] - Before, std::chrono::milliseconds( 80 ) );
+  for( uint32_t i = 0; i < 3; ++i )
+  {
+    EXPECT_EQ( Client.m_Seen[i].m_Counter, i );
+    EXPECT_EQ( Client.m_Seen[i].m_StreamTime, i * 5400000 );
+  }
+}
+
 TEST_F( DeckLinkDiscovery, AnArrivalMayUninstallOrAddMore )
 {
   VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
-  m_Watcher.m_OnArrival = [ & ]( IDeckLink* )
+  m_Watcher.m_OnArrival = [&]( IDeckLink* )
   {
     if( m_Watcher.m_News.size() == 1 )
     {
@@ -155,7 +200,8 @@ TEST_F( DeckLinkDiscovery, AnArrivalMayUninstallOrAddMore )
 
 TEST_F( DeckLinkDiscovery, AllGenerationsOfTheFactoriesAndTheIterator )
 {
-  for( const char* pName : { "CreateDeckLinkDiscoveryInstance_0001", "CreateDeckLinkDiscoveryInstance_0002", "CreateDeckLinkDiscoveryInstance_0003" } )
+  for( const char* pName :
+    { "CreateDeckLinkDiscoveryInstance_0001", "CreateDeckLinkDiscoveryInstance_0002", "CreateDeckLinkDiscoveryInstance_0003" } )
   {
     const VPointer<IDeckLinkDiscovery> pDiscovery( Exported<IDeckLinkDiscovery*()>( pName )() );
     EXPECT_NE( ( Query<IDeckLinkDiscovery>( *pDiscovery, IID_IDeckLinkDiscovery ) ), nullptr );
@@ -172,8 +218,7 @@ TEST_F( DeckLinkDiscovery, AllGenerationsOfTheFactoriesAndTheIterator )
     }
     EXPECT_EQ( Count, 2 );
   }
-  const VPointer<IDeckLinkAPIInformation> pInformation(
-    Exported<IDeckLinkAPIInformation*()>( "CreateDeckLinkAPIInformationInstance_0001" )() );
+  const VPointer<IDeckLinkAPIInformation> pInformation( Exported<IDeckLinkAPIInformation*()>( "CreateDeckLinkAPIInformationInstance_0001" )() );
   int64_t Version = 0;
   EXPECT_EQ( pInformation->GetInt( AttributeId::APIVersion, &Version ), S_OK );
   EXPECT_EQ( Version >> 24, 10 );

@@ -24,7 +24,7 @@ TEST_F( DeckLinkThreads, ACardRunsOnItsOwnThread )
   Plug( "decklink:pattern=counter,speed=50", false );
   boost::latch Enough( 20 );
   const boost::thread::id TestThread = boost::this_thread::get_id();
-  m_Client.m_OnFrame = [ & ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
   {
     if( m_Client.m_Seen.size() < 20 )
     {
@@ -40,8 +40,8 @@ TEST_F( DeckLinkThreads, ACardRunsOnItsOwnThread )
   m_pInput->StopStreams();
   for( size_t i = 1; i < 20; ++i )
   {
-    EXPECT_EQ( *m_Client.m_Seen[ i ].m_Counter, *m_Client.m_Seen[ i - 1 ].m_Counter + 1 );
-    EXPECT_EQ( m_Client.m_Seen[ i ].m_HardwareTime - m_Client.m_Seen[ i - 1 ].m_HardwareTime, 5400000 );
+    EXPECT_EQ( *m_Client.m_Seen[i].m_Counter, *m_Client.m_Seen[i - 1].m_Counter + 1 );
+    EXPECT_EQ( m_Client.m_Seen[i].m_HardwareTime - m_Client.m_Seen[i - 1].m_HardwareTime, 5400000 );
   }
   EXPECT_FALSE( Control().Step( m_Card, 1 ) ) << "only a card with a manual clock is stepped";
 }
@@ -51,14 +51,14 @@ TEST_F( DeckLinkThreads, OnlyStopWaitsForARunningCallback )
   Plug( "decklink" );
   boost::latch Inside( 1 );
   boost::latch GoOn( 1 );
-  m_Client.m_OnFrame = [ & ]( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )
+  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )
   {
     Inside.count_down();
     GoOn.wait();
   };
   Enable();
   Start();
-  VThread Stepper( [ this ] { Control().Step( m_Card, 1 ); } );
+  VThread Stepper( [this] { Control().Step( m_Card, 1 ); } );
   Inside.wait();
   // All of these come back while the callback is running
   EXPECT_EQ( Control().CallbacksInFlight(), 1 );
@@ -81,7 +81,7 @@ TEST_F( DeckLinkThreads, AStopFromOutsideWinsOverARestartInsideACallback )
   {
     boost::latch Inside( 1 );
     boost::latch Stopping( 1 );
-    m_Client.m_OnFormat = [ & ]( uint32_t i_Mode )
+    m_Client.m_OnFormat = [&]( uint32_t i_Mode )
     {
       Inside.count_down();
       Stopping.wait();
@@ -92,7 +92,7 @@ TEST_F( DeckLinkThreads, AStopFromOutsideWinsOverARestartInsideACallback )
     };
     Enable( ModeNTSC, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
     Start();
-    VThread Stepper( [ this ] { Control().Step( m_Card, 1 ); } );
+    VThread Stepper( [this] { Control().Step( m_Card, 1 ); } );
     Inside.wait();
     Stopping.count_down();
     EXPECT_EQ( m_pInput->StopStreams(), S_OK );
@@ -107,14 +107,14 @@ TEST_F( DeckLinkThreads, NoCallbackBeginsAfterAStopInAStormOfStartsAndStops )
 {
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
   RestartOnFormat();
-  m_Client.m_OnFormat = [ & ]( uint32_t i_Mode )
+  m_Client.m_OnFormat = [&]( uint32_t i_Mode )
   {
     m_pInput->PauseStreams();
     m_pInput->EnableVideoInput( i_Mode, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
     m_pInput->FlushStreams();
     m_pInput->StartStreams();
   };
-  const auto Storm = [ this ]( uint32_t i_Mode )
+  const auto Storm = [this]( uint32_t i_Mode )
   {
     for( int i = 0; i < 500; ++i )
     {
@@ -147,7 +147,7 @@ TEST_F( DeckLinkThreads, CardsComeAndGoWhileTheyRunAndFramesAreGivenBackElsewher
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
   boost::mutex Mutex;
   std::vector<IDeckLinkVideoInputFrame*> Kept;
-  m_Client.m_OnFrame = [ & ]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
+  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
   {
     i_pFrame->AddRef();
     const boost::lock_guard<boost::mutex> Lock( Mutex );
@@ -183,7 +183,7 @@ TEST_F( DeckLinkThreads, CardsComeAndGoWhileTheyRunAndFramesAreGivenBackElsewher
 TEST_F( DeckLinkThreads, ACardIsNotTakenOutFromInsideItsCallback )
 {
   Plug( "decklink" );
-  m_Client.m_OnFrame = [ & ]( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )
+  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )
   {
     EXPECT_FALSE( Control().RemoveCard( m_Card ) );
     EXPECT_FALSE( Control().Step( m_Card, 1 ) );

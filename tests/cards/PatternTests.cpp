@@ -18,12 +18,10 @@ namespace
 {
 
 constexpr IPixelFormat::Enum Formats[] = { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8 };
-constexpr IVideoStandard::Enum Sizes[] = { IVideoStandard::ESD_720_486I_5994, IVideoStandard::EHD_1280_720P_5000, IVideoStandard::EHD_1920_1080P_2500 };
+constexpr IVideoStandard::Enum Sizes[] = { IVideoStandard::ESD_720_486I_5994, IVideoStandard::EHD_1280_720P_5000,
+  IVideoStandard::EHD_1920_1080P_2500 };
 
-VPictureFormat FormatOf( IVideoStandard::Enum i_Standard, IPixelFormat::Enum i_Format )
-{
-  return { KVZ::FindVideoStandard( i_Standard ), i_Format };
-}
+VPictureFormat FormatOf( IVideoStandard::Enum i_Standard, IPixelFormat::Enum i_Format ) { return { KVZ::FindVideoStandard( i_Standard ), i_Format }; }
 
 VPixels PixelsOf( const VPictureFormat& i_rFormat, VPicture& i_rPicture )
 {
@@ -48,7 +46,8 @@ std::vector<uint8_t> BytesOf( const VPictureFormat& i_rFormat, VPicture& i_rPict
 }
 
 // Every format at three sizes, with the given pattern
-template<class TCheck> void ForEachFormat( EPattern i_Pattern, TCheck i_Check )
+template<class TCheck>
+void ForEachFormat( EPattern i_Pattern, TCheck i_Check )
 {
   for( const IVideoStandard::Enum Standard : Sizes )
   {
@@ -134,7 +133,7 @@ TEST( BarsPattern, SevenBarsWithTheirPublishedLevels )
   MakeBarsPainter( Format )->Paint( Picture, FrameNumber( 0 ) );
   for( uint32_t Bar = 0; Bar < 7; ++Bar )
   {
-    EXPECT_NEAR( TestSupport::BrightnessAt( PixelsOf( Format, Picture ), Bar * 1920 / 7 + 137, 300 ), Luma[ Bar ], 1 ) << Bar;
+    EXPECT_NEAR( TestSupport::BrightnessAt( PixelsOf( Format, Picture ), Bar * 1920 / 7 + 137, 300 ), Luma[Bar], 1 ) << Bar;
   }
 }
 
@@ -153,7 +152,7 @@ TEST( Sound, ARampReaderFindsTheFirstSampleInEveryLayout )
       std::vector<uint8_t> Bytes( Layout.BytesPerFrame() * Sound.m_Samples );
       Sound.Write( Layout, Bytes.data() );
       EXPECT_EQ( TestSupport::ReadRamp( { Bytes.data(), Sound.m_Samples, Channels, Bits / 8 }, std::min( 4u, Channels ) ), 65000 );
-      Bytes[ Bytes.size() / 2 ] ^= 1;
+      Bytes[Bytes.size() / 2] ^= 1;
       EXPECT_FALSE( TestSupport::ReadRamp( { Bytes.data(), Sound.m_Samples, Channels, Bits / 8 }, std::min( 4u, Channels ) ) );
     }
   }

@@ -149,8 +149,8 @@ TEST( SignalTimeline, EventsHappenAtTheirFramesAndTheClockGoesOn )
   VCardEvent Jump = Event( 10, EEvent::TimecodeJump );
   Jump.m_To = { 5, 0, 0, 0, false };
   VSignalTimeline Signal = Timeline( IVideoStandard::EHD_1920_1080P_2500,
-    { Jump, Late, Event( 2, EEvent::SignalLoss, 2 ), Event( 5, EEvent::Drop, 2 ), Event( 12, EEvent::TimecodeLoss, 2 ), Event( 15, EEvent::TimecodeLoss ),
-      Event( 17, EEvent::Remove ), Event( 19, EEvent::Arrive ) } );
+    { Jump, Late, Event( 2, EEvent::SignalLoss, 2 ), Event( 5, EEvent::Drop, 2 ), Event( 12, EEvent::TimecodeLoss, 2 ),
+      Event( 15, EEvent::TimecodeLoss ), Event( 17, EEvent::Remove ), Event( 19, EEvent::Arrive ) } );
   for( uint64_t i = 0; i < 22; ++i )
   {
     SCOPED_TRACE( i );

@@ -26,8 +26,8 @@ inline int BrightnessAt( const VPixels& i_rPixels, uint32_t i_X, uint32_t i_Y )
   const uint8_t* pRow = i_rPixels.m_pBytes + i_Y * i_rPixels.m_RowBytes;
   switch( i_rPixels.m_Format )
   {
-    case KVZ::IPixelFormat::EU8Y8V8Y8: return pRow[ 2 * i_X + 1 ];
-    case KVZ::IPixelFormat::EB8G8R8u8: return pRow[ 4 * i_X + 1 ];
+    case KVZ::IPixelFormat::EU8Y8V8Y8: return pRow[2 * i_X + 1];
+    case KVZ::IPixelFormat::EB8G8R8u8: return pRow[4 * i_X + 1];
     case KVZ::IPixelFormat::EU10Y10V10Y10: break;
     default: return -1;
   }

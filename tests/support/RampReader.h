@@ -15,7 +15,7 @@ struct VSamples
   const uint8_t* m_pBytes = nullptr;   // interleaved
   size_t m_Frames = 0;                 // samples a channel
   uint32_t m_Channels = 0;
-  uint32_t m_Bytes = 2;                // of a sample: 2 or 4
+  uint32_t m_Bytes = 2;   // of a sample: 2 or 4
 };
 
 inline int32_t SampleAt( const VSamples& i_rSamples, size_t i_Frame, uint32_t i_Channel )
