@@ -44,6 +44,17 @@ private:
 // The list that travels from the frame through the encoder to the writer, in stream order. An encoder replaces its content.
 using VBufferList = std::vector<std::shared_ptr<const IBufferConst>>;
 
+// Bytes of all buffers together.
+inline uint64_t GetTotalSize( const VBufferList& i_rBuffers )
+{
+  uint64_t Sum = 0;
+  for( const auto& rpBuffer : i_rBuffers )
+  {
+    Sum += rpBuffer->Size();
+  }
+  return Sum;
+}
+
 // Gives out buffers. Implementations may keep returned ones for reuse; the name appears in diagnostics.
 class IBufferAllocator
 {

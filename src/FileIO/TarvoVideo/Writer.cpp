@@ -16,20 +16,21 @@ namespace TarvoVideo
 namespace
 {
 
-uint64_t SumOfSizes( const KVZ::VBufferList& i_rBuffers )
+void AppendSpans( std::vector<KVZ::IOutputStream::VSpan>& o_rSpans, const KVZ::VBufferList& i_rBuffers )
 {
-  uint64_t Sum = 0;
   for( const auto& rpBuffer : i_rBuffers )
   {
-    Sum += rpBuffer->Size();
+    if( rpBuffer->Size() != 0 )
+    {
+      o_rSpans.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
+    }
   }
-  return Sum;
 }
 
 }
 
 VWriter::VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
-  : VWriterBase( "TarvoVideo", m_Capabilities ),
+  : VWriterBase( "TarvoVideo" ),
     m_StreamMaker( std::move( i_StreamMaker ) ),
     m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Unnamed" ) ),
     m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
@@ -114,12 +115,13 @@ bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
     return false;
   }
   const bool bAudio = m_Audio.HasAudio();
-  const uint64_t AudioSum = bAudio ? SumOfSizes( io_rFrame.m_rAudio ) : 0;
+  const uint64_t AudioSum = bAudio ? KVZ::GetTotalSize( io_rFrame.m_rAudio ) : 0;
   if( !FitsDescription( io_rFrame, AudioSum ) )
   {
     return false;
   }
   const auto AudioBytes = static_cast<uint32_t>( AudioSum );
+  CollectSpans( io_rFrame, bAudio ? &AudioBytes : nullptr );
   const auto [Entry, bNew] = m_Index.try_emplace( io_rFrame.m_Key, VRecord{ m_pStream->GetEnd(), AudioBytes } );
   if( Entry->second.m_AudioBytes != AudioBytes )
   {
@@ -127,9 +129,9 @@ bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
       Entry->second.m_AudioBytes, AudioBytes );
     return false;
   }
-  const bool bVideoWritten = m_pStream->Seek( Entry->second.m_Position ) && WriteBuffers( io_rFrame.m_rVideo, nullptr );
+  const bool bVideoWritten = m_pStream->Seek( Entry->second.m_Position ) && m_pStream->Write( m_VideoSpans );
   // Sound that could not be written shows in the next call.
-  if( !bVideoWritten || ( bAudio && !WriteBuffers( io_rFrame.m_rAudio, &AudioBytes ) ) )
+  if( !bVideoWritten || !m_pStream->Write( m_AudioSpans ) )
   {
     m_Index.erase( Entry );
   }
@@ -156,7 +158,7 @@ bool VWriter::Encode( WriterSupport::VFrame& io_rFrame )
 // A record carries no length of its own: one that does not match the header's description would make every reader see a wrong picture.
 bool VWriter::FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const
 {
-  const uint64_t VideoBytes = SumOfSizes( i_rFrame.m_rVideo );
+  const uint64_t VideoBytes = KVZ::GetTotalSize( i_rFrame.m_rVideo );
   const uint64_t StoredBytes = CoreVideoUtils::GetFrameSize( m_Video );
   const KVZ::VideoFrameInfo& rInfo = i_rFrame.m_rVideoInfo;
   if( VideoBytes != StoredBytes || rInfo.m_ImageWidth != m_Video.m_ImageWidth || rInfo.m_ImageHeight != m_Video.m_ImageHeight )
@@ -173,22 +175,17 @@ bool VWriter::FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i
   return true;
 }
 
-// With a length, that goes first; all in one write.
-bool VWriter::WriteBuffers( const KVZ::VBufferList& i_rBuffers, const uint32_t* i_pLength )
+// Needs memory, so it comes before the index: an entry must not stay where its record was never begun. Without a length there is no sound.
+void VWriter::CollectSpans( const WriterSupport::VFrame& i_rFrame, const uint32_t* i_pAudioLength )
 {
-  m_Spans.clear();
-  if( i_pLength )
+  m_VideoSpans.clear();
+  AppendSpans( m_VideoSpans, i_rFrame.m_rVideo );
+  m_AudioSpans.clear();
+  if( i_pAudioLength )
   {
-    m_Spans.emplace_back( i_pLength, sizeof( *i_pLength ) );
+    m_AudioSpans.emplace_back( i_pAudioLength, sizeof( *i_pAudioLength ) );
+    AppendSpans( m_AudioSpans, i_rFrame.m_rAudio );
   }
-  for( const auto& rpBuffer : i_rBuffers )
-  {
-    if( rpBuffer->Size() != 0 )
-    {
-      m_Spans.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
-    }
-  }
-  return m_pStream->Write( m_Spans );
 }
 
 bool VWriter::DoClose()

@@ -26,9 +26,12 @@ public:
   explicit VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder = {},
     WriterSupport::VStreamMaker i_StreamMaker = WriterSupport::MakeFile );
 
+  const KVZ::IVideoWriterCapabilities& GetCapabilities() const override { return m_Capabilities; }
   bool IsOpen() const override { return m_pStream != nullptr; }
 
 private:
+  using VSpans = std::vector<KVZ::IOutputStream::VSpan>;
+
   struct VRecord
   {
     uint64_t m_Position;
@@ -44,8 +47,8 @@ private:
   bool WriteInternalBlock();
   bool WriteExternalBlock( const WriterSupport::VHeader& i_rHeader );
   bool Encode( WriterSupport::VFrame& io_rFrame );
+  void CollectSpans( const WriterSupport::VFrame& i_rFrame, const uint32_t* i_pAudioLength );
   bool FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const;
-  bool WriteBuffers( const KVZ::VBufferList& i_rBuffers, const uint32_t* i_pLength );
   bool WriteIndex( WriterSupport::VWatchedStream& io_rStream ) const;
 
   const VWriterCapabilities m_Capabilities;
@@ -59,7 +62,8 @@ private:
   KVZ::VideoFrameInfo m_Video;   // as stored
   KVZ::AudioFrameInfo m_Audio;   // as stored
   std::map<uint64_t, VRecord> m_Index;
-  std::vector<KVZ::IOutputStream::VSpan> m_Spans;   // kept for its memory
+  VSpans m_VideoSpans;   // both kept for their memory
+  VSpans m_AudioSpans;
 };
 
 }

@@ -118,12 +118,7 @@ bool VVideoFrameEncoder::Encode( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBuff
 bool VVideoFrameEncoder::Join( VJob& io_rJob ) const
 {
   const uint64_t Size = CoreVideoUtils::GetFrameSize( io_rJob.m_rSource );
-  uint64_t Sum = 0;
-  for( const auto& rpBuffer : io_rJob.m_rVideo )
-  {
-    Sum += rpBuffer->Size();
-  }
-  if( Sum != Size )
+  if( KVZ::GetTotalSize( io_rJob.m_rVideo ) != Size )
   {
     KVZ_LOG_ERROR( "VideoEncoding", "Unexpected buffer size when copying frame data to make contiguous." );
     return false;

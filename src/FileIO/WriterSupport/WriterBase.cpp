@@ -7,11 +7,6 @@
 namespace WriterSupport
 {
 
-VWriterBase::VWriterBase( const char* i_pCategory, const KVZ::IVideoWriterCapabilities& i_rCapabilities )
-  : m_rCategory( KVZ::LogCategory( i_pCategory ) ), m_rCapabilities( i_rCapabilities )
-{
-}
-
 template<class TOperation>
 bool VWriterBase::Guarded( const char* i_pName, TOperation i_Operation ) const
 try
@@ -43,25 +38,26 @@ bool VWriterBase::CheckHeader( const VHeader& i_rHeader ) const
     KVZ_LOG_ERROR( m_rCategory, "File must be opened for write access before WriteHeader is called." );
     return false;
   }
-  if( !m_rCapabilities.IsVideoPayloadSupported( i_rHeader.m_VideoPayload ) )
+  const KVZ::IVideoWriterCapabilities& rCapabilities = GetCapabilities();
+  if( !rCapabilities.IsVideoPayloadSupported( i_rHeader.m_VideoPayload ) )
   {
     KVZ_LOG_ERROR( m_rCategory, "Video payload format '%1%' is not supported.", KVZ::NameOrUnspecified( i_rHeader.m_VideoPayload ) );
     return false;
   }
   const bool bUncompressedVideo = i_rHeader.m_VideoPayload == KVZ::IVideoPayload::EUncompressed;
-  if( bUncompressedVideo && !m_rCapabilities.IsPixelFormatSupported( i_rHeader.m_rVideo.m_PixelFormat ) )
+  if( bUncompressedVideo && !rCapabilities.IsPixelFormatSupported( i_rHeader.m_rVideo.m_PixelFormat ) )
   {
     KVZ_LOG_ERROR( m_rCategory, "Pixel format '%1%' is not supported for uncompressed video.",
       KVZ::NameOrUnspecified( i_rHeader.m_rVideo.m_PixelFormat ) );
     return false;
   }
-  if( !m_rCapabilities.IsAudioPayloadSupported( i_rHeader.m_AudioPayload ) )
+  if( !rCapabilities.IsAudioPayloadSupported( i_rHeader.m_AudioPayload ) )
   {
     KVZ_LOG_ERROR( m_rCategory, "Audio payload format '%1%' is not supported.", KVZ::NameOrUnspecified( i_rHeader.m_AudioPayload ) );
     return false;
   }
   const bool bUncompressedAudio = i_rHeader.m_AudioPayload == KVZ::IAudioPayload::EUncompressed && !i_rHeader.m_rAudio.IsEmpty();
-  if( bUncompressedAudio && !m_rCapabilities.IsAudioSampleFormatSupported( i_rHeader.m_rAudio.m_SampleFormat ) )
+  if( bUncompressedAudio && !rCapabilities.IsAudioSampleFormatSupported( i_rHeader.m_rAudio.m_SampleFormat ) )
   {
     KVZ_LOG_ERROR( m_rCategory, "Audio sample format '%1%' is not supported for uncompressed audio.",
       KVZ::NameOrUnspecified( i_rHeader.m_rAudio.m_SampleFormat ) );

@@ -32,7 +32,6 @@ struct VFrame
 class VWriterBase : public KVZ::IVideoWriter
 {
 public:
-  const KVZ::IVideoWriterCapabilities& GetCapabilities() const final { return m_rCapabilities; }
   bool Open( const std::string& i_rPath ) final;
   bool WriteHeader( const KVZ::VideoFrameInfo& i_rVideoInfo, const KVZ::AudioFrameInfo& i_rAudioInfo, const KVZ::VTimingRecord& i_rTiming,
     const KVZ::ITimecode& i_rTimecode, const KVZ::VColourRecord& i_rColour, const KVZ::IVideoAttributes& i_rAttributes,
@@ -43,8 +42,8 @@ public:
   bool Close() final;
 
 protected:
-  // The category is named after the container's namespace. The capabilities may be a member that is made after this.
-  VWriterBase( const char* i_pCategory, const KVZ::IVideoWriterCapabilities& i_rCapabilities );
+  // The category is named after the container's namespace.
+  explicit VWriterBase( const char* i_pCategory ) : m_rCategory( KVZ::LogCategory( i_pCategory ) ) {}
 
   const KVZ::VLogCategory& Category() const { return m_rCategory; }
   bool IsHeaded() const { return m_State == EState::Headed; }
@@ -69,7 +68,6 @@ private:
   bool Guarded( const char* i_pName, TOperation i_Operation ) const;
 
   const KVZ::VLogCategory& m_rCategory;
-  const KVZ::IVideoWriterCapabilities& m_rCapabilities;
   EState m_State = EState::New;
 };
 
