@@ -1,6 +1,7 @@
 #include "Core/VideoInterface/VideoAttributes.h"
 
 #include <bit>
+#include <limits>
 
 namespace KVZ
 {
@@ -83,8 +84,8 @@ bool WriteValue( IOutputStream& o_rStream, const T& i_rValue )
 template<>
 bool WriteValue( IOutputStream& o_rStream, const std::string& i_rValue )
 {
-  const uint32_t Length = static_cast<uint32_t>( i_rValue.size() );
-  return WriteValue( o_rStream, Length ) && o_rStream.Write( i_rValue.data(), Length );
+  const auto Length = static_cast<uint32_t>( i_rValue.size() );
+  return i_rValue.size() <= std::numeric_limits<uint32_t>::max() && WriteValue( o_rStream, Length ) && o_rStream.Write( i_rValue.data(), Length );
 }
 
 }

@@ -26,7 +26,8 @@ public:
     // The number that stands before the value on disk: 0 bool, 1 int8, 2 int16, 3 int32, 4 int64, 5 to 8 the unsigned forms, 9 float,
     // 10 double, 11 string.
     virtual uint32_t GetTypeTag() const = 0;
-    // The tag as four bytes, then the value, little-endian; a string is its length as uint32 and its bytes. False as soon as a write fails.
+    // The tag as four bytes, then the value, little-endian; a string is its length as uint32 and its bytes. False as soon as a write
+    // fails, and for a string of 4 GiB or more.
     virtual bool Write( IOutputStream& o_rStream ) const = 0;
     virtual ~IValue() = default;
   };

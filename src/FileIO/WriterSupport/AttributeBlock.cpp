@@ -55,12 +55,18 @@ private:
     throw std::runtime_error( m_Entry == 0 ? i_rReason : ( boost::format( "entry %1%: %2%" ) % m_Entry % i_rReason ).str() );
   }
 
-  void TakeBytes( void* o_pData, uint64_t i_Size )
+  // Before anything is allocated or read.
+  void RequireRoom( uint64_t i_Size ) const
   {
     if( i_Size > m_Left )
     {
       Fail( m_bLimited ? "it is longer than any attribute block can be" : "it runs past the end of the file" );
     }
+  }
+
+  void TakeBytes( void* o_pData, uint64_t i_Size )
+  {
+    RequireRoom( i_Size );
     if( !m_rStream.Read( o_pData, i_Size ) )
     {
       Fail( "it could not be read" );
@@ -79,10 +85,7 @@ private:
   std::string TakeText()
   {
     const auto Length = Take<uint32_t>();
-    if( Length > m_Left )
-    {
-      Fail( "it runs past the end of the file" );
-    }
+    RequireRoom( Length );
     std::string Text( Length, '\0' );
     TakeBytes( Text.data(), Length );
     return Text;

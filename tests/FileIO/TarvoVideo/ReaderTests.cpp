@@ -143,6 +143,13 @@ TEST( TarvoReader, LengthsFromTheFileAreCheckedBeforeUse )
   const VBytes Huge = VBuilder().U32( 0xFFFFFFF0 ).m_Bytes;
   EXPECT_EQ( Damage( false, 48, Huge ), "The internal attribute block at 48 is damaged: entry 14: the keys are not in ascending order." );
   EXPECT_EQ( Damage( false, 52, Huge ), "The internal attribute block at 48 is damaged: entry 1: it runs past the end of the file." );
+  // In a file that is said to be long enough for the length, the block's own limit holds.
+  VBytes Long = MakeFile( false );
+  std::copy( Huge.begin(), Huge.end(), Long.begin() + 52 );
+  VReader Reader;
+  EXPECT_FALSE( Reader.Open( std::make_unique<ISimpleInputStreamAdapter>( Long ), uint64_t{ 1 } << 40 ) );
+  EXPECT_EQ( Reader.GetError(), "The internal attribute block at 48 is damaged: entry 1: it is longer than any attribute block can be." );
+
   const VBytes Whole = MakeFile( true );
   const size_t IndexPosition = Whole.size() - 5 * 16 - 8;
   EXPECT_EQ( Damage( true, IndexPosition, VBuilder().U64( 0x1000000000000005 ).m_Bytes ),
