@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <new>
 
 namespace KVZ
 {
@@ -35,7 +36,9 @@ bool ISimpleStreamAdapter::ReadBlock( void* o_pData, size_t i_Size, size_t& o_rR
   return m_bGood;
 }
 
+// A memory that is full is a failure like that of a full disk.
 bool ISimpleStreamAdapter::Write( const void* i_pData, size_t i_Size )
+try
 {
   if( !m_bGood || i_Size == 0 )
   {
@@ -54,6 +57,11 @@ bool ISimpleStreamAdapter::Write( const void* i_pData, size_t i_Size )
   std::memcpy( m_rBytes.data() + m_Position, i_pData, i_Size );
   m_Position = End;
   return true;
+}
+catch( const std::bad_alloc& )
+{
+  m_bGood = false;
+  return false;
 }
 
 bool ISimpleStreamAdapter::Tell( uint64_t& o_rPosition )

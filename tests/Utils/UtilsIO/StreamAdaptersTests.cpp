@@ -1,3 +1,4 @@
+#include "StageCoreRuntime/SanitizerBuild.h"
 #include "Utils/UtilsIO/StreamAdapters.h"
 
 #include <gtest/gtest.h>
@@ -21,6 +22,13 @@ TEST( StreamAdapters, MemoryBehavesLikeAFile )
   EXPECT_TRUE( Stream.Seek( 5 ) && Stream.Read( Read, 2 ) );
   EXPECT_EQ( Read[1], 7 );
   EXPECT_FALSE( Stream.Seek( ~uint64_t{ 0 } ) );
+  // A sanitizer ends the process at an allocation of this size.
+  if constexpr( !DebugServices::IsSanitizerBuild )
+  {
+    EXPECT_TRUE( Stream.Seek( Bytes.max_size() - 1 ) );
+    EXPECT_FALSE( Stream.Write( Written, 1 ) || Stream.IsGood() );
+    EXPECT_EQ( Bytes.size(), 7u );
+  }
 }
 
 TEST( StreamAdapters, ReadingMemoryEndsAtItsEnd )
