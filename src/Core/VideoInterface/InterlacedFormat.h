@@ -1,4 +1,4 @@
-// How the lines of a frame lie in time. Values are stored in files.
+// How the lines of a frame lie in time. Names are stored in files.
 #pragma once
 
 #include <cstdint>

@@ -1,6 +1,6 @@
 // The timecode record and its arithmetic (SMPTE ST 12-1 labels, drop-frame included) in ticks of 1/135000000 s.
 //
-// Plain value, copied freely. No function here allocates or throws; any thread may call.
+// Plain value, copied freely. Any thread may call these functions; the arithmetic neither allocates nor throws.
 #pragma once
 
 #include <cstdint>

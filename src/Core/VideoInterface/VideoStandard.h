@@ -1,7 +1,7 @@
 // The video standards that a capture device can report. Values are stored in settings and files and never change.
 //
 // The name carries width, height, scan and rate: an interlaced name gives fields a second, the others frames a second.
-// Any thread may call these functions; none allocates or throws.
+// Any thread may call these functions. The look-ups neither allocate nor throw; only a name, and a line in the log, takes memory.
 #pragma once
 
 #include "Core/VideoInterface/InterlacedFormat.h"

@@ -14,7 +14,7 @@
 namespace VideoEncoding
 {
 
-// Which converter an encoder asks for. Values are the constructor argument of the writers.
+// Which converter an encoder is made with. A writer that makes its own encoder takes the software one.
 enum class EConverter : int32_t
 {
   OpenGLFirst = 1,
@@ -30,7 +30,6 @@ struct VBurnInSettings
   uint32_t m_SizeIndex = 2;   // one of the five fonts
 };
 
-// Compresses one image into o_rOutput. The scratch vector is there to be reused from frame to frame. False if it could not.
 struct VCompressionInput
 {
   const KVZ::VideoFrameInfo& m_rInfo;
@@ -38,6 +37,7 @@ struct VCompressionInput
   size_t m_Size;
   int m_JPEGQuality;   // 1 to 100
 };
+// Compresses one image into o_rOutput, using the scratch vector for what it needs in between. False if it could not.
 using VCompressor = std::function<bool( const VCompressionInput&, std::vector<uint8_t>& o_rOutput, std::vector<uint8_t>& io_rScratch )>;
 
 using VConverterMaker = std::function<std::shared_ptr<KVZ::IPixelFormatConverter>()>;
