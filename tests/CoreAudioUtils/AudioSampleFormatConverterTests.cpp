@@ -1,5 +1,5 @@
 #include "CoreAudioUtils/AudioSampleFormatConverter.h"
-#include "StageCoreRuntime/DebugServices.h"
+#include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -175,12 +175,9 @@ TEST( AudioSampleFormatConverter, TheTwoDirectionsOfFloatDiffer )
 
 TEST( AudioSampleFormatConverter, AHalfSampleFrameIsAnAssertion )
 {
-  std::vector<std::string> Failed;
-  const auto Before = DebugServices::SetAssertFailHandler(
-    [&]( const char* i_pExpression, const char*, int ) { Failed.push_back( i_pExpression ); } );
+  const TestSupport::VAssertionCapture Assertions;
   const VBytes Source( 6 );
   VBytes Target( 12 );
   EXPECT_TRUE( ConvertSamples( { IAudioSampleFormat::EInt16, 48000, 2 }, IAudioSampleFormat::EInt32, Source.data(), Source.size(), Target.data() ) );
-  DebugServices::SetAssertFailHandler( Before );
-  EXPECT_EQ( Failed, std::vector<std::string>{ "i_SourceSize % Stride == 0" } );
+  EXPECT_EQ( Assertions.Expressions(), std::vector<std::string>{ "i_SourceSize % Stride == 0" } );
 }

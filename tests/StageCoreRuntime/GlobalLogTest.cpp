@@ -1,9 +1,9 @@
 #include "StageCoreRuntime/GlobalLog.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
-#include <boost/filesystem/operations.hpp>
 #include <boost/thread/thread.hpp>
 
 #include <fstream>
@@ -100,26 +100,21 @@ TEST( Log, CarriesCategoryLevelAndPosition )
 class LogFile : public testing::Test
 {
 protected:
-  LogFile() { boost::filesystem::create_directories( m_Folder ); }
-  ~LogFile() override
-  {
-    KVZ::ConfigureLog( {} );
-    boost::filesystem::remove_all( m_Folder );
-  }
+  ~LogFile() override { KVZ::ConfigureLog( {} ); }
 
   std::string Content() const
   {
-    std::ifstream File( ( m_Folder / "host.log" ).string() );
+    std::ifstream File( m_Folder.File( "host.log" ) );
     return std::string( std::istreambuf_iterator<char>( File ), {} );
   }
 
-  const boost::filesystem::path m_Folder = boost::filesystem::temp_directory_path() / boost::filesystem::unique_path();
+  const TestSupport::VTemporaryFolder m_Folder;
 };
 
 TEST_F( LogFile, HoldsWhatItsLevelsAllow )
 {
   ASSERT_TRUE( KVZ::ConfigureLog( { .m_ConsoleLevel = 0,
-    .m_FilePath = ( m_Folder / "host.log" ).string(),
+    .m_FilePath = m_Folder.File( "host.log" ),
     .m_FileLevel = 3,
     .m_CategoryLevels = { { "GlobalLogTest.Detailed", 6 }, { "GlobalLogTest.Silent", 0 } } } ) );
   testing::internal::CaptureStderr();
@@ -140,9 +135,9 @@ TEST_F( LogFile, HoldsWhatItsLevelsAllow )
 TEST_F( LogFile, ThatCannotBeOpenedIsReportedAndTheConsoleGoesOn )
 {
   const VLogCapture Capture( "GlobalLog" );
-  std::ofstream( ( m_Folder / "occupied" ).string() ) << "a file, not a folder";
+  std::ofstream( m_Folder.File( "occupied" ) ) << "a file, not a folder";
   testing::internal::CaptureStderr();
-  EXPECT_FALSE( KVZ::ConfigureLog( { .m_FilePath = ( m_Folder / "occupied" / "host.log" ).string() } ) );
+  EXPECT_FALSE( KVZ::ConfigureLog( { .m_FilePath = m_Folder.File( "occupied/host.log" ) } ) );
   KVZ_LOG( "GlobalLogTest.Plain", 2, "still here" );
   EXPECT_NE( testing::internal::GetCapturedStderr().find( "still here" ), std::string::npos );
   EXPECT_EQ( Capture.Texts().size(), 1u );

@@ -1,5 +1,5 @@
 #include "StageCoreRuntime/Variant.h"
-#include "StageCoreRuntime/DebugServices.h"
+#include "tests/support/AssertionCapture.h"
 
 #include <gtest/gtest.h>
 
@@ -108,13 +108,11 @@ TEST( Schema, IsUniqueAcrossThreads )
 TEST( Schema, KeepsTheFirstContentOfANameAndAssertsOnAnother )
 {
   const ISchema* pFirst = KVZ::IO::GetUniqueSchema( "VariantTest.Twice", "", std::vector<ISchema::VEntry>{ { 1, "One", "" } } );
-  int Assertions = 0;
-  const auto Former = DebugServices::SetAssertFailHandler( [&Assertions]( const char*, const char*, int ) { ++Assertions; } );
+  const TestSupport::VAssertionCapture Assertions;
   EXPECT_EQ( KVZ::IO::GetUniqueSchema( "VariantTest.Twice", "", std::vector<ISchema::VEntry>{ { 1, "One", "" } } ), pFirst );
-  EXPECT_EQ( Assertions, 0 );
+  EXPECT_EQ( Assertions.Expressions().size(), 0u );
   EXPECT_EQ( KVZ::IO::GetUniqueSchema( "VariantTest.Twice", "", std::vector<ISchema::VEntry>{ { 2, "One", "" } } ), pFirst );
-  EXPECT_EQ( Assertions, 1 );
-  DebugServices::SetAssertFailHandler( Former );
+  EXPECT_EQ( Assertions.Expressions().size(), 1u );
   EXPECT_EQ( pFirst->ValueFromName( "One" ), 1 );
 }
 
