@@ -24,9 +24,7 @@ struct VCaptureBufferAllocator::VBlock
   uintptr_t m_pEnd;
   std::atomic<void*> m_pLastAllocated{ nullptr };
   std::atomic<void*> m_pLastLinked{ nullptr };
-  VBlock* m_pNextBlock = nullptr;   // under the allocator's mutex, like the next two
-  VBlock* m_pPreviousBlock = nullptr;
-  bool m_bParked = false;   // empty, kept by a pin
+  VBlock* m_pNextBlock = nullptr;   // in the list of parked blocks
 
   VBlock( uintptr_t i_pNextFree, uintptr_t i_pEnd ) : m_pNextFree( i_pNextFree ), m_pEnd( i_pEnd ) {}
 };
@@ -53,7 +51,7 @@ VCaptureBufferAllocator::~VCaptureBufferAllocator()
 {
   if( VBlock* pCurrent = m_pCurrent.load() ) DropCurrentReference( pCurrent );
   ReleaseIfUnpinned();
-  KVZ_ASSERT( m_pFirstBlock == nullptr );
+  KVZ_ASSERT( m_HeldBlocks == 0 );
 }
 
 VCaptureBufferAllocator::VHeader& VCaptureBufferAllocator::HeaderOf( void* i_pMemory ) { return *( static_cast<VHeader*>( i_pMemory ) - 1 ); }
@@ -119,9 +117,7 @@ VCaptureBufferAllocator::VBlock* VCaptureBufferAllocator::MakeBlock()
   const auto pStart = reinterpret_cast<uintptr_t>( pMemory );
   auto* pBlock = new( pMemory ) VBlock( pStart + BlockHeaderBytes, pStart + m_BlockPayload );
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  pBlock->m_pPreviousBlock = m_pLastBlock;
-  ( m_pLastBlock ? m_pLastBlock->m_pNextBlock : m_pFirstBlock ) = pBlock;
-  m_pLastBlock = pBlock;
+  ++m_HeldBlocks;
   return pBlock;
 }
 
@@ -150,31 +146,37 @@ void VCaptureBufferAllocator::FreeOwned( void* i_pMemory )
 void VCaptureBufferAllocator::OnEmpty( VBlock* i_pBlock )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  if( i_pBlock->m_Pins.load( std::memory_order_acquire ) != 0 ) i_pBlock->m_bParked = true;
-  else GiveBackLocked( i_pBlock );
+  if( i_pBlock->m_Pins.load( std::memory_order_acquire ) == 0 )
+  {
+    GiveBackLocked( i_pBlock );
+    return;
+  }
+  i_pBlock->m_pNextBlock = m_pParked;
+  m_pParked = i_pBlock;
 }
 
 bool VCaptureBufferAllocator::ReleaseIfUnpinned()
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   bool bReleased = false;
-  for( VBlock* pBlock = m_pFirstBlock; pBlock; )
+  for( VBlock** ppBlock = &m_pParked; *ppBlock; )
   {
-    VBlock* pNext = pBlock->m_pNextBlock;
-    if( pBlock->m_bParked && pBlock->m_Pins.load( std::memory_order_acquire ) == 0 )
+    VBlock* pBlock = *ppBlock;
+    if( pBlock->m_Pins.load( std::memory_order_acquire ) != 0 )
     {
-      GiveBackLocked( pBlock );
-      bReleased = true;
+      ppBlock = &pBlock->m_pNextBlock;
+      continue;
     }
-    pBlock = pNext;
+    *ppBlock = pBlock->m_pNextBlock;
+    GiveBackLocked( pBlock );
+    bReleased = true;
   }
   return bReleased;
 }
 
 void VCaptureBufferAllocator::GiveBackLocked( VBlock* i_pBlock )
 {
-  ( i_pBlock->m_pPreviousBlock ? i_pBlock->m_pPreviousBlock->m_pNextBlock : m_pFirstBlock ) = i_pBlock->m_pNextBlock;
-  ( i_pBlock->m_pNextBlock ? i_pBlock->m_pNextBlock->m_pPreviousBlock : m_pLastBlock ) = i_pBlock->m_pPreviousBlock;
+  --m_HeldBlocks;
   i_pBlock->~VBlock();
   m_pClient->Free( i_pBlock );
   m_ReleasedBlocks.fetch_add( 1, std::memory_order_relaxed );

@@ -85,8 +85,8 @@ private:
   std::atomic<uint64_t> m_ReleasedBlocks{ 0 };
 
   boost::mutex m_Mutex;
-  VBlock* m_pFirstBlock GUARDED_BY( m_Mutex ) = nullptr;   // list of blocks in order of allocation
-  VBlock* m_pLastBlock GUARDED_BY( m_Mutex ) = nullptr;
+  size_t m_HeldBlocks GUARDED_BY( m_Mutex ) = 0;
+  VBlock* m_pParked GUARDED_BY( m_Mutex ) = nullptr;   // empty blocks, kept by a pin
 };
 
 }

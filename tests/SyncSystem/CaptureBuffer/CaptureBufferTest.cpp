@@ -531,6 +531,40 @@ TEST( CaptureBufferTiny, RunningSessionSurvivesWithoutFrames )
   EXPECT_EQ( pBuffer->GetCurrentBufferSession().Value(), 1u );
 }
 
+// All that there was has been evicted, and a pin keeps its memory from the next frame.
+TEST( CaptureBufferTiny, SessionWithoutFramesAsTheStartOfACapture )
+{
+  TestSupport::VFrameMemory Memory( 1, 1 );
+  const auto pBuffer = VCaptureBuffer::Make<TestSupport::VNumberedCaptureBuffer>( TestSupport::VNumberedCaptureBuffer::Settings( Memory ) );
+  VToken Evicted = pBuffer->Add();
+  VRefCountedToken Pinned;
+  VToken Token;
+  const auto Empty = [&]
+  {
+    pBuffer->Read( Evicted, Pinned );
+    EXPECT_FALSE( pBuffer->Add().IsValid() );
+    EXPECT_FALSE( pBuffer->GetNewestToken( Token ) );
+    Pinned.Clear();
+  };
+  Empty();
+  VCaptureRequest Request;
+  Request.m_Id = VCaptureSessionId( 1 );
+  Request.m_Start = Evicted;
+  ASSERT_TRUE( pBuffer->StartCapture( Request ) );
+  VCaptureSessionStatus Status;
+  pBuffer->Status( Status );
+  EXPECT_EQ( Status.m_State, ECaptureState::WaitingForStart );   // clipped to the frame that comes next
+  Evicted = pBuffer->Add();
+  pBuffer->Status( Status );
+  EXPECT_EQ( Status.m_State, ECaptureState::Capturing );
+  EXPECT_EQ( Status.m_Start.m_FrameNumber, 2 );
+  Empty();
+  std::vector<uint32_t> Removed;
+  pBuffer->BufferSessionRemovedCallback().AddImmediate( [&Removed]( KVZ::VBufferSessionId i_Id ) { Removed.push_back( i_Id.Value() ); } );
+  pBuffer->StartNewBufferSession();
+  EXPECT_EQ( Removed, std::vector<uint32_t>{ 1 } );
+}
+
 TEST_F( CaptureBuffer, DrainLimitHoldsBackWhoIsAhead )
 {
   m_pBuffer->SetDataDrainLimit( 2 );

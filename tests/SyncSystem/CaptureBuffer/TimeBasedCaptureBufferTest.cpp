@@ -169,17 +169,20 @@ TEST_F( TimeBasedCaptureBuffer, PeriodBeatAndCounterClock )
   EXPECT_EQ( BufferSession(), 1u );
   EXPECT_TRUE( Logged( "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 0:0 -> 5400000:1)" ) );
   EXPECT_EQ( Record( 2 ).m_ContinuousSince.at( Timecode ), 1u );
+  m_Timing.m_BeatOffset = VTick( 2 );
+  Add();
+  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 5400000:1 -> 5400000:2)" ) );
   m_Timing.m_Period = VTick( 2700000 );
   Add();
-  EXPECT_EQ( m_Id, 3u );
+  EXPECT_EQ( m_Id, 4u );
   EXPECT_EQ( BufferSession(), 2u );
   EXPECT_TRUE( Logged( "Test Buffer: New Buffer Session due to period changing from 5400000 to 2700000" ) );
   m_Timing.m_CounterClock = OtherCounter;
   Add();
-  EXPECT_EQ( m_Id, 4u );
+  EXPECT_EQ( m_Id, 5u );
   EXPECT_EQ( BufferSession(), 3u );
   EXPECT_TRUE( Logged( "Buffer Test: New Buffer Session due change in counter clock type" ) );
-  EXPECT_TRUE( Record( 4 ).m_StartTime.Find( OtherCounter ) == VTick( 0 ) && !Record( 4 ).m_StartTime.Find( Counter ).IsValid() );
+  EXPECT_TRUE( Record( 5 ).m_StartTime.Find( OtherCounter ) == VTick( 0 ) && !Record( 5 ).m_StartTime.Find( Counter ).IsValid() );
 }
 
 TEST_F( TimeBasedCaptureBuffer, SessionsFromOutside )
