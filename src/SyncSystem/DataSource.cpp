@@ -40,14 +40,14 @@ std::shared_ptr<VTimeBasedCaptureBuffer> MakeBuffer( const VDataSourceSettings& 
 
 }
 
-VDataSource::VDataSource( VDataSourceSettings i_Settings )
-  : m_Name( i_Settings.m_Name ),
-    m_rLog( KVZ::LogCategory( "Hal." + i_Settings.m_Name ) ),
+VDataSource::VDataSource( const VDataSourceSettings& i_rSettings )
+  : m_Name( i_rSettings.m_Name ),
+    m_rLog( KVZ::LogCategory( "Hal." + i_rSettings.m_Name ) ),
     m_SourceId( MakeSourceId() ),
-    m_NoticeSeconds( i_Settings.m_NoticeSeconds ),
+    m_NoticeSeconds( i_rSettings.m_NoticeSeconds ),
     m_CounterClock( KVZ::IClock::CounterFromSessionStart, 0, m_SourceId ),
-    m_pStrand( MakeStrand( i_Settings.m_pPostalService ) ),
-    m_pBuffer( MakeBuffer( i_Settings, m_pStrand ) ),
+    m_pStrand( MakeStrand( i_rSettings.m_pPostalService ) ),
+    m_pBuffer( MakeBuffer( i_rSettings, m_pStrand ) ),
     m_pDrift( std::make_shared<VTimingMonitor>( Drift::VDriftMonitorConfiguration(), Drift::VDriftMonitorFilteredConfiguration() ) ),
     m_Reader( m_pBuffer, m_rLog ),
     m_OnRequestNewGlobal( m_pStrand ),

@@ -106,7 +106,7 @@ public:
   const std::shared_ptr<VTimeBasedCaptureBuffer>& Buffer() const { return m_pBuffer; }
 
 protected:
-  explicit VDataSource( VDataSourceSettings i_Settings );
+  explicit VDataSource( const VDataSourceSettings& i_rSettings );
 
   // Stores a frame and tells everybody. i_FillPayload writes the entry's payload, of this size; false refuses the frame. False: not stored,
   // and the memory stays the caller's. Delivery thread only.
@@ -123,15 +123,15 @@ protected:
   // Hooks. On the strand, without a lock.
   //
   // False opts out of the session.
-  virtual bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, std::shared_ptr<KVZ::IBaseLineClock>, VTriggerPlan& ) { return true; }
+  virtual bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, const std::shared_ptr<KVZ::IBaseLineClock>&, VTriggerPlan& ) { return true; }
   // True while a triggered source waits for its frames to stop.
   virtual bool OnGlobalSyncSessionDeclared() { return false; }
   virtual std::vector<std::string> TriggerSignalsChanged( const std::map<std::string, KVZ::ITriggerSignal>& ) { return {}; }
-  virtual void OnGlobalSyncSessionStarted( std::shared_ptr<const VGlobalSyncSessionInfo> ) {}
+  virtual void OnGlobalSyncSessionStarted( const std::shared_ptr<const VGlobalSyncSessionInfo>& ) {}
   virtual void OnArmGlobalSyncSession() {}
   virtual void OnGlobalSyncSessionHook() {}
   // Makes a capture ready, once for each capture that is not a reservation. Errors go to the capture's status; false fails it.
-  virtual bool BeginCapture( const KVZ::ICaptureHeader&, std::shared_ptr<const VGlobalSyncSessionInfo>, uint32_t /*options*/,
+  virtual bool BeginCapture( const KVZ::ICaptureHeader&, const std::shared_ptr<const VGlobalSyncSessionInfo>&, uint32_t /*options*/,
     std::vector<VCaptureError>& )
   {
     return true;

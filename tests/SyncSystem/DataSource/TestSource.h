@@ -21,7 +21,7 @@ constexpr int32_t Timecode25Index = 3;
 class VTestSource : public SyncSystem::VDataSource
 {
 public:
-  explicit VTestSource( SyncSystem::VDataSourceSettings i_Settings ) : VDataSource( std::move( i_Settings ) ) {}
+  explicit VTestSource( const SyncSystem::VDataSourceSettings& i_rSettings ) : VDataSource( i_rSettings ) {}
 
   // Delivers the frame of the next index. Its payload holds the index.
   bool Add()
@@ -72,7 +72,7 @@ public:
   SyncSystem::VTriggerPlan m_Plan;
 
 protected:
-  bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>, uint32_t,
+  bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>&, uint32_t,
     std::vector<SyncSystem::VCaptureError>& o_rErrors ) override
   {
     m_Begun.push_back( i_rHeader.m_CaptureSessionId.Value() );
@@ -85,7 +85,8 @@ protected:
   }
   void OnCaptureCancelled( KVZ::VCaptureSessionId i_Id ) override { m_CancelledCaptures.push_back( i_Id.Value() ); }
   void OnBusyChanged( bool i_bBusy ) override { m_Busy.push_back( i_bBusy ); }
-  bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, std::shared_ptr<KVZ::IBaseLineClock>, SyncSystem::VTriggerPlan& o_rPlan ) override
+  bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, const std::shared_ptr<KVZ::IBaseLineClock>&,
+    SyncSystem::VTriggerPlan& o_rPlan ) override
   {
     o_rPlan = m_Plan;
     return true;

@@ -22,7 +22,7 @@ namespace
 
 std::shared_ptr<VideoEncoding::VVideoFrameEncoder> MakeEncoder( const VVideoEncoderSettings& i_rSettings )
 {
-  const auto pEncoder = std::make_shared<VideoEncoding::VVideoFrameEncoder>( i_rSettings.m_Converter );
+  auto pEncoder = std::make_shared<VideoEncoding::VVideoFrameEncoder>( i_rSettings.m_Converter );
   pEncoder->SetJPEGQuality( i_rSettings.m_JPEGQuality );
   pEncoder->SetBurnIn( i_rSettings.m_BurnIn );
   return pEncoder;

@@ -25,9 +25,15 @@ namespace
 constexpr uint64_t MaxLiveFrames = 10;
 
 // What an entry of the buffer holds of a frame.
-using VPayload = VVideoInputDataSourceFrame*;
+struct VPayload
+{
+  VVideoInputDataSourceFrame* m_pFrame;
+};
 
-VVideoInputDataSourceFrame* PayloadOf( SyncSystem::VFrameEntry* i_pEntry ) { return *static_cast<VPayload*>( SyncSystem::Payload( i_pEntry ) ); }
+VVideoInputDataSourceFrame* PayloadOf( SyncSystem::VFrameEntry* i_pEntry )
+{
+  return static_cast<VPayload*>( SyncSystem::Payload( i_pEntry ) )->m_pFrame;
+}
 
 // The source's settings; also gives the options a service, so that both have the same.
 SyncSystem::VDataSourceSettings MakeSettings( const IVideoInputDevice& i_rDevice, const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator,
@@ -54,8 +60,8 @@ SyncSystem::VDataSourceSettings MakeSettings( const IVideoInputDevice& i_rDevice
 }
 
 VVideoInputDataSource::VVideoInputDataSource( std::shared_ptr<VVideoInputDeviceManager> i_pManager, std::shared_ptr<IVideoInputDevice> i_pDevice,
-  std::shared_ptr<VVideoInputDataSourceAllocator> i_pAllocator, std::shared_ptr<IServiceObject> i_pFirstService,
-  std::shared_ptr<IServiceObject> i_pSecondService, std::shared_ptr<ICaptureTargets> i_pCaptureTargets, std::shared_ptr<ITimeService> i_pTime,
+  const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator, const std::shared_ptr<IServiceObject>& i_pFirstService,
+  const std::shared_ptr<IServiceObject>& i_pSecondService, std::shared_ptr<ICaptureTargets> i_pCaptureTargets, std::shared_ptr<ITimeService> i_pTime,
   VVideoInputDataSourceOptions i_Options )
   : VDataSource( MakeSettings( *i_pDevice, i_pAllocator, i_Options ) ),
     m_Options( std::move( i_Options ) ),
@@ -113,7 +119,7 @@ bool VVideoInputDataSource::OnVideoInputData( uint32_t i_FrameIndex, VVideoInput
     AddFrame( Frame, sizeof( VPayload ),
       [i_pFrame]( void* o_pPayload )
       {
-        *static_cast<VPayload*>( o_pPayload ) = i_pFrame;
+        static_cast<VPayload*>( o_pPayload )->m_pFrame = i_pFrame;
         return true;
       } );
 }
@@ -155,11 +161,11 @@ SyncSystem::EReadResult::Enum VVideoInputDataSource::GetFrames( uint64_t i_WakeT
 
 const VVideoInputDataSourceFrame* VVideoInputDataSource::FrameOf( const SyncSystem::VFrameEntry* i_pEntry )
 {
-  return *static_cast<const VPayload*>( SyncSystem::Payload( i_pEntry ) );
+  return static_cast<const VPayload*>( SyncSystem::Payload( i_pEntry ) )->m_pFrame;
 }
 
-bool VVideoInputDataSource::BeginCapture( const KVZ::ICaptureHeader& i_rHeader, std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo> i_pInfo,
-  uint32_t, std::vector<SyncSystem::VCaptureError>& io_rErrors )
+bool VVideoInputDataSource::BeginCapture( const KVZ::ICaptureHeader& i_rHeader,
+  const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>& i_pInfo, uint32_t, std::vector<SyncSystem::VCaptureError>& io_rErrors )
 {
   StopClient();
   const std::string URN = m_pDevice->GetDeviceURN();
@@ -186,18 +192,18 @@ bool VVideoInputDataSource::BeginCapture( const KVZ::ICaptureHeader& i_rHeader, 
   }
   if( !Targets.empty() )
   {
-    StartClient( i_rHeader, std::move( i_pInfo ), Targets );
+    StartClient( i_rHeader, i_pInfo, Targets );
   }
   return true;
 }
 
-void VVideoInputDataSource::StartClient( const KVZ::ICaptureHeader& i_rHeader, std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo> i_pInfo,
-  const std::vector<VCaptureTarget>& i_rTargets )
+void VVideoInputDataSource::StartClient( const KVZ::ICaptureHeader& i_rHeader,
+  const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>& i_pInfo, const std::vector<VCaptureTarget>& i_rTargets )
 {
   VVideoInputBufferClient::VSettings Settings;
   Settings.m_pBuffer = Buffer();
   Settings.m_Header = i_rHeader;
-  Settings.m_pSession = std::move( i_pInfo );
+  Settings.m_pSession = i_pInfo;
   Settings.m_pCaptureTargets = m_pCaptureTargets;
   Settings.m_pWriterFactory = m_Options.m_pWriterFactory;
   Settings.m_Encoder = m_Options.m_Encoder;

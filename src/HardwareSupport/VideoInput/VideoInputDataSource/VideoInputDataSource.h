@@ -54,8 +54,9 @@ class VVideoInputDataSource : public SyncSystem::VDataSource, public IVideoInput
 {
 public:
   VVideoInputDataSource( std::shared_ptr<VVideoInputDeviceManager> i_pManager, std::shared_ptr<IVideoInputDevice> i_pDevice,
-    std::shared_ptr<VVideoInputDataSourceAllocator> i_pAllocator, std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pFirstService,
-    std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pSecondService,
+    const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator,
+    const std::shared_ptr<StageCorePluginInterface::IServiceObject>& i_pFirstService,
+    const std::shared_ptr<StageCorePluginInterface::IServiceObject>& i_pSecondService,
     std::shared_ptr<StageCorePluginInterface::ICaptureTargets> i_pCaptureTargets, std::shared_ptr<StageCorePluginInterface::ITimeService> i_pTime,
     VVideoInputDataSourceOptions i_Options );
   ~VVideoInputDataSource() override;
@@ -88,8 +89,8 @@ protected:
   // Says what the frame's clocks read; the period is known. False refuses the frame. Delivery thread.
   virtual bool ReadClocks( const VDelivered& i_rDelivered, SyncSystem::VIncomingFrame& io_rFrame );
 
-  bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo> i_pInfo, uint32_t i_Options,
-    std::vector<SyncSystem::VCaptureError>& io_rErrors ) override;
+  bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>& i_pInfo,
+    uint32_t i_Options, std::vector<SyncSystem::VCaptureError>& io_rErrors ) override;
   bool IsCaptureDraining() override;
 
   const VVideoInputDataSourceOptions& Options() const { return m_Options; }
@@ -97,7 +98,7 @@ protected:
 private:
   void OnDroppedFrames( unsigned int i_Count );
   void StopClient();
-  void StartClient( const KVZ::ICaptureHeader& i_rHeader, std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo> i_pInfo,
+  void StartClient( const KVZ::ICaptureHeader& i_rHeader, const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>& i_pInfo,
     const std::vector<StageCorePluginInterface::VCaptureTarget>& i_rTargets );
 
   // Fixed after construction

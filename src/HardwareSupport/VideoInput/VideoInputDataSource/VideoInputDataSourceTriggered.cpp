@@ -36,12 +36,12 @@ std::unique_ptr<IDeadlineTimer> MakeTimer( const VVideoInputDataSourceOptions& i
 }
 
 VVideoInputDataSourceTriggered::VVideoInputDataSourceTriggered( std::shared_ptr<VVideoInputDeviceManager> i_pManager,
-  std::shared_ptr<IVideoInputDevice> i_pDevice, std::shared_ptr<VVideoInputDataSourceAllocator> i_pAllocator,
-  std::shared_ptr<IServiceObject> i_pTriggerService, std::shared_ptr<IServiceObject> i_pFirstService,
-  std::shared_ptr<IServiceObject> i_pSecondService, std::shared_ptr<ICaptureTargets> i_pCaptureTargets, std::shared_ptr<ITimeService> i_pTime,
+  std::shared_ptr<IVideoInputDevice> i_pDevice, const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator,
+  std::shared_ptr<IServiceObject> i_pTriggerService, const std::shared_ptr<IServiceObject>& i_pFirstService,
+  const std::shared_ptr<IServiceObject>& i_pSecondService, std::shared_ptr<ICaptureTargets> i_pCaptureTargets, std::shared_ptr<ITimeService> i_pTime,
   VVideoInputDataSourceOptions i_Options )
-  : VVideoInputDataSource( std::move( i_pManager ), std::move( i_pDevice ), std::move( i_pAllocator ), std::move( i_pFirstService ),
-      std::move( i_pSecondService ), std::move( i_pCaptureTargets ), std::move( i_pTime ), std::move( i_Options ) ),
+  : VVideoInputDataSource( std::move( i_pManager ), std::move( i_pDevice ), i_pAllocator, i_pFirstService, i_pSecondService,
+      std::move( i_pCaptureTargets ), std::move( i_pTime ), std::move( i_Options ) ),
     m_pTriggerService( std::move( i_pTriggerService ) ),
     m_pTimer( MakeTimer( Options() ) )
 {
@@ -65,7 +65,7 @@ bool VVideoInputDataSourceTriggered::ReadClocks( const VDelivered&, SyncSystem::
   return m_State == Running;
 }
 
-bool VVideoInputDataSourceTriggered::PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, std::shared_ptr<KVZ::IBaseLineClock>,
+bool VVideoInputDataSourceTriggered::PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, const std::shared_ptr<KVZ::IBaseLineClock>&,
   SyncSystem::VTriggerPlan& o_rPlan )
 {
   o_rPlan.m_Kind = PlanKind;

@@ -23,9 +23,9 @@ public:
   };
 
   VVideoInputDataSourceTriggered( std::shared_ptr<VVideoInputDeviceManager> i_pManager, std::shared_ptr<IVideoInputDevice> i_pDevice,
-    std::shared_ptr<VVideoInputDataSourceAllocator> i_pAllocator, std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pTriggerService,
-    std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pFirstService,
-    std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pSecondService,
+    const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator, std::shared_ptr<StageCorePluginInterface::IServiceObject> i_pTriggerService,
+    const std::shared_ptr<StageCorePluginInterface::IServiceObject>& i_pFirstService,
+    const std::shared_ptr<StageCorePluginInterface::IServiceObject>& i_pSecondService,
     std::shared_ptr<StageCorePluginInterface::ICaptureTargets> i_pCaptureTargets, std::shared_ptr<StageCorePluginInterface::ITimeService> i_pTime,
     VVideoInputDataSourceOptions i_Options );
   ~VVideoInputDataSourceTriggered() override;
@@ -34,7 +34,7 @@ public:
 
 protected:
   bool ReadClocks( const VDelivered& i_rDelivered, SyncSystem::VIncomingFrame& io_rFrame ) override;
-  bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId i_Id, std::shared_ptr<KVZ::IBaseLineClock> i_pClock,
+  bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId i_Id, const std::shared_ptr<KVZ::IBaseLineClock>& i_pClock,
     SyncSystem::VTriggerPlan& o_rPlan ) override;
   bool OnGlobalSyncSessionDeclared() override { return GetState() == Armed; }
   void OnArmGlobalSyncSession() override;

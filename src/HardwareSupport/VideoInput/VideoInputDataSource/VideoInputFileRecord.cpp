@@ -1,5 +1,6 @@
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputFileRecord.h"
 
+#include "Core/VideoInterface/EnumTable.h"
 #include "Core/VideoInterface/VideoAttributes.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
 #include "StageCoreRuntime/GlobalLog.h"
@@ -42,8 +43,6 @@ KVZ::IAudioPayload::Enum AudioPayloadOf( const VCaptureTarget& i_rTarget )
   return static_cast<KVZ::IAudioPayload::Enum>( i_rTarget.m_AudioPayload );
 }
 
-std::string NameOrUnspecified( std::string i_Name ) { return i_Name.empty() ? "Unspecified" : i_Name; }
-
 bool HasVideo( const VVideoInputDataSourceFrame* i_pFrame )
 {
   if( !i_pFrame )
@@ -68,13 +67,13 @@ bool IsSameImage( const KVZ::VideoFrameInfo& i_rA, const KVZ::VideoFrameInfo& i_
 std::string FormatText( const KVZ::VideoFrameInfo& i_rVideo, const KVZ::AudioFrameInfo& i_rAudio )
 {
   std::string Text = std::to_string( i_rVideo.m_ImageWidth ) + " x " + std::to_string( i_rVideo.m_ImageHeight ) + " " +
-    NameOrUnspecified( KVZ::ToName( i_rVideo.m_PixelFormat ) );
+    KVZ::NameOrUnspecified( i_rVideo.m_PixelFormat );
   if( !i_rAudio.HasAudio() )
   {
     return Text + " without audio";
   }
-  return Text + ", " + std::to_string( i_rAudio.m_Channels ) + " channels of " + NameOrUnspecified( KVZ::ToName( i_rAudio.m_SampleFormat ) ) +
-    " at " + std::to_string( i_rAudio.m_SampleRate ) + " Hz";
+  return Text + ", " + std::to_string( i_rAudio.m_Channels ) + " channels of " + KVZ::NameOrUnspecified( i_rAudio.m_SampleFormat ) + " at " +
+    std::to_string( i_rAudio.m_SampleRate ) + " Hz";
 }
 
 KVZ::VConversionRecord RecordingStep( const VCaptureTarget& i_rTarget, KVZ::IPixelFormat::Enum i_Captured )
@@ -82,10 +81,10 @@ KVZ::VConversionRecord RecordingStep( const VCaptureTarget& i_rTarget, KVZ::IPix
   KVZ::IPixelFormat::Enum Stored = i_Captured;
   VideoEncoding::PixelFormatForPayloadFormat( VideoPayloadOf( i_rTarget ), i_Captured, Stored );
   KVZ::VConversionRecord Record;
-  Record.m_Container = NameOrUnspecified( KVZ::ToName( ContainerOf( i_rTarget ) ) );
-  Record.m_AudioPayload = NameOrUnspecified( KVZ::ToName( AudioPayloadOf( i_rTarget ) ) );
-  Record.m_VideoPayload = NameOrUnspecified( KVZ::ToName( VideoPayloadOf( i_rTarget ) ) );
-  Record.m_PixelFormat = NameOrUnspecified( KVZ::ToName( Stored ) );
+  Record.m_Container = KVZ::NameOrUnspecified( ContainerOf( i_rTarget ) );
+  Record.m_AudioPayload = KVZ::NameOrUnspecified( AudioPayloadOf( i_rTarget ) );
+  Record.m_VideoPayload = KVZ::NameOrUnspecified( VideoPayloadOf( i_rTarget ) );
+  Record.m_PixelFormat = KVZ::NameOrUnspecified( Stored );
   return Record;
 }
 
@@ -247,7 +246,7 @@ void VVideoInputBufferClient::VFileRecord::Close()
 bool VVideoInputBufferClient::VFileRecord::FailWriter()
 {
   KVZ_LOG_ERROR( "VideoInputDataSource", "Error writing capture file with container format '%s'.",
-    NameOrUnspecified( KVZ::ToName( ContainerOf( m_Target ) ) ) );
+    KVZ::NameOrUnspecified( ContainerOf( m_Target ) ) );
   return Fail( WriteFailureText() );
 }
 
