@@ -72,7 +72,7 @@ void OnFatalSignal( int i_Signal )
   const long Thread = syscall( SYS_gettid );
   long Expected = 0;
   const bool bFirst = g_ReportingThread.compare_exchange_strong( Expected, Thread );
-  while( !bFirst && Expected != Thread )
+  while( g_ReportingThread.load() != Thread )
   {
     pause();   // another thread reports and ends the process
   }

@@ -78,10 +78,10 @@ public:
     return Found == m_Schemas.end() ? nullptr : &Found->second;
   }
 
-  const ISchema* FindOrAdd( std::string_view i_Name, VContent i_Content )
+  const ISchema* FindOrAdd( std::string_view i_Name, const VContent& i_rContent )
   {
-    const VSchema& rSchema = FindOrAddLocked( i_Name, i_Content );
-    KVZ_ASSERT( rSchema.IsMadeOf( i_Content ) );
+    const VSchema& rSchema = FindOrAddLocked( i_Name, i_rContent );
+    KVZ_ASSERT( rSchema.IsMadeOf( i_rContent ) );
     return &rSchema;
   }
 
