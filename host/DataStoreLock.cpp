@@ -21,6 +21,12 @@ VDataStoreLock::EHeld VDataStoreLock::HeldByThisThread()
   return HeldLocked();
 }
 
+unsigned int VDataStoreLock::WaitingWriters()
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_WaitingWriters;
+}
+
 VDataStoreLock::EHeld VDataStoreLock::AcquireShared()
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );

@@ -35,6 +35,8 @@ public:
   EHeld Release( const std::function<void()>& i_rBeforeLastExclusive );
 
   EHeld HeldByThisThread();
+  // How many threads wait to write at this moment.
+  unsigned int WaitingWriters();
 
 private:
   EHeld HeldLocked() REQUIRES( m_Mutex );

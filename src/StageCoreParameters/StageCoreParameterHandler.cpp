@@ -27,7 +27,7 @@ void VStageCoreParameterHandler::PreDestruct() { m_pParameterRegistry->RemovePar
 
 std::shared_ptr<VParameter> VStageCoreParameterHandler::GetParameter( const std::string& i_rKey ) const
 {
-  const std::shared_ptr<VParameter> pParameter = std::dynamic_pointer_cast<VParameter>( m_pParameterGroup->GetParameter( i_rKey ) );
+  std::shared_ptr<VParameter> pParameter = std::dynamic_pointer_cast<VParameter>( m_pParameterGroup->GetParameter( i_rKey ) );
   KVZ_ASSERT( pParameter );
   return pParameter;
 }

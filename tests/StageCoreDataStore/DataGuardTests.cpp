@@ -63,17 +63,17 @@ TEST_F( GuardedStore, AMovedVerifyWriterAndReadersPassTheirLockOn )
 
 TEST_F( GuardedStore, AMovedFromGuardFindsAndStoresNothing )
 {
-  VDataVerifyWriter Writer( m_Store );
-  EXPECT_TRUE( Writer.SetValue( m_Path, KVZ::Variant::Make( 1 ) ) );
-  const VDataVerifyWriter Owner( std::move( Writer ) );
+  const auto pWriter = std::make_unique<VDataVerifyWriter>( m_Store );
+  EXPECT_TRUE( pWriter->SetValue( m_Path, KVZ::Variant::Make( 1 ) ) );
+  const VDataVerifyWriter Owner( std::move( *pWriter ) );
 
   KVZ::Variant Value;
-  EXPECT_FALSE( Writer.Exists( m_Path ) );
-  EXPECT_FALSE( Writer.GetVerifiedValue( m_Path, Value ) );
-  EXPECT_FALSE( Writer.SetVerifiedValue( m_Path, KVZ::Variant::Make( 2 ) ) );
-  EXPECT_EQ( Writer.GetNode( m_Path ), nullptr );
+  EXPECT_FALSE( pWriter->Exists( m_Path ) );
+  EXPECT_FALSE( pWriter->GetVerifiedValue( m_Path, Value ) );
+  EXPECT_FALSE( pWriter->SetVerifiedValue( m_Path, KVZ::Variant::Make( 2 ) ) );
+  EXPECT_EQ( pWriter->GetNode( m_Path ), nullptr );
   EXPECT_TRUE( m_Assertions.Expressions().empty() );
-  EXPECT_EQ( Writer.GetDataStore(), nullptr );
+  EXPECT_EQ( pWriter->GetDataStore(), nullptr );
   EXPECT_EQ( m_Assertions.Expressions(), std::vector<std::string>{ "m_pDataStore != nullptr" } );
   EXPECT_EQ( Owner.GetDataStore(), &m_Store );
 }

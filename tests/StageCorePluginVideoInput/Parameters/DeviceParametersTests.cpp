@@ -9,7 +9,6 @@ namespace
 {
 
 using KVZ::IPixelFormat;
-using KVZ::ITimecodeSource;
 using KVZ::IVideoStandard;
 using KVZ::Variant;
 using Labels = std::vector<std::string>;

@@ -4,6 +4,7 @@
 #include "Core/VideoInterface/Schemas.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "NotificationSystem/AsioPostalService.h"
+#include "StageCoreDataStore/DataVerifyWriter.h"
 
 #include <thread>
 
@@ -72,6 +73,16 @@ TEST_F( VReactions, EnabledSettlesOnlyAfterTheDeviceHasBeenTold )
   EXPECT_FALSE( VDataReader( *m_pStore ).IsSettled( DeviceSchemas::Enabled( m_Device ) ) );
   m_pService->RunAll();
   EXPECT_EQ( Settled, 1 );
+}
+
+TEST_F( VReactions, AProposalOfEnabledAloneIsAnsweredToo )
+{
+  Create();
+  VDataVerifyWriter( *m_pStore ).SetProposedValue( DeviceSchemas::Enabled( m_Device ), Variant::Make( false ) );
+  EXPECT_TRUE( Value<bool>( "Enabled" ) );
+  m_pService->RunAll();
+  EXPECT_FALSE( Value<bool>( "Enabled" ) );
+  EXPECT_EQ( m_pDevice->m_Stops, 1 );
 }
 
 TEST_F( VReactions, EnabledTellsTheWishAndStatusTheFact )

@@ -23,7 +23,7 @@ protected:
     return m_Lock.Release( [this] { ++m_LastReleases; } );
   }
 
-  // Held on a thread of its own from construction until End.
+  // Takes the lock on a thread of its own, and gives it back at End.
   class VOtherThread
   {
   public:
@@ -32,12 +32,14 @@ protected:
           [this, &i_rTest, i_bExclusive]
           {
             i_bExclusive ? (void)i_rTest.m_Lock.AcquireExclusive() : (void)i_rTest.m_Lock.AcquireShared();
+            m_bTaken = true;
             m_Taken.set_value();
             m_End.get_future().wait();
             i_rTest.Release();
           } )
     {
     }
+    bool HasTaken() const { return m_bTaken; }
     void WaitUntilTaken() { m_Taken.get_future().wait(); }
     void End()
     {
@@ -46,10 +48,21 @@ protected:
     }
 
   private:
+    std::atomic<bool> m_bTaken{ false };
     std::promise<void> m_Taken;
     std::promise<void> m_End;
     std::thread m_Thread;
   };
+
+  // Returns when the writer waits for its turn, or has wrongly got it.
+  void WaitUntilWaiting( const VOtherThread& i_rWriter )
+  {
+    while( m_Lock.WaitingWriters() == 0 && !i_rWriter.HasTaken() )
+    {
+      std::this_thread::yield();
+    }
+    EXPECT_FALSE( i_rWriter.HasTaken() );
+  }
 
   StageHost::VDataStoreLock m_Lock;
   std::atomic<int> m_LastReleases{ 0 };
@@ -84,21 +97,46 @@ TEST_F( DataStoreLock, IsExclusiveUntilTheWritersLastNestedLockEndsInWhateverOrd
   EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::None );
 }
 
-TEST_F( DataStoreLock, ReadersShareAndANestedReaderPassesAWaitingWriter )
+TEST_F( DataStoreLock, ReadersShareAndAWriterWaitsForThemAll )
 {
   m_Lock.AcquireShared();
   VOtherThread Reader( *this, false );
   Reader.WaitUntilTaken();
   VOtherThread Writer( *this, true );
-  // Whether or not the writer waits by now: this thread's second lock may not wait behind it.
-  m_Lock.AcquireShared();
+  WaitUntilWaiting( Writer );
   Release();
+  WaitUntilWaiting( Writer );
   Reader.End();
-  Release();
   Writer.WaitUntilTaken();
-  EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::None );
   Writer.End();
   EXPECT_EQ( m_LastReleases, 1 );
+}
+
+TEST_F( DataStoreLock, ANestedReaderPassesAWaitingWriterAndANewOneDoesNot )
+{
+  m_Lock.AcquireShared();
+  VOtherThread Writer( *this, true );
+  WaitUntilWaiting( Writer );
+  EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Shared );
+  VOtherThread Newcomer( *this, false );
+  Release();
+  Release();
+  Writer.WaitUntilTaken();
+  EXPECT_FALSE( Newcomer.HasTaken() );
+  Writer.End();
+  Newcomer.WaitUntilTaken();
+  Newcomer.End();
+}
+
+TEST_F( DataStoreLock, AWriterKeepsOtherWritersOut )
+{
+  m_Lock.AcquireExclusive();
+  VOtherThread Writer( *this, true );
+  WaitUntilWaiting( Writer );
+  Release();
+  Writer.WaitUntilTaken();
+  Writer.End();
+  EXPECT_EQ( m_LastReleases, 2 );
 }
 
 TEST( DataStoreThreads, ReadersNeverSeeHalfAWrite )

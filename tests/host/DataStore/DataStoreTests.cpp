@@ -31,7 +31,7 @@ class DataStore : public testing::Test
 {
 protected:
   // Writes down each of a node's events by its letter: proposed, changed, added, removed, flags, branch.
-  void Listen( const VDataPath& i_rPath, std::string& o_rHeard, std::shared_ptr<KVZ::IPostalService> i_pService = nullptr )
+  void Listen( const VDataPath& i_rPath, std::string& o_rHeard, const std::shared_ptr<KVZ::IPostalService>& i_pService = nullptr )
   {
     IDataNode& rNode = *VDataWriter( m_Store ).GetNode( i_rPath );
     rNode.OnProposedValue().Add( [&o_rHeard] { o_rHeard += 'p'; }, i_pService );
@@ -298,13 +298,16 @@ TEST_F( DataStore, EventsGoOutOnceWhenTheOutermostWriterEnds )
 
 TEST_F( DataStore, ASubscriberHearsOnlyOfWhatIsWrittenAfterwards )
 {
-  std::string Heard;
+  std::string Early;
+  std::string Late;
+  VDataWriter( m_Store ).GetNode( m_Path )->OnValueAdded().AddImmediate( [&Early] { Early += 'a'; } );
   {
     VDataWriter Outer( m_Store );
     Set( m_Path, 1 );
-    Listen( m_Path, Heard );
+    VDataWriter( m_Store ).GetNode( m_Path )->OnValueChanged().AddImmediate( [&Late] { Late += 'c'; } );
   }
-  EXPECT_TRUE( IsHeard( Heard, "" ) );
+  EXPECT_EQ( Early, "a" );
+  EXPECT_EQ( Late, "" );
 }
 
 TEST_F( DataStore, PostedSubscribersWaitForTheirServiceAndImmediateOnesMayReadAndWrite )
