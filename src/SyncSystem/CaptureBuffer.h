@@ -52,7 +52,7 @@ public:
   template<class T>
   static std::shared_ptr<T> Make( VSettings i_Settings )
   {
-    const auto pBuffer = std::make_shared<T>( std::move( i_Settings ) );
+    auto pBuffer = std::make_shared<T>( std::move( i_Settings ) );
     pBuffer->ConnectRecovery();
     return pBuffer;
   }

@@ -20,13 +20,13 @@ struct VCaptureBufferAllocator::VBlock
 {
   std::atomic<uint32_t> m_Allocations{ 1 };   // one of them for being the current block
   std::atomic<uint32_t> m_Pins{ 0 };
-  uintptr_t m_pNextFree;   // touched by the thread that has the block out of the slot
-  uintptr_t m_pEnd;
+  std::byte* m_pNextFree;   // touched by the thread that has the block out of the slot
+  std::byte* const m_pEnd;
   std::atomic<void*> m_pLastAllocated{ nullptr };
   std::atomic<void*> m_pLastLinked{ nullptr };
   VBlock* m_pNextBlock = nullptr;   // in the list of parked blocks
 
-  VBlock( uintptr_t i_pNextFree, uintptr_t i_pEnd ) : m_pNextFree( i_pNextFree ), m_pEnd( i_pEnd ) {}
+  VBlock( std::byte* i_pNextFree, std::byte* i_pEnd ) : m_pNextFree( i_pNextFree ), m_pEnd( i_pEnd ) {}
 };
 
 // In front of every allocation; the first field is the hidden pointer of the base class.
@@ -58,7 +58,12 @@ VCaptureBufferAllocator::VHeader& VCaptureBufferAllocator::HeaderOf( void* i_pMe
 
 VCaptureBufferAllocator::VBlock& VCaptureBufferAllocator::BlockOf( void* i_pMemory ) { return *HeaderOf( i_pMemory ).m_pBlock; }
 
-VCaptureBufferAllocator::VBlock* VCaptureBufferAllocator::Busy() { return reinterpret_cast<VBlock*>( uintptr_t{ 1 } ); }
+// An address that no block has.
+VCaptureBufferAllocator::VBlock* VCaptureBufferAllocator::Busy()
+{
+  alignas( VBlock ) static std::byte s_Busy{};
+  return reinterpret_cast<VBlock*>( &s_Busy );
+}
 
 void* VCaptureBufferAllocator::Allocate( size_t i_Size )
 {
@@ -114,7 +119,7 @@ VCaptureBufferAllocator::VBlock* VCaptureBufferAllocator::MakeBlock()
 {
   void* pMemory = m_pClient->Allocate( m_BlockPayload );
   if( !pMemory ) return nullptr;
-  const auto pStart = reinterpret_cast<uintptr_t>( pMemory );
+  auto* pStart = static_cast<std::byte*>( pMemory );
   auto* pBlock = new( pMemory ) VBlock( pStart + BlockHeaderBytes, pStart + m_BlockPayload );
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   ++m_HeldBlocks;
@@ -124,10 +129,11 @@ VCaptureBufferAllocator::VBlock* VCaptureBufferAllocator::MakeBlock()
 // Null if the block has no room left.
 void* VCaptureBufferAllocator::Bump( VBlock& i_rBlock, size_t i_Size )
 {
-  const uintptr_t pMemory = ( i_rBlock.m_pNextFree + sizeof( VHeader ) + m_AlignMask ) & ~m_AlignMask;
-  if( pMemory > i_rBlock.m_pEnd || i_Size > i_rBlock.m_pEnd - pMemory ) return nullptr;
-  i_rBlock.m_pNextFree = pMemory + i_Size;
-  auto* pResult = reinterpret_cast<void*>( pMemory );
+  const size_t Padding = -( reinterpret_cast<uintptr_t>( i_rBlock.m_pNextFree ) + sizeof( VHeader ) ) & m_AlignMask;
+  const auto Room = static_cast<size_t>( i_rBlock.m_pEnd - i_rBlock.m_pNextFree );
+  if( sizeof( VHeader ) + Padding + i_Size > Room ) return nullptr;
+  void* pResult = i_rBlock.m_pNextFree + sizeof( VHeader ) + Padding;
+  i_rBlock.m_pNextFree += sizeof( VHeader ) + Padding + i_Size;
   Own( pResult );
   HeaderOf( pResult ).m_pBlock = &i_rBlock;
   i_rBlock.m_Allocations.fetch_add( 1, std::memory_order_relaxed );

@@ -20,10 +20,7 @@ void VGlobalFreeAllocator::Free( void* i_pMemory )
   if( i_pMemory ) OwnerOf( i_pMemory )->FreeOwned( i_pMemory );
 }
 
-void VGlobalFreeAllocator::Own( void* i_pMemory )
-{
-  OwnerOf( i_pMemory ) = this;
-}
+void VGlobalFreeAllocator::Own( void* i_pMemory ) { OwnerOf( i_pMemory ) = this; }
 
 void* VGlobalFreeAllocatorNewDelete::Allocate( size_t i_Size )
 {
@@ -34,9 +31,6 @@ void* VGlobalFreeAllocatorNewDelete::Allocate( size_t i_Size )
   return pRaw + HiddenBytes;
 }
 
-void VGlobalFreeAllocatorNewDelete::FreeOwned( void* i_pMemory )
-{
-  ::operator delete( static_cast<std::byte*>( i_pMemory ) - HiddenBytes );
-}
+void VGlobalFreeAllocatorNewDelete::FreeOwned( void* i_pMemory ) { ::operator delete( static_cast<std::byte*>( i_pMemory ) - HiddenBytes ); }
 
 }

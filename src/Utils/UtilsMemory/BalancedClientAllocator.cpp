@@ -12,10 +12,7 @@ constexpr double BytesPerMiB = 1048576.0;
 
 VBalancedClientAllocator::VBalancedClientAllocator( std::shared_ptr<VBalancingAllocator> i_pBalancing ) : m_pBalancing( std::move( i_pBalancing ) ) {}
 
-size_t VBalancedClientAllocator::MaxAllocation() const
-{
-  return m_pBalancing->GetBlockSize();
-}
+size_t VBalancedClientAllocator::MaxAllocation() const { return m_pBalancing->GetBlockSize(); }
 
 void* VBalancedClientAllocator::Allocate( size_t i_Size )
 {
@@ -53,10 +50,7 @@ void VBalancedClientAllocator::Abandon( VBalancedClientAllocator* i_pClient )
   if( pBalancing->Abandon( *i_pClient ) ) delete i_pClient;
 }
 
-void VBalancedClientAllocator::SetShare( size_t i_Blocks )
-{
-  m_pBalancing->SetMinimumShare( *this, i_Blocks );
-}
+void VBalancedClientAllocator::SetShare( size_t i_Blocks ) { m_pBalancing->SetMinimumShare( *this, i_Blocks ); }
 
 void VBalancedClientAllocator::SetRecovery( std::function<bool()> i_Recovery )
 {

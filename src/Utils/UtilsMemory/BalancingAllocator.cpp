@@ -68,10 +68,7 @@ void VBalancingAllocator::TrimLocked()
   while( m_Grants.size() > m_TotalBlocks ) DropOldestGrantLocked();
 }
 
-size_t VBalancingAllocator::WithheldLocked() const
-{
-  return m_Deficit + m_Reserve + m_Used;
-}
+size_t VBalancingAllocator::WithheldLocked() const { return m_Deficit + m_Reserve + m_Used; }
 
 void VBalancingAllocator::DropOldestGrantLocked()
 {

@@ -50,8 +50,8 @@ TEST( CaptureBufferAllocator, LargestRequestFitsWhateverTheAlignment )
 TEST( CaptureBufferAllocator, BlockGoesBackWithItsLastAllocation )
 {
   VMemory Memory( 2 );
-  std::vector<void*> Frames;
-  for( int Frame = 0; Frame < 3; ++Frame ) Frames.push_back( Memory.m_Allocator.Allocate( 304 ) );   // three to a block
+  const auto Allocate = [&Memory] { return Memory.m_Allocator.Allocate( 304 ); };   // three to a block
+  std::vector<void*> Frames = { Allocate(), Allocate(), Allocate() };
   EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
   Frames.push_back( Memory.m_Allocator.Allocate( 1 ) );
   EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );

@@ -65,6 +65,7 @@ public:
       { &VRandomRun::Unregister, 0.7 }, { &VRandomRun::ReadAsClient, 25 }, { &VRandomRun::FinishAsClient, 1 }, { &VRandomRun::PinSomewhere, 6 },
       { &VRandomRun::Unpin, 6 }, { &VRandomRun::Walk, 5 } };
     std::vector<double> Weights;
+    Weights.reserve( Commands.size() );
     for( const auto& [pCommand, Weight] : Commands ) Weights.push_back( Weight );
     ( this->*Commands[std::discrete_distribution<size_t>( Weights.begin(), Weights.end() )( m_Random )].first )();
     m_pPostalService->RunAll();
