@@ -2,11 +2,14 @@
 #include "apps/stagehost/Commands.h"
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/HostSession.h"
+#include "apps/stagehost/Interrupt.h"
 #include "apps/stagehost/TextTable.h"
 
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
 
+#include <algorithm>
+#include <cstdlib>
 #include <iostream>
 
 using StageHost::VDeviceInfo;
@@ -14,18 +17,31 @@ using StageHost::VDeviceInfo;
 namespace
 {
 
+constexpr double PollSeconds = 0.02;
+constexpr double RateSeconds = 1.0;
+
 struct VOptions
 {
   VSessionOptions m_Session;
   bool m_bJson = false;
 };
 
+nlohmann::ordered_json ToNumber( const std::string& i_rText )
+{
+  return nlohmann::ordered_json( std::strtoul( i_rText.c_str(), nullptr, 10 ) );
+}
+
 nlohmann::ordered_json ToJson( const VDeviceInfo& i_rDevice )
 {
+  nlohmann::ordered_json ChannelCounts = nlohmann::ordered_json::array();
+  for( const std::string& rCount : i_rDevice.m_AudioChannelCounts )
+  {
+    ChannelCounts.push_back( ToNumber( rCount ) );
+  }
   return { { "urn", i_rDevice.m_URN }, { "name", i_rDevice.m_Name }, { "driver", i_rDevice.m_Driver }, { "standard", i_rDevice.m_Standard },
     { "signal", i_rDevice.HasSignal() }, { "status", i_rDevice.m_Status }, { "timecode", i_rDevice.m_Timecode },
     { "pixel_format", i_rDevice.m_PixelFormat }, { "pixel_formats", i_rDevice.m_PixelFormats }, { "audio_format", i_rDevice.m_AudioFormat },
-    { "channels", i_rDevice.m_AudioChannels }, { "channel_counts", i_rDevice.m_AudioChannelCounts }, { "warnings", i_rDevice.m_Warnings } };
+    { "channels", ToNumber( i_rDevice.m_AudioChannels ) }, { "channel_counts", ChannelCounts }, { "warnings", i_rDevice.m_Warnings } };
 }
 
 void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
@@ -47,6 +63,19 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
   }
 }
 
+// The host takes its rate from the first source that delivers. Until then every device's rate seems to be a wrong one.
+void WaitForRate( VHostSession& i_rSession )
+{
+  const double Until = i_rSession.Host().Time().Now() + RateSeconds;
+  const auto HasWarnings = [&] {
+    const auto Devices = i_rSession.Settings().GetDevices();
+    return std::any_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return !i_rDevice.m_Warnings.empty(); } );
+  };
+  while( ( !i_rSession.Host().Engine().GetStarted() || HasWarnings() ) && i_rSession.Host().Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
+  {
+  }
+}
+
 int Run( const VOptions& i_rOptions )
 {
   VHostSession Session;
@@ -54,10 +83,15 @@ int Run( const VOptions& i_rOptions )
   {
     return Result;
   }
-  const std::vector<VDeviceInfo> Devices = Session.WaitForDevices( false );
+  std::vector<VDeviceInfo> Devices = Session.WaitForDevices( false );
   if( Devices.empty() )
   {
     return VHostSession::ExitWithoutDevices();
+  }
+  if( std::any_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return !i_rDevice.m_Warnings.empty(); } ) )
+  {
+    WaitForRate( Session );
+    Devices = Session.Settings().GetDevices();
   }
   if( i_rOptions.m_bJson )
   {

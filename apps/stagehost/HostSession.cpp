@@ -19,6 +19,17 @@ constexpr double PollSeconds = 0.02;
 constexpr double ArrivalSeconds = 1.5;
 constexpr double SignalSeconds = 5.0;
 
+constexpr const char* pCardKeys = R"(Keys of a virtual card, parted by commas:
+  standard=NAME        a video standard; one that is not carried is answered with a list
+  pattern=PATTERN      bars, counter or noise
+  timecode=START       HH:MM:SS:FF, HH:MM:SS;FF for drop-frame, or none
+  audio=SOUND          tone, ramp, silence or none
+  channels=N           1 to 16
+  script=FILE          events: signal-loss, format, drop, timecode-jump, timecode-loss, late, remove, arrive
+  speed=X              frame rate factor, 0.01 to 100
+  loop=0               an input that ends is not begun again
+  input=REST           a file, a URL, or FFmpeg's input options; comes last)";
+
 std::string JoinURNs( const std::vector<VDeviceInfo>& i_rDevices )
 {
   std::string Text;
@@ -43,6 +54,7 @@ void AddSessionOptions( CLI::App& io_rCommand, VSessionOptions& io_rOptions )
     ->type_name( "CARD" )
     ->allow_extra_args( false );
   io_rCommand.add_flag( "--verbose", io_rOptions.m_bVerbose, "Show the log's information on standard error" );
+  io_rCommand.footer( pCardKeys );
 }
 
 int VHostSession::Start( const VSessionOptions& i_rOptions )

@@ -9,6 +9,7 @@
 
 #include <CLI/CLI.hpp>
 #include <boost/crc.hpp>
+#include <boost/filesystem/operations.hpp>
 #include <nlohmann/json.hpp>
 
 #include <cmath>
@@ -184,8 +185,26 @@ bool PrintJson( VReader& io_rReader, const VOptions& i_rOptions )
   return true;
 }
 
+// Empty where there is a file to open.
+std::string WhyNoFile( const std::string& i_rPath )
+{
+  boost::system::error_code Error;
+  const boost::filesystem::file_status Status = boost::filesystem::status( i_rPath, Error );
+  if( !boost::filesystem::exists( Status ) )
+  {
+    return Error ? Error.message() + "." : "There is no such file.";
+  }
+  return boost::filesystem::is_regular_file( Status ) ? std::string() : "This is no file.";
+}
+
 int Run( const VOptions& i_rOptions )
 {
+  const std::string WhyNot = WhyNoFile( i_rOptions.m_Path );
+  if( !WhyNot.empty() )
+  {
+    Complain( i_rOptions.m_Path + ": " + WhyNot );
+    return ExitFailed;
+  }
   VReader Reader;
   if( Reader.Open( i_rOptions.m_Path ) )
   {
@@ -210,7 +229,7 @@ VCommand AddInspectCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "inspect", "Show what a tvid file holds" );
   auto pOptions = std::make_shared<VOptions>();
-  rCommand.add_option( "file", pOptions->m_Path, "A .tvid file" )->type_name( "FILE" )->required();
+  rCommand.add_option( "FILE", pOptions->m_Path, "A .tvid file" )->required();
   rCommand.add_flag( "--frames", pOptions->m_bFrames, "Add a row for each frame, with CRC-32 of video and audio" );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print one JSON document" );
   return [pOptions] { return Run( *pOptions ); };

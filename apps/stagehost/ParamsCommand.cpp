@@ -80,6 +80,11 @@ int Set( VHostSession& i_rSession, const VOptions& i_rOptions )
 
 int Run( const VOptions& i_rOptions )
 {
+  if( !i_rOptions.m_pList->parsed() && !i_rOptions.m_pGet->parsed() && !i_rOptions.m_pSet->parsed() )
+  {
+    Complain( "params needs one of: list, get PATH, set PATH VALUE." );
+    return ExitUsage;
+  }
   VHostSession Session;
   if( const int Result = Session.Start( i_rOptions.m_Session ) )
   {
@@ -103,7 +108,7 @@ VCommand AddParamsCommand( CLI::App& io_rApp )
   auto pOptions = std::make_shared<VOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print one JSON document" );
-  rCommand.require_subcommand( 1 );
+  rCommand.require_subcommand( 0, 1 );
   pOptions->m_pList = rCommand.add_subcommand( "list", "All settings" );
   pOptions->m_pGet = rCommand.add_subcommand( "get", "The value of one setting" );
   pOptions->m_pSet = rCommand.add_subcommand( "set", "Change one setting" );

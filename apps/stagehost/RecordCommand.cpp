@@ -4,6 +4,7 @@
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/HostSession.h"
 #include "apps/stagehost/Interrupt.h"
+#include "apps/stagehost/NumberCheck.h"
 #include "apps/stagehost/RecordReport.h"
 #include "host/Recording.h"
 
@@ -24,6 +25,12 @@ namespace
 constexpr double PollSeconds = 0.02;
 constexpr double ReadySeconds = 10.0;
 constexpr double SettleSeconds = 5.0;
+
+// Days of recording; times in ticks stay far from their ends.
+constexpr double LongestSeconds = 1e6;
+constexpr double MostFrames = 1e8;
+constexpr double LongestPreRoll = 3600.0;
+constexpr double MostMemoryMiB = 1048576.0;
 
 struct VOptions
 {
@@ -115,23 +122,31 @@ std::string DeviceChannels( const VDeviceInfo& i_rDevice, uint32_t i_Channels )
   return bFound ? std::to_string( Best ) : std::to_string( i_Channels );
 }
 
-std::vector<std::pair<std::string, std::string>> WantedSettings( const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+struct VWantedSetting
 {
-  std::vector<std::pair<std::string, std::string>> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ) } };
+  const char* m_pKey;
+  std::string m_Value;
+  std::string m_Option;   // of the command line, as it was given
+};
+
+std::vector<VWantedSetting> WantedSettings( const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+{
+  std::vector<VWantedSetting> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ), "--container " + i_rOptions.m_Container } };
   if( !i_rOptions.m_PixelFormat.empty() )
   {
-    Wanted.emplace_back( "PixelFormat", i_rOptions.m_PixelFormat );
+    Wanted.push_back( { "PixelFormat", i_rOptions.m_PixelFormat, "--pixel-format " + i_rOptions.m_PixelFormat } );
   }
   if( i_rOptions.m_bAudioChannels )
   {
-    Wanted.emplace_back( "AudioChannelCount", DeviceChannels( i_rDevice, i_rOptions.m_AudioChannels ) );
+    Wanted.push_back( { "AudioChannelCount", DeviceChannels( i_rDevice, i_rOptions.m_AudioChannels ),
+      "--audio-channels " + std::to_string( i_rOptions.m_AudioChannels ) } );
   }
   if( !i_rOptions.m_AudioFormat.empty() )
   {
-    Wanted.emplace_back( "AudioSampleFormat", i_rOptions.m_AudioFormat );
+    Wanted.push_back( { "AudioSampleFormat", i_rOptions.m_AudioFormat, "--audio-format " + i_rOptions.m_AudioFormat } );
   }
-  Wanted.emplace_back( "VideoPayload", NameFor( VideoPayloads, i_rOptions.m_Video ) );
-  Wanted.emplace_back( "AudioPayload", NameFor( AudioPayloads, i_rOptions.m_Audio ) );
+  Wanted.push_back( { "VideoPayload", NameFor( VideoPayloads, i_rOptions.m_Video ), "--video " + i_rOptions.m_Video } );
+  Wanted.push_back( { "AudioPayload", NameFor( AudioPayloads, i_rOptions.m_Audio ), "--audio " + i_rOptions.m_Audio } );
   return Wanted;
 }
 
@@ -153,12 +168,12 @@ int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const V
     Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
     return ExitFailed;
   }
-  for( const auto& rSetting : WantedSettings( i_rOptions, i_rDevice ) )
+  for( const VWantedSetting& rSetting : WantedSettings( i_rOptions, i_rDevice ) )
   {
     std::string Error;
-    if( !i_rSession.Settings().Set( VDeviceSettings::SettingPath( i_rDevice.m_URN, rSetting.first ), rSetting.second, Error ) )
+    if( !i_rSession.Settings().Set( VDeviceSettings::SettingPath( i_rDevice.m_URN, rSetting.m_pKey ), rSetting.m_Value, Error ) )
     {
-      Complain( Error );
+      Complain( rSetting.m_Option + ": " + Error );
       return ExitUsage;
     }
   }
@@ -302,7 +317,7 @@ void AddFormatOptions( CLI::App& io_rCommand, VOptions& io_rOptions )
   io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload" )->check( CLI::IsMember( WordsOf( VideoPayloads ) ) )->capture_default_str();
   io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload" )->check( CLI::IsMember( WordsOf( AudioPayloads ) ) )->capture_default_str();
   io_rCommand.add_option( "--audio-channels", io_rOptions.m_AudioChannels, "Channels to keep" )
-    ->check( CLI::Range( 0u, 16u ) )
+    ->check( WholeNumberCheck( 0.0, 16.0, "a whole number from 0 to 16" ) )
     ->each( [&io_rOptions]( const std::string& ) { io_rOptions.m_bAudioChannels = true; } );
   io_rCommand.add_option( "--audio-format", io_rOptions.m_AudioFormat, "Sample format, for example Int16" );
   io_rCommand.add_option( "--pixel-format", io_rOptions.m_PixelFormat, "Pixel format of the capture buffer, for example U10Y10V10Y10" );
@@ -316,16 +331,26 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
   auto pOptions = std::make_shared<VOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all when absent" )->type_name( "URN" )->allow_extra_args( false );
-  rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )->type_name( "S" )->check( CLI::PositiveNumber );
-  rCommand.add_option( "--frames", pOptions->m_Frames, "How many frames of each device to record" )->type_name( "N" )->check( CLI::PositiveNumber );
-  rCommand.add_option( "--pre-roll", pOptions->m_PreRoll, "Begin so many seconds before the request" )->type_name( "S" )->check( CLI::NonNegativeNumber );
+  rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )
+    ->type_name( "S" )
+    ->check( NumberCheck( 0.0, LongestSeconds, "seconds above 0, up to 1000000", ELowerEnd::Excluded ) );
+  rCommand.add_option( "--frames", pOptions->m_Frames, "How many frames of each device to record" )
+    ->type_name( "N" )
+    ->check( WholeNumberCheck( 1.0, MostFrames, "a whole number from 1 to 100000000" ) );
+  rCommand.add_option( "--pre-roll", pOptions->m_PreRoll, "Begin so many seconds before the request" )
+    ->type_name( "S" )
+    ->check( NumberCheck( 0.0, LongestPreRoll, "seconds from 0 to 3600" ) );
   AddFormatOptions( rCommand, *pOptions );
   rCommand.add_option( "--memory", pOptions->m_Session.m_MemoryMiB, "Memory for frames of all devices, in MiB" )
     ->type_name( "MIB" )
-    ->check( CLI::Range( StageHost::MinimumMemoryMiB, size_t{ 1 } << 20 ) )
+    ->check( WholeNumberCheck( static_cast<double>( StageHost::MinimumMemoryMiB ), MostMemoryMiB,
+      "whole MiB from " + std::to_string( StageHost::MinimumMemoryMiB ) + " to 1048576" ) )
     ->capture_default_str();
   rCommand.add_option( "--output", pOptions->m_Output, "The folder that the files go to" )->type_name( "DIR" )->required();
-  rCommand.add_option( "--name", pOptions->m_Name, "What the file names begin with" )->type_name( "STEM" )->capture_default_str();
+  rCommand.add_option( "--name", pOptions->m_Name, "What the file names begin with" )
+    ->type_name( "STEM" )
+    ->check( []( const std::string& i_rText ) { return i_rText.empty() ? std::string( "a file name cannot begin with nothing" ) : std::string(); } )
+    ->capture_default_str();
   rCommand.add_flag( "--overwrite", pOptions->m_bOverwrite, "Replace files that are there" );
   rCommand.add_flag( "--json", pOptions->m_Report.m_bJson, "Print one JSON document" );
   rCommand.add_flag( "--progress", pOptions->m_Report.m_bProgressBlocks, "Print blocks of key=value lines on standard error while recording" );

@@ -21,7 +21,7 @@ int main( int i_ArgumentCount, char** i_ppArguments )
   const DebugServices::VCrashHandlerForThread CrashHandler;
 
   CLI::App App( "Runs the video input module without the closed host: finds capture cards, records them, and reads the files.", "stagehost" );
-  App.require_subcommand( 1 );
+  App.require_subcommand( 0, 1 );
   std::vector<std::pair<CLI::App*, VCommand>> Commands;
   for( const auto& pAdd : { &AddDevicesCommand, &AddRecordCommand, &AddInspectCommand, &AddParamsCommand } )
   {
@@ -55,6 +55,8 @@ int main( int i_ArgumentCount, char** i_ppArguments )
   catch( const std::exception& rError )
   {
     std::fprintf( stderr, "stagehost: %s\n", rError.what() );
+    return ExitFailed;
   }
-  return ExitFailed;
+  std::fputs( "stagehost: a command is needed: devices, record, inspect or params; --help tells more.\n", stderr );
+  return ExitUsage;
 }
