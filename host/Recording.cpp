@@ -261,8 +261,10 @@ VDeviceOutcome VRecording::MakeOutcome( const VDevice& i_rDevice ) const
     : std::min( Missing, FramesOf( i_rDevice.m_Status.m_Start - i_rDevice.m_Start, i_rDevice.m_Period ) );
   Outcome.m_Lost.m_Card = i_rDevice.m_Dropped;
   Outcome.m_Lost.m_Memory = ( i_rDevice.m_Status.m_Failure & FailureMemory ) != 0 ? Missing : Clipped;
-  Outcome.m_Lost.m_Signal = Missing - Outcome.m_Lost.m_Memory;
   Outcome.m_Lost.m_Writer = LessOrZero( Outcome.m_FramesCaptured, Outcome.m_FramesWritten );
+  // A capture that could not be prepared never began: no frame of it is the signal's loss.
+  const bool bPrepared = i_rDevice.m_Status.m_State != StateIdle || ( i_rDevice.m_Status.m_Failure & FailureErrors ) == 0;
+  ( bPrepared ? Outcome.m_Lost.m_Signal : Outcome.m_Lost.m_Writer ) += Missing - Outcome.m_Lost.m_Memory;
   return Outcome;
 }
 
