@@ -1,0 +1,262 @@
+// What cannot be done is refused in one line that names the thing and says what would be accepted. Nothing else is printed, and nothing is lost.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/system/StageHost.h"
+
+#include <boost/filesystem/operations.hpp>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <fstream>
+
+using namespace SystemTests;
+
+namespace
+{
+
+struct VRefusalCase
+{
+  const char* m_pName;
+  VArguments m_Arguments;   // FOLDER stands for the test's folder
+  int m_ExitCode;
+  std::vector<std::string> m_Words;   // each is in the line
+};
+
+const VArguments RecordTo = { "record", "--output", "FOLDER/out" };
+const VArguments Five = RecordTo + VArguments{ "--frames", "5" };
+const VArguments Ready = Five + VArguments{ "--card", "decklink:standard=SD_720_576I_5000" };
+
+VArguments CardText( const std::string& i_rText ) { return Five + VArguments{ "--card", i_rText }; }
+VArguments Params( const VArguments& i_rMore ) { return VArguments{ "params", "--card", "decklink" } + i_rMore; }
+
+const VRefusalCase RefusalCases[] = {
+  // The command line
+  { "NoCommand", {}, 2, { "devices", "record", "inspect", "params" } },
+  { "UnknownCommand", { "recrod" }, 2, { "recrod" } },
+  { "UnknownOption", Ready + VArguments{ "--colour" }, 2, { "--colour" } },
+  { "NoLength", RecordTo + VArguments{ "--card", "decklink" }, 2, { "--seconds", "--frames" } },
+  { "TwoLengths", Ready + VArguments{ "--seconds", "1" }, 2, { "--seconds", "--frames" } },
+  { "NoOutput", { "record", "--frames", "5", "--card", "decklink" }, 2, { "--output" } },
+  { "NoSeconds", RecordTo + VArguments{ "--card", "decklink", "--seconds", "0" }, 2, { "--seconds", "\"0\"", "above 0" } },
+  { "NegativeSeconds", RecordTo + VArguments{ "--card", "decklink", "--seconds", "-1" }, 2, { "--seconds", "above 0" } },
+  { "SecondsThatAreNone", RecordTo + VArguments{ "--card", "decklink", "--seconds", "nan" }, 2, { "--seconds", "\"nan\"" } },
+  { "EndlessSeconds", RecordTo + VArguments{ "--card", "decklink", "--seconds", "1e300" }, 2, { "--seconds", "up to" } },
+  { "HalfAFrame", RecordTo + VArguments{ "--card", "decklink", "--frames", "1.5" }, 2, { "--frames", "whole number" } },
+  { "MoreFramesThanThereCanBe", RecordTo + VArguments{ "--card", "decklink", "--frames", "99999999999999999999" }, 2, { "--frames" } },
+  { "PreRollOfAges", Ready + VArguments{ "--pre-roll", "1e30" }, 2, { "--pre-roll", "from 0 to" } },
+  { "TooLittleMemory", Ready + VArguments{ "--memory", "1" }, 2, { "--memory", "MiB from" } },
+  { "UnknownContainer", Ready + VArguments{ "--container", "wav" }, 2, { "--container", "wav", "tvid" } },
+  { "TooManyChannels", Ready + VArguments{ "--audio-channels", "17" }, 2, { "--audio-channels", "16" } },
+  { "NoName", Ready + VArguments{ "--name", "" }, 2, { "--name" } },
+  { "ParamsOfWhat", Params( {} ), 2, { "list", "get", "set" } },
+  { "InspectWhat", { "inspect" }, 2, { "FILE" } },
+  // What the device does not offer
+  { "UnknownPixelFormat", Ready + VArguments{ "--pixel-format", "XYZ" }, 2, { "--pixel-format XYZ", "U8Y8V8Y8" } },
+  { "UnknownAudioFormat", Ready + VArguments{ "--audio-format", "Float" }, 2, { "--audio-format Float", "Int16", "Int32" } },
+  { "PayloadOfAnotherContainer", Ready + VArguments{ "--video", "jpeg" }, 2, { "--video jpeg", "Uncompressed" } },
+  { "UnknownDevice", Ready + VArguments{ "--device", "vi:7" }, 4, { "vi:7", "vi:0" } },
+  { "NoDevice", Five, 4, { "--card" } },
+  // The card's text
+  { "UnknownKind", CardText( "sony" ), 2, { "\"sony\"", "decklink" } },
+  { "UnknownKey", CardText( "decklink:colour=red" ), 2, { "\"colour\"", "standard", "pattern" } },
+  { "NoValue", CardText( "decklink:pattern=" ), 2, { "pattern" } },
+  { "UnknownPattern", CardText( "decklink:pattern=stripes" ), 2, { "stripes", "bars", "counter", "noise" } },
+  { "UnknownStandard", CardText( "decklink:standard=HD_9" ), 2, { "HD_9", "HD_1920_1080P_2500" } },
+  { "StandardOfAnotherKind", CardText( "decklink:standard=HD_1920_1080P_4800" ), 2, { "HD_1920_1080P_4800", "HD_1920_1080P_2500" } },
+  { "NoSuchLabel", CardText( "decklink:timecode=01:00:00:25" ), 2, { "timecode", "24" } },
+  { "DropFrameWhereThereIsNone", CardText( "decklink:timecode=01:00:00;00" ), 2, { "drop-frame", "29.97" } },
+  { "TooFast", CardText( "decklink:speed=1000" ), 2, { "speed", "100" } },
+  { "NoScript", CardText( "decklink:script=FOLDER/none.json" ), 2, { "FOLDER/none.json" } },
+  { "NoClip", CardText( "decklink:input=FOLDER/none.mov" ), 2, { "FOLDER/none.mov", "No such file" } },
+  { "NoScreen", CardText( "decklink:input=-f x11grab -i :7654" ), 2, { ":7654" } },
+  // Settings
+  { "UnknownSetting", Params( { "get", "VideoInput.vi:0.Settings.Nonsense" } ), 1, { "VideoInput.vi:0.Settings.Nonsense", "params list" } },
+  { "RefusedValue", Params( { "set", "VideoInput.vi:0.Settings.PixelFormat", "Nope" } ), 1,
+    { "VideoInput.vi:0.Settings.PixelFormat", "Nope", "U8Y8V8Y8" } },
+  { "RefusedCount", Params( { "set", "VideoInput.vi:0.Settings.AudioChannelCount", "3" } ), 1, { "AudioChannelCount", "0, 2, 8, 16" } },
+  { "RefusedType", Params( { "set", "VideoInput.vi:0.Settings.Enabled", "maybe" } ), 1, { "Enabled", "maybe", "bool" } },
+  { "ReadOnly", Params( { "set", "VideoInput.vi:0.Hardware.Status", "Ready" } ), 1, { "VideoInput.vi:0.Hardware.Status", "read-only" } },
+  // Files
+  { "FolderThatCannotBeMade", { "record", "--output", "/proc/here", "--frames", "5", "--card", "decklink" }, 1, { "\"/proc/here\"" } },
+  { "FolderUnderAFile", { "record", "--output", "FOLDER/file/out", "--frames", "5", "--card", "decklink" }, 1,
+    { "FOLDER/file/out", "Not a directory" } },
+  { "FolderThatIsAFile", { "record", "--output", "FOLDER/file", "--frames", "5", "--card", "decklink" }, 1, { "FOLDER/file" } },
+  { "NoFile", { "inspect", "FOLDER/none.tvid" }, 1, { "FOLDER/none.tvid", "No such file" } },
+  { "FolderAsFile", { "inspect", "FOLDER" }, 1, { "FOLDER" } },
+  { "ForeignFile", { "inspect", "FOLDER/file" }, 1, { "FOLDER/file", "Not a tvid file" } },
+};
+
+std::string WithFolder( std::string i_Text, const std::string& i_rFolder )
+{
+  const size_t Place = i_Text.find( "FOLDER" );
+  return Place == std::string::npos ? i_Text : i_Text.replace( Place, 6, i_rFolder );
+}
+
+std::string ReadFile( const std::string& i_rPath )
+{
+  std::ifstream File( i_rPath, std::ios::binary );
+  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
+}
+
+void WriteFile( const std::string& i_rPath, const std::string& i_rBytes ) { std::ofstream( i_rPath, std::ios::binary ) << i_rBytes; }
+
+// One line of the program's own, and at most log lines besides.
+void ExpectOneLine( const VRunResult& i_rRun )
+{
+  EXPECT_EQ( "", i_rRun.m_Output );
+  EXPECT_EQ( 0u, i_rRun.m_Error.find( "stagehost: " ) ) << Describe( i_rRun );
+  EXPECT_EQ( 1, std::count( i_rRun.m_Error.begin(), i_rRun.m_Error.end(), '\n' ) ) << Describe( i_rRun );
+}
+
+}
+
+class RefusalTest : public testing::TestWithParam<VRefusalCase>
+{
+protected:
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_P( RefusalTest, IsOneLineThatNamesTheThing )
+{
+  const std::string Folder = m_Folder.File( "here" );
+  boost::filesystem::create_directories( Folder );
+  WriteFile( Folder + "/file", std::string( 100, 'x' ) );
+  VArguments Arguments = GetParam().m_Arguments;
+  std::transform( Arguments.begin(), Arguments.end(), Arguments.begin(),
+    [&]( const std::string& i_rText ) { return WithFolder( i_rText, Folder ); } );
+  const VRunResult Run = TestSupport::RunStageHost( Arguments );
+  EXPECT_EQ( GetParam().m_ExitCode, Run.m_ExitCode ) << Describe( Run );
+  ExpectOneLine( Run );
+  for( const std::string& rWord : GetParam().m_Words )
+  {
+    EXPECT_NE( std::string::npos, Run.m_Error.find( WithFolder( rWord, Folder ) ) ) << rWord << "\n" << Describe( Run );
+  }
+  EXPECT_EQ( std::string( 100, 'x' ), ReadFile( Folder + "/file" ) );
+}
+
+INSTANTIATE_TEST_SUITE_P( Cases, RefusalTest, testing::ValuesIn( RefusalCases ),
+  []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pName ); } );
+
+class BadInputTest : public testing::Test
+{
+protected:
+  std::string MakeRecording( const std::string& i_rName, const VArguments& i_rMore = {} )
+  {
+    const VRecordResult Result = Record( m_Folder.File( "out" ),
+      VArguments{ "--card", "decklink:pattern=counter,standard=SD_720_576I_5000,speed=8", "--frames", "3", "--name", i_rName } + i_rMore );
+    EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+    return Result.Path();
+  }
+
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_F( BadInputTest, AFileThatIsThereStaysAsItIs )
+{
+  const std::string Path = MakeRecording( "take" );
+  WriteFile( Path, "mine" );
+  const VRecordResult Refused = Record( m_Folder.File( "out" ),
+    { "--card", "decklink:pattern=counter,standard=SD_720_576I_5000,speed=8", "--frames", "3" } );
+  EXPECT_EQ( 1, Refused.m_Run.m_ExitCode );
+  ExpectOneLine( Refused.m_Run );
+  EXPECT_NE( std::string::npos, Refused.m_Run.m_Error.find( Path ) ) << Describe( Refused.m_Run );
+  EXPECT_NE( std::string::npos, Refused.m_Run.m_Error.find( "--overwrite" ) ) << Describe( Refused.m_Run );
+  EXPECT_EQ( "mine", ReadFile( Path ) );
+
+  EXPECT_EQ( Path, MakeRecording( "take", { "--overwrite" } ) );
+  EXPECT_EQ( 3u, Inspect( Path ).value( "frame_count", 0u ) );
+}
+
+// A card that shows nothing: there is a device, and no signal.
+TEST_F( BadInputTest, NoSignalIsToldAsSuch )
+{
+  const std::string Script = WriteScript( m_Folder.File( "script.json" ), { { { "frame", 0 }, { "do", "signal-loss" }, { "frames", 100000 } } } );
+  const VRecordResult Result = Record( m_Folder.File( "out" ), { "--card", "decklink:standard=SD_720_576I_5000,script=" + Script, "--frames", "3" } );
+  EXPECT_EQ( 4, Result.m_Run.m_ExitCode );
+  ExpectOneLine( Result.m_Run );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "vi:0" ) );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "no signal" ) );
+}
+
+TEST_F( BadInputTest, AScriptThatCannotBeUnderstoodNamesTheEvent )
+{
+  const struct
+  {
+    const char* m_pScript;
+    std::vector<std::string> m_Words;
+  } Cases[] = {
+    { "nonsense", { "JSON" } },
+    { R"([{"frame":1,"do":"explode"}])", { "event 0", "explode", "signal-loss" } },
+    { R"([{"frame":1,"do":"arrive"},{"frame":2,"do":"drop"}])", { "event 1", "frames" } },
+    { R"([{"frame":1,"do":"format","standard":"HD_9"}])", { "event 0", "HD_9", "HD_1920_1080P_2500" } },
+    { R"([{"frame":1,"do":"timecode-jump","to":"25:00:00:00"}])", { "event 0", "25:00:00:00", "HH:MM:SS:FF" } },
+    { R"([{"frame":-1,"do":"arrive"}])", { "event 0", "frame" } },
+  };
+  const std::string Path = m_Folder.File( "script.json" );
+  for( const auto& rCase : Cases )
+  {
+    SCOPED_TRACE( rCase.m_pScript );
+    WriteFile( Path, rCase.m_pScript );
+    const VRunResult Run = TestSupport::RunStageHost( { "devices", "--card", "decklink:script=" + Path } );
+    EXPECT_EQ( 2, Run.m_ExitCode );
+    ExpectOneLine( Run );
+    EXPECT_NE( std::string::npos, Run.m_Error.find( Path ) );
+    for( const std::string& rWord : rCase.m_Words )
+    {
+      EXPECT_NE( std::string::npos, Run.m_Error.find( rWord ) ) << rWord << "\n" << Run.m_Error;
+    }
+  }
+}
+
+// Every length of the head and index, and some of the frames: cut short, a finished file is damaged and is never taken for a whole one.
+TEST_F( BadInputTest, ATruncatedFileIsToldAsSuch )
+{
+  const std::string Whole = ReadFile( MakeRecording( "take" ) );
+  const std::string Path = m_Folder.File( "cut.tvid" );
+  const size_t Size = Whole.size();
+  for( const size_t Length : { size_t{ 0 }, size_t{ 1 }, size_t{ 19 }, size_t{ 40 }, size_t{ 47 }, size_t{ 48 }, size_t{ 60 }, size_t{ 500 },
+         size_t{ 1500 }, Size / 3, Size / 2, Size - 60, Size - 56, Size - 48, Size - 16, Size - 1 } )
+  {
+    SCOPED_TRACE( Length );
+    WriteFile( Path, Whole.substr( 0, Length ) );
+    const VRunResult Run = TestSupport::RunStageHost( { "inspect", "--frames", "--json", Path } );
+    EXPECT_EQ( 1, Run.m_ExitCode ) << Describe( Run ).substr( 0, 2000 );
+    ExpectOneLine( Run );
+    EXPECT_NE( std::string::npos, Run.m_Error.find( Path ) );
+  }
+}
+
+// A changed byte of the head or the index is told, or changes nothing but what an attribute says; a crash or an endless run is neither.
+TEST_F( BadInputTest, ADamagedFileNeverBringsInspectDown )
+{
+  const std::string Whole = ReadFile( MakeRecording( "take" ) );
+  const std::string Path = m_Folder.File( "damaged.tvid" );
+  const size_t Records = Whole.size() - 3 * ( 720 * 576 * 2 + 4 + 1920 * 16 * 2 ) - 8 - 3 * 16;
+  std::vector<size_t> Places = { 0, 10, 19, 20, 25, 31, 33, 39 };
+  for( size_t Place = 40; Place < Records; Place += 37 )
+  {
+    Places.push_back( Place );
+  }
+  for( size_t Place = Whole.size() - 56; Place < Whole.size(); Place += 5 )
+  {
+    Places.push_back( Place );
+  }
+  for( const size_t Place : Places )
+  {
+    SCOPED_TRACE( Place );
+    std::string Damaged = Whole;
+    Damaged[Place] = static_cast<char>( Damaged[Place] ^ 0x5A );
+    WriteFile( Path, Damaged );
+    const VRunResult Run = TestSupport::RunStageHost( { "inspect", "--json", Path } );
+    EXPECT_FALSE( Run.m_bTimedOut );
+    EXPECT_TRUE( Run.m_ExitCode == 0 || Run.m_ExitCode == 1 ) << Describe( Run );
+    if( Run.m_ExitCode == 1 )
+    {
+      ExpectOneLine( Run );
+    }
+    else
+    {
+      EXPECT_GE( Place, 40u ) << "the fixed header is constant";
+      EXPECT_EQ( "", Run.m_Error );
+    }
+  }
+}
