@@ -1,0 +1,81 @@
+#include "tests/support/system/BackgroundProgram.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <cstdlib>
+#include <stdexcept>
+
+namespace SystemTests
+{
+
+VBackgroundProgram::VBackgroundProgram( const std::vector<std::string>& i_rArguments, const std::vector<std::string>& i_rEnvironment )
+{
+  int Ends[2] = { -1, -1 };
+  if( pipe2( Ends, O_CLOEXEC ) != 0 )
+  {
+    throw std::runtime_error( "no pipe" );
+  }
+  std::vector<char*> Arguments;
+  for( const std::string& rArgument : i_rArguments )
+  {
+    Arguments.push_back( const_cast<char*>( rArgument.c_str() ) );
+  }
+  Arguments.push_back( nullptr );
+  m_Child = fork();
+  if( m_Child == 0 )
+  {
+    dup2( open( "/dev/null", O_RDONLY ), STDIN_FILENO );
+    dup2( Ends[1], STDOUT_FILENO );
+    dup2( Ends[1], STDERR_FILENO );
+    for( const std::string& rVariable : i_rEnvironment )
+    {
+      putenv( const_cast<char*>( rVariable.c_str() ) );
+    }
+    execvp( Arguments.front(), Arguments.data() );
+    _exit( 127 );
+  }
+  close( Ends[1] );
+  m_Output = Ends[0];
+}
+
+VBackgroundProgram::~VBackgroundProgram()
+{
+  close( m_Output );
+  if( m_Child > 0 )
+  {
+    kill( m_Child, SIGKILL );
+    while( waitpid( m_Child, nullptr, 0 ) < 0 && errno == EINTR )
+    {
+    }
+  }
+}
+
+bool VBackgroundProgram::WaitFor( const std::string& i_rText, double i_Seconds )
+{
+  const auto Deadline = std::chrono::steady_clock::now() + std::chrono::duration<double>( i_Seconds );
+  while( m_Printed.find( i_rText ) == std::string::npos )
+  {
+    const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( Deadline - std::chrono::steady_clock::now() ).count();
+    pollfd End = { m_Output, POLLIN, 0 };
+    if( Left <= 0 || poll( &End, 1, static_cast<int>( Left ) ) == 0 )
+    {
+      return false;
+    }
+    char Bytes[4096];
+    const ssize_t Count = read( m_Output, Bytes, sizeof( Bytes ) );
+    if( Count == 0 || ( Count < 0 && errno != EINTR ) )
+    {
+      return false;
+    }
+    m_Printed.append( Bytes, static_cast<size_t>( Count > 0 ? Count : 0 ) );
+  }
+  return true;
+}
+
+}

@@ -1,0 +1,32 @@
+// A program that runs beside the test, until the test lets go of it.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include <sys/types.h>
+
+namespace SystemTests
+{
+
+class VBackgroundProgram
+{
+public:
+  // The name is looked up. Its standard output and error come through one pipe.
+  VBackgroundProgram( const std::vector<std::string>& i_rArguments, const std::vector<std::string>& i_rEnvironment = {} );
+  // Ends it and waits for its end.
+  ~VBackgroundProgram();
+  VBackgroundProgram( const VBackgroundProgram& ) = delete;
+  VBackgroundProgram& operator=( const VBackgroundProgram& ) = delete;
+
+  // Until it has printed this text. False when it ends or so many seconds pass before that.
+  bool WaitFor( const std::string& i_rText, double i_Seconds );
+  const std::string& Printed() const { return m_Printed; }
+
+private:
+  pid_t m_Child = -1;
+  int m_Output = -1;
+  std::string m_Printed;
+};
+
+}
