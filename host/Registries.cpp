@@ -34,6 +34,7 @@ void VParameterRegistry::AddParameterGroup( std::shared_ptr<IParameterGroup> i_p
   m_Groups.push_back( std::move( i_pGroup ) );
 }
 
+// The caller has the group still, so that it does not end under the lock.
 void VParameterRegistry::RemoveParameterGroup( const std::shared_ptr<IParameterGroup>& i_pGroup )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
@@ -48,8 +49,9 @@ std::vector<std::shared_ptr<IParameterGroup>> VParameterRegistry::GetGroups() co
 
 void VParameterRegistry::Clear()
 {
+  std::vector<std::shared_ptr<IParameterGroup>> Groups;   // destroyed without the lock
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Groups.clear();
+  Groups.swap( m_Groups );
 }
 
 void VFlowNodeRegistry::AddFactory( std::shared_ptr<IFlowNodeFactory> i_pFactory )
@@ -60,8 +62,9 @@ void VFlowNodeRegistry::AddFactory( std::shared_ptr<IFlowNodeFactory> i_pFactory
 
 void VFlowNodeRegistry::Clear()
 {
+  std::vector<std::shared_ptr<IFlowNodeFactory>> Factories;   // destroyed without the lock
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Factories.clear();
+  Factories.swap( m_Factories );
 }
 
 void VHardwareStartEvent::Add( std::function<void()> i_Callback, std::shared_ptr<KVZ::IPostalService> i_pService )
@@ -74,14 +77,9 @@ void VHardwareStartEvent::Add( std::function<void()> i_Callback, std::shared_ptr
       return;
     }
   }
-  if( i_pService )
-  {
-    i_pService->Post( std::move( i_Callback ), 0 );
-  }
-  else
-  {
-    i_Callback();
-  }
+  NotificationSystem::VMultiCallbackPostal<void()> Late;   // a callback that comes too late is treated like the others
+  Late.Add( std::move( i_Callback ), std::move( i_pService ) );
+  Late();
 }
 
 void VHardwareStartEvent::Fire()
@@ -112,14 +110,14 @@ void VHardwareRegistry::UnregisterManager( const std::shared_ptr<IHardwareManage
 void VHardwareRegistry::SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Sections[ i_rSection ].m_Root = i_rPath;
+  m_Sections[i_rSection].m_Root = i_rPath;
 }
 
 void VHardwareRegistry::AddSection( const std::string& i_rSection, VSectionPredicate i_Predicate, int i_SortPosition )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Sections[ i_rSection ].m_Predicate = std::move( i_Predicate );
-  m_Sections[ i_rSection ].m_SortPosition = i_SortPosition;
+  m_Sections[i_rSection].m_Predicate = std::move( i_Predicate );
+  m_Sections[i_rSection].m_SortPosition = i_SortPosition;
 }
 
 void VHardwareRegistry::AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
@@ -150,10 +148,8 @@ std::vector<VHardwareCommand> VHardwareRegistry::GetCommands() const
 void VHardwareRegistry::ReleaseManagers()
 {
   std::vector<std::shared_ptr<IHardwareManager>> Managers;   // destroyed without the lock
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    Managers.swap( m_Managers );
-  }
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  Managers.swap( m_Managers );
 }
 
 }

@@ -85,8 +85,7 @@ struct VHardwareCommand
   std::string m_Shortcut;
 };
 
-class VHardwareRegistry
-  : public StageCorePluginInterface::IHardwareRegistry
+class VHardwareRegistry : public StageCorePluginInterface::IHardwareRegistry
 {
 public:
   void RegisterManager( std::shared_ptr<StageCorePluginInterface::IHardwareManager> i_pManager ) override;

@@ -7,6 +7,7 @@
 #include "host/DataStore.h"
 
 #include <algorithm>
+#include <future>
 
 namespace StageHost
 {
@@ -24,6 +25,14 @@ std::shared_ptr<UtilsMemory::VBalancingAllocator> MakeAllocator( size_t i_Memory
   return pAllocator;
 }
 
+// Everything that was posted before has run.
+void WaitFor( KVZ::IPostalService& i_rService )
+{
+  const auto pReached = std::make_shared<std::promise<void>>();
+  i_rService.Post( [pReached] { pReached->set_value(); } );
+  pReached->get_future().wait();
+}
+
 // On the sync engine's thread.
 void PublishMasterRate( VSyncEngine& i_rEngine, IDataStore& io_rDataStore )
 {
@@ -34,29 +43,26 @@ void PublishMasterRate( VSyncEngine& i_rEngine, IDataStore& io_rDataStore )
 }
 
 VStandAloneHost::VStandAloneHost( const VHostOptions& i_rOptions )
-  : m_pDataStore( std::make_shared<VDataStore>() )
-  , m_pTime( std::make_shared<VMonotonicTime>() )
-  , m_pAllocator( MakeAllocator( i_rOptions.m_MemoryMiB ) )
-  , m_pShutdown( std::make_shared<VShutdownManager>() )
-  , m_pFlowNodes( std::make_shared<VFlowNodeRegistry>() )
-  , m_pParameters( std::make_shared<VParameterRegistry>() )
-  , m_pHardwareStart( std::make_shared<VHardwareStartEvent>() )
-  , m_pHardware( std::make_shared<VHardwareRegistry>() )
-  , m_pTargets( std::make_shared<VCaptureTargets>( m_pDataStore ) )
-  , m_pTriggerService( std::make_shared<VNamedService>( "Trigger" ) )
-  , m_pFirstService( std::make_shared<VNamedService>( "FlowServices" ) )
-  , m_pSecondService( std::make_shared<VNamedService>( "SourceServices" ) )
-  , m_pEngineService( std::make_shared<NotificationSystem::VAsioPostalService>( "Sync Engine" ) )
-  , m_pEngine( std::make_shared<VSyncEngine>( m_pEngineService, std::make_shared<VAsioDelayedCalls>( m_pEngineService ) ) )
+  : m_pDataStore( std::make_shared<VDataStore>() ),
+    m_pTime( std::make_shared<VMonotonicTime>() ),
+    m_pAllocator( MakeAllocator( i_rOptions.m_MemoryMiB ) ),
+    m_pShutdown( std::make_shared<VShutdownManager>() ),
+    m_pFlowNodes( std::make_shared<VFlowNodeRegistry>() ),
+    m_pParameters( std::make_shared<VParameterRegistry>() ),
+    m_pHardwareStart( std::make_shared<VHardwareStartEvent>() ),
+    m_pHardware( std::make_shared<VHardwareRegistry>() ),
+    m_pTargets( std::make_shared<VCaptureTargets>( m_pDataStore ) ),
+    m_pTriggerService( std::make_shared<VNamedService>( "Trigger" ) ),
+    m_pFirstService( std::make_shared<VNamedService>( "FlowServices" ) ),
+    m_pSecondService( std::make_shared<VNamedService>( "SourceServices" ) ),
+    m_pEngineService( std::make_shared<NotificationSystem::VAsioPostalService>( "Sync Engine" ) ),
+    m_pEngine( std::make_shared<VSyncEngine>( m_pEngineService, std::make_shared<VAsioDelayedCalls>( m_pEngineService ) ) )
 {
-  m_pEngine->GetMasterPeriodChangedCallback().AddImmediate(
-    NotificationSystem::BindWeak( m_pEngine, [pDataStore = m_pDataStore]( VSyncEngine& i_rEngine ) { PublishMasterRate( i_rEngine, *pDataStore ); } ) );
+  m_pEngine->GetMasterPeriodChangedCallback().AddImmediate( NotificationSystem::BindWeak( m_pEngine,
+    [pDataStore = m_pDataStore]( VSyncEngine& i_rEngine ) { PublishMasterRate( i_rEngine, *pDataStore ); } ) );
 }
 
-VStandAloneHost::~VStandAloneHost()
-{
-  StopModule();
-}
+VStandAloneHost::~VStandAloneHost() { StopModule(); }
 
 bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rError )
 {
@@ -67,8 +73,8 @@ bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rE
   }
   VHardwareHost Hardware( m_pHardware );
   StageCorePluginInterface::IPlugin& rPlugin = m_pModule->Plugin();
-  const bool bStarted =
-    rPlugin.Initialise( *this ) && rPlugin.RegisterFlowNodeFactories( *m_pFlowNodes ) && rPlugin.RegisterHardware( nullptr, Hardware );
+  const bool bStarted = rPlugin.Initialise( *this ) && rPlugin.RegisterFlowNodeFactories( *m_pFlowNodes ) &&
+    rPlugin.RegisterHardware( nullptr, Hardware );
   if( !bStarted )
   {
     o_rError = "The module \"" + i_rPath + "\" refuses to start.";
@@ -79,7 +85,7 @@ bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rE
   return true;
 }
 
-// The shutdown objects go first: what only they keep ends here. Then every owner of the module's engine lets go.
+// The shutdown objects go first: what nobody owns any more ends there. Then every owner of the module's engine lets go.
 void VStandAloneHost::StopModule()
 {
   m_pShutdown->Shutdown();
@@ -87,11 +93,9 @@ void VStandAloneHost::StopModule()
   m_pFlowNodes->Clear();
   m_pModule.reset();
   m_pParameters->Clear();
+  WaitFor( *m_pEngineService );   // the sync engine may be in the middle of a session with sources that have just been removed
 }
 
-void VStandAloneHost::SetFileFilters( int i_Kind, const std::vector<std::string>& i_rFilters )
-{
-  m_FileFilters[ i_Kind ] = i_rFilters;
-}
+void VStandAloneHost::SetFileFilters( int i_Kind, const std::vector<std::string>& i_rFilters ) { m_FileFilters[i_Kind] = i_rFilters; }
 
 }

@@ -6,6 +6,8 @@
 #include <boost/thread/lock_guard.hpp>
 
 #include <algorithm>
+#include <iterator>
+#include <utility>
 
 namespace StageHost
 {
@@ -38,14 +40,13 @@ void AddReadings( const VStartedSource& i_rSource, KVZ::VTick i_Global, KVZ::ITi
 
 const VStartedSource* VStartedSession::Find( const KVZ::ISource* i_pSource ) const
 {
-  const auto Found =
-    std::find_if( m_Sources.begin(), m_Sources.end(), [&]( const VStartedSource& i_rSource ) { return i_rSource.m_pSource.get() == i_pSource; } );
+  const auto Found = std::find_if( m_Sources.begin(), m_Sources.end(),
+    [&]( const VStartedSource& i_rSource ) { return i_rSource.m_pSource.get() == i_pSource; } );
   return Found == m_Sources.end() ? nullptr : &*Found;
 }
 
 VSyncEngine::VSyncEngine( std::shared_ptr<KVZ::IPostalService> i_pStrand, std::shared_ptr<IDelayedCalls> i_pDelayed )
-  : m_pStrand( std::move( i_pStrand ) )
-  , m_pDelayed( std::move( i_pDelayed ) )
+  : m_pStrand( std::move( i_pStrand ) ), m_pDelayed( std::move( i_pDelayed ) )
 {
 }
 
@@ -53,23 +54,40 @@ void VSyncEngine::AddSource( std::shared_ptr<KVZ::ISource> i_pSource )
 {
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Sources.push_back( i_pSource );
+    m_Sources.push_back( { i_pSource, {} } );
   }
-  i_pSource->Temporal().OnRequestNewGlobalSyncSession().Set( NotificationSystem::BindWeak( weak_from_this(), &VSyncEngine::OnRequest ), m_pStrand );
+  // The pointer only names the source.
+  const auto Answer = [pSource = i_pSource.get()]( VSyncEngine& i_rEngine, KVZ::VGlobalSyncSessionId i_LastDeclared )
+  { i_rEngine.OnRequest( pSource, i_LastDeclared ); };
+  i_pSource->Temporal().OnRequestNewGlobalSyncSession().Set( NotificationSystem::BindWeak( weak_from_this(), Answer ), m_pStrand );
 }
 
 void VSyncEngine::RemoveSource( const std::shared_ptr<KVZ::ISource>& i_pSource )
 {
   i_pSource->Temporal().OnRequestNewGlobalSyncSession().Clear();
+  std::shared_ptr<const VStartedSession> pFormer;   // ends without the lock
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Sources.erase( std::remove( m_Sources.begin(), m_Sources.end(), i_pSource ), m_Sources.end() );
+  std::erase_if( m_Sources, [&]( const VEntry& i_rEntry ) { return i_rEntry.m_pSource == i_pSource; } );
+  TakeRemoved( m_Sources, m_Candidates );
   if( m_pStarted && m_pStarted->Find( i_pSource.get() ) )
   {
     auto pWithout = std::make_shared<VStartedSession>( *m_pStarted );
-    pWithout->m_Sources.erase(
-      pWithout->m_Sources.begin() + ( m_pStarted->Find( i_pSource.get() ) - m_pStarted->m_Sources.data() ) );
-    m_pStarted = std::move( pWithout );
+    TakeRemoved( m_Sources, pWithout->m_Sources );
+    pFormer = std::exchange( m_pStarted, std::move( pWithout ) );
   }
+}
+
+std::vector<VStartedSource> VSyncEngine::TakeRemoved( const std::vector<VEntry>& i_rRegistered, std::vector<VStartedSource>& io_rSources )
+{
+  const auto IsRegistered = [&i_rRegistered]( const VStartedSource& i_rSource )
+  {
+    return std::any_of( i_rRegistered.begin(), i_rRegistered.end(),
+      [&i_rSource]( const VEntry& i_rEntry ) { return i_rEntry.m_pSource == i_rSource.m_pSource; } );
+  };
+  const auto Removed = std::stable_partition( io_rSources.begin(), io_rSources.end(), IsRegistered );
+  std::vector<VStartedSource> Taken( std::make_move_iterator( Removed ), std::make_move_iterator( io_rSources.end() ) );
+  io_rSources.erase( Removed, io_rSources.end() );
+  return Taken;
 }
 
 std::shared_ptr<KVZ::IBaseLineClock> VSyncEngine::GetMasterClock()
@@ -86,61 +104,96 @@ std::shared_ptr<const VStartedSession> VSyncEngine::GetStarted() const
 
 std::vector<std::shared_ptr<KVZ::ISource>> VSyncEngine::GetSources() const
 {
+  std::vector<std::shared_ptr<KVZ::ISource>> Sources;
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_Sources;
+  for( const VEntry& rEntry : m_Sources )
+  {
+    Sources.push_back( rEntry.m_pSource );
+  }
+  return Sources;
 }
 
-// A request that was made before the newest declaration has been answered by it: several at once make one new session.
-void VSyncEngine::OnRequest( KVZ::VGlobalSyncSessionId i_LastDeclared )
+void VSyncEngine::OnRequest( const KVZ::ISource* i_pSource, KVZ::VGlobalSyncSessionId i_LastDeclared )
 {
+  if( IsUnanswered( i_pSource, i_LastDeclared ) )
   {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( i_LastDeclared.Value() < m_NewestId && i_LastDeclared.IsValid() )
-    {
-      return;
-    }
+    Declare();
   }
-  Declare();
+}
+
+// A request that a source made before its newest declaration has been answered by that: several at once make one new session.
+bool VSyncEngine::IsUnanswered( const KVZ::ISource* i_pSource, KVZ::VGlobalSyncSessionId i_LastDeclared ) const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  const auto Found = std::find_if( m_Sources.begin(), m_Sources.end(),
+    [i_pSource]( const VEntry& i_rEntry ) { return i_rEntry.m_pSource.get() == i_pSource; } );
+  return Found != m_Sources.end() && Found->m_LastDeclared <= i_LastDeclared;
+}
+
+std::vector<VSyncEngine::VEntry> VSyncEngine::BeginDeclaration( KVZ::VGlobalSyncSessionId& o_rId, std::shared_ptr<KVZ::IBaseLineClock>& o_rpMaster )
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Newest = KVZ::VGlobalSyncSessionId( m_Newest.Value() + 1 );
+  for( VEntry& rEntry : m_Sources )
+  {
+    rEntry.m_LastDeclared = m_Newest;
+  }
+  o_rId = m_Newest;
+  o_rpMaster = m_pMasterClock;
+  return m_Sources;
 }
 
 void VSyncEngine::Declare()
 {
-  auto pDeclared = std::make_shared<VDeclared>();
+  KVZ::VGlobalSyncSessionId Id;
   std::shared_ptr<KVZ::IBaseLineClock> pMaster;
-  std::vector<std::shared_ptr<KVZ::ISource>> Sources;
+  std::vector<VStartedSource> TakePart;
+  for( const VEntry& rEntry : BeginDeclaration( Id, pMaster ) )
   {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    pDeclared->m_Id = KVZ::VGlobalSyncSessionId( ++m_NewestId );
-    pMaster = m_pMasterClock;
-    Sources = m_Sources;
-  }
-  for( const std::shared_ptr<KVZ::ISource>& pSource : Sources )
-  {
-    if( const auto Session = pSource->Temporal().DeclareGlobalSyncSession( pDeclared->m_Id, pMaster ) )
+    if( const auto Session = rEntry.m_pSource->Temporal().DeclareGlobalSyncSession( Id, pMaster ) )
     {
-      pDeclared->m_Sources.push_back( { pSource, *Session, {} } );
+      TakePart.push_back( { rEntry.m_pSource, *Session, {} } );
     }
   }
-  TryStart( pDeclared, 0 );
+  SetCandidates( Id, std::move( TakePart ) );
+  TryStart( Id, 0 );
 }
 
-bool VSyncEngine::IsNewest( const VDeclared& i_rDeclared ) const
+// Empty where another session has been declared since.
+std::vector<VStartedSource> VSyncEngine::Candidates( KVZ::VGlobalSyncSessionId i_Id ) const
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return i_rDeclared.m_Id.Value() == m_NewestId;
+  return i_Id == m_Newest ? m_Candidates : std::vector<VStartedSource>();
 }
 
-void VSyncEngine::TryStart( const std::shared_ptr<VDeclared>& i_pDeclared, int i_Attempt )
+void VSyncEngine::SetCandidates( KVZ::VGlobalSyncSessionId i_Id, std::vector<VStartedSource> i_Sources )
 {
-  if( !IsNewest( *i_pDeclared ) || i_pDeclared->m_Sources.empty() )
+  std::vector<VStartedSource> Removed;   // end without the lock
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  if( i_Id == m_Newest )
+  {
+    Removed = TakeRemoved( m_Sources, i_Sources );
+    m_Candidates.swap( i_Sources );
+  }
+}
+
+void VSyncEngine::TryStart( KVZ::VGlobalSyncSessionId i_Id, int i_Attempt )
+{
+  const std::vector<VStartedSource> TakePart = Candidates( i_Id );
+  if( TakePart.empty() )
   {
     return;
   }
   std::vector<VTimelineSource> Sources;
-  for( const VStartedSource& rSource : i_pDeclared->m_Sources )
+  std::vector<VStartedSource> Timed;
+  for( const VStartedSource& rSource : TakePart )
   {
     auto Timing = rSource.m_pSource->Temporal().GetSourceTimingInfo();
-    if( Timing && Timing->m_SessionId != rSource.m_Session.m_Id )
+    if( Timing && Timing->m_SessionId == rSource.m_Session.m_Id )
+    {
+      Timed.push_back( rSource );
+    }
+    else
     {
       Timing.reset();
     }
@@ -148,45 +201,43 @@ void VSyncEngine::TryStart( const std::shared_ptr<VDeclared>& i_pDeclared, int i
   }
   if( const auto Timeline = LaySources( Sources ) )
   {
-    StartSession( *i_pDeclared, *Timeline );
+    StartSession( i_Id, TakePart, *Timeline );
   }
   else if( i_Attempt < TimingAttempts )
   {
-    m_pDelayed->CallAfter( TimingRetrySeconds,
-      [pWeak = weak_from_this(), i_pDeclared, i_Attempt] {
-        if( const auto pThis = pWeak.lock() )
-        {
-          pThis->TryStart( i_pDeclared, i_Attempt + 1 );
-        }
-      } );
+    TryLater( i_Id, i_Attempt + 1 );
   }
   else
   {
     // A source that stopped after its first frame must not hold the others back; it asks again with its next session.
-    KVZ_LOG( "SyncEngine", 3, "Global session %1%: not every source has delivery times, going on with those that have.", i_pDeclared->m_Id.Value() );
-    auto pTimed = std::make_shared<VDeclared>();
-    pTimed->m_Id = i_pDeclared->m_Id;
-    for( size_t Index = 0; Index < Sources.size(); ++Index )
-    {
-      if( Sources[ Index ].m_Timing )
-      {
-        pTimed->m_Sources.push_back( i_pDeclared->m_Sources[ Index ] );
-      }
-    }
-    TryStart( pTimed, 0 );
+    KVZ_LOG( "SyncEngine", 3, "Global session %1%: not every source has delivery times, going on with those that have.", i_Id.Value() );
+    SetCandidates( i_Id, std::move( Timed ) );
+    TryStart( i_Id, 0 );
   }
 }
 
-void VSyncEngine::StartSession( const VDeclared& i_rDeclared, const VTimeline& i_rTimeline )
+void VSyncEngine::TryLater( KVZ::VGlobalSyncSessionId i_Id, int i_Attempt )
+{
+  m_pDelayed->CallAfter( TimingRetrySeconds,
+    [pWeak = weak_from_this(), i_Id, i_Attempt]
+    {
+      if( const auto pThis = pWeak.lock() )
+      {
+        pThis->TryStart( i_Id, i_Attempt );
+      }
+    } );
+}
+
+void VSyncEngine::StartSession( KVZ::VGlobalSyncSessionId i_Id, const std::vector<VStartedSource>& i_rSources, const VTimeline& i_rTimeline )
 {
   auto pStarted = std::make_shared<VStartedSession>();
-  pStarted->m_Id = i_rDeclared.m_Id;
+  pStarted->m_Id = i_Id;
   pStarted->m_bByTimecode = i_rTimeline.m_bByTimecode;
-  pStarted->m_Sources = i_rDeclared.m_Sources;
+  pStarted->m_Sources = i_rSources;
   KVZ::ITickInClocks Shared;
   for( size_t Index = 0; Index < pStarted->m_Sources.size(); ++Index )
   {
-    pStarted->m_Sources[ Index ].m_Place = i_rTimeline.m_Sources[ Index ];
+    pStarted->m_Sources[Index].m_Place = i_rTimeline.m_Sources[Index];
   }
   pStarted->m_LiveEdge = NewestTick( pStarted->m_Sources.front() );
   Shared.Set( KVZ::IClock( KVZ::IClock::GlobalTime, 0, 0 ), pStarted->m_LiveEdge );
@@ -207,8 +258,12 @@ void VSyncEngine::StartSession( const VDeclared& i_rDeclared, const VTimeline& i
     rSource.m_pSource->Temporal().StartGlobalSyncSession( Ticks, KVZ::VTick() );
   }
   SetMasterPeriod( pStarted->m_Sources.front().m_Session.m_Period );
+  // Both end without the lock.
+  std::shared_ptr<const VStartedSession> pFormer;
+  std::vector<VStartedSource> Removed;
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_pStarted = std::move( pStarted );
+  Removed = TakeRemoved( m_Sources, pStarted->m_Sources );
+  pFormer = std::exchange( m_pStarted, std::move( pStarted ) );
 }
 
 void VSyncEngine::SetMasterPeriod( KVZ::VTick i_Period )

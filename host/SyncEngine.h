@@ -28,7 +28,7 @@ struct VStartedSource
 struct VStartedSession
 {
   KVZ::VGlobalSyncSessionId m_Id;
-  KVZ::VTick m_LiveEdge;      // global tick at which readers began
+  KVZ::VTick m_LiveEdge;   // global tick at which readers began
   bool m_bByTimecode = false;
   std::vector<VStartedSource> m_Sources;
 
@@ -49,15 +49,14 @@ private:
 };
 
 // The register of sources and the engine over it. Requests are answered on the strand; every operation may be called from any thread.
-class VSyncEngine
-  : public StageCorePluginInterface::ISourceRegistry
-  , public std::enable_shared_from_this<VSyncEngine>
+class VSyncEngine : public StageCorePluginInterface::ISourceRegistry, public std::enable_shared_from_this<VSyncEngine>
 {
 public:
   // The strand runs one call at a time; delayed calls come back on it.
   VSyncEngine( std::shared_ptr<KVZ::IPostalService> i_pStrand, std::shared_ptr<IDelayedCalls> i_pDelayed );
 
   void AddSource( std::shared_ptr<KVZ::ISource> i_pSource ) override;
+  // No new session takes the source up after this; one that is being started on the strand right now may still call it.
   void RemoveSource( const std::shared_ptr<KVZ::ISource>& i_pSource ) override;
   // Empty until the first session has started.
   std::shared_ptr<KVZ::IBaseLineClock> GetMasterClock() override;
@@ -68,18 +67,24 @@ public:
   std::vector<std::shared_ptr<KVZ::ISource>> GetSources() const;
 
 private:
-  struct VDeclared
+  struct VEntry
   {
-    KVZ::VGlobalSyncSessionId m_Id;
-    std::vector<VStartedSource> m_Sources;
+    std::shared_ptr<KVZ::ISource> m_pSource;
+    KVZ::VGlobalSyncSessionId m_LastDeclared;   // to this source; invalid before the first
   };
 
-  void OnRequest( KVZ::VGlobalSyncSessionId i_LastDeclared );
+  void OnRequest( const KVZ::ISource* i_pSource, KVZ::VGlobalSyncSessionId i_LastDeclared );
   void Declare();
-  void TryStart( const std::shared_ptr<VDeclared>& i_pDeclared, int i_Attempt );
-  void StartSession( const VDeclared& i_rDeclared, const VTimeline& i_rTimeline );
+  std::vector<VEntry> BeginDeclaration( KVZ::VGlobalSyncSessionId& o_rId, std::shared_ptr<KVZ::IBaseLineClock>& o_rpMaster );
+  void TryStart( KVZ::VGlobalSyncSessionId i_Id, int i_Attempt );
+  void TryLater( KVZ::VGlobalSyncSessionId i_Id, int i_Attempt );
+  void StartSession( KVZ::VGlobalSyncSessionId i_Id, const std::vector<VStartedSource>& i_rSources, const VTimeline& i_rTimeline );
   void SetMasterPeriod( KVZ::VTick i_Period );
-  bool IsNewest( const VDeclared& i_rDeclared ) const;
+  bool IsUnanswered( const KVZ::ISource* i_pSource, KVZ::VGlobalSyncSessionId i_LastDeclared ) const;
+  std::vector<VStartedSource> Candidates( KVZ::VGlobalSyncSessionId i_Id ) const;
+  void SetCandidates( KVZ::VGlobalSyncSessionId i_Id, std::vector<VStartedSource> i_Sources );
+  // Takes out what is no longer registered, for the caller to let go.
+  static std::vector<VStartedSource> TakeRemoved( const std::vector<VEntry>& i_rRegistered, std::vector<VStartedSource>& io_rSources );
 
   // Fixed after construction
   const std::shared_ptr<KVZ::IPostalService> m_pStrand;
@@ -87,10 +92,11 @@ private:
   NotificationSystem::VMultiCallbackPostal<void()> m_MasterPeriodChanged;
 
   mutable boost::mutex m_Mutex;
-  std::vector<std::shared_ptr<KVZ::ISource>> m_Sources GUARDED_BY( m_Mutex );   // in the order of arrival
+  std::vector<VEntry> m_Sources GUARDED_BY( m_Mutex );              // in the order of arrival
+  std::vector<VStartedSource> m_Candidates GUARDED_BY( m_Mutex );   // what takes part in the newest declaration; no places yet
   std::shared_ptr<const VStartedSession> m_pStarted GUARDED_BY( m_Mutex );
   std::shared_ptr<VMasterClock> m_pMasterClock GUARDED_BY( m_Mutex );
-  uint32_t m_NewestId GUARDED_BY( m_Mutex ) = 0;
+  KVZ::VGlobalSyncSessionId m_Newest GUARDED_BY( m_Mutex );   // declared
 };
 
 }

@@ -47,6 +47,6 @@ public:
 }
 
 // The module's three exports.
-using VCreatePlugin = StageCorePluginInterface::IPlugin* ( * )();
+using VCreatePlugin = StageCorePluginInterface::IPlugin* (*)();
 using VDestroyPlugin = void ( * )( StageCorePluginInterface::IPlugin* );
 using VPluginBuildRevision = unsigned int ( * )();

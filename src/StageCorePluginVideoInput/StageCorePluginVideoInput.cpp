@@ -37,10 +37,7 @@ bool VStageCorePluginVideoInput::Initialise( IStageCoreHost& i_rHost )
   return true;
 }
 
-bool VStageCorePluginVideoInput::RegisterFlowNodeFactories( IFlowNodeRegistry& )
-{
-  return KVZ_ASSERT( m_pEngine != nullptr );
-}
+bool VStageCorePluginVideoInput::RegisterFlowNodeFactories( IFlowNodeRegistry& ) { return KVZ_ASSERT( m_pEngine != nullptr ); }
 
 bool VStageCorePluginVideoInput::RegisterHardware( void*, IHardwareHost& i_rHardware )
 {
@@ -59,7 +56,4 @@ bool VStageCorePluginVideoInput::RegisterHardware( void*, IHardwareHost& i_rHard
   return true;
 }
 
-bool SelectVideoInputSection( const IDataReader&, const VDataPath& i_rPath )
-{
-  return i_rPath.BeginsWith( DeviceSchemas::VideoInput::Path() );
-}
+bool SelectVideoInputSection( const IDataReader&, const VDataPath& i_rPath ) { return i_rPath.BeginsWith( DeviceSchemas::VideoInput::Path() ); }

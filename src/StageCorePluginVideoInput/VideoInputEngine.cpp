@@ -30,6 +30,13 @@ constexpr size_t DeviceShareBytes = 0x10000000;
 constexpr size_t FrameAlignment = 16;
 constexpr int VideoFileKind = 2;
 
+std::shared_ptr<VVideoInputDataSourceAllocator> MakeFrameAllocator( UtilsMemory::VBalancingAllocator& io_rBalancing )
+{
+  const auto pClient = io_rBalancing.MakeClient();
+  pClient->SetShare( DeviceShareBytes / io_rBalancing.GetBlockSize() );
+  return std::make_shared<VVideoInputDataSourceAllocator>( std::make_shared<SyncSystem::VCaptureBufferAllocator>( pClient, FrameAlignment ) );
+}
+
 template<class T>
 void HandOver( IShutdownManager& i_rManager, const std::shared_ptr<T>& i_pObject, const char* i_pFile, int i_Line )
 {
@@ -46,16 +53,14 @@ public:
   ~VImpl() override;
 
   void Start();
-  const std::shared_ptr<VVideoInputDeviceParameterHandler>* FindHandler( const std::string& i_rDeviceURN ) const
-  {
-    return m_ParameterHandlers.Find( i_rDeviceURN );
-  }
+  // Lets the engine's thread finish what has been posted, and ends it. What is posted later never runs.
+  void StopThread() { m_pPostalService->Stop(); }
+  bool StartCapture( const std::string& i_rDeviceURN ) const;
+  bool StopCapture( const std::string& i_rDeviceURN ) const;
 
 private:
-  std::weak_ptr<VImpl> WeakThis() { return std::static_pointer_cast<VImpl>( shared_from_this() ); }
   void StartDrivers() { m_pDeviceManager->StartDiscovery(); }
   void OnDeviceAdded( std::shared_ptr<IVideoInputDevice> i_pDevice );
-  std::shared_ptr<VVideoInputDataSourceAllocator> MakeFrameAllocator();
   std::shared_ptr<VVideoInputDataSource> MakeDataSource( const std::shared_ptr<IVideoInputDevice>& i_pDevice,
     const std::shared_ptr<VVideoInputDataSourceAllocator>& i_pAllocator );
 
@@ -68,15 +73,15 @@ private:
 };
 
 VVideoInputEngine::VImpl::VImpl( IStageCoreHost& i_rHost )
-  : m_pHost( &i_rHost )
-  , m_pPostalService( std::make_shared<NotificationSystem::VAsioPostalService>( "Video Input Engine" ) )
-  , m_pDeviceManager( KVZ::MakeShared<VVideoInputDeviceManager>( Composition::DriverMakers() ) )
+  : m_pHost( &i_rHost ),
+    m_pPostalService( std::make_shared<NotificationSystem::VAsioPostalService>( "Video Input Engine" ) ),
+    m_pDeviceManager( KVZ::MakeShared<VVideoInputDeviceManager>( Composition::DriverMakers() ) )
 {
   const std::shared_ptr<IShutdownManager> pShutdown = m_pHost->GetShutdownManager();
   HandOver( *pShutdown, m_pDeviceManager, __FILE__, __LINE__ );
   m_pHost->SetFileFilters( VideoFileKind, { "*.avi", "*.mov", "*.mp4", "*.tvid", "*.mkv" } );
-  m_pSystemParameterHandler =
-    KVZ::MakeShared<VVideoInputSystemParameterHandler>( m_pPostalService, m_pHost->GetDataStore(), m_pHost->GetParameterRegistry() );
+  m_pSystemParameterHandler = KVZ::MakeShared<VVideoInputSystemParameterHandler>( m_pPostalService, m_pHost->GetDataStore(),
+    m_pHost->GetParameterRegistry() );
   HandOver( *pShutdown, m_pSystemParameterHandler, __FILE__, __LINE__ );
   m_pVideoInputDataSources = std::make_shared<VDeviceUrnMap<std::shared_ptr<VVideoInputDataSource>>>();
 }
@@ -86,7 +91,8 @@ VVideoInputEngine::VImpl::~VImpl()
   std::vector<std::shared_ptr<IVideoInputDevice>> Devices;
   m_pDeviceManager->GetDevices( Devices );
   m_pDeviceManager->Shutdown();
-  // The data sources keep their devices, whose cards go on streaming: without a receiver no frame arrives.
+  // A driver that is announcing a card at this moment ends later than the manager, and its cards go on streaming: without a receiver no frame
+  // arrives.
   for( const std::shared_ptr<IVideoInputDevice>& pDevice : Devices )
   {
     pDevice->SetDataCallback( {} );
@@ -103,15 +109,17 @@ VVideoInputEngine::VImpl::~VImpl()
 
 void VVideoInputEngine::VImpl::Start()
 {
-  m_pDeviceManager->GetDeviceAddedCallback().Add( NotificationSystem::BindWeak( WeakThis(), &VImpl::OnDeviceAdded ), m_pPostalService );
-  m_pHost->GetHardwareStartEvent()->Add( NotificationSystem::BindWeak( WeakThis(), &VImpl::StartDrivers ), {} );
+  m_pDeviceManager->GetDeviceAddedCallback().Add( NotificationSystem::BindWeak( KVZ::WeakFrom( this ), &VImpl::OnDeviceAdded ), m_pPostalService );
+  m_pHost->GetHardwareStartEvent()->Add( NotificationSystem::BindWeak( KVZ::WeakFrom( this ), &VImpl::StartDrivers ), {} );
 }
 
 // Engine's thread. The device gets its receiver and allocator last, when all that a first frame can touch is in place.
 void VVideoInputEngine::VImpl::OnDeviceAdded( std::shared_ptr<IVideoInputDevice> i_pDevice )
 {
   const std::string URN = i_pDevice->GetDeviceURN();
-  const std::shared_ptr<VVideoInputDataSourceAllocator> pAllocator = MakeFrameAllocator();
+  const std::shared_ptr<UtilsMemory::VBalancingAllocator> pBalancing = m_pHost->GetBalancingAllocator();
+  const auto pHeldBack = pBalancing->MakeClient();   // takes part in the balance until the device is wired
+  const std::shared_ptr<VVideoInputDataSourceAllocator> pAllocator = MakeFrameAllocator( *pBalancing );
   const std::shared_ptr<VVideoInputDataSource> pSource = MakeDataSource( i_pDevice, pAllocator );
   const std::shared_ptr<ISourceRegistry> pSources = m_pHost->GetSourceRegistry();
 
@@ -122,15 +130,6 @@ void VVideoInputEngine::VImpl::OnDeviceAdded( std::shared_ptr<IVideoInputDevice>
   m_pVideoInputDataSources->Insert( URN, pSource );
   i_pDevice->SetDataCallback( pSource );
   i_pDevice->SetAllocator( pAllocator );
-}
-
-std::shared_ptr<VVideoInputDataSourceAllocator> VVideoInputEngine::VImpl::MakeFrameAllocator()
-{
-  const std::shared_ptr<UtilsMemory::VBalancingAllocator> pBalancing = m_pHost->GetBalancingAllocator();
-  const auto pFirstClient = pBalancing->MakeClient();   // takes part in the balance while the device's own client is made
-  const auto pClient = pBalancing->MakeClient();
-  pClient->SetShare( DeviceShareBytes / pBalancing->GetBlockSize() );
-  return std::make_shared<VVideoInputDataSourceAllocator>( std::make_shared<SyncSystem::VCaptureBufferAllocator>( pClient, FrameAlignment ) );
 }
 
 std::shared_ptr<VVideoInputDataSource> VVideoInputEngine::VImpl::MakeDataSource( const std::shared_ptr<IVideoInputDevice>& i_pDevice,
@@ -147,27 +146,28 @@ std::shared_ptr<VVideoInputDataSource> VVideoInputEngine::VImpl::MakeDataSource(
     m_pHost->GetSecondSourceService(), m_pHost->GetCaptureTargetService(), m_pHost->GetTimeService(), Options );
 }
 
-VVideoInputEngine::VVideoInputEngine( IStageCoreHost& i_rHost )
-  : m_pImpl( KVZ::MakeShared<VImpl>( i_rHost ) )
+bool VVideoInputEngine::VImpl::StartCapture( const std::string& i_rDeviceURN ) const
+{
+  const auto* pHandler = m_ParameterHandlers.Find( i_rDeviceURN );
+  return pHandler && ( *pHandler )->StartCapture();
+}
+
+bool VVideoInputEngine::VImpl::StopCapture( const std::string& i_rDeviceURN ) const
+{
+  const auto* pHandler = m_ParameterHandlers.Find( i_rDeviceURN );
+  return pHandler && ( *pHandler )->StopCapture();
+}
+
+VVideoInputEngine::VVideoInputEngine( IStageCoreHost& i_rHost ) : m_pImpl( KVZ::MakeShared<VImpl>( i_rHost ) )
 {
   HandOver( *i_rHost.GetShutdownManager(), m_pImpl, __FILE__, __LINE__ );
 }
 
-VVideoInputEngine::~VVideoInputEngine() = default;
+// An arrival that runs now owns the implementation too. It must not end with that call, on the engine's thread, when the host has gone.
+VVideoInputEngine::~VVideoInputEngine() { m_pImpl->StopThread(); }
 
-void VVideoInputEngine::Start()
-{
-  m_pImpl->Start();
-}
+void VVideoInputEngine::Start() { m_pImpl->Start(); }
 
-bool VVideoInputEngine::StartCapture( const std::string& i_rDeviceURN )
-{
-  const auto* pHandler = m_pImpl->FindHandler( i_rDeviceURN );
-  return pHandler && ( *pHandler )->StartCapture();
-}
+bool VVideoInputEngine::StartCapture( const std::string& i_rDeviceURN ) { return m_pImpl->StartCapture( i_rDeviceURN ); }
 
-bool VVideoInputEngine::StopCapture( const std::string& i_rDeviceURN )
-{
-  const auto* pHandler = m_pImpl->FindHandler( i_rDeviceURN );
-  return pHandler && ( *pHandler )->StopCapture();
-}
+bool VVideoInputEngine::StopCapture( const std::string& i_rDeviceURN ) { return m_pImpl->StopCapture( i_rDeviceURN ); }

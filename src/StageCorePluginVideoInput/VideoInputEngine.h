@@ -17,6 +17,7 @@ class VVideoInputEngine : public StageCorePluginInterface::IHardwareManager
 public:
   // Builds everything and hands the shutdown objects to the host, the engine's own last. The host object must outlive the engine.
   explicit VVideoInputEngine( StageCorePluginInterface::IStageCoreHost& i_rHost );
+  // Waits until the engine's thread has run all that was posted and has ended.
   ~VVideoInputEngine() override;
 
   void OnSystemStarted() override {}
@@ -26,7 +27,8 @@ public:
   // Subscribes to device arrival and to the host's start of hardware. Nothing looks for hardware before the host fires that event.
   void Start();
 
-  // Of one device's capture from the card. False for an unknown URN, which is not reported, and where the device refuses.
+  // Capture of one device from its card. False for an unknown URN, which is not reported, and where the device refuses. Not while devices
+  // are arriving: the table of devices changes on the engine's thread and has no lock.
   bool StartCapture( const std::string& i_rDeviceURN );
   bool StopCapture( const std::string& i_rDeviceURN );
 

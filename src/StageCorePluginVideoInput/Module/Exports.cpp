@@ -4,19 +4,9 @@
 extern "C"
 {
 
-StageCorePluginInterface::IPlugin* CreatePlugin()
-{
-  return new VStageCorePluginVideoInput;
-}
+  StageCorePluginInterface::IPlugin* CreatePlugin() { return new VStageCorePluginVideoInput; }
 
-void DestroyPlugin( StageCorePluginInterface::IPlugin* i_pPlugin )
-{
-  delete i_pPlugin;
-}
+  void DestroyPlugin( StageCorePluginInterface::IPlugin* i_pPlugin ) { delete i_pPlugin; }
 
-unsigned int PluginBuildRevision()
-{
-  return 120364;
-}
-
+  unsigned int PluginBuildRevision() { return 120364; }
 }

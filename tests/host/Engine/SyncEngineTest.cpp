@@ -85,6 +85,8 @@ TEST_F( SyncEngineTest, SeveralRequestsAtOnceMakeOneSession )
   pFirst->SetNewest( 2 );
   pSecond->SetNewest( 2 );
   m_pStrand->RunAll();
+  EXPECT_EQ( ( std::vector<uint32_t>{ 1 } ), pFirst->m_Declared );   // the very first requests included
+  EXPECT_EQ( 2u, m_pEngine->GetStarted()->m_Sources.size() );
   const uint32_t Newest = m_pEngine->GetStarted()->m_Id.Value();
 
   pFirst->BeginSession( 101.0, OneHour * 2 );
@@ -94,6 +96,44 @@ TEST_F( SyncEngineTest, SeveralRequestsAtOnceMakeOneSession )
   m_pStrand->RunAll();
   EXPECT_EQ( Newest + 1, m_pEngine->GetStarted()->m_Id.Value() );
   EXPECT_EQ( 2u, m_pEngine->GetStarted()->m_Sources.size() );
+}
+
+TEST_F( SyncEngineTest, ASourceThatComesLaterJoinsTheOthers )
+{
+  const auto pFirst = Add( "vi:0", Period25 );
+  pFirst->BeginSession( 100.0, OneHour );
+  pFirst->SetNewest( 2 );
+  m_pStrand->RunAll();
+  const auto pLate = Add( "vi:1", Period25 );
+  pLate->BeginSession( 101.0, OneHour + KVZ::SecondsToTick135( 1 ) );
+  pLate->SetNewest( 2 );
+  m_pStrand->RunAll();
+  ASSERT_EQ( 2u, m_pEngine->GetStarted()->m_Sources.size() );
+  EXPECT_EQ( 2, pFirst->m_Started );
+  EXPECT_EQ( 1, pLate->m_Started );
+}
+
+// A module that ends takes its sources out, and none of them may be called any more.
+TEST_F( SyncEngineTest, ASourceThatIsRemovedWhileItsSessionWaitsIsLetGo )
+{
+  const auto pStays = Add( "vi:0", Period25 );
+  auto pLeaves = Add( "vi:1", Period25 );
+  pStays->BeginSession( 100.0, OneHour );
+  pLeaves->BeginSession( 100.0 );   // no second frame: the start waits
+  pStays->SetNewest( 2 );
+  m_pStrand->RunAll();
+  ASSERT_EQ( 1u, m_pDelays->Count() );
+
+  pLeaves->BeginSession( 101.0 );   // its request is under way
+  m_pEngine->RemoveSource( pLeaves );
+  const std::weak_ptr<VFakeSource> pGone = pLeaves;
+  pLeaves.reset();
+  EXPECT_TRUE( pGone.expired() );
+  m_pStrand->RunAll();
+  m_pDelays->RunAll();
+  ASSERT_TRUE( m_pEngine->GetStarted() );
+  EXPECT_EQ( 1u, m_pEngine->GetStarted()->m_Sources.size() );
+  EXPECT_EQ( ( std::vector<uint32_t>{ 1 } ), pStays->m_Declared );
 }
 
 TEST_F( SyncEngineTest, ReadersBeginAtTheLiveEdge )

@@ -1,0 +1,378 @@
+// The engine between a fake host and virtual cards that are stepped by hand. The thread that steps is the vendor's thread.
+#include "StageCorePluginVideoInput/VideoInputEngine.h"
+
+#include "Core/VideoInterface/Schemas.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
+#include "StageCoreDataStoreTypes/DeviceSchemas.h"
+#include "cards/common/VirtualCardControl.h"
+#include "tests/support/FakeHost.h"
+#include "tests/support/LogCapture.h"
+
+#include <boost/thread/thread.hpp>
+#include <gtest/gtest.h>
+
+#include <dlfcn.h>
+
+#include <atomic>
+#include <future>
+#include <stdexcept>
+
+namespace
+{
+
+using KVZ::IVideoStandard;
+using TestSupport::VFakeHost;
+using EStatus = VideoInputHAL::IVideoInputDevice::EStatus;
+using VTexts = std::vector<std::string>;
+
+const std::string EngineThread = "Video Input Engine0";
+
+// Loaded before anybody looks for the vendor's library, which is then this one: it has the same file name.
+VirtualCards::IVirtualCardControl& Control()
+{
+  static VirtualCards::IVirtualCardControl* const s_pControl = []
+  {
+    void* const pLibrary = dlopen( VIRTUAL_DECKLINK_LIBRARY, RTLD_NOW | RTLD_GLOBAL );
+    void* const pFunction = pLibrary ? dlsym( pLibrary, VirtualCards::GetVirtualCardControlName ) : nullptr;
+    return pFunction ? reinterpret_cast<VirtualCards::GetVirtualCardControlFunction*>( pFunction )() : nullptr;
+  }();
+  return *s_pControl;
+}
+
+class VideoInputEngine : public ::testing::Test
+{
+protected:
+  void SetUp() override
+  {
+    ASSERT_NE( &Control(), nullptr );
+    m_pHost = std::make_unique<VFakeHost>();
+  }
+  // What came from the card has gone back when engine and host have ended.
+  void TearDown() override
+  {
+    End();
+    for( const VirtualCards::VCardId Card : m_Cards )
+    {
+      Control().RemoveCard( Card );
+    }
+    EXPECT_EQ( Control().ReferencesHeld(), 0 );
+    EXPECT_EQ( Control().ReleaseErrors(), 0 );
+  }
+
+  void Make() { m_pEngine = std::make_unique<VVideoInputEngine>( *m_pHost ); }
+  void MakeAndStart()
+  {
+    Make();
+    m_pEngine->Start();
+  }
+  // As a host ends a module that it has started: nothing waits in between.
+  void End()
+  {
+    m_pEngine.reset();
+    if( m_pHost )
+    {
+      const auto Sources = m_pHost->m_pSources->AllSources();
+      m_pHost->m_pShutdown->Shutdown();
+      m_pHost.reset();
+      VFakeHost::WaitForEnd( Sources );
+    }
+  }
+  VirtualCards::VCardId AddCard()
+  {
+    std::string Error;
+    m_Cards.push_back( Control().AddCard( "decklink:standard=SD_720_576I_5000", { .m_bManualClock = true }, Error ) );
+    EXPECT_EQ( Error, "" );
+    return m_Cards.back();
+  }
+  void WaitFor( const std::string& i_rText )
+  {
+    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->m_pHappenings->Has( i_rText ); } );
+  }
+  // Every device is enabled unless somebody has said otherwise: it starts as soon as it is wired.
+  void WaitForStatus( const std::string& i_rURN, EStatus::Enum i_Status )
+  {
+    const VDataPath Path = DeviceSchemas::VideoInput::Status( DeviceSchemas::VideoInput::Path( i_rURN ) );
+    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->Setting<EStatus::Enum>( Path ) == i_Status; } );
+  }
+  // The device has found its signal, and the source begins a session with the next frame.
+  void WaitForSignal( const std::string& i_rURN )
+  {
+    const auto pSource = m_pHost->m_pSources->Find( i_rURN );
+    m_pHost->m_pHappenings->WaitUntil( [&] { return pSource->Temporal().GetSourceSyncStatus().m_bEnabled; } );
+  }
+  void StartCard( VirtualCards::VCardId i_Card, const std::string& i_rURN )
+  {
+    WaitForStatus( i_rURN, EStatus::ECapturing );
+    EXPECT_TRUE( Control().Step( i_Card, 1 ) );
+    WaitForSignal( i_rURN );
+  }
+  // Of the present session.
+  uint64_t FramesOf( const std::string& i_rURN )
+  {
+    const auto Status = m_pHost->m_pSources->Find( i_rURN )->Temporal().GetSourceSyncStatus();
+    return Status.m_Session.m_Id == 0 ? 0 : Status.m_LatestCounterFrames + 1;
+  }
+  // Frames that the card has handed to its client.
+  static uint64_t Delivered( VirtualCards::VCardId i_Card )
+  {
+    VirtualCards::VCardCounters Counters;
+    Control().GetCounters( i_Card, Counters );
+    return Counters.m_FramesDelivered;
+  }
+  VTexts Sources( const std::string& i_rVerb ) const
+  {
+    VTexts Found;
+    for( const std::string& rText : m_pHost->m_pHappenings->Texts() )
+    {
+      if( rText.rfind( i_rVerb, 0 ) == 0 )
+      {
+        Found.push_back( rText );
+      }
+    }
+    return Found;
+  }
+
+  std::unique_ptr<VFakeHost> m_pHost;
+  std::unique_ptr<VVideoInputEngine> m_pEngine;
+  std::vector<VirtualCards::VCardId> m_Cards;
+};
+
+TEST_F( VideoInputEngine, IsBuiltInOrderAndHandsItsOwnShutdownObjectOverLast )
+{
+  Make();
+  EXPECT_EQ( m_pHost->m_pHappenings->Texts(),
+    ( VTexts{ "AddShutdownObject VVideoInputDeviceManager", "SetFileFilters 2 *.avi *.mov *.mp4 *.tvid *.mkv", "AddParameterGroup System.VideoInput",
+      "AddShutdownObject VVideoInputSystemParameterHandler", "AddShutdownObject VVideoInputEngine" } ) );
+  EXPECT_TRUE( m_pHost->m_pParameters->GetGroups().front()->GetParameters().empty() );
+}
+
+TEST_F( VideoInputEngine, ShutdownObjectsOfALivingEngineEndNothing )
+{
+  AddCard();
+  MakeAndStart();
+  m_pHost->m_pShutdown->Shutdown();
+  EXPECT_TRUE( Sources( "Remove" ).empty() );
+  m_pHost->m_pHardwareStart->Fire();
+  WaitFor( "AddSource vi:0" );
+}
+
+TEST_F( VideoInputEngine, WithoutCardsNothingComesAndNothingGoes )
+{
+  MakeAndStart();
+  m_pHost->m_pHardwareStart->Fire();
+  EXPECT_FALSE( m_pEngine->StartCapture( "vi:0" ) );
+  EXPECT_FALSE( m_pEngine->StopCapture( "vi:0" ) );
+  m_pHost->m_pHappenings->Clear();
+  m_pEngine.reset();
+  EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "RemoveParameterGroup System.VideoInput" } ) );
+}
+
+TEST_F( VideoInputEngine, LooksForHardwareWhenTheHostSaysSo )
+{
+  AddCard();
+  MakeAndStart();
+  const int64_t WithoutCards = Control().ReferencesHeld();
+  m_pHost->m_pHardwareStart->Fire();
+  EXPECT_GT( Control().ReferencesHeld(), WithoutCards );
+  WaitFor( "AddSource vi:0" );
+}
+
+TEST_F( VideoInputEngine, AStartOfHardwareAfterItsEndDoesNothing )
+{
+  AddCard();
+  MakeAndStart();
+  m_pEngine.reset();
+  m_pHost->m_pHardwareStart->Fire();
+  EXPECT_EQ( Control().ReferencesHeld(), 0 );
+}
+
+TEST_F( VideoInputEngine, WiresADeviceOnItsOwnThreadAndRegistersItsSourceLast )
+{
+  AddCard();
+  m_pHost->m_pSources->m_OnAdd = [&]( const std::string& i_rName )
+  {
+    EXPECT_EQ( i_rName, "vi:0" );
+    EXPECT_TRUE( m_pHost->m_pHappenings->Has( "AddParameterGroup VideoInput.vi:0" ) );
+    EXPECT_EQ( m_pHost->m_pParameters->GetGroups().size(), 2u );
+  };
+  MakeAndStart();
+  m_pHost->m_pHappenings->Clear();
+  m_pHost->m_pHardwareStart->Fire();   // finds the card on this thread
+  WaitFor( "AddSource vi:0" );
+  EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "AddParameterGroup VideoInput.vi:0", "AddSource vi:0" } ) );
+  EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "AddParameterGroup VideoInput.vi:0" ), EngineThread );
+  EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "AddSource vi:0" ), EngineThread );
+}
+
+TEST_F( VideoInputEngine, FramesReachTheSourceOnceTheSignalIsThere )
+{
+  const auto Card = AddCard();
+  MakeAndStart();
+  m_pHost->m_pHardwareStart->Fire();
+  StartCard( Card, "vi:0" );
+  Control().Step( Card, 6 );
+  EXPECT_EQ( FramesOf( "vi:0" ), 6u );
+
+  EXPECT_TRUE( m_pEngine->StopCapture( "vi:0" ) );
+  Control().Step( Card, 3 );
+  EXPECT_EQ( FramesOf( "vi:0" ), 6u );
+  EXPECT_TRUE( m_pEngine->StartCapture( "vi:0" ) );
+  Control().Step( Card, 2 );
+  EXPECT_FALSE( m_pEngine->StartCapture( "vi:1" ) );
+}
+
+TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )
+{
+  AddCard();
+  MakeAndStart();
+  m_pHost->m_pHardwareStart->Fire();
+  AddCard();
+  AddCard();
+  WaitFor( "AddSource vi:2" );
+  WaitForStatus( "vi:2", EStatus::ECapturing );
+  m_pEngine.reset();
+  EXPECT_EQ( Sources( "AddSource" ), ( VTexts{ "AddSource vi:0", "AddSource vi:1", "AddSource vi:2" } ) );
+  EXPECT_EQ( Sources( "RemoveSource" ), ( VTexts{ "RemoveSource vi:0", "RemoveSource vi:1", "RemoveSource vi:2" } ) );
+  EXPECT_TRUE( m_pHost->m_pParameters->GetGroups().empty() );
+  // Handlers go before sources, the system's parameters after them.
+  const VTexts All = m_pHost->m_pHappenings->Texts();
+  const VTexts Ends( All.end() - 7, All.end() );
+  EXPECT_EQ( Ends.front(), "RemoveParameterGroup VideoInput.vi:0" );
+  EXPECT_EQ( Ends[3], "RemoveSource vi:0" );
+  EXPECT_EQ( Ends.back(), "RemoveParameterGroup System.VideoInput" );
+}
+
+TEST_F( VideoInputEngine, NoFrameComesAnyMoreWhenSourcesAreTakenOut )
+{
+  const auto Card = AddCard();
+  m_pHost->m_pSources->m_OnRemove = [&]( const std::string& )
+  {
+    const uint64_t Before = Delivered( Card );
+    EXPECT_TRUE( Control().Step( Card, 3 ) );
+    EXPECT_EQ( Delivered( Card ), Before );
+  };
+  MakeAndStart();
+  m_pHost->m_pHardwareStart->Fire();
+  StartCard( Card, "vi:0" );
+  m_pEngine.reset();
+  EXPECT_TRUE( m_pHost->m_pHappenings->Has( "RemoveSource vi:0" ) );
+}
+
+TEST_F( VideoInputEngine, ADeviceThatTheHostRefusesCostsThatDeviceOnly )
+{
+  TestSupport::VLogCapture Log( "NotificationSystem", 2 );
+  m_pHost->m_pSources->m_OnAdd = []( const std::string& i_rName )
+  {
+    if( i_rName == "vi:0" )
+    {
+      throw std::runtime_error( "no room" );
+    }
+  };
+  AddCard();
+  AddCard();
+  MakeAndStart();
+  m_pHost->m_pHardwareStart->Fire();
+  WaitFor( "AddSource vi:1" );
+  m_pEngine.reset();
+  EXPECT_EQ( Log.Texts(), ( VTexts{ "A posted function ended with an exception: no room" } ) );
+  EXPECT_EQ( Sources( "RemoveSource" ), ( VTexts{ "RemoveSource vi:1" } ) );
+}
+
+TEST_F( VideoInputEngine, MayEndInMidStream )
+{
+  for( int Round = 0; Round < 5; ++Round )
+  {
+    SCOPED_TRACE( Round );
+    SetUp();
+    const auto Card = AddCard();
+    MakeAndStart();
+    m_pHost->m_pHardwareStart->Fire();
+    StartCard( Card, "vi:0" );
+    std::promise<void> Streaming;
+    std::atomic<bool> bEnd{ false };
+    boost::thread Vendor(
+      [&]
+      {
+        Control().Step( Card, 1 );
+        Streaming.set_value();
+        while( !bEnd )
+        {
+          Control().Step( Card, 1 );
+        }
+      } );
+    Streaming.get_future().wait();
+    End();
+    const uint64_t AtEnd = Delivered( Card );
+    bEnd = true;
+    Vendor.join();
+    Control().Step( Card, 2 );
+    EXPECT_EQ( Delivered( Card ), AtEnd );
+    TearDown();
+    m_Cards.clear();
+  }
+}
+
+// The arrival owns the engine's insides while it runs. They must end with the engine all the same, on the host's thread: afterwards there
+// is no host any more.
+TEST_F( VideoInputEngine, MayEndWhileADeviceArrives )
+{
+  AddCard();
+  for( int Round = 0; Round < 10; ++Round )
+  {
+    SCOPED_TRACE( Round );
+    m_pHost = std::make_unique<VFakeHost>();
+    std::promise<void> Reached;
+    std::promise<void> Opened;
+    m_pHost->m_OnGetAllocator = [&]
+    {
+      Reached.set_value();
+      Opened.get_future().wait();
+    };
+    MakeAndStart();
+    m_pHost->m_pHardwareStart->Fire();
+    Reached.get_future().wait();
+    const auto pSources = m_pHost->m_pSources;
+    std::promise<void> Ending;
+    std::atomic<bool> bEnded{ false };
+    boost::thread Host(
+      [&]
+      {
+        DebugServices::SetThreadName( "Host" );
+        Ending.set_value();
+        m_pEngine.reset();
+        bEnded = true;
+        EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "RemoveSource vi:0" ), "Host" );
+        End();
+      } );
+    Ending.get_future().wait();
+    EXPECT_FALSE( bEnded );   // it has to wait for the arrival
+    Opened.set_value();
+    Host.join();
+    EXPECT_EQ( pSources->Find( "vi:0" ), nullptr );
+  }
+}
+
+// A card comes while the engine ends: it is wired or not, but never left behind.
+TEST_F( VideoInputEngine, MayEndWhileCardsAreAnnounced )
+{
+  for( int Round = 0; Round < 10; ++Round )
+  {
+    SCOPED_TRACE( Round );
+    SetUp();
+    MakeAndStart();
+    m_pHost->m_pHardwareStart->Fire();
+    boost::thread Vendor( [&] { AddCard(); } );
+    if( Round % 2 == 0 )
+    {
+      WaitFor( "AddSource vi:0" );
+    }
+    m_pEngine.reset();
+    EXPECT_EQ( Sources( "RemoveSource" ).size(), Sources( "AddSource" ).size() );
+    EXPECT_TRUE( m_pHost->m_pParameters->GetGroups().empty() );
+    Vendor.join();
+    TearDown();
+    m_Cards.clear();
+  }
+}
+
+}

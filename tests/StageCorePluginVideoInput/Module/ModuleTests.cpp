@@ -1,0 +1,76 @@
+// The module file as a host finds it: three exports and what they promise.
+#include "host/ModuleLoader.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <dlfcn.h>
+#include <set>
+#include <string>
+
+namespace
+{
+
+// What the dynamic symbol table offers to others.
+std::set<std::string> ExportsOf( const std::string& i_rPath )
+{
+  std::set<std::string> Names;
+  FILE* const pOutput = popen( ( "nm -D --defined-only --format=posix '" + i_rPath + "'" ).c_str(), "r" );
+  char Line[4096];
+  while( pOutput && std::fgets( Line, sizeof( Line ), pOutput ) )
+  {
+    const std::string Text = Line;
+    Names.insert( Text.substr( 0, Text.find( ' ' ) ) );
+  }
+  if( pOutput )
+  {
+    pclose( pOutput );
+  }
+  return Names;
+}
+
+template<class T>
+T Export( const char* i_pName )
+{
+  void* const pModule = dlopen( VIDEO_INPUT_MODULE, RTLD_NOW | RTLD_LOCAL );
+  return pModule ? reinterpret_cast<T>( dlsym( pModule, i_pName ) ) : nullptr;
+}
+
+TEST( Module, ExportsThreeNamesAndNothingElse )
+{
+  EXPECT_EQ( ExportsOf( VIDEO_INPUT_MODULE ), ( std::set<std::string>{ "CreatePlugin", "DestroyPlugin", "PluginBuildRevision" } ) );
+}
+
+TEST( Module, ALoadedModuleThatIsNeverInitialisedEndsQuietly )
+{
+  std::string Error;
+  const auto pModule = StageHost::VLoadedModule::Load( VIDEO_INPUT_MODULE, Error );
+  ASSERT_TRUE( pModule ) << Error;
+  EXPECT_EQ( pModule->BuildRevision(), 120364u );
+  EXPECT_EQ( pModule->Plugin().GetDisplayName(), "" );
+  EXPECT_EQ( pModule->Plugin().GetVersionText(), "" );
+  EXPECT_TRUE( pModule->Plugin().RegisterTypes() );
+  EXPECT_TRUE( pModule->Plugin().RegisterCommands() );
+  EXPECT_TRUE( pModule->Plugin().RegisterViews() );
+  EXPECT_TRUE( pModule->Plugin().PostInitialise() );
+  pModule->Plugin().OnHostReady();
+  pModule->Plugin().OnHostClosing();
+}
+
+TEST( Module, DestroysNothingWhereThereIsNothing )
+{
+  const auto pDestroy = Export<VDestroyPlugin>( "DestroyPlugin" );
+  ASSERT_TRUE( pDestroy );
+  pDestroy( nullptr );
+}
+
+TEST( Module, AFileThatIsNoModuleIsRefusedWithTheReason )
+{
+  std::string Error;
+  EXPECT_FALSE( StageHost::VLoadedModule::Load( "/nowhere/Some.tpm", Error ) );
+  EXPECT_NE( Error.find( "/nowhere/Some.tpm" ), std::string::npos );
+  EXPECT_FALSE( StageHost::VLoadedModule::Load( "libm.so.6", Error ) );
+  EXPECT_EQ( Error, "\"libm.so.6\" is no module: it must export CreatePlugin, DestroyPlugin and PluginBuildRevision." );
+}
+
+}
