@@ -156,6 +156,14 @@ bool VDataSource::IsDrainingAfterExhaustion()
   return false;
 }
 
+// The newest frame's place, also where that frame has been evicted already; before the session's first frame when it has none.
+VToken VDataSource::NewestPosition() const
+{
+  VToken Position = m_pBuffer->GetNextToken();
+  --Position.m_FrameNumber;
+  return Position;
+}
+
 // Delivery thread, from inside an allocation: a frame's data or its entry cannot be had, and eviction could not help. Frames of a device that
 // finds no memory never arrive here, and its frame count does not show them: the next frame must not seem to follow the last one.
 void VDataSource::OnMemoryExhausted()
@@ -168,10 +176,8 @@ void VDataSource::OnMemoryExhausted()
     VCaptureEnd End;
     End.m_Failure = ECaptureFailure::MemoryExhausted;
     End.m_bRequested = false;
-    if( m_pBuffer->GetNewestToken( End.m_End ) )
-    {
-      m_pBuffer->SetCaptureEnd( Status.m_CaptureSessionId, End );
-    }
+    End.m_End = NewestPosition();
+    m_pBuffer->SetCaptureEnd( Status.m_CaptureSessionId, End );
   }
   m_pBuffer->RequestNewBufferSession();
 }

@@ -186,6 +186,7 @@ private:
   // Frames
   void Store( VFrameEntry* i_pEntry, const VIncomingFrame& i_rFrame, uint32_t i_SessionBefore );
   bool IsDrainingAfterExhaustion();
+  VToken NewestPosition() const;
   void OnMemoryExhausted();
   void OnNewSyncSession( uint32_t i_SessionId );
   void WakeReader();

@@ -108,6 +108,10 @@ bool VDataSource::Prepare( const VCaptureCall& i_rCall, const VInfoPtr& i_pInfo,
   {
     m_PreparedCapture = io_rRequest.m_Id;
     bReady = BeginCapture( i_rCall.m_Header, i_pInfo, i_rCall.m_Options, io_rRequest.m_Errors );
+    if( !bReady )
+    {
+      m_PreparedCapture = {};   // another try with this id prepares anew
+    }
   }
   if( !bReady || !io_rRequest.m_Errors.empty() )
   {
@@ -194,11 +198,14 @@ void VDataSource::EndCapture( VTick i_End )
   {
     End.m_End = LastBefore( *Capture.m_pInfo, i_End );
   }
-  else if( !m_pBuffer->GetNewestToken( End.m_End ) )
+  else
   {
-    return;   // the session has just begun anew, and with it the capture has ended
+    End.m_End = NewestPosition();
   }
-  m_pBuffer->SetCaptureEnd( Capture.m_Id, End );
+  if( !m_pBuffer->SetCaptureEnd( Capture.m_Id, End ) )
+  {
+    return;   // it is over, or a new session has ended it
+  }
 
   VTick EndTick = i_End;
   if( i_End.IsOpen() && !Capture.m_pInfo->TickAt( End.m_End, EndTick ) )

@@ -3,6 +3,8 @@
 
 #include "StageCoreRuntime/DebugServices.h"
 
+#include <utility>
+
 namespace SyncSystem
 {
 
@@ -51,7 +53,8 @@ bool VTimeBasedCaptureBuffer::ForceNewSyncSession( const VFrameTiming& i_rTiming
 {
   if( i_rTiming.m_Period < KVZ::VTick( 1 ) || !IsCounter( i_rTiming.m_CounterClock ) ) return false;
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  CheckSession( i_rTiming, { .m_bForceSyncSession = true } );
+  // A buffer session that was asked for begins here, not again with the first frame.
+  CheckSession( i_rTiming, { .m_bForceBufferSession = std::exchange( m_bBufferSessionRequested, false ), .m_bForceSyncSession = true } );
   VSyncSessionRecord& rNewest = NewestUnlocked();
   rNewest.m_LatestClocks = KVZ::Shifted( i_rTiming.m_Clocks, -i_rTiming.m_Period );
   RemoveCounters( rNewest.m_LatestClocks );

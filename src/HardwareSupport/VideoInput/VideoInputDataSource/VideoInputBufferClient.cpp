@@ -9,6 +9,7 @@
 #include <boost/thread/lock_guard.hpp>
 
 #include <algorithm>
+#include <exception>
 #include <utility>
 
 namespace VideoInputHAL
@@ -122,7 +123,7 @@ void VVideoInputBufferClient::TakeFrame( VNews& o_rNews )
   {
     return;
   }
-  if( Frame && !WriteFrame( Frame, o_rNews ) )
+  if( Frame && !TryWriteFrame( Frame, o_rNews ) )
   {
     CloseFiles( o_rNews );
     m_bEnded = true;
@@ -141,6 +142,20 @@ void VVideoInputBufferClient::TakeFrame( VNews& o_rNews )
     CloseFiles( o_rNews );
     LogEnd( "Client %1% cancelled after writing %2% seconds of data." );
     m_bEnded = true;
+  }
+}
+
+// Memory that runs out outside of a writer ends the capture as any other failure does.
+bool VVideoInputBufferClient::TryWriteFrame( const VRefCountedToken& i_rFrame, VNews& o_rNews )
+{
+  try
+  {
+    return WriteFrame( i_rFrame, o_rNews );
+  }
+  catch( const std::exception& i_rException )
+  {
+    o_rNews.m_Failure = std::string( "A frame could not be prepared for its files: " ) + i_rException.what();
+    return false;
   }
 }
 

@@ -77,6 +77,7 @@ private:
 
   void WriteFrames();
   void TakeFrame( VNews& o_rNews ) REQUIRES( m_Mutex );
+  bool TryWriteFrame( const SyncSystem::VRefCountedToken& i_rFrame, VNews& o_rNews ) REQUIRES( m_Mutex );
   bool WriteFrame( const SyncSystem::VRefCountedToken& i_rFrame, VNews& o_rNews ) REQUIRES( m_Mutex );
   bool Begin( const VFrameView& i_rFrame, VNews& o_rNews ) REQUIRES( m_Mutex );
   bool CreateFiles( VNews& o_rNews ) REQUIRES( m_Mutex );
