@@ -12,7 +12,8 @@
 namespace DataGuards
 {
 
-template<class TInterface> class VReadOperations : public TInterface
+template<class TInterface>
+class VReadOperations : public TInterface
 {
 public:
   using TInterface::GetDataStore;
@@ -79,7 +80,8 @@ protected:
   IDataStore* m_pDataStore;
 };
 
-template<class TBase> class VVerifyReadOperations : public TBase
+template<class TBase>
+class VVerifyReadOperations : public TBase
 {
 public:
   bool GetProposedValue( const VDataAddress& i_rAddress, KVZ::Variant& o_rValue ) const override
@@ -95,7 +97,8 @@ protected:
   using TBase::TBase;
 };
 
-template<class TBase> class VWriteOperations : public TBase
+template<class TBase>
+class VWriteOperations : public TBase
 {
 public:
   using TBase::GetDataStore;
@@ -118,7 +121,8 @@ protected:
   using TBase::TBase;
 };
 
-template<class TBase> class VVerifyWriteOperations : public TBase
+template<class TBase>
+class VVerifyWriteOperations : public TBase
 {
 public:
   bool SetProposedValue( const VDataAddress& i_rAddress, const KVZ::Variant& i_rValue ) override
@@ -134,7 +138,8 @@ protected:
   using TBase::TBase;
 };
 
-template<class TOperations> class VReadGuard : public TOperations
+template<class TOperations>
+class VReadGuard : public TOperations
 {
 protected:
   explicit VReadGuard( IDataStore& i_rDataStore ) : TOperations( &i_rDataStore )
@@ -153,7 +158,8 @@ protected:
   }
 };
 
-template<class TOperations> class VWriteGuard : public TOperations
+template<class TOperations>
+class VWriteGuard : public TOperations
 {
 protected:
   explicit VWriteGuard( IDataStore& i_rDataStore ) : TOperations( &i_rDataStore )

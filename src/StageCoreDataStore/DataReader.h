@@ -31,7 +31,8 @@ protected:
 };
 
 // False, with the output left alone, where there is no value of this type.
-template<class T> bool GetTyped( const IDataReader& i_rReader, const VDataAddress& i_rAddress, T& o_rValue )
+template<class T>
+bool GetTyped( const IDataReader& i_rReader, const VDataAddress& i_rAddress, T& o_rValue )
 {
   return i_rReader.GetValue( i_rAddress ).Get( o_rValue );
 }

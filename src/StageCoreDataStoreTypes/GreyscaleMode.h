@@ -21,7 +21,8 @@ public:
 
 }
 
-template<> struct KVZ::VSchemaOf<CoreTarvoTypesUtils::EGreyscaleMode::Enum>
+template<>
+struct KVZ::VSchemaOf<CoreTarvoTypesUtils::EGreyscaleMode::Enum>
 {
   static const ISchema* Get();
 };

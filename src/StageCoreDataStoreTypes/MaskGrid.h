@@ -15,11 +15,13 @@ struct VMaskGrid
   bool operator==( const VMaskGrid& ) const = default;
 };
 
-template<> struct KVZ::VSchemaOf<VMaskGrid>
+template<>
+struct KVZ::VSchemaOf<VMaskGrid>
 {
   static const ISchema* Get();
 
-  template<class TRecord, class TVisitor> static void Visit( TRecord& i_rRecord, TVisitor& i_rVisitor )
+  template<class TRecord, class TVisitor>
+  static void Visit( TRecord& i_rRecord, TVisitor& i_rVisitor )
   {
     i_rVisitor( i_rRecord.m_DeviceURN );
     i_rVisitor( i_rRecord.m_TileSizeX );

@@ -45,8 +45,8 @@ void VDeviceParameterHandler::CreateParameters()
 
   VParameter& rEnabled = AddParameter<bool>( DeviceSchemas::Enabled( rDevice ), EnabledText, VerifyRequired );
   const bool bSaved = rEnabled.HasValue();
-  rEnabled.SubscribeProposedValue(
-    NotificationSystem::BindWeak( KVZ::WeakFrom( this ), &VDeviceParameterHandler::OnEnabledChanged ), PostalService() );
+  rEnabled.SubscribeProposedValue( NotificationSystem::BindWeak( KVZ::WeakFrom( this ), &VDeviceParameterHandler::OnEnabledChanged ),
+    PostalService() );
   rEnabled.SetValueDefault( Variant::Make( true ) );
   if( bSaved )
   {
