@@ -37,7 +37,8 @@ std::string FilePath( const VCaptureTarget& i_rTarget )
 // A name as one component of a path.
 std::string FileNamePart( std::string i_Text )
 {
-  std::replace_if( i_Text.begin(), i_Text.end(),
+  std::replace_if(
+    i_Text.begin(), i_Text.end(),
     []( char i_Character ) { return i_Character == '/' || i_Character == ':' || static_cast<unsigned char>( i_Character ) < 0x20; }, '-' );
   return i_Text;
 }
@@ -55,10 +56,7 @@ std::string MakeDeviceLabel( const std::string& i_rDeviceURN, const std::string&
   return Label;
 }
 
-VCaptureTargets::VCaptureTargets( std::shared_ptr<IDataStore> i_pDataStore )
-  : m_pDataStore( std::move( i_pDataStore ) )
-{
-}
+VCaptureTargets::VCaptureTargets( std::shared_ptr<IDataStore> i_pDataStore ) : m_pDataStore( std::move( i_pDataStore ) ) {}
 
 void VCaptureTargets::Configure( VCaptureTargetOptions i_Options )
 {
@@ -112,7 +110,8 @@ std::string VCaptureTargets::WhyRefused( const VCaptureTarget& i_rTarget ) const
   return {};
 }
 
-bool VCaptureTargets::GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std::string& i_rDeviceURN, int32_t i_Container, VCaptureTarget& o_rTarget )
+bool VCaptureTargets::GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std::string& i_rDeviceURN, int32_t i_Container,
+  VCaptureTarget& o_rTarget )
 {
   VCaptureTarget Target = MakeTarget( i_rHeader.m_Name, i_rDeviceURN, i_Container );
   const std::string Refusal = WhyRefused( Target );
@@ -138,10 +137,7 @@ std::string VCaptureTargets::WhyRefused( const std::string& i_rName, const std::
   return {};
 }
 
-void VCaptureTargets::GetFolderAliases( std::vector<std::string>& o_rAliases )
-{
-  o_rAliases = { "Default" };
-}
+void VCaptureTargets::GetFolderAliases( std::vector<std::string>& o_rAliases ) { o_rAliases = { "Default" }; }
 
 void VCaptureTargets::OnFileFinished( const VCaptureFileReport& i_rReport )
 {

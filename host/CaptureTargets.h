@@ -17,9 +17,9 @@ namespace StageHost
 
 struct VCaptureTargetOptions
 {
-  std::string m_Folder;                       // where the alias "Default" leads
-  bool m_bOverwrite = false;                  // an existing file is never replaced otherwise
-  uint32_t m_AudioChannels = 0xFFFFFFFFu;     // to keep; all ones keeps what was captured
+  std::string m_Folder;                     // where the alias "Default" leads
+  bool m_bOverwrite = false;                // an existing file is never replaced otherwise
+  uint32_t m_AudioChannels = 0xFFFFFFFFu;   // to keep; all ones keeps what was captured
 };
 
 // What a device is called in file names: the user's name for it, or its URN without the colon.

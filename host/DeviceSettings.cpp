@@ -82,8 +82,8 @@ std::string WhatIsAccepted( const VSettingInfo& i_rSetting, const IParameter& i_
   }
   if( !i_rSetting.m_Minimum.empty() || !i_rSetting.m_Maximum.empty() )
   {
-    return "it takes values from " + ( i_rSetting.m_Minimum.empty() ? "any" : i_rSetting.m_Minimum ) + " to "
-      + ( i_rSetting.m_Maximum.empty() ? "any" : i_rSetting.m_Maximum );
+    return "it takes values from " + ( i_rSetting.m_Minimum.empty() ? "any" : i_rSetting.m_Minimum ) + " to " +
+      ( i_rSetting.m_Maximum.empty() ? "any" : i_rSetting.m_Maximum );
   }
   return "it takes a value of the type " + i_rParameter.GetSchema()->Name();
 }
@@ -91,8 +91,7 @@ std::string WhatIsAccepted( const VSettingInfo& i_rSetting, const IParameter& i_
 }
 
 VDeviceSettings::VDeviceSettings( std::shared_ptr<IDataStore> i_pDataStore, const VParameterRegistry& i_rRegistry )
-  : m_pDataStore( std::move( i_pDataStore ) )
-  , m_rRegistry( i_rRegistry )
+  : m_pDataStore( std::move( i_pDataStore ) ), m_rRegistry( i_rRegistry )
 {
 }
 
@@ -181,11 +180,13 @@ std::vector<VDeviceInfo> VDeviceSettings::GetDevices() const
 
 VDeviceInfo VDeviceSettings::DescribeDevice( const IParameterGroup& i_rGroup, const std::string& i_rURN ) const
 {
-  const auto Text = [&]( const char* i_pKey ) {
+  const auto Text = [&]( const char* i_pKey )
+  {
     const auto pParameter = i_rGroup.GetParameter( std::string_view( i_pKey ) );
     return pParameter ? ValueText( *pParameter ) : std::string();
   };
-  const auto Choices = [&]( const char* i_pKey ) {
+  const auto Choices = [&]( const char* i_pKey )
+  {
     const auto pParameter = i_rGroup.GetParameter( std::string_view( i_pKey ) );
     return pParameter ? Labels( *pParameter ) : std::vector<std::string>();
   };

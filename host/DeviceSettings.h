@@ -22,17 +22,17 @@ namespace StageHost
 struct VDeviceInfo
 {
   std::string m_URN;
-  std::string m_Name;         // of the device
+  std::string m_Name;   // of the device
   std::string m_Driver;
-  std::string m_Standard;     // "Unspecified" without a signal
+  std::string m_Standard;   // "Unspecified" without a signal
   std::string m_Status;
-  std::string m_Timecode;     // "Receiving 25 fps" or "Not Detected"
+  std::string m_Timecode;   // "Receiving 25 fps" or "Not Detected"
   std::string m_PixelFormat;
   std::vector<std::string> m_PixelFormats;
   std::string m_AudioFormat;
   std::string m_AudioChannels;
   std::vector<std::string> m_AudioChannelCounts;
-  std::string m_Label;        // the user's name for the device, or the URN without its colon
+  std::string m_Label;   // the user's name for the device, or the URN without its colon
   std::vector<std::string> m_Warnings;
 
   bool HasSignal() const { return m_Standard != "Unspecified"; }
@@ -40,12 +40,12 @@ struct VDeviceInfo
 
 struct VSettingInfo
 {
-  std::string m_Path;         // "VideoInput.vi:0.Settings.Enabled"
-  std::string m_Value;        // empty where it has none
+  std::string m_Path;    // "VideoInput.vi:0.Settings.Enabled"
+  std::string m_Value;   // empty where it has none
   std::string m_Display;
   std::string m_Description;
   std::string m_Category;
-  std::string m_Minimum;      // empty where there is none
+  std::string m_Minimum;   // empty where there is none
   std::string m_Maximum;
   std::vector<std::string> m_Allowed;   // labels, empty where everything is
   bool m_bReadOnly = false;

@@ -8,16 +8,11 @@ namespace StageHost
 {
 
 VLoadedModule::VLoadedModule( StageCorePluginInterface::IPlugin* i_pPlugin, VDestroyPlugin i_pDestroy, unsigned int i_BuildRevision )
-  : m_pPlugin( i_pPlugin )
-  , m_pDestroy( i_pDestroy )
-  , m_BuildRevision( i_BuildRevision )
+  : m_pPlugin( i_pPlugin ), m_pDestroy( i_pDestroy ), m_BuildRevision( i_BuildRevision )
 {
 }
 
-VLoadedModule::~VLoadedModule()
-{
-  m_pDestroy( m_pPlugin );
-}
+VLoadedModule::~VLoadedModule() { m_pDestroy( m_pPlugin ); }
 
 std::unique_ptr<VLoadedModule> VLoadedModule::Load( const std::string& i_rPath, std::string& o_rError )
 {
@@ -38,9 +33,6 @@ std::unique_ptr<VLoadedModule> VLoadedModule::Load( const std::string& i_rPath, 
   return std::unique_ptr<VLoadedModule>( new VLoadedModule( pCreate(), pDestroy, pRevision() ) );
 }
 
-std::string ProgramFolder()
-{
-  return boost::filesystem::read_symlink( "/proc/self/exe" ).parent_path().string();
-}
+std::string ProgramFolder() { return boost::filesystem::read_symlink( "/proc/self/exe" ).parent_path().string(); }
 
 }

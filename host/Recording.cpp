@@ -23,10 +23,7 @@ constexpr uint32_t FailureEndMoved = 2;
 constexpr uint32_t FailureMemory = 4;
 constexpr uint32_t FailureErrors = 8;
 
-int64_t CeilDivide( int64_t i_Value, int64_t i_By )
-{
-  return i_Value >= 0 ? ( i_Value + i_By - 1 ) / i_By : -( -i_Value / i_By );
-}
+int64_t CeilDivide( int64_t i_Value, int64_t i_By ) { return i_Value >= 0 ? ( i_Value + i_By - 1 ) / i_By : -( -i_Value / i_By ); }
 
 KVZ::VCaptureSessionId NextCaptureId()
 {
@@ -50,23 +47,18 @@ uint64_t FramesOf( KVZ::VTick i_Duration, KVZ::VTick i_Period )
   return i_Duration.IsOpen() || i_Duration.Count() <= 0 ? 0 : static_cast<uint64_t>( i_Duration.Count() / i_Period.Count() );
 }
 
-uint64_t LessOrZero( uint64_t i_A, uint64_t i_B )
-{
-  return i_A > i_B ? i_A - i_B : 0;
-}
+uint64_t LessOrZero( uint64_t i_A, uint64_t i_B ) { return i_A > i_B ? i_A - i_B : 0; }
 
 }
 
 bool VDeviceOutcome::HasFailed() const
 {
-  return ( m_Status.m_Failure & ( FailureStart | FailureErrors ) ) != 0 || m_Files.empty()
-    || std::any_of( m_Files.begin(), m_Files.end(), []( const auto& i_rFile ) { return i_rFile.m_bFailed; } );
+  return ( m_Status.m_Failure & ( FailureStart | FailureErrors ) ) != 0 || m_Files.empty() ||
+    std::any_of( m_Files.begin(), m_Files.end(), []( const auto& i_rFile ) { return i_rFile.m_bFailed; } );
 }
 
 VRecording::VRecording( VSyncEngine& i_rEngine, VCaptureTargets& i_rTargets, StageCorePluginInterface::ITimeService& i_rTime )
-  : m_rEngine( i_rEngine )
-  , m_rTargets( i_rTargets )
-  , m_rTime( i_rTime )
+  : m_rEngine( i_rEngine ), m_rTargets( i_rTargets ), m_rTime( i_rTime )
 {
 }
 
@@ -88,8 +80,8 @@ const VStartedSource* VRecording::FindReady( const VStartedSession& i_rSession, 
 bool VRecording::IsReady( const VRecordingRequest& i_rRequest ) const
 {
   const auto pSession = m_rEngine.GetStarted();
-  return pSession
-    && std::all_of( i_rRequest.m_DeviceURNs.begin(), i_rRequest.m_DeviceURNs.end(),
+  return pSession &&
+    std::all_of( i_rRequest.m_DeviceURNs.begin(), i_rRequest.m_DeviceURNs.end(),
       [&]( const std::string& i_rURN ) { return FindReady( *pSession, i_rURN, i_rRequest.m_PreRoll ) != nullptr; } );
 }
 
@@ -184,7 +176,8 @@ void VRecording::PollDevice( VDevice& io_rDevice )
 void VRecording::CountArrivals( VDevice& io_rDevice, const KVZ::ISourceTemporal::ISourceSyncStatus& i_rSync )
 {
   const bool bSameSession = i_rSync.m_Session.m_Id == io_rDevice.m_Sync.m_Session.m_Id;
-  io_rDevice.m_Arrived += bSameSession ? LessOrZero( i_rSync.m_LatestCounterFrames, io_rDevice.m_Sync.m_LatestCounterFrames ) : i_rSync.m_LatestCounterFrames + 1;
+  io_rDevice.m_Arrived += bSameSession ? LessOrZero( i_rSync.m_LatestCounterFrames, io_rDevice.m_Sync.m_LatestCounterFrames )
+                                       : i_rSync.m_LatestCounterFrames + 1;
 }
 
 void VRecording::EndStalled( VDevice& io_rDevice, double i_Now )
@@ -252,7 +245,9 @@ VDeviceOutcome VRecording::MakeOutcome( const VDevice& i_rDevice ) const
   if( !Outcome.m_Files.empty() )
   {
     Outcome.m_FramesWritten = std::min_element( Outcome.m_Files.begin(), Outcome.m_Files.end(),
-      []( const auto& i_rA, const auto& i_rB ) { return i_rA.m_FramesWritten < i_rB.m_FramesWritten; } )->m_FramesWritten;
+      []( const auto& i_rA, const auto& i_rB ) {
+        return i_rA.m_FramesWritten < i_rB.m_FramesWritten;
+      } )->m_FramesWritten;
   }
 
   const uint64_t Missing = LessOrZero( Outcome.m_FramesRequested, Outcome.m_FramesCaptured );

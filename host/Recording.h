@@ -21,9 +21,9 @@ namespace StageHost
 struct VRecordingRequest
 {
   std::vector<std::string> m_DeviceURNs;
-  boost::optional<uint64_t> m_Frames;     // so many of each device, or
-  KVZ::VTick m_Duration;                  // all within this span
-  KVZ::VTick m_PreRoll;                   // how far before the request the range begins
+  boost::optional<uint64_t> m_Frames;   // so many of each device, or
+  KVZ::VTick m_Duration;                // all within this span
+  KVZ::VTick m_PreRoll;                 // how far before the request the range begins
   std::string m_Name;
 };
 
@@ -41,13 +41,13 @@ struct VDeviceOutcome
 {
   std::string m_DeviceURN;
   uint64_t m_FramesRequested = 0;
-  uint64_t m_FramesCaptured = 0;    // while it runs, as the last poll has seen it
-  uint64_t m_FramesWritten = 0;     // of the file with the fewest
+  uint64_t m_FramesCaptured = 0;   // while it runs, as the last poll has seen it
+  uint64_t m_FramesWritten = 0;    // of the file with the fewest
   VLostFrames m_Lost;
   KVZ::ICaptureStatus m_Status;
   KVZ::VTick m_Period;
-  double m_PeakFill = 0.0;          // 0 to 1; a buffer keeps old frames, so full is its usual state
-  uint64_t m_PeakBacklog = 0;       // frames captured and not yet written, at most
+  double m_PeakFill = 0.0;      // 0 to 1; a buffer keeps old frames, so full is its usual state
+  uint64_t m_PeakBacklog = 0;   // frames captured and not yet written, at most
   boost::optional<KVZ::ISourceTemporal::ISourceTimingInfo> m_Timing;
   std::vector<StageCorePluginInterface::VCaptureFileReport> m_Files;
 
@@ -78,14 +78,14 @@ private:
   {
     std::shared_ptr<KVZ::ISource> m_pSource;
     KVZ::VCaptureSessionId m_CaptureId;
-    KVZ::VTick m_Start;             // of the range asked for
+    KVZ::VTick m_Start;   // of the range asked for
     uint64_t m_FramesRequested = 0;
     KVZ::VTick m_Period;
     uint64_t m_DroppedAtStart = 0;
-    uint64_t m_Dropped = 0;         // by the card, since the start and before the capture's end
-    uint64_t m_Arrived = 0;         // frames of the range so far, as the polls have seen them
-    uint64_t m_NewestFrame = 0;     // progress of delivery, for stalls
-    double m_LastProgress = 0.0;    // seconds
+    uint64_t m_Dropped = 0;        // by the card, since the start and before the capture's end
+    uint64_t m_Arrived = 0;        // frames of the range so far, as the polls have seen them
+    uint64_t m_NewestFrame = 0;    // progress of delivery, for stalls
+    double m_LastProgress = 0.0;   // seconds
     KVZ::ICaptureStatus m_Status;
     KVZ::ISourceTemporal::ISourceSyncStatus m_Sync;
     double m_PeakFill = 0.0;

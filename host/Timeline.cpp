@@ -8,10 +8,7 @@ namespace StageHost
 namespace
 {
 
-KVZ::VTick Distance( KVZ::VTick i_A, KVZ::VTick i_B )
-{
-  return i_A < i_B ? i_B - i_A : i_A - i_B;
-}
+KVZ::VTick Distance( KVZ::VTick i_A, KVZ::VTick i_B ) { return i_A < i_B ? i_B - i_A : i_A - i_B; }
 
 }
 
@@ -29,8 +26,8 @@ const KVZ::IClock* FindSharedTimecode( const KVZ::ISourceSyncSession& i_rSession
 
 boost::optional<VTimeline> LaySources( const std::vector<VTimelineSource>& i_rSources )
 {
-  const auto Reference =
-    std::find_if( i_rSources.begin(), i_rSources.end(), []( const VTimelineSource& i_rSource ) { return FindSharedTimecode( i_rSource.m_Session ); } );
+  const auto Reference = std::find_if( i_rSources.begin(), i_rSources.end(),
+    []( const VTimelineSource& i_rSource ) { return FindSharedTimecode( i_rSource.m_Session ); } );
 
   VTimeline Timeline;
   Timeline.m_bByTimecode = Reference != i_rSources.end();
@@ -47,8 +44,8 @@ boost::optional<VTimeline> LaySources( const std::vector<VTimelineSource>& i_rSo
   KVZ::VTick HostToGlobal;
   if( Timeline.m_bByTimecode )
   {
-    HostToGlobal = Reference->m_Session.m_StartTime.Find( *FindSharedTimecode( Reference->m_Session ) )
-      - KVZ::VTick::FromSeconds( Reference->m_Timing->m_StartTime );
+    HostToGlobal = Reference->m_Session.m_StartTime.Find( *FindSharedTimecode( Reference->m_Session ) ) -
+      KVZ::VTick::FromSeconds( Reference->m_Timing->m_StartTime );
   }
   for( const VTimelineSource& rSource : i_rSources )
   {

@@ -60,7 +60,7 @@ VirtualCards::IVirtualCardControl* VVirtualCards::Load( const std::string& i_rKi
       o_rError = "The virtual cards of \"" + Path + "\" cannot be loaded: " + dlerror();
       return nullptr;
     }
-    return m_Controls[ i_rKind ] = pGet();
+    return m_Controls[i_rKind] = pGet();
   }
   o_rError = "card \"" + i_rKind + "\": there is no such kind of virtual card; there are: " + AvailableKinds();
   return nullptr;

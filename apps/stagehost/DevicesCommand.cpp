@@ -26,10 +26,7 @@ struct VOptions
   bool m_bJson = false;
 };
 
-nlohmann::ordered_json ToNumber( const std::string& i_rText )
-{
-  return nlohmann::ordered_json( std::strtoul( i_rText.c_str(), nullptr, 10 ) );
-}
+nlohmann::ordered_json ToNumber( const std::string& i_rText ) { return nlohmann::ordered_json( std::strtoul( i_rText.c_str(), nullptr, 10 ) ); }
 
 nlohmann::ordered_json ToJson( const VDeviceInfo& i_rDevice )
 {
@@ -49,9 +46,9 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
   VTextTable Table( { "URN", "NAME", "DRIVER", "STANDARD", "SIGNAL", "TIMECODE", "PIXEL FORMATS", "CHANNELS" } );
   for( const VDeviceInfo& rDevice : i_rDevices )
   {
-    Table.AddRow( { rDevice.m_URN, rDevice.m_Name, rDevice.m_Driver, rDevice.HasSignal() ? rDevice.m_Standard : "-",
-      rDevice.HasSignal() ? "yes" : "no", rDevice.m_Timecode, JoinTexts( rDevice.m_PixelFormats, " " ),
-      JoinTexts( rDevice.m_AudioChannelCounts, " " ) } );
+    Table.AddRow(
+      { rDevice.m_URN, rDevice.m_Name, rDevice.m_Driver, rDevice.HasSignal() ? rDevice.m_Standard : "-", rDevice.HasSignal() ? "yes" : "no",
+        rDevice.m_Timecode, JoinTexts( rDevice.m_PixelFormats, " " ), JoinTexts( rDevice.m_AudioChannelCounts, " " ) } );
   }
   std::cout << Table.ToText();
   for( const VDeviceInfo& rDevice : i_rDevices )
@@ -67,7 +64,8 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
 void WaitForRate( VHostSession& i_rSession )
 {
   const double Until = i_rSession.Host().Time().Now() + RateSeconds;
-  const auto HasWarnings = [&] {
+  const auto HasWarnings = [&]
+  {
     const auto Devices = i_rSession.Settings().GetDevices();
     return std::any_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return !i_rDevice.m_Warnings.empty(); } );
   };

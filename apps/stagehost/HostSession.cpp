@@ -42,10 +42,7 @@ std::string JoinURNs( const std::vector<VDeviceInfo>& i_rDevices )
 
 }
 
-void Complain( const std::string& i_rText )
-{
-  std::fprintf( stderr, "stagehost: %s\n", i_rText.c_str() );
-}
+void Complain( const std::string& i_rText ) { std::fprintf( stderr, "stagehost: %s\n", i_rText.c_str() ); }
 
 void AddSessionOptions( CLI::App& io_rCommand, VSessionOptions& io_rOptions )
 {
@@ -102,8 +99,7 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
 {
   const double Begin = m_pHost->Time().Now();
   std::vector<VDeviceInfo> Devices;
-  do
-  {
+  do {
     Devices = m_pSettings->GetDevices();
     const double Waited = m_pHost->Time().Now() - Begin;
     const bool bAllThere = m_Cards.Count() > 0 ? Devices.size() >= m_Cards.Count() : !Devices.empty() && Waited > ArrivalSeconds;
@@ -144,7 +140,4 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
   return Devices;
 }
 
-int VHostSession::ExitWithoutDevices()
-{
-  return IsInterrupted() ? ExitFailed : ExitNoDevice;
-}
+int VHostSession::ExitWithoutDevices() { return IsInterrupted() ? ExitFailed : ExitNoDevice; }

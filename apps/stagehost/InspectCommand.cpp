@@ -33,7 +33,8 @@ struct VOptions
 nlohmann::ordered_json ValueOf( const KVZ::IVideoAttributes& i_rAttributes, const std::string& i_rKey )
 {
   nlohmann::ordered_json Json;
-  const auto Try = [&]( auto i_Value ) {
+  const auto Try = [&]( auto i_Value )
+  {
     if( !i_rAttributes.Get( i_rKey, i_Value ) )
     {
       return false;
@@ -48,8 +49,8 @@ nlohmann::ordered_json ValueOf( const KVZ::IVideoAttributes& i_rAttributes, cons
     }
     return true;
   };
-  (void)( Try( false ) || Try( char() ) || Try( int16_t() ) || Try( int32_t() ) || Try( int64_t() ) || Try( uint8_t() ) || Try( uint16_t() )
-    || Try( uint32_t() ) || Try( uint64_t() ) || Try( float() ) || Try( double() ) || Try( std::string() ) );
+  (void)( Try( false ) || Try( char() ) || Try( int16_t() ) || Try( int32_t() ) || Try( int64_t() ) || Try( uint8_t() ) || Try( uint16_t() ) ||
+    Try( uint32_t() ) || Try( uint64_t() ) || Try( float() ) || Try( double() ) || Try( std::string() ) );
   return Json;
 }
 
@@ -58,7 +59,7 @@ nlohmann::ordered_json ToJson( const KVZ::IVideoAttributes& i_rAttributes )
   nlohmann::ordered_json Json = nlohmann::ordered_json::object();
   for( const auto& rEntry : i_rAttributes.Values() )
   {
-    Json[ rEntry.first ] = ValueOf( i_rAttributes, rEntry.first );
+    Json[rEntry.first] = ValueOf( i_rAttributes, rEntry.first );
   }
   return Json;
 }
@@ -80,7 +81,7 @@ bool Checksum( VReader& io_rReader, const TarvoVideo::VExtent& i_rExtent, uint32
 
 std::string Hex( uint32_t i_Value )
 {
-  char Text[ 16 ];
+  char Text[16];
   std::snprintf( Text, sizeof( Text ), "%08x", i_Value );
   return Text;
 }
@@ -98,16 +99,16 @@ std::string RateText( const VReader& i_rReader )
   {
     return {};
   }
-  char Text[ 64 ];
+  char Text[64];
   std::snprintf( Text, sizeof( Text ), ", %.3f frames a second", static_cast<double>( Timing.m_TicksPerSecond ) / Timing.m_FramePeriodInTicks );
   return Text;
 }
 
 std::string AudioText( const KVZ::AudioFrameInfo& i_rAudio )
 {
-  return i_rAudio.HasAudio()
-    ? KVZ::ToName( i_rAudio.m_SampleFormat ) + ", " + std::to_string( i_rAudio.m_SampleRate ) + " Hz, " + std::to_string( i_rAudio.m_Channels ) + " channels"
-    : "none";
+  return i_rAudio.HasAudio() ? KVZ::ToName( i_rAudio.m_SampleFormat ) + ", " + std::to_string( i_rAudio.m_SampleRate ) + " Hz, " +
+      std::to_string( i_rAudio.m_Channels ) + " channels"
+                             : "none";
 }
 
 // The head of the report. False with an error in the reader.
@@ -120,7 +121,8 @@ bool PrintSummary( VReader& io_rReader, const VOptions& i_rOptions )
   }
   const KVZ::VideoFrameInfo& rVideo = io_rReader.GetVideoInfo();
   std::cout << "file        " << i_rOptions.m_Path << "  (" << BytesToText( io_rReader.GetFileSize() ) << ")\n"
-            << "finished    " << ( io_rReader.IsFinished() ? "yes" : "no: it was never closed; these are the whole frame records found in it" ) << "\n"
+            << "finished    " << ( io_rReader.IsFinished() ? "yes" : "no: it was never closed; these are the whole frame records found in it" )
+            << "\n"
             << "frames      " << Frames << RateText( io_rReader ) << "\n"
             << "video       " << rVideo.m_ImageWidth << " x " << rVideo.m_ImageHeight << ", " << KVZ::ToName( rVideo.m_PixelFormat ) << "\n"
             << "audio       " << AudioText( io_rReader.GetAudioInfo() ) << "\n";
@@ -141,8 +143,8 @@ bool PrintSummary( VReader& io_rReader, const VOptions& i_rOptions )
 
 bool ReadRow( VReader& io_rReader, VFrameRow& o_rRow )
 {
-  return io_rReader.Next( o_rRow.m_Record ) && Checksum( io_rReader, o_rRow.m_Record.m_Video, o_rRow.m_VideoCrc )
-    && Checksum( io_rReader, o_rRow.m_Record.m_Audio, o_rRow.m_AudioCrc );
+  return io_rReader.Next( o_rRow.m_Record ) && Checksum( io_rReader, o_rRow.m_Record.m_Video, o_rRow.m_VideoCrc ) &&
+    Checksum( io_rReader, o_rRow.m_Record.m_Audio, o_rRow.m_AudioCrc );
 }
 
 void PrintRows( VReader& io_rReader )
@@ -151,10 +153,10 @@ void PrintRows( VReader& io_rReader )
   VFrameRow Row;
   while( !IsInterrupted() && ReadRow( io_rReader, Row ) )
   {
-    char Line[ 128 ];
+    char Line[128];
     std::snprintf( Line, sizeof( Line ), "%10llu %14llu %12llu  %08x %12llu  %08x\n", static_cast<unsigned long long>( Row.m_Record.m_Key ),
-      static_cast<unsigned long long>( Row.m_Record.m_Video.m_Position ), static_cast<unsigned long long>( Row.m_Record.m_Video.m_Size ), Row.m_VideoCrc,
-      static_cast<unsigned long long>( Row.m_Record.m_Audio.m_Size ), Row.m_AudioCrc );
+      static_cast<unsigned long long>( Row.m_Record.m_Video.m_Position ), static_cast<unsigned long long>( Row.m_Record.m_Video.m_Size ),
+      Row.m_VideoCrc, static_cast<unsigned long long>( Row.m_Record.m_Audio.m_Size ), Row.m_AudioCrc );
     std::cout << Line;
   }
 }
@@ -167,19 +169,21 @@ bool PrintJson( VReader& io_rReader, const VOptions& i_rOptions )
     return false;
   }
   nlohmann::ordered_json Json = { { "path", i_rOptions.m_Path }, { "bytes", io_rReader.GetFileSize() }, { "finished", io_rReader.IsFinished() },
-    { "frame_count", Frames }, { "internal", ToJson( io_rReader.GetInternalAttributes() ) }, { "external", ToJson( io_rReader.GetExternalAttributes() ) } };
+    { "frame_count", Frames }, { "internal", ToJson( io_rReader.GetInternalAttributes() ) },
+    { "external", ToJson( io_rReader.GetExternalAttributes() ) } };
   const std::string Timecode = StartTimecode( io_rReader );
-  Json[ "start_timecode" ] = Timecode.empty() ? nlohmann::ordered_json( nullptr ) : nlohmann::ordered_json( Timecode );
+  Json["start_timecode"] = Timecode.empty() ? nlohmann::ordered_json( nullptr ) : nlohmann::ordered_json( Timecode );
   if( i_rOptions.m_bFrames )
   {
     nlohmann::ordered_json List = nlohmann::ordered_json::array();
     VFrameRow Row;
     while( !IsInterrupted() && ReadRow( io_rReader, Row ) )
     {
-      List.push_back( { { "key", Row.m_Record.m_Key }, { "position", Row.m_Record.m_Video.m_Position }, { "video_bytes", Row.m_Record.m_Video.m_Size },
-        { "video_crc32", Hex( Row.m_VideoCrc ) }, { "audio_bytes", Row.m_Record.m_Audio.m_Size }, { "audio_crc32", Hex( Row.m_AudioCrc ) } } );
+      List.push_back(
+        { { "key", Row.m_Record.m_Key }, { "position", Row.m_Record.m_Video.m_Position }, { "video_bytes", Row.m_Record.m_Video.m_Size },
+          { "video_crc32", Hex( Row.m_VideoCrc ) }, { "audio_bytes", Row.m_Record.m_Audio.m_Size }, { "audio_crc32", Hex( Row.m_AudioCrc ) } } );
     }
-    Json[ "frames" ] = std::move( List );
+    Json["frames"] = std::move( List );
   }
   std::cout << Json.dump( 2, ' ', false, nlohmann::ordered_json::error_handler_t::replace ) << "\n";
   return true;

@@ -13,7 +13,7 @@ namespace
 constexpr int ExitSecondSignal = 130;
 
 volatile std::sig_atomic_t s_SignalCount = 0;
-int s_Pipe[ 2 ] = { -1, -1 };   // readable once the first signal has come
+int s_Pipe[2] = { -1, -1 };   // readable once the first signal has come
 
 extern "C" void OnSignal( int )
 {
@@ -23,7 +23,7 @@ extern "C" void OnSignal( int )
   {
     _exit( ExitSecondSignal );
   }
-  [[maybe_unused]] const ssize_t Written = write( s_Pipe[ 1 ], "!", 1 );
+  [[maybe_unused]] const ssize_t Written = write( s_Pipe[1], "!", 1 );
   errno = SavedError;
 }
 
@@ -41,10 +41,7 @@ void InstallInterrupt()
   sigaction( SIGTERM, &Action, nullptr );
 }
 
-bool IsInterrupted()
-{
-  return s_SignalCount > 0;
-}
+bool IsInterrupted() { return s_SignalCount > 0; }
 
 bool WaitUninterrupted( double i_Seconds )
 {
@@ -60,13 +57,10 @@ bool WaitUninterrupted( double i_Seconds )
     {
       return true;
     }
-    pollfd Wait = { s_Pipe[ 0 ], POLLIN, 0 };
+    pollfd Wait = { s_Pipe[0], POLLIN, 0 };
     poll( &Wait, 1, static_cast<int>( Left * 1000.0 ) + 1 );
   }
   return false;
 }
 
-void WaitAfterInterrupt( double i_Seconds )
-{
-  poll( nullptr, 0, static_cast<int>( i_Seconds * 1000.0 ) );
-}
+void WaitAfterInterrupt( double i_Seconds ) { poll( nullptr, 0, static_cast<int>( i_Seconds * 1000.0 ) ); }

@@ -62,14 +62,14 @@ constexpr VWord VideoPayloads[] = { { "uncompressed", "Uncompressed" }, { "jpeg"
 constexpr VWord AudioPayloads[] = { { "uncompressed", "Uncompressed" }, { "none", "None" } };
 
 template<size_t Count>
-std::string NameFor( const VWord ( &i_rWords )[ Count ], const std::string& i_rWord )
+std::string NameFor( const VWord ( &i_rWords )[Count], const std::string& i_rWord )
 {
   const auto Found = std::find_if( std::begin( i_rWords ), std::end( i_rWords ), [&]( const VWord& i_rRow ) { return i_rWord == i_rRow.m_pWord; } );
   return Found == std::end( i_rWords ) ? i_rWord : Found->m_pName;
 }
 
 template<size_t Count>
-std::vector<std::string> WordsOf( const VWord ( &i_rWords )[ Count ] )
+std::vector<std::string> WordsOf( const VWord ( &i_rWords )[Count] )
 {
   std::vector<std::string> Words;
   for( const VWord& rRow : i_rWords )
@@ -86,7 +86,8 @@ int CheckOutput( const VOptions& i_rOptions )
   boost::filesystem::create_directories( i_rOptions.m_Output, Error );
   if( Error || !boost::filesystem::is_directory( i_rOptions.m_Output, Error ) )
   {
-    Complain( "The output folder \"" + i_rOptions.m_Output + "\" cannot be made: " + ( Error ? Error.message() : "a file of that name is there" ) + "." );
+    Complain(
+      "The output folder \"" + i_rOptions.m_Output + "\" cannot be made: " + ( Error ? Error.message() : "a file of that name is there" ) + "." );
     return ExitFailed;
   }
   return ExitComplete;
@@ -131,7 +132,8 @@ struct VWantedSetting
 
 std::vector<VWantedSetting> WantedSettings( const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
 {
-  std::vector<VWantedSetting> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ), "--container " + i_rOptions.m_Container } };
+  std::vector<VWantedSetting> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ),
+    "--container " + i_rOptions.m_Container } };
   if( !i_rOptions.m_PixelFormat.empty() )
   {
     Wanted.push_back( { "PixelFormat", i_rOptions.m_PixelFormat, "--pixel-format " + i_rOptions.m_PixelFormat } );
@@ -154,10 +156,13 @@ bool SetEnabled( VHostSession& i_rSession, const std::string& i_rURN, bool i_bEn
 {
   const std::string Path = VDeviceSettings::SettingPath( i_rURN, "Enabled" );
   std::string Error;
-  return i_rSession.Settings().Set( Path, i_bEnabled ? "true" : "false", Error ) && WaitUntil( i_rSession, SettleSeconds, [&] {
-    const bool bReady = i_rSession.Settings().Find( "VideoInput." + i_rURN + ".Hardware.Status" )->m_Value == "Ready";
-    return i_rSession.Settings().IsSettled( Path ) && bReady != i_bEnabled;
-  } );
+  return i_rSession.Settings().Set( Path, i_bEnabled ? "true" : "false", Error ) &&
+    WaitUntil( i_rSession, SettleSeconds,
+      [&]
+      {
+        const bool bReady = i_rSession.Settings().Find( "VideoInput." + i_rURN + ".Hardware.Status" )->m_Value == "Ready";
+        return i_rSession.Settings().IsSettled( Path ) && bReady != i_bEnabled;
+      } );
 }
 
 // While the device is stopped, so that the next buffer session holds frames of these settings alone.
@@ -313,9 +318,15 @@ int Run( const VOptions& i_rOptions )
 
 void AddFormatOptions( CLI::App& io_rCommand, VOptions& io_rOptions )
 {
-  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format" )->check( CLI::IsMember( WordsOf( Containers ) ) )->capture_default_str();
-  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload" )->check( CLI::IsMember( WordsOf( VideoPayloads ) ) )->capture_default_str();
-  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload" )->check( CLI::IsMember( WordsOf( AudioPayloads ) ) )->capture_default_str();
+  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format" )
+    ->check( CLI::IsMember( WordsOf( Containers ) ) )
+    ->capture_default_str();
+  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload" )
+    ->check( CLI::IsMember( WordsOf( VideoPayloads ) ) )
+    ->capture_default_str();
+  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload" )
+    ->check( CLI::IsMember( WordsOf( AudioPayloads ) ) )
+    ->capture_default_str();
   io_rCommand.add_option( "--audio-channels", io_rOptions.m_AudioChannels, "Channels to keep" )
     ->check( WholeNumberCheck( 0.0, 16.0, "a whole number from 0 to 16" ) )
     ->each( [&io_rOptions]( const std::string& ) { io_rOptions.m_bAudioChannels = true; } );
@@ -330,7 +341,9 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
   CLI::App& rCommand = *io_rApp.add_subcommand( "record", "Record devices to files" );
   auto pOptions = std::make_shared<VOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
-  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all when absent" )->type_name( "URN" )->allow_extra_args( false );
+  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all when absent" )
+    ->type_name( "URN" )
+    ->allow_extra_args( false );
   rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )
     ->type_name( "S" )
     ->check( NumberCheck( 0.0, LongestSeconds, "seconds above 0, up to 1000000", ELowerEnd::Excluded ) );

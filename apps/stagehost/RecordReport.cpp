@@ -14,8 +14,8 @@
 #include <iostream>
 #include <unistd.h>
 
-using StageHost::VDeviceOutcome;
 using StageCorePluginInterface::VCaptureFileReport;
+using StageHost::VDeviceOutcome;
 
 namespace
 {
@@ -60,10 +60,7 @@ constexpr uint32_t FailureStart = 1;
 constexpr uint32_t FailureEndMoved = 2;
 constexpr uint32_t FailureMemory = 4;
 
-std::string FramesText( uint64_t i_Frames )
-{
-  return std::to_string( i_Frames ) + ( i_Frames == 1 ? " frame" : " frames" );
-}
+std::string FramesText( uint64_t i_Frames ) { return std::to_string( i_Frames ) + ( i_Frames == 1 ? " frame" : " frames" ); }
 
 // Why a recording is not all that was asked for, and what helps.
 std::vector<std::string> Reasons( const VDeviceOutcome& i_rOutcome )
@@ -77,7 +74,8 @@ std::vector<std::string> Reasons( const VDeviceOutcome& i_rOutcome )
   }
   else if( ( Failure & FailureStart ) != 0 || i_rOutcome.m_Lost.m_Memory != 0 )
   {
-    const std::string What = ( Failure & FailureStart ) != 0 ? "The frames asked for are" : "The first " + FramesText( i_rOutcome.m_Lost.m_Memory ) + " asked for are";
+    const std::string What = ( Failure & FailureStart ) != 0 ? "The frames asked for are"
+                                                             : "The first " + FramesText( i_rOutcome.m_Lost.m_Memory ) + " asked for are";
     Texts.push_back( What + " no longer in memory. A shorter --pre-roll or a larger --memory keeps them." );
   }
   if( i_rOutcome.m_Lost.m_Signal != 0 && ( Failure & FailureStart ) == 0 )
@@ -107,32 +105,33 @@ nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::stri
 {
   const VCaptureFileReport* const pFile = i_rOutcome.m_Files.empty() ? nullptr : &i_rOutcome.m_Files.front();
   nlohmann::ordered_json Json = { { "urn", i_rOutcome.m_DeviceURN }, { "name", i_rName } };
-  Json[ "container" ] = pFile ? nlohmann::ordered_json( ContainerWord( *pFile ) ) : nullptr;
-  Json[ "path" ] = pFile ? nlohmann::ordered_json( pFile->m_Path ) : nullptr;
-  Json[ "frames_requested" ] = i_rOutcome.m_FramesRequested;
-  Json[ "frames_captured" ] = i_rOutcome.m_FramesCaptured;
-  Json[ "frames_written" ] = i_rOutcome.m_FramesWritten;
-  Json[ "bytes" ] = pFile ? pFile->m_Bytes : 0;
-  Json[ "lost" ] = { { "card", i_rOutcome.m_Lost.m_Card }, { "memory", i_rOutcome.m_Lost.m_Memory }, { "signal", i_rOutcome.m_Lost.m_Signal },
+  Json["container"] = pFile ? nlohmann::ordered_json( ContainerWord( *pFile ) ) : nullptr;
+  Json["path"] = pFile ? nlohmann::ordered_json( pFile->m_Path ) : nullptr;
+  Json["frames_requested"] = i_rOutcome.m_FramesRequested;
+  Json["frames_captured"] = i_rOutcome.m_FramesCaptured;
+  Json["frames_written"] = i_rOutcome.m_FramesWritten;
+  Json["bytes"] = pFile ? pFile->m_Bytes : 0;
+  Json["lost"] = { { "card", i_rOutcome.m_Lost.m_Card }, { "memory", i_rOutcome.m_Lost.m_Memory }, { "signal", i_rOutcome.m_Lost.m_Signal },
     { "writer", i_rOutcome.m_Lost.m_Writer } };
-  Json[ "state" ] = StateName( i_rOutcome.m_Status.m_State );
-  Json[ "failure" ] = i_rOutcome.m_Status.m_Failure;
-  Json[ "errors" ] = ErrorsOf( i_rOutcome );
-  Json[ "start_timecode" ] = pFile && KVZ::IsValid( pFile->m_StartTimecode ) ? nlohmann::ordered_json( KVZ::ToText( pFile->m_StartTimecode ) ) : nullptr;
-  Json[ "start_tick" ] =
-    i_rOutcome.m_Status.m_Start.IsOpen() ? nlohmann::ordered_json( nullptr ) : nlohmann::ordered_json( i_rOutcome.m_Status.m_Start.Count() );
-  Json[ "period" ] = i_rOutcome.m_Period.Count();
-  Json[ "buffer_peak_fill" ] = i_rOutcome.m_PeakFill;
-  Json[ "backlog_peak" ] = i_rOutcome.m_PeakBacklog;
-  Json[ "drift" ] = DriftToJson( i_rOutcome );
+  Json["state"] = StateName( i_rOutcome.m_Status.m_State );
+  Json["failure"] = i_rOutcome.m_Status.m_Failure;
+  Json["errors"] = ErrorsOf( i_rOutcome );
+  Json["start_timecode"] = pFile && KVZ::IsValid( pFile->m_StartTimecode ) ? nlohmann::ordered_json( KVZ::ToText( pFile->m_StartTimecode ) )
+                                                                           : nullptr;
+  Json["start_tick"] = i_rOutcome.m_Status.m_Start.IsOpen() ? nlohmann::ordered_json( nullptr )
+                                                            : nlohmann::ordered_json( i_rOutcome.m_Status.m_Start.Count() );
+  Json["period"] = i_rOutcome.m_Period.Count();
+  Json["buffer_peak_fill"] = i_rOutcome.m_PeakFill;
+  Json["backlog_peak"] = i_rOutcome.m_PeakBacklog;
+  Json["drift"] = DriftToJson( i_rOutcome );
   return Json;
 }
 
 std::string LostText( const StageHost::VLostFrames& i_rLost )
 {
   std::vector<std::string> Parts;
-  const std::pair<const char*, uint64_t> Causes[] = {
-    { "card", i_rLost.m_Card }, { "memory", i_rLost.m_Memory }, { "signal", i_rLost.m_Signal }, { "writer", i_rLost.m_Writer } };
+  const std::pair<const char*, uint64_t> Causes[] = { { "card", i_rLost.m_Card }, { "memory", i_rLost.m_Memory }, { "signal", i_rLost.m_Signal },
+    { "writer", i_rLost.m_Writer } };
   for( const auto& rCause : Causes )
   {
     if( rCause.second != 0 )
@@ -152,16 +151,14 @@ bool WantsPlainOutput()
 }
 
 VRecordReport::VRecordReport( const VReportOptions& i_rOptions, const std::vector<StageHost::VDeviceInfo>& i_rDevices )
-  : m_Options( i_rOptions )
-  , m_Devices( i_rDevices )
-  , m_bTerminal( isatty( STDERR_FILENO ) != 0 )
+  : m_Options( i_rOptions ), m_Devices( i_rDevices ), m_bTerminal( isatty( STDERR_FILENO ) != 0 )
 {
 }
 
 std::string VRecordReport::NameOf( const std::string& i_rURN ) const
 {
-  const auto Found =
-    std::find_if( m_Devices.begin(), m_Devices.end(), [&]( const StageHost::VDeviceInfo& i_rDevice ) { return i_rDevice.m_URN == i_rURN; } );
+  const auto Found = std::find_if( m_Devices.begin(), m_Devices.end(),
+    [&]( const StageHost::VDeviceInfo& i_rDevice ) { return i_rDevice.m_URN == i_rURN; } );
   return Found == m_Devices.end() ? std::string() : Found->m_Name;
 }
 
@@ -185,7 +182,7 @@ void VRecordReport::ShowProgress( const std::vector<VDeviceOutcome>& i_rOutcomes
   std::string Line;
   for( const VDeviceOutcome& rOutcome : i_rOutcomes )
   {
-    char Part[ 128 ];
+    char Part[128];
     std::snprintf( Part, sizeof( Part ), "  %s %llu/%llu frames", rOutcome.m_DeviceURN.c_str(),
       static_cast<unsigned long long>( rOutcome.m_FramesCaptured ), static_cast<unsigned long long>( rOutcome.m_FramesRequested ) );
     Line += Part;
@@ -217,7 +214,7 @@ void VRecordReport::PrintText( const VDeviceOutcome& i_rOutcome ) const
       std::cout << "  start     " << KVZ::ToText( rFile.m_StartTimecode ) << "\n";
     }
   }
-  char Rate[ 64 ];
+  char Rate[64];
   std::snprintf( Rate, sizeof( Rate ), "%.2f", 1.0 / i_rOutcome.m_Period.Seconds() );
   std::cout << "  frames    " << i_rOutcome.m_FramesWritten << " of " << i_rOutcome.m_FramesRequested << " written, " << Rate << " a second\n"
             << "  lost      " << LostText( i_rOutcome.m_Lost ) << "\n"

@@ -4,10 +4,7 @@
 #include <array>
 #include <cstdio>
 
-VTextTable::VTextTable( std::vector<std::string> i_Heads )
-  : m_Rows{ std::move( i_Heads ) }
-{
-}
+VTextTable::VTextTable( std::vector<std::string> i_Heads ) : m_Rows{ std::move( i_Heads ) } {}
 
 void VTextTable::AddRow( std::vector<std::string> i_Cells )
 {
@@ -22,7 +19,7 @@ std::string VTextTable::ToText() const
   {
     for( size_t Column = 0; Column < rRow.size(); ++Column )
     {
-      Widths[ Column ] = std::max( Widths[ Column ], rRow[ Column ].size() );
+      Widths[Column] = std::max( Widths[Column], rRow[Column].size() );
     }
   }
   std::string Text;
@@ -31,7 +28,7 @@ std::string VTextTable::ToText() const
     std::string Line;
     for( size_t Column = 0; Column < rRow.size(); ++Column )
     {
-      Line += rRow[ Column ] + std::string( Widths[ Column ] - rRow[ Column ].size() + 2, ' ' );
+      Line += rRow[Column] + std::string( Widths[Column] - rRow[Column].size() + 2, ' ' );
     }
     Line.erase( Line.find_last_not_of( ' ' ) + 1 );
     Text += Line + "\n";
@@ -58,7 +55,7 @@ std::string BytesToText( uint64_t i_Bytes )
   {
     Value /= 1000.0;
   }
-  char Text[ 32 ];
-  std::snprintf( Text, sizeof( Text ), Unit == 0 ? "%.0f %s" : "%.1f %s", Value, Units[ Unit ] );
+  char Text[32];
+  std::snprintf( Text, sizeof( Text ), Unit == 0 ? "%.0f %s" : "%.1f %s", Value, Units[Unit] );
   return Text;
 }

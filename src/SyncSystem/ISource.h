@@ -48,14 +48,14 @@ struct ICaptureHeader
 
 struct ICaptureStatus
 {
-  uint32_t m_State = 1;                            // SyncSystem::ECaptureState
-  uint32_t m_Failure = 0;                          // SyncSystem::ECaptureFailure flags
+  uint32_t m_State = 1;     // SyncSystem::ECaptureState
+  uint32_t m_Failure = 0;   // SyncSystem::ECaptureFailure flags
   std::vector<std::string> m_Errors;
-  double m_BufferFill = 0.0;                       // used over total memory
-  VTick m_RequestedStart = VTick::Open();          // global; Open() while not known
-  VTick m_Start = VTick::Open();                   // global tick of the capture's first frame
+  double m_BufferFill = 0.0;                // used over total memory
+  VTick m_RequestedStart = VTick::Open();   // global; Open() while not known
+  VTick m_Start = VTick::Open();            // global tick of the capture's first frame
   VTick m_CapturedDuration = VTick::Open();
-  VTick m_AvailableDuration = VTick::Open();       // captured and not yet taken by the slowest reader
+  VTick m_AvailableDuration = VTick::Open();   // captured and not yet taken by the slowest reader
 };
 
 class ISourceTemporal
@@ -63,22 +63,22 @@ class ISourceTemporal
 public:
   struct ISourceSyncStatus
   {
-    ISourceSyncSession m_Session;                  // m_Id 0 while no frame has come
+    ISourceSyncSession m_Session;   // m_Id 0 while no frame has come
     bool m_bEnabled = false;
     VGlobalSyncSessionId m_LastDeclared;
-    uint64_t m_LatestCounterFrames = 0;            // frames of m_Session so far less one: the newest frame's number in it
-    uint64_t m_DroppedFrames = 0;                  // missed by the card since the source was made; the first count after a start is no loss
-    uint64_t m_RefusedFrames = 0;                  // delivered and not stored: memory had run out
+    uint64_t m_LatestCounterFrames = 0;   // frames of m_Session so far less one: the newest frame's number in it
+    uint64_t m_DroppedFrames = 0;         // missed by the card since the source was made; the first count after a start is no loss
+    uint64_t m_RefusedFrames = 0;         // delivered and not stored: memory had run out
   };
 
   struct ISourceTimingInfo
   {
-    uint32_t m_SessionId = 0;                      // source sync session of the fit
-    double m_StartTime = 0.0;                      // fitted host time of the session's first frame, seconds
+    uint32_t m_SessionId = 0;   // source sync session of the fit
+    double m_StartTime = 0.0;   // fitted host time of the session's first frame, seconds
     double m_SecondsPerSample = 0.0;
-    double m_MeanOffset = 0.0;                     // delivery later than the fit says, seconds
+    double m_MeanOffset = 0.0;   // delivery later than the fit says, seconds
     double m_OffsetVariance = 0.0;
-    double m_RecentMaximum = 0.0;                  // the window's largest offset but for the few worst
+    double m_RecentMaximum = 0.0;   // the window's largest offset but for the few worst
   };
 
   // Joins the source to a session; empty when the source opts out or has no frames yet.

@@ -37,8 +37,16 @@ public:
   constexpr ITick operator+( ITick i_Other ) const { return ITick( m_Count + i_Other.m_Count ); }
   constexpr ITick operator-( ITick i_Other ) const { return ITick( m_Count - i_Other.m_Count ); }
   constexpr ITick operator*( int64_t i_Factor ) const { return ITick( m_Count * i_Factor ); }
-  constexpr ITick& operator+=( ITick i_Other ) { m_Count += i_Other.m_Count; return *this; }
-  constexpr ITick& operator-=( ITick i_Other ) { m_Count -= i_Other.m_Count; return *this; }
+  constexpr ITick& operator+=( ITick i_Other )
+  {
+    m_Count += i_Other.m_Count;
+    return *this;
+  }
+  constexpr ITick& operator-=( ITick i_Other )
+  {
+    m_Count -= i_Other.m_Count;
+    return *this;
+  }
 
 private:
   int64_t m_Count = 0;

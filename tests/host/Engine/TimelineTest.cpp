@@ -38,7 +38,7 @@ TEST( Timeline, OneSourceWithTimecodeNeedsNoDeliveryTimes )
   const auto Timeline = LaySources( { MakeSource( OneHour, 0.0, false ) } );
   ASSERT_TRUE( Timeline );
   EXPECT_TRUE( Timeline->m_bByTimecode );
-  EXPECT_EQ( OneHour, Timeline->m_Sources[ 0 ].m_CounterStart );
+  EXPECT_EQ( OneHour, Timeline->m_Sources[0].m_CounterStart );
 }
 
 TEST( Timeline, WaitsForDeliveryTimesWhereTheyDecide )
@@ -52,8 +52,8 @@ TEST( Timeline, SharedTimecodeBeatsLateDelivery )
   // The second source is delivered 100 ms late; its timecode says that it began one second after the first.
   const auto Timeline = LaySources( { MakeSource( OneHour, 10.0 ), MakeSource( OneHour + KVZ::SecondsToTick135( 1 ), 11.1 ) } );
   ASSERT_TRUE( Timeline );
-  EXPECT_TRUE( Timeline->m_Sources[ 1 ].m_bByTimecode );
-  EXPECT_EQ( KVZ::SecondsToTick135( 1 ), Timeline->m_Sources[ 1 ].m_CounterStart - Timeline->m_Sources[ 0 ].m_CounterStart );
+  EXPECT_TRUE( Timeline->m_Sources[1].m_bByTimecode );
+  EXPECT_EQ( KVZ::SecondsToTick135( 1 ), Timeline->m_Sources[1].m_CounterStart - Timeline->m_Sources[0].m_CounterStart );
 }
 
 TEST( Timeline, AForeignTimecodeIsLaidByDelivery )
@@ -61,20 +61,20 @@ TEST( Timeline, AForeignTimecodeIsLaidByDelivery )
   // Ten hours apart on paper, a quarter of a second apart in the room.
   const auto Timeline = LaySources( { MakeSource( OneHour, 10.0 ), MakeSource( OneHour * 11, 10.25 ) } );
   ASSERT_TRUE( Timeline );
-  EXPECT_FALSE( Timeline->m_Sources[ 1 ].m_bByTimecode );
-  EXPECT_EQ( KVZ::MillisecondsToTick135( 250 ), Timeline->m_Sources[ 1 ].m_CounterStart - Timeline->m_Sources[ 0 ].m_CounterStart );
+  EXPECT_FALSE( Timeline->m_Sources[1].m_bByTimecode );
+  EXPECT_EQ( KVZ::MillisecondsToTick135( 250 ), Timeline->m_Sources[1].m_CounterStart - Timeline->m_Sources[0].m_CounterStart );
 }
 
 TEST( Timeline, SourcesWithoutTimecodeFollowTheReferenceOrTheHostsClock )
 {
   const auto Mixed = LaySources( { MakeSource( VTick::Invalid(), 12.0 ), MakeSource( OneHour, 10.0 ) } );
   ASSERT_TRUE( Mixed );
-  EXPECT_EQ( OneHour + KVZ::SecondsToTick135( 2 ), Mixed->m_Sources[ 0 ].m_CounterStart );
-  EXPECT_EQ( OneHour, Mixed->m_Sources[ 1 ].m_CounterStart );
+  EXPECT_EQ( OneHour + KVZ::SecondsToTick135( 2 ), Mixed->m_Sources[0].m_CounterStart );
+  EXPECT_EQ( OneHour, Mixed->m_Sources[1].m_CounterStart );
 
   const auto Plain = LaySources( { MakeSource( VTick::Invalid(), 12.0 ), MakeSource( VTick::Invalid(), 10.0 ) } );
   ASSERT_TRUE( Plain );
   EXPECT_FALSE( Plain->m_bByTimecode );
-  EXPECT_EQ( KVZ::SecondsToTick135( 12 ), Plain->m_Sources[ 0 ].m_CounterStart );
-  EXPECT_EQ( KVZ::SecondsToTick135( 10 ), Plain->m_Sources[ 1 ].m_CounterStart );
+  EXPECT_EQ( KVZ::SecondsToTick135( 12 ), Plain->m_Sources[0].m_CounterStart );
+  EXPECT_EQ( KVZ::SecondsToTick135( 10 ), Plain->m_Sources[1].m_CounterStart );
 }
