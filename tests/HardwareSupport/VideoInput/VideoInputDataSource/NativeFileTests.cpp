@@ -143,6 +143,7 @@ public:
       }
       m_AtCapture = m_Delivered.load();
       const VTick Now = Period * static_cast<int64_t>( m_pSource->GetSourceSyncStatus().m_LatestCounterFrames );
+      m_AtCapture = m_Delivered.load();   // once more: the frames that the capture asks for must still come
       KVZ::ITickInClocks Ticks = KVZ::Shifted( Session->m_StartTime, Now );
       Ticks.Set( IClock( IClock::GlobalTime, 0, 0 ), Now );
       m_pSource->StartGlobalSyncSession( Ticks, VTick() );
@@ -182,7 +183,7 @@ public:
 
 TEST( VideoInputDataSourceThreads, EveryFileHoldsAnUnbrokenRun )
 {
-  VVideoRig Rig( 160 );
+  VVideoRig Rig( 240 );
   {
     VBusySource Busy( Rig );
     std::thread Device( [&] { Busy.Deliver(); } );
