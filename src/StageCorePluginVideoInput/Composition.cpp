@@ -21,4 +21,19 @@ std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory()
   return pFactory;
 }
 
+std::vector<KVZ::IVideoContainer::Enum> WritableContainers()
+{
+  const auto pFactory = WriterFactory();
+  std::vector<KVZ::IVideoContainer::Enum> Containers;
+  for( int32_t Value = 0; Value < KVZ::VideoContainerCount; ++Value )
+  {
+    const auto Container = static_cast<KVZ::IVideoContainer::Enum>( Value );
+    if( pFactory->IsRegistered( Container ) )
+    {
+      Containers.push_back( Container );
+    }
+  }
+  return Containers;
+}
+
 }

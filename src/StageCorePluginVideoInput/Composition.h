@@ -16,4 +16,7 @@ std::vector<VideoInputHAL::VDriverMaker> DriverMakers();
 // A writer for each container that captures can go to.
 std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory();
 
+// Those containers, in the order of their values.
+std::vector<KVZ::IVideoContainer::Enum> WritableContainers();
+
 }

@@ -125,7 +125,7 @@ void VVideoInputEngine::VImpl::OnDeviceAdded( std::shared_ptr<IVideoInputDevice>
 
   m_ParameterHandlers.Insert( URN,
     KVZ::MakeShared<VVideoInputDeviceParameterHandler>( m_pPostalService, m_pHost->GetDataStore(), m_pHost->GetParameterRegistry(),
-      m_pHost->GetCaptureTargets(), pSources, i_pDevice, pSource ) );
+      m_pHost->GetCaptureTargets(), pSources, i_pDevice, pSource, Composition::WritableContainers() ) );
   pSources->AddSource( pSource );
   m_pVideoInputDataSources->Insert( URN, pSource );
   i_pDevice->SetDataCallback( pSource );
