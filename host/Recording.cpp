@@ -12,6 +12,10 @@ namespace
 // A source that is silent for this long has ended: its capture is closed so that the file is whole.
 constexpr double StallSeconds = 3.0;
 
+// A session that begins within a timecode label that two frames share ends with the next label: the second frame of a label is known as such
+// only by its first. From this many frames on a session has outlived that.
+constexpr uint64_t SettledFrames = 2;
+
 // SyncSystem's capture states and failure flags, as they cross the interface.
 constexpr uint32_t StateIdle = 1;
 constexpr uint32_t StateWaitingForStart = 2;
@@ -72,7 +76,8 @@ const VStartedSource* VRecording::FindReady( const VStartedSession& i_rSession, 
     }
     const auto Status = rSource.m_pSource->Temporal().GetSourceSyncStatus();
     const KVZ::VTick InMemory = rSource.m_Session.m_Period * static_cast<int64_t>( Status.m_LatestCounterFrames );
-    return Status.m_bEnabled && Status.m_Session.m_Id == rSource.m_Session.m_Id && InMemory >= i_PreRoll ? &rSource : nullptr;
+    const bool bSettled = Status.m_bEnabled && Status.m_Session.m_Id == rSource.m_Session.m_Id && Status.m_LatestCounterFrames >= SettledFrames;
+    return bSettled && InMemory >= i_PreRoll ? &rSource : nullptr;
   }
   return nullptr;
 }

@@ -66,15 +66,23 @@ VirtualCards::IVirtualCardControl* VVirtualCards::Load( const std::string& i_rKi
   return nullptr;
 }
 
+VVirtualCards::~VVirtualCards()
+{
+  for( const auto& rCard : m_Cards )
+  {
+    rCard.first->RemoveCard( rCard.second );
+  }
+}
+
 bool VVirtualCards::Add( const std::string& i_rText, std::string& o_rError )
 {
   VirtualCards::IVirtualCardControl* const pControl = Load( i_rText.substr( 0, i_rText.find( ':' ) ), o_rError );
-  if( !pControl || pControl->AddCard( i_rText.c_str(), {}, o_rError ) == 0 )
+  const uint32_t Card = pControl ? pControl->AddCard( i_rText.c_str(), {}, o_rError ) : 0;
+  if( Card != 0 )
   {
-    return false;
+    m_Cards.emplace_back( pControl, Card );
   }
-  ++m_Count;
-  return true;
+  return Card != 0;
 }
 
 }

@@ -18,7 +18,8 @@ namespace
 {
 
 constexpr double PollSeconds = 0.02;
-constexpr double RateSeconds = 1.0;
+constexpr double RateSeconds = 2.0;
+constexpr double ReactionSeconds = 0.1;
 
 struct VOptions
 {
@@ -60,18 +61,22 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
   }
 }
 
-// The host takes its rate from the first source that delivers. Until then every device's rate seems to be a wrong one.
-void WaitForRate( VHostSession& i_rSession )
+// The host takes its rate from the first of the sources that deliver; until it has, and the devices have compared theirs with it, their
+// warnings tell nothing.
+void WaitForRate( VHostSession& i_rSession, const std::vector<VDeviceInfo>& i_rDevices )
 {
-  const double Until = i_rSession.Host().Time().Now() + RateSeconds;
-  const auto HasWarnings = [&]
+  const auto Delivering = static_cast<size_t>(
+    std::count_if( i_rDevices.begin(), i_rDevices.end(), []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal(); } ) );
+  const auto IsRateKnown = [&]
   {
-    const auto Devices = i_rSession.Settings().GetDevices();
-    return std::any_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return !i_rDevice.m_Warnings.empty(); } );
+    const auto pSession = i_rSession.Host().Engine().GetStarted();
+    return pSession && pSession->m_Sources.size() >= Delivering;
   };
-  while( ( !i_rSession.Host().Engine().GetStarted() || HasWarnings() ) && i_rSession.Host().Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
+  const double Until = i_rSession.Host().Time().Now() + RateSeconds;
+  while( Delivering != 0 && !IsRateKnown() && i_rSession.Host().Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
   {
   }
+  WaitUninterrupted( ReactionSeconds );
 }
 
 int Run( const VOptions& i_rOptions )
@@ -86,11 +91,8 @@ int Run( const VOptions& i_rOptions )
   {
     return VHostSession::ExitWithoutDevices();
   }
-  if( std::any_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return !i_rDevice.m_Warnings.empty(); } ) )
-  {
-    WaitForRate( Session );
-    Devices = Session.Settings().GetDevices();
-  }
+  WaitForRate( Session, Devices );
+  Devices = Session.Settings().GetDevices();
   if( i_rOptions.m_bJson )
   {
     nlohmann::ordered_json List = nlohmann::ordered_json::array();

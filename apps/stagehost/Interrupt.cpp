@@ -1,5 +1,6 @@
 #include "apps/stagehost/Interrupt.h"
 
+#include <atomic>
 #include <cerrno>
 #include <csignal>
 #include <ctime>
@@ -12,14 +13,15 @@ namespace
 
 constexpr int ExitSecondSignal = 130;
 
-volatile std::sig_atomic_t s_SignalCount = 0;
+// Touched by the handler on any thread.
+std::atomic<int> s_SignalCount{ 0 };
+static_assert( std::atomic<int>::is_always_lock_free );
 int s_Pipe[2] = { -1, -1 };   // readable once the first signal has come
 
 extern "C" void OnSignal( int )
 {
   const int SavedError = errno;
-  s_SignalCount = s_SignalCount + 1;
-  if( s_SignalCount > 1 )
+  if( ++s_SignalCount > 1 )
   {
     _exit( ExitSecondSignal );
   }

@@ -285,7 +285,7 @@ int Run( const VOptions& i_rOptions )
 {
   if( ( i_rOptions.m_Frames != 0 ) == ( i_rOptions.m_Seconds > 0.0 ) )
   {
-    Complain( "record needs one of --seconds S (above 0) and --frames N (above 0)." );
+    Complain( "record needs one of --seconds S (above 0) and --frames N (2 or more)." );
     return ExitUsage;
   }
   if( const int Result = CheckOutput( i_rOptions ) )
@@ -349,7 +349,7 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
     ->check( NumberCheck( 0.0, LongestSeconds, "seconds above 0, up to 1000000", ELowerEnd::Excluded ) );
   rCommand.add_option( "--frames", pOptions->m_Frames, "How many frames of each device to record" )
     ->type_name( "N" )
-    ->check( WholeNumberCheck( 1.0, MostFrames, "a whole number from 1 to 100000000" ) );
+    ->check( WholeNumberCheck( 2.0, MostFrames, "a whole number from 2 to 100000000" ) );
   rCommand.add_option( "--pre-roll", pOptions->m_PreRoll, "Begin so many seconds before the request" )
     ->type_name( "S" )
     ->check( NumberCheck( 0.0, LongestPreRoll, "seconds from 0 to 3600" ) );
