@@ -76,10 +76,10 @@ void VCaptureDeviceParameterHandler::CreateCaptureDirectory()
 {
   VParameter& rDirectory = AddParameter<std::string>( DeviceSchemas::CaptureDirectory( GetPath() ), CaptureDirectoryText );
   rDirectory.SetValueDefault( Variant::Make( DefaultFolder ) );
-  UpdateCaptureFolders();
   rDirectory.SubscribeValueChanged( BindWeak( KVZ::WeakFrom( this ), &VCaptureDeviceParameterHandler::CheckCaptureFolder ), PostalService() );
   m_pCaptureFolders->GetFolderAliasesChangedCallback().Add( BindWeak( KVZ::WeakFrom( this ), &VCaptureDeviceParameterHandler::UpdateCaptureFolders ),
     PostalService() );
+  UpdateCaptureFolders();   // what changes before this is read here
 }
 
 void VCaptureDeviceParameterHandler::CreateFormats()

@@ -76,7 +76,7 @@ int64_t SystemPeriod( double i_Rate )
 
 bool AreCompatible( int64_t i_PeriodA, int64_t i_PeriodB )
 {
-  if( i_PeriodA == 0 || i_PeriodB == 0 )
+  if( i_PeriodA <= 0 || i_PeriodB <= 0 )
   {
     return false;
   }

@@ -242,6 +242,7 @@ void VVideoInputDeviceParameterHandler::CreatePixelAspectRatio()
   AddSetting( Keys::PixelAspectRatio( m_DevicePath ), PixelAspectRatioText, Hidden | Advanced, 1.0,
     &VVideoInputDeviceParameterHandler::ApplyPixelAspectRatio )
     .SetEnum( Choices );
+  ApplyPixelAspectRatio();   // the source knows no ratio of its own
 }
 
 void VVideoInputDeviceParameterHandler::CreateOpticalSettings()
