@@ -1,5 +1,6 @@
 // Turns an image from one pixel format to another. Implementations lie in this folder (software) and beside it (OpenGL).
-// One thread at a time.
+// Convert may be called from several threads at once, for different images, and beside the setters: each conversion works with the settings
+// as they stood when it began. Setting equal values again is cheap. The OpenGL implementation may make its callers wait for each other.
 #pragma once
 
 #include "Core/VideoInterface/FrameRecords.h"
