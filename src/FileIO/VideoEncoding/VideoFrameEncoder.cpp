@@ -5,6 +5,7 @@
 #include "StageCoreRuntime/GlobalLog.h"
 
 #include <cstring>
+#include <optional>
 
 namespace VideoEncoding
 {
@@ -26,16 +27,57 @@ bool IsGrey( IPixelFormat::Enum i_Format )
   return i_Format == IPixelFormat::ELuminance8 || i_Format == IPixelFormat::ELuminance7 || i_Format == IPixelFormat::ELuminance6;
 }
 
+// Nothing for a payload that cannot be encoded.
+std::optional<IPixelFormat::Enum> FindStoredFormat( IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Source )
+{
+  switch( i_Payload )
+  {
+    case IVideoPayload::ENone: return IPixelFormat::EUnspecified;
+    case IVideoPayload::EUncompressed: return i_Source;
+    case IVideoPayload::EImageJPEG: return IsColour( i_Source ) || i_Source == IPixelFormat::ELuminance8 ? i_Source : IPixelFormat::ER8G8B8;
+    case IVideoPayload::EImagePNG:
+    case IVideoPayload::EImageTIFF: return IsGrey( i_Source ) ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8;
+    default: return std::nullopt;
+  }
+}
+
+// What the steps before compression work towards. A payload that no compressor takes keeps the frame as it is until it is refused.
+IPixelFormat::Enum TargetFormat( IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Source, IPixelFormat::Enum i_Wanted )
+{
+  if( i_Payload == IVideoPayload::EUncompressed )
+  {
+    return i_Wanted;
+  }
+  const IPixelFormat::Enum Stored = FindStoredFormat( i_Payload, i_Source ).value_or( IPixelFormat::EUnspecified );
+  return Stored == IPixelFormat::EUnspecified ? i_Source : Stored;
+}
+
 void ReportUnsupported( IVideoPayload::Enum i_Payload )
 {
   KVZ_LOG_ERROR( "VideoEncoding", "Unsupported video payload format '%s'.", KVZ::NameOrUnspecified( i_Payload ) );
 }
 
+// Whatever is not one of the first two is the third.
 std::shared_ptr<KVZ::IPixelFormatConverter> MakeConverter( EConverter i_Converter, const VEncoderParts& i_rParts )
 {
-  const auto Found = i_rParts.m_ConverterMakers.find( i_Converter );
+  const bool bNamed = i_Converter == EConverter::OpenGLFirst || i_Converter == EConverter::Software;
+  const auto Found = i_rParts.m_ConverterMakers.find( bNamed ? i_Converter : EConverter::OpenGLSecond );
   return Found == i_rParts.m_ConverterMakers.end() ? nullptr : Found->second();
 }
+
+// What a compressor has made.
+class VCompressedBuffer : public KVZ::IBuffer
+{
+public:
+  uint8_t* Data() override { return m_Bytes.data(); }
+  const uint8_t* Data() const override { return m_Bytes.data(); }
+  size_t Size() const override { return m_Bytes.size(); }
+
+  UtilsMemory::VByteVector& Bytes() { return m_Bytes; }
+
+private:
+  UtilsMemory::VByteVector m_Bytes;
+};
 
 }
 
@@ -47,17 +89,14 @@ VEncoderParts& DefaultEncoderParts()
 
 bool PixelFormatForPayloadFormat( IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Source, IPixelFormat::Enum& o_rStored )
 {
-  switch( i_Payload )
+  const auto Stored = FindStoredFormat( i_Payload, i_Source );
+  if( !Stored )
   {
-    case IVideoPayload::ENone: o_rStored = IPixelFormat::EUnspecified; return true;
-    case IVideoPayload::EUncompressed: o_rStored = i_Source; return true;
-    case IVideoPayload::EImageJPEG:
-      o_rStored = IsColour( i_Source ) || i_Source == IPixelFormat::ELuminance8 ? i_Source : IPixelFormat::ER8G8B8;
-      return true;
-    case IVideoPayload::EImagePNG:
-    case IVideoPayload::EImageTIFF: o_rStored = IsGrey( i_Source ) ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8; return true;
-    default: ReportUnsupported( i_Payload ); return false;
+    ReportUnsupported( i_Payload );
+    return false;
   }
+  o_rStored = *Stored;
+  return true;
 }
 
 // One frame on its way through the encoder.
@@ -82,26 +121,41 @@ VVideoFrameEncoder::VVideoFrameEncoder( EConverter i_Converter, const VEncoderPa
 {
 }
 
+void VVideoFrameEncoder::SetColour( const KVZ::VColourRecord& i_rColour )
+{
+  if( m_pConverter )
+  {
+    m_pConverter->SetColourCorrection( i_rColour );
+  }
+}
+
+void VVideoFrameEncoder::SetLensCorrection( const KVZ::VLensDistortionRecord& i_rLens )
+{
+  if( m_pConverter )
+  {
+    m_pConverter->SetLensCorrection( i_rLens );
+  }
+}
+
+void VVideoFrameEncoder::SetLensCorrectionEnabled( bool i_bEnabled )
+{
+  m_bForceConversion = i_bEnabled;
+  if( m_pConverter )
+  {
+    m_pConverter->SetLensCorrectionEnabled( i_bEnabled );
+  }
+}
+
 bool VVideoFrameEncoder::Encode( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBufferList& io_rVideo, const KVZ::VideoFrameInfo& i_rInfo,
-  IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_PixelFormat )
+  IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_PixelFormat ) const
 {
   if( io_rVideo.empty() )
   {
     return false;
   }
   VJob Job{ i_rAllocator, io_rVideo, i_rInfo, i_rInfo, i_Payload };
-  Job.m_Target.m_PixelFormat = i_PixelFormat;
+  Job.m_Target.m_PixelFormat = TargetFormat( i_Payload, i_rInfo.m_PixelFormat, i_PixelFormat );
   const bool bUncompressed = i_Payload == IVideoPayload::EUncompressed;
-  const auto Compressor = m_Parts.m_Compressors.find( i_Payload );
-  if( !bUncompressed && Compressor == m_Parts.m_Compressors.end() )
-  {
-    ReportUnsupported( i_Payload );
-    return false;
-  }
-  if( !bUncompressed && !PixelFormatForPayloadFormat( i_Payload, i_rInfo.m_PixelFormat, Job.m_Target.m_PixelFormat ) )
-  {
-    return false;
-  }
   const bool bConvert = m_bForceConversion || Job.m_Target.m_PixelFormat != i_rInfo.m_PixelFormat;
   const bool bDraw = !m_BurnIn.m_Text.empty();
   if( io_rVideo.size() > 1 && ( bConvert || bDraw || !bUncompressed ) && !Join( Job ) )
@@ -112,7 +166,7 @@ bool VVideoFrameEncoder::Encode( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBuff
   {
     return false;
   }
-  return bUncompressed || Compress( Job, Compressor->second );
+  return bUncompressed || Compress( Job );
 }
 
 bool VVideoFrameEncoder::Join( VJob& io_rJob ) const
@@ -143,9 +197,6 @@ bool VVideoFrameEncoder::ConvertPixels( VJob& io_rJob ) const
   if( m_pConverter )
   {
     std::shared_ptr<KVZ::IBuffer> pTarget = io_rJob.m_rAllocator.AllocateBuffer( CoreVideoUtils::GetFrameSize( io_rJob.m_Target ) );
-    m_pConverter->SetColourCorrection( m_Colour );
-    m_pConverter->SetLensCorrection( m_Lens );
-    m_pConverter->SetLensCorrectionEnabled( m_bForceConversion );
     const KVZ::IBufferConst& rSource = *io_rJob.m_rVideo.front();
     bConverted = m_pConverter->Convert( io_rJob.m_rSource, rSource.Data(), rSource.Size(), io_rJob.m_Target.m_PixelFormat, pTarget->Data(),
       pTarget->Size() );
@@ -184,15 +235,27 @@ bool VVideoFrameEncoder::DrawText( VJob& io_rJob ) const
     }
     io_rJob.Replace( std::move( pCopy ) );
   }
-  return m_Parts.m_DrawText( *m_pConverter, io_rJob.m_Target, m_BurnIn, io_rJob.m_pOwn->Data(), io_rJob.m_pOwn->Size() );
+  if( !m_Parts.m_DrawText( *m_pConverter, io_rJob.m_Target, m_BurnIn, io_rJob.m_pOwn->Data(), io_rJob.m_pOwn->Size() ) )
+  {
+    KVZ_LOG_ERROR( "VideoEncoding", "Error burning text into an image in '%s' pixel format.",
+      KVZ::NameOrUnspecified( io_rJob.m_Target.m_PixelFormat ) );
+    return false;
+  }
+  return true;
 }
 
-bool VVideoFrameEncoder::Compress( VJob& io_rJob, const VCompressor& i_rCompressor ) const
+bool VVideoFrameEncoder::Compress( VJob& io_rJob ) const
 {
+  const auto Compressor = m_Parts.m_Compressors.find( io_rJob.m_Payload );
+  if( Compressor == m_Parts.m_Compressors.end() )
+  {
+    ReportUnsupported( io_rJob.m_Payload );
+    return false;
+  }
   const KVZ::IBufferConst& rSource = *io_rJob.m_rVideo.front();
-  auto pOutput = std::make_shared<KVZ::IStandardBuffer>();
-  std::vector<uint8_t> Scratch;
-  if( !i_rCompressor( { io_rJob.m_Target, rSource.Data(), rSource.Size(), m_JPEGQuality }, pOutput->Bytes(), Scratch ) )
+  auto pOutput = std::make_shared<VCompressedBuffer>();
+  UtilsMemory::VByteVector Scratch;
+  if( !Compressor->second( { io_rJob.m_Target, rSource.Data(), rSource.Size(), m_JPEGQuality }, pOutput->Bytes(), Scratch ) )
   {
     KVZ_LOG_ERROR( "VideoEncoding", "Error encoding data in '%s' pixel format to '%s'.", KVZ::NameOrUnspecified( io_rJob.m_Target.m_PixelFormat ),
       KVZ::NameOrUnspecified( io_rJob.m_Payload ) );

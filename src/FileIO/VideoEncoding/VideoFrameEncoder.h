@@ -1,7 +1,8 @@
 // Brings the buffers of one captured frame into the payload that a file stores: joins split buffers, converts the pixel format, draws
 // text and compresses. A frame that needs none of this passes through without a copy.
 //
-// One thread at a time, but for frames that need no conversion: settings must not change during a capture.
+// Several threads may encode different frames at once, where the converter's Convert and the compressors allow it. Settings must not change
+// meanwhile, and so not during a capture.
 #pragma once
 
 #include "Core/VideoInterface/BufferAllocator.h"
@@ -21,10 +22,11 @@ public:
 
   void SetJPEGQuality( int i_Quality ) { m_JPEGQuality = i_Quality; }
   void SetBurnIn( const VBurnInSettings& i_rSettings ) { m_BurnIn = i_rSettings; }
-  void SetColour( const KVZ::VColourRecord& i_rColour ) { m_Colour = i_rColour; }
+  // These three go to the converter at once.
+  void SetColour( const KVZ::VColourRecord& i_rColour );
   // Corrects the lens while it converts, which makes a conversion of frames that are in their target format already.
-  void SetLensCorrection( const KVZ::VLensDistortionRecord& i_rLens ) { m_Lens = i_rLens; }
-  void SetLensCorrectionEnabled( bool i_bEnabled ) { m_bForceConversion = i_bEnabled; }
+  void SetLensCorrection( const KVZ::VLensDistortionRecord& i_rLens );
+  void SetLensCorrectionEnabled( bool i_bEnabled );
 
   // Digits of a frame's number in file names.
   uint32_t GetFrameNumberDigits() const { return 8; }
@@ -32,7 +34,7 @@ public:
   // The list is replaced by the result. i_PixelFormat is what an uncompressed payload shall be; other payloads have their own. False, with
   // a line in the log, if the frame cannot be encoded.
   bool Encode( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBufferList& io_rVideo, const KVZ::VideoFrameInfo& i_rInfo,
-    KVZ::IVideoPayload::Enum i_Payload, KVZ::IPixelFormat::Enum i_PixelFormat );
+    KVZ::IVideoPayload::Enum i_Payload, KVZ::IPixelFormat::Enum i_PixelFormat ) const;
 
 private:
   struct VJob;
@@ -40,14 +42,12 @@ private:
   bool Join( VJob& io_rJob ) const;
   bool ConvertPixels( VJob& io_rJob ) const;
   bool DrawText( VJob& io_rJob ) const;
-  bool Compress( VJob& io_rJob, const VCompressor& i_rCompressor ) const;
+  bool Compress( VJob& io_rJob ) const;
 
   const VEncoderParts m_Parts;
   const std::shared_ptr<KVZ::IPixelFormatConverter> m_pConverter;   // empty where none is registered
   int m_JPEGQuality = 90;
   VBurnInSettings m_BurnIn;
-  KVZ::VColourRecord m_Colour;
-  KVZ::VLensDistortionRecord m_Lens;
   bool m_bForceConversion = false;
 };
 
