@@ -5,8 +5,10 @@
 
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
+#include <boost/thread/tss.hpp>
 
-#include <map>
+#include <algorithm>
+#include <iterator>
 #include <new>
 #include <stdexcept>
 #include <vector>
@@ -16,20 +18,20 @@ namespace UtilsMemory
 
 using VOwned = std::unique_ptr<KVZ::IStandardBuffer>;
 
+// A free list for each thread, used without a lock, and a shared one through which threads that only take get the buffers of threads that
+// only give back. The lists own nothing but their buffers, so a list that a thread leaves behind holds no pool.
 class VPooledBufferAllocator::VPool
 {
 public:
-  // An empty pointer if no free buffer has room.
-  VOwned Take( size_t i_Size )
+  VOwned Take()
   {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    const auto Found = m_Free.lower_bound( i_Size );
-    if( Found == m_Free.end() )
+    VList& rList = ThreadList();
+    if( rList.empty() )
     {
-      return {};
+      Refill( rList );
     }
-    VOwned pBuffer = std::move( Found->second );
-    m_Free.erase( Found );
+    VOwned pBuffer = std::move( rList.back() );
+    rList.pop_back();
     return pBuffer;
   }
 
@@ -37,27 +39,69 @@ public:
   void GiveBack( VOwned i_pBuffer ) noexcept
   try
   {
-    const size_t Room = i_pBuffer->Bytes().capacity();
-    VOwned pSurplus;
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Free.emplace( Room, std::move( i_pBuffer ) );
-    if( m_Free.size() > MaxFree )
+    VList& rList = ThreadList();
+    if( rList.size() == ThreadRoom )
     {
-      pSurplus = std::move( m_Free.begin()->second );
-      m_Free.erase( m_Free.begin() );
+      Share( rList );
     }
+    rList.push_back( std::move( i_pBuffer ) );
   }
   catch( const std::exception& )
   {
-    // No memory for the entry: the buffer goes to the heap.
+    // No memory for a list: the buffer goes to the heap.
   }
 
 private:
-  // A frame in flight needs a handful; the rest is what a burst left behind.
-  static constexpr size_t MaxFree = 16;
+  using VList = std::vector<VOwned>;
 
+  static constexpr size_t ThreadRoom = 32;
+  static constexpr size_t MovedAtOnce = 16;
+  static constexpr size_t SharedRoom = 64;   // the rest is what a burst left behind
+
+  VList& ThreadList()
+  {
+    if( !m_pThreadList.get() )
+    {
+      auto pList = std::make_unique<VList>();
+      pList->reserve( ThreadRoom );
+      m_pThreadList.reset( pList.release() );
+    }
+    return *m_pThreadList;
+  }
+
+  void Refill( VList& o_rList )
+  {
+    {
+      boost::lock_guard<boost::mutex> Lock( m_Mutex );
+      if( m_Shared.size() >= MovedAtOnce )
+      {
+        std::move( m_Shared.end() - MovedAtOnce, m_Shared.end(), std::back_inserter( o_rList ) );
+        m_Shared.resize( m_Shared.size() - MovedAtOnce );
+        return;
+      }
+    }
+    while( o_rList.size() < MovedAtOnce )
+    {
+      o_rList.push_back( std::make_unique<KVZ::IStandardBuffer>() );
+    }
+  }
+
+  // Those that have lain there longest.
+  void Share( VList& io_rList )
+  {
+    VList Surplus( std::make_move_iterator( io_rList.begin() ), std::make_move_iterator( io_rList.begin() + MovedAtOnce ) );
+    io_rList.erase( io_rList.begin(), io_rList.begin() + MovedAtOnce );
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    if( m_Shared.size() + MovedAtOnce <= SharedRoom )
+    {
+      std::move( Surplus.begin(), Surplus.end(), std::back_inserter( m_Shared ) );
+      Surplus.clear();
+    }
+  }
+
+  boost::thread_specific_ptr<VList> m_pThreadList;
   boost::mutex m_Mutex;
-  std::multimap<size_t, VOwned> m_Free GUARDED_BY( m_Mutex );   // by capacity
+  VList m_Shared GUARDED_BY( m_Mutex );
 };
 
 VPooledBufferAllocator::VPooledBufferAllocator( std::string i_Name ) : m_Name( std::move( i_Name ) ), m_pPool( std::make_shared<VPool>() ) {}
@@ -65,11 +109,7 @@ VPooledBufferAllocator::VPooledBufferAllocator( std::string i_Name ) : m_Name( s
 std::shared_ptr<KVZ::IBuffer> VPooledBufferAllocator::AllocateBuffer( size_t i_Size )
 try
 {
-  VOwned pBuffer = m_pPool->Take( i_Size );
-  if( !pBuffer )
-  {
-    pBuffer = std::make_unique<KVZ::IStandardBuffer>();
-  }
+  VOwned pBuffer = m_pPool->Take();
   pBuffer->Bytes().resize( i_Size );
   return std::shared_ptr<KVZ::IBuffer>( pBuffer.release(),
     [pPool = m_pPool]( KVZ::IBuffer* i_pBuffer ) { pPool->GiveBack( VOwned( static_cast<KVZ::IStandardBuffer*>( i_pBuffer ) ) ); } );

@@ -8,27 +8,47 @@
 #include <cstring>
 #include <limits>
 #include <new>
+#include <vector>
 
 using UtilsMemory::VPooledBufferAllocator;
 
-TEST( PooledBufferAllocator, GivesReturnedBuffersOutAgainByTheirRoom )
+TEST( PooledBufferAllocator, AThreadGetsBackWhatItReleasedLast )
 {
   VPooledBufferAllocator Allocator( "Test" );
-  const uint8_t* pLarge = nullptr;
-  const uint8_t* pSmall = nullptr;
+  const uint8_t* pMemory = nullptr;
   {
-    const auto pLargeBuffer = Allocator.AllocateBuffer( 1000 );
-    const auto pSmallBuffer = Allocator.AllocateBuffer( 10 );
-    pLarge = pLargeBuffer->Data();
-    pSmall = pSmallBuffer->Data();
+    const auto pOther = Allocator.AllocateBuffer( 10 );
+    pMemory = Allocator.AllocateBuffer( 1000 )->Data();
   }
-  const auto pFirst = Allocator.AllocateBuffer( 5 );
-  const auto pSecond = Allocator.AllocateBuffer( 5 );
-  const auto pThird = Allocator.AllocateBuffer( 5 );
-  EXPECT_EQ( pFirst->Data(), pSmall );
-  EXPECT_EQ( pSecond->Data(), pLarge );
-  EXPECT_EQ( pSecond->Size(), 5u );
-  EXPECT_NE( pThird->Data(), pSmall );
+  const auto pNewest = Allocator.AllocateBuffer( 10 );
+  const auto pBuffer = Allocator.AllocateBuffer( 500 );
+  EXPECT_EQ( pBuffer->Data(), pMemory ) << "its memory is kept";
+  EXPECT_EQ( pBuffer->Size(), 500u );
+}
+
+// A new buffer is empty, so one that still holds what was put into it is one of those released.
+TEST( PooledBufferAllocator, BuffersThatOneThreadReleasesReachTheOthers )
+{
+  constexpr size_t Count = 64;
+  constexpr uint8_t Mark = 0x5A;
+  VPooledBufferAllocator Allocator( "Test" );
+  std::vector<std::shared_ptr<KVZ::IBuffer>> Buffers;
+  boost::thread Other(
+    [&]
+    {
+      while( Buffers.size() < Count )
+      {
+        Buffers.push_back( Allocator.AllocateBuffer( 1 ) );
+        Buffers.back()->Data()[0] = Mark;
+      }
+      Buffers.clear();
+    } );
+  Other.join();
+  for( size_t Index = 0; Index < 16; ++Index )
+  {
+    Buffers.push_back( Allocator.AllocateBuffer( 1 ) );
+    EXPECT_EQ( Buffers.back()->Data()[0], Mark ) << Index;
+  }
 }
 
 TEST( PooledBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAnyThread )
