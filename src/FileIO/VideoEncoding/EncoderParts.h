@@ -4,12 +4,12 @@
 #pragma once
 
 #include "CoreVideoUtils/IPixelFormatConverter.h"
+#include "Utils/UtilsMemory/ByteVector.h"
 
 #include <functional>
 #include <map>
 #include <memory>
 #include <string>
-#include <vector>
 
 namespace VideoEncoding
 {
@@ -19,7 +19,7 @@ enum class EConverter : int32_t
 {
   OpenGLFirst = 1,
   Software = 2,
-  OpenGLSecond = 3,
+  OpenGLSecond = 3,   // and any other value
 };
 
 struct VBurnInSettings
@@ -37,12 +37,13 @@ struct VCompressionInput
   size_t m_Size;
   int m_JPEGQuality;   // 1 to 100
 };
-// Compresses one image into o_rOutput, using the scratch vector for what it needs in between. False if it could not.
-using VCompressor = std::function<bool( const VCompressionInput&, std::vector<uint8_t>& o_rOutput, std::vector<uint8_t>& io_rScratch )>;
+// Compresses one image into o_rOutput, using the scratch vector for what it needs in between. False if it could not. Any thread, several at
+// once.
+using VCompressor = std::function<bool( const VCompressionInput&, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& io_rScratch )>;
 
 using VConverterMaker = std::function<std::shared_ptr<KVZ::IPixelFormatConverter>()>;
 
-// Draws into an image of the given description. False if it could not.
+// Draws into an image of the given description. False if it could not. Any thread, several at once.
 using VTextDrawer =
   std::function<bool( KVZ::IPixelFormatConverter&, const KVZ::VideoFrameInfo&, const VBurnInSettings&, uint8_t* io_pPixels, size_t i_Size )>;
 
