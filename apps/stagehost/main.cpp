@@ -1,5 +1,6 @@
 // stagehost: the stand-alone host on a command line. Results go to standard output, everything else to standard error.
 #include "StageCoreRuntime/DebugServices.h"
+#include "StageCoreRuntime/GlobalLog.h"
 #include "apps/stagehost/Commands.h"
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/Interrupt.h"
@@ -48,7 +49,9 @@ int main( int i_ArgumentCount, char** i_ppArguments )
     {
       if( rCommand.first->parsed() )
       {
-        return rCommand.second();
+        const int Result = rCommand.second();
+        KVZ::ConfigureLog( {} );   // the log tells of repeated lines that it is still counting
+        return Result;
       }
     }
   }

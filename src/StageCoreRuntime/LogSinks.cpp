@@ -1,5 +1,7 @@
 #include "StageCoreRuntime/LogSinks.h"
 
+#include "StageCoreRuntime/LogRepeats.h"
+
 #include <spdlog/sinks/rotating_file_sink.h>
 #include <spdlog/sinks/stdout_color_sinks.h>
 
@@ -48,6 +50,8 @@ struct VLogSinks::VImpl
   spdlog::sinks::stderr_color_sink_mt m_Console;
   std::unique_ptr<spdlog::sinks::rotating_file_sink_mt> m_pFile;
   std::string m_FileFailure;
+  VLogRepeats m_ToConsole{ [this]( const VLogRecord& i_rRecord ) { WriteTo( m_Console, i_rRecord ); } };
+  VLogRepeats m_ToFile{ [this]( const VLogRecord& i_rRecord ) { WriteTo( *m_pFile, i_rRecord ); } };
 };
 
 VLogSinks::VLogSinks( const VLogOptions& i_rOptions ) : m_pImpl( std::make_unique<VImpl>() )
@@ -75,13 +79,13 @@ bool VLogSinks::HasFile() const { return m_pImpl->m_pFile != nullptr; }
 
 const std::string& VLogSinks::FileFailure() const { return m_pImpl->m_FileFailure; }
 
-void VLogSinks::WriteToConsole( const VLogRecord& i_rRecord ) { WriteTo( m_pImpl->m_Console, i_rRecord ); }
+void VLogSinks::WriteToConsole( const VLogRecord& i_rRecord ) { m_pImpl->m_ToConsole.Write( i_rRecord ); }
 
 void VLogSinks::WriteToFile( const VLogRecord& i_rRecord )
 {
   if( m_pImpl->m_pFile )
   {
-    WriteTo( *m_pImpl->m_pFile, i_rRecord );
+    m_pImpl->m_ToFile.Write( i_rRecord );
   }
 }
 }

@@ -1,4 +1,4 @@
-// Where log records end up: console and rotating file. The one place that knows the logging library.
+// Where log records end up: console and rotating file, lines that repeat folded. The one place that knows the logging library.
 #pragma once
 
 #include "StageCoreRuntime/GlobalLog.h"

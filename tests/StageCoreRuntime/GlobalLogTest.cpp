@@ -1,4 +1,5 @@
 #include "StageCoreRuntime/GlobalLog.h"
+#include "StageCoreRuntime/LogRepeats.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 
@@ -6,6 +7,7 @@
 
 #include <boost/thread/thread.hpp>
 
+#include <algorithm>
 #include <fstream>
 #include <iterator>
 
@@ -141,6 +143,47 @@ TEST_F( LogFile, ThatCannotBeOpenedIsReportedAndTheConsoleGoesOn )
   KVZ_LOG( "GlobalLogTest.Plain", 2, "still here" );
   EXPECT_NE( testing::internal::GetCapturedStderr().find( "still here" ), std::string::npos );
   EXPECT_EQ( Capture.Texts().size(), 1u );
+}
+
+TEST_F( LogFile, FoldsALineThatRepeats )
+{
+  ASSERT_TRUE( KVZ::ConfigureLog( { .m_ConsoleLevel = 0, .m_FilePath = m_Folder.File( "host.log" ), .m_FileLevel = 3 } ) );
+  for( int Line = 0; Line < 4; ++Line )
+  {
+    KVZ_LOG( "GlobalLogTest.Plain", 2, "no memory" );
+  }
+  KVZ::ConfigureLog( {} );
+  const std::string Found = Content();
+  EXPECT_EQ( std::count( Found.begin(), Found.end(), '\n' ), 2 ) << Found;
+  EXPECT_NE( Found.find( "[GlobalLogTest.Plain:error] no memory (repeated 3 times) (GlobalLogTest.cpp:" ), std::string::npos ) << Found;
+}
+
+TEST( LogRepeats, CountUntilAnotherLineComesOrTheirTimeIsOver )
+{
+  double Now = 100.0;
+  std::vector<std::string> Lines;
+  KVZ::Detail::VLogRepeats Repeats( [&Lines]( const KVZ::VLogRecord& i_rRecord )
+    { Lines.push_back( std::string( i_rRecord.m_Category ) + std::to_string( i_rRecord.m_Level ) + ' ' + std::string( i_rRecord.m_Text ) ); },
+    [&Now] { return Now; } );
+  const auto Write = [&Repeats]( const char* i_pCategory, int i_Level, const char* i_pText ) {
+    Repeats.Write( { i_pCategory, i_Level, i_pText, "f.cpp", 1 } );
+  };
+  const auto Take = [&Lines] { return std::exchange( Lines, {} ); };
+  using VLines = std::vector<std::string>;
+  for( const char* pCategory : { "A", "A", "A", "B" } )
+  {
+    Write( pCategory, 2, "x" );
+  }
+  Write( "B", 3, "x" );
+  EXPECT_EQ( Take(), ( VLines{ "A2 x", "A2 x (repeated 2 times)", "B2 x", "B3 x" } ) );
+  for( int Second = 0; Second < 12; ++Second )
+  {
+    Write( "A", 2, "y" );
+    Now += 1.0;
+  }
+  EXPECT_EQ( Take(), ( VLines{ "A2 y", "A2 y (repeated 4 times)", "A2 y", "A2 y (repeated 4 times)", "A2 y" } ) );
+  Write( "A", 2, "z" );
+  EXPECT_EQ( Take(), ( VLines{ "A2 y (repeated 1 times)", "A2 z" } ) );
 }
 
 TEST( Log, ObserverMayLogAndRemoveItself )
