@@ -5,6 +5,7 @@
 #include <sys/mman.h>
 #include <sys/resource.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cerrno>
 
@@ -33,13 +34,15 @@ bool SetWorkingSet( size_t i_Minimum, size_t i_Maximum )
   bool bDone = getrlimit( RLIMIT_MEMLOCK, &Limit ) == 0;
   if( bDone && Limit.rlim_cur < i_Maximum )
   {
-    Limit.rlim_cur = i_Maximum;
-    if( Limit.rlim_max < i_Maximum ) Limit.rlim_max = i_Maximum;
-    bDone = setrlimit( RLIMIT_MEMLOCK, &Limit ) == 0;
+    const rlimit Raised{ i_Maximum, std::max<rlim_t>( i_Maximum, Limit.rlim_max ) };
+    bDone = setrlimit( RLIMIT_MEMLOCK, &Raised ) == 0;
   }
   if( !bDone )
   {
-    KVZ_LOG_ERROR( "UtilsMemory", "Working set could not be set to (%d - %d) MiB: error %d.", i_Minimum >> 20, i_Maximum >> 20, errno );
+    const int Error = errno;
+    KVZ_LOG_ERROR( "UtilsMemory", "Working set could not be set to (%d - %d) MiB: error %d.", i_Minimum >> 20, i_Maximum >> 20, Error );
+    Limit.rlim_cur = Limit.rlim_max;   // as far as every user may go
+    setrlimit( RLIMIT_MEMLOCK, &Limit );
   }
   return bDone;
 }

@@ -8,7 +8,7 @@ namespace UtilsMemory
 {
 
 // Bytes that the process wants to keep resident at least and at most. Here it is the limit of lockable memory (RLIMIT_MEMLOCK), which is
-// raised to the maximum as far as the process may. False, with a log entry, where it may not.
+// raised to the maximum. False, with a log entry, where the process may not; it is then raised as far as every process may.
 bool SetWorkingSet( size_t i_Minimum, size_t i_Maximum );
 
 // Page-aligned memory, locked where the system allows it. Null only if there is no memory at all.

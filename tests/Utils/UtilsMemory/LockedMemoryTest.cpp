@@ -5,7 +5,9 @@
 #include <gtest/gtest.h>
 
 #include <sys/resource.h>
+#include <unistd.h>
 
+#include <cstdlib>
 #include <cstring>
 
 namespace
@@ -31,16 +33,22 @@ TEST( LockedMemory, WorksWhereTheSystemRefusesToLock )
   ASSERT_EQ( setrlimit( RLIMIT_MEMLOCK, &Former ), 0 );
 }
 
-TEST( LockedMemory, WorkingSetRaisesTheLimitAsFarAsItMay )
+// In a process of its own, for a lowered limit cannot be raised again: exits with 0 where a user without rights gets what he may have.
+[[noreturn]] void RaiseAsAUserWithoutRights()
 {
-  rlimit Former{};
-  ASSERT_EQ( getrlimit( RLIMIT_MEMLOCK, &Former ), 0 );
-  const size_t Within = Former.rlim_max == RLIM_INFINITY ? size_t{ 64 } << 20 : Former.rlim_max;
-  EXPECT_TRUE( UtilsMemory::SetWorkingSet( 1 << 20, Within ) );
+  constexpr rlim_t Hard = 1 << 20;
+  const rlimit Little{ 0, Hard };
   rlimit Raised{};
-  ASSERT_EQ( getrlimit( RLIMIT_MEMLOCK, &Raised ), 0 );
-  EXPECT_GE( Raised.rlim_cur, Within );
-  ASSERT_EQ( setrlimit( RLIMIT_MEMLOCK, &Former ), 0 );
+  const bool bPrepared = setrlimit( RLIMIT_MEMLOCK, &Little ) == 0 && ( geteuid() != 0 || setresuid( 65534, 65534, 65534 ) == 0 );
+  const bool bWithin = bPrepared && UtilsMemory::SetWorkingSet( 4096, Hard / 2 ) && getrlimit( RLIMIT_MEMLOCK, &Raised ) == 0 &&
+    Raised.rlim_cur == Hard / 2;
+  const bool bRefused = bWithin && !UtilsMemory::SetWorkingSet( 4096, 8 * Hard );
+  std::_Exit( bRefused && getrlimit( RLIMIT_MEMLOCK, &Raised ) == 0 && Raised.rlim_cur == Hard ? 0 : 1 );
+}
+
+TEST( LockedMemoryDeathTest, WorkingSetRaisesTheLimitAsFarAsItMay )
+{
+  EXPECT_EXIT( RaiseAsAUserWithoutRights(), testing::ExitedWithCode( 0 ), "Working set could not be set to \\(0 - 8\\) MiB: error 1" );
 }
 
 }
