@@ -134,6 +134,7 @@ bool VDataStore::Remove( VDataStoreNode& i_rNode )
   i_rNode.m_Verified = {};
   i_rNode.m_bWaiting = false;
   Note( i_rNode, EDataEvent::Removed );
+  Note( i_rNode, EDataEvent::Changed );
   return true;
 }
 

@@ -21,7 +21,7 @@ public:
 
   // Someone has proposed a value, the same one as before included.
   virtual VEvent& OnProposedValue() = 0;
-  // The value that counts has become another one, or has been settled by its owner. See IDataStore.
+  // The value that counts has become another one, or none, or has been settled by its owner. See IDataStore.
   virtual VEvent& OnValueChanged() = 0;
   // There is a value where none was.
   virtual VEvent& OnValueAdded() = 0;

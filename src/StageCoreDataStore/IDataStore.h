@@ -94,7 +94,7 @@ public:
   virtual bool RemoveValue( const VDataAddress& i_rAddress, uint32_t i_Options ) = 0;   // 21
   // Removes all values here and below with their flags.
   virtual bool RemoveBranch( const VDataAddress& i_rAddress ) = 0;   // 22
-  // Gives up the waiting proposal: the verified form counts as if nothing had been asked. False if none waits or there is no verified form.
+  // Gives up the waiting proposal: the verified form settles it, and OnValueChanged fires. False if none waits or there is no verified form.
   virtual bool DiscardProposal( const VDataAddress& i_rAddress ) = 0;                   // 23
   virtual bool SetValueFlags( const VDataAddress& i_rAddress, uint32_t i_Flags ) = 0;   // 24
 };

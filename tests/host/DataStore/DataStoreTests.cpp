@@ -230,8 +230,11 @@ TEST_F( DataStore, AProposalCanBeGivenUp )
   EXPECT_FALSE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
   Verify( m_Path, 1 );
   Propose( m_Path, 2 );
+  std::string Heard;
+  Listen( m_Path, Heard );
   EXPECT_TRUE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
   EXPECT_EQ( Forms(), ( VForms{ 1, 1, 1 } ) );
+  EXPECT_TRUE( IsHeard( Heard, "cb" ) );
   Propose( m_Path, 3 );
   VDataWriter( m_Store ).SetValueFlags( m_Path, 0 );
   EXPECT_EQ( Forms(), ( VForms{ 3, 3, 3 } ) ) << "without an owner a proposal settles itself";
@@ -250,7 +253,7 @@ TEST_F( DataStore, FlagsStandByThemselves )
   Set( m_Path, 1 );
   Heard.clear();
   VDataWriter( m_Store ).RemoveValue( m_Path );
-  EXPECT_TRUE( IsHeard( Heard, "rb" ) );
+  EXPECT_TRUE( IsHeard( Heard, "rcb" ) );
   EXPECT_TRUE( VDataReader( m_Store ).GetValueFlags( m_Path, Flags ) );
   EXPECT_EQ( Flags, DataFlags::VerifyRequired );
   VDataWriter Writer( m_Store );
