@@ -3,6 +3,8 @@
 #include "Core/VideoInterface/Schemas.h"
 #include "Core/VideoInterface/VideoAttributes.h"
 
+#include <functional>
+#include <tuple>
 #include <type_traits>
 
 namespace KVZ
@@ -24,223 +26,170 @@ bool FromName( const std::string& i_rName, VLensDistortionRecord::ERadialModel& 
   return FindEnumerator( RadialModelTable, i_rName, o_rModel );
 }
 
-// Each record lists its fields once, in VFields; these two carry the list into a map and back. Enumerators travel as names.
-
-class VFieldWriter
+// A key and what gives the field of a record: a pointer to a member, or a function. TStored is the stored type where that is another one.
+template<class TMember, class TStored = void>
+struct VField
 {
-public:
-  VFieldWriter( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) : m_rAttributes( o_rAttributes ), m_Prefix( i_rPrefix ) {}
+  const char* m_pKey;
+  TMember m_Member;
+};
+template<class TMember>
+VField( const char*, TMember ) -> VField<TMember>;
 
-  template<class T>
-  void Field( const char* i_pKey, const T& i_rValue )
-  {
-    if constexpr( std::is_enum_v<T> )
-    {
-      m_rAttributes.Set( m_Prefix + i_pKey, ToName( i_rValue ) );
-    }
-    else
-    {
-      m_rAttributes.Set( m_Prefix + i_pKey, i_rValue );
-    }
-  }
-
-  template<class TStored, class T>
-  void FieldAs( const char* i_pKey, const T& i_rValue )
-  {
-    Field( i_pKey, static_cast<TStored>( i_rValue ) );
-  }
-
-private:
-  IVideoAttributes& m_rAttributes;
-  const std::string m_Prefix;
+template<auto Member, size_t Index>
+constexpr auto ElementOf = []( auto& io_rRecord ) -> auto&
+{
+  return ( io_rRecord.*Member )[Index];
 };
 
-// Stops at the first key that is missing, of another type or an unknown name.
-class VFieldReader
-{
-public:
-  VFieldReader( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix ) : m_rAttributes( i_rAttributes ), m_Prefix( i_rPrefix ) {}
-
-  template<class T>
-  void Field( const char* i_pKey, T& o_rValue )
-  {
-    if constexpr( std::is_enum_v<T> )
-    {
-      std::string Name;
-      Field( i_pKey, Name );
-      m_bGood = m_bGood && FromName( Name, o_rValue );
-    }
-    else
-    {
-      m_bGood = m_bGood && m_rAttributes.Get( m_Prefix + i_pKey, o_rValue );
-    }
-  }
-
-  template<class TStored, class T>
-  void FieldAs( const char* i_pKey, T& o_rValue )
-  {
-    TStored Stored{};
-    Field( i_pKey, Stored );
-    if( m_bGood )
-    {
-      o_rValue = static_cast<T>( Stored );
-    }
-  }
-
-  bool IsGood() const { return m_bGood; }
-
-private:
-  const IVideoAttributes& m_rAttributes;
-  const std::string m_Prefix;
-  bool m_bGood = true;
-};
-
+// The fields of a record in the order of their writing. Enumerators travel as names.
 template<class TRecord>
-struct VFields;
+constexpr auto Fields = std::tuple<>();
 
 template<>
-struct VFields<VideoFrameInfo>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "VideoFrameInfo.ImageX", i_rRecord.m_ImageX );
-    i_rVisitor.Field( "VideoFrameInfo.ImageY", i_rRecord.m_ImageY );
-    i_rVisitor.Field( "VideoFrameInfo.ImageWidth", i_rRecord.m_ImageWidth );
-    i_rVisitor.Field( "VideoFrameInfo.ImageHeight", i_rRecord.m_ImageHeight );
-    i_rVisitor.Field( "VideoFrameInfo.PixelFormat", i_rRecord.m_PixelFormat );
-    i_rVisitor.Field( "VideoFrameInfo.Inverted", i_rRecord.m_bInverted );
-    i_rVisitor.Field( "VideoFrameInfo.PixelAspectRatio", i_rRecord.m_PixelAspectRatio );
-    i_rVisitor.Field( "VideoFrameInfo.InterlacedFormat", i_rRecord.m_InterlacedFormat );
-  }
+constexpr auto Fields<VideoFrameInfo> = std::tuple{
+  VField{ "VideoFrameInfo.ImageX", &VideoFrameInfo::m_ImageX },
+  VField{ "VideoFrameInfo.ImageY", &VideoFrameInfo::m_ImageY },
+  VField{ "VideoFrameInfo.ImageWidth", &VideoFrameInfo::m_ImageWidth },
+  VField{ "VideoFrameInfo.ImageHeight", &VideoFrameInfo::m_ImageHeight },
+  VField{ "VideoFrameInfo.PixelFormat", &VideoFrameInfo::m_PixelFormat },
+  VField{ "VideoFrameInfo.Inverted", &VideoFrameInfo::m_bInverted },
+  VField{ "VideoFrameInfo.PixelAspectRatio", &VideoFrameInfo::m_PixelAspectRatio },
+  VField{ "VideoFrameInfo.InterlacedFormat", &VideoFrameInfo::m_InterlacedFormat },
 };
 
 template<>
-struct VFields<AudioFrameInfo>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "AudioFrameInfo.SampleFormat", i_rRecord.m_SampleFormat );
-    i_rVisitor.Field( "AudioFrameInfo.SampleRate", i_rRecord.m_SampleRate );
-    i_rVisitor.Field( "AudioFrameInfo.Channels", i_rRecord.m_Channels );
-  }
+constexpr auto Fields<AudioFrameInfo> = std::tuple{
+  VField{ "AudioFrameInfo.SampleFormat", &AudioFrameInfo::m_SampleFormat },
+  VField{ "AudioFrameInfo.SampleRate", &AudioFrameInfo::m_SampleRate },
+  VField{ "AudioFrameInfo.Channels", &AudioFrameInfo::m_Channels },
 };
 
 template<>
-struct VFields<VTimingRecord>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "TicksPerSecond", i_rRecord.m_TicksPerSecond );
-    i_rVisitor.Field( "FramePeriodInTicks", i_rRecord.m_FramePeriodInTicks );
-    i_rVisitor.Field( "StartOffsetInTicks", i_rRecord.m_StartOffsetInTicks );
-  }
+constexpr auto Fields<VTimingRecord> = std::tuple{
+  VField{ "TicksPerSecond", &VTimingRecord::m_TicksPerSecond },
+  VField{ "FramePeriodInTicks", &VTimingRecord::m_FramePeriodInTicks },
+  VField{ "StartOffsetInTicks", &VTimingRecord::m_StartOffsetInTicks },
 };
 
 template<>
-struct VFields<VColourRecord>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "Saturation", i_rRecord.m_Saturation );
-    i_rVisitor.Field( "GammaCorrection", i_rRecord.m_GammaCorrection );
-  }
+constexpr auto Fields<VColourRecord> = std::tuple{
+  VField{ "Saturation", &VColourRecord::m_Saturation },
+  VField{ "GammaCorrection", &VColourRecord::m_GammaCorrection },
 };
 
 template<>
-struct VFields<VCameraHardwareRecord>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "CameraHardware.DeviceURN", i_rRecord.m_DeviceURN );
-    i_rVisitor.Field( "CameraHardware.Type", i_rRecord.m_Type );
-    i_rVisitor.Field( "CameraHardware.DisplayType", i_rRecord.m_DisplayType );
-    i_rVisitor.Field( "CameraHardware.SensorWidthInPixels", i_rRecord.m_SensorWidthInPixels );
-    i_rVisitor.Field( "CameraHardware.SensorHeightInPixels", i_rRecord.m_SensorHeightInPixels );
-    i_rVisitor.Field( "CameraHardware.PixelAspectRatio", i_rRecord.m_PixelAspectRatio );
-  }
+constexpr auto Fields<VCameraHardwareRecord> = std::tuple{
+  VField{ "CameraHardware.DeviceURN", &VCameraHardwareRecord::m_DeviceURN },
+  VField{ "CameraHardware.Type", &VCameraHardwareRecord::m_Type },
+  VField{ "CameraHardware.DisplayType", &VCameraHardwareRecord::m_DisplayType },
+  VField{ "CameraHardware.SensorWidthInPixels", &VCameraHardwareRecord::m_SensorWidthInPixels },
+  VField{ "CameraHardware.SensorHeightInPixels", &VCameraHardwareRecord::m_SensorHeightInPixels },
+  VField{ "CameraHardware.PixelAspectRatio", &VCameraHardwareRecord::m_PixelAspectRatio },
 };
 
 template<>
-struct VFields<VLensDistortionRecord>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "LensDistortionCalibration.RadialModel", i_rRecord.m_RadialModel );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_X", i_rRecord.m_Centre[0] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionCentre_Y", i_rRecord.m_Centre[1] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_0", i_rRecord.m_Parameters[0] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_1", i_rRecord.m_Parameters[1] );
-    i_rVisitor.Field( "LensDistortionCalibration.RadialDistortionParameters_2", i_rRecord.m_Parameters[2] );
-  }
+constexpr auto Fields<VLensDistortionRecord> = std::tuple{
+  VField{ "LensDistortionCalibration.RadialModel", &VLensDistortionRecord::m_RadialModel },
+  VField{ "LensDistortionCalibration.RadialDistortionCentre_X", ElementOf<&VLensDistortionRecord::m_Centre, 0> },
+  VField{ "LensDistortionCalibration.RadialDistortionCentre_Y", ElementOf<&VLensDistortionRecord::m_Centre, 1> },
+  VField{ "LensDistortionCalibration.RadialDistortionParameters_0", ElementOf<&VLensDistortionRecord::m_Parameters, 0> },
+  VField{ "LensDistortionCalibration.RadialDistortionParameters_1", ElementOf<&VLensDistortionRecord::m_Parameters, 1> },
+  VField{ "LensDistortionCalibration.RadialDistortionParameters_2", ElementOf<&VLensDistortionRecord::m_Parameters, 2> },
 };
 
 template<>
-struct VFields<VConversionRecord>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.Field( "Container", i_rRecord.m_Container );
-    i_rVisitor.Field( "AudioPayload", i_rRecord.m_AudioPayload );
-    i_rVisitor.Field( "VideoPayload", i_rRecord.m_VideoPayload );
-    i_rVisitor.Field( "VideoFrameInfo.PixelFormat", i_rRecord.m_PixelFormat );
-  }
+constexpr auto Fields<VConversionRecord> = std::tuple{
+  VField{ "Container", &VConversionRecord::m_Container },
+  VField{ "AudioPayload", &VConversionRecord::m_AudioPayload },
+  VField{ "VideoPayload", &VConversionRecord::m_VideoPayload },
+  VField{ "VideoFrameInfo.PixelFormat", &VConversionRecord::m_PixelFormat },
 };
 
 template<>
-struct VFields<ITimecode>
-{
-  static void Visit( auto& i_rRecord, auto& i_rVisitor )
-  {
-    i_rVisitor.template FieldAs<uint32_t>( "Timecode.Standards", i_rRecord.m_Standard );
-    i_rVisitor.Field( "Timecode.Hours", i_rRecord.m_Hours );
-    i_rVisitor.Field( "Timecode.Minutes", i_rRecord.m_Minutes );
-    i_rVisitor.Field( "Timecode.Seconds", i_rRecord.m_Seconds );
-    i_rVisitor.Field( "Timecode.Frames", i_rRecord.m_Frames );
-    i_rVisitor.Field( "Timecode.UserBits", i_rRecord.m_UserBits );
-    i_rVisitor.Field( "Timecode.Days", i_rRecord.m_Days );
-    i_rVisitor.Field( "Timecode.TickRemainder", i_rRecord.m_TickRemainder );
-    i_rVisitor.Field( "Timecode.SubFramePeriod", i_rRecord.m_SubFramePeriod );
-  }
+constexpr auto Fields<ITimecode> = std::tuple{
+  VField<int32_t ITimecode::*, uint32_t>{ "Timecode.Standards", &ITimecode::m_Standard },
+  VField{ "Timecode.Hours", &ITimecode::m_Hours },
+  VField{ "Timecode.Minutes", &ITimecode::m_Minutes },
+  VField{ "Timecode.Seconds", &ITimecode::m_Seconds },
+  VField{ "Timecode.Frames", &ITimecode::m_Frames },
+  VField{ "Timecode.UserBits", &ITimecode::m_UserBits },
+  VField{ "Timecode.Days", &ITimecode::m_Days },
+  VField{ "Timecode.TickRemainder", &ITimecode::m_TickRemainder },
+  VField{ "Timecode.SubFramePeriod", &ITimecode::m_SubFramePeriod },
 };
 
-template<class TRecord>
-bool WriteFields( const TRecord& i_rRecord, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
+template<class TStored, class T>
+auto ToStored( const T& i_rValue )
 {
-  VFieldWriter Writer( o_rAttributes, i_rPrefix );
-  VFields<TRecord>::Visit( i_rRecord, Writer );
-  return true;
+  if constexpr( std::is_enum_v<T> )
+  {
+    return ToName( i_rValue );
+  }
+  else
+  {
+    return static_cast<std::conditional_t<std::is_void_v<TStored>, T, TStored>>( i_rValue );
+  }
+}
+
+template<class TStored, class T>
+bool FromStored( const TStored& i_rStored, T& o_rValue )
+{
+  if constexpr( std::is_enum_v<T> )
+  {
+    return FromName( i_rStored, o_rValue );
+  }
+  else
+  {
+    o_rValue = static_cast<T>( i_rStored );
+    return true;
+  }
 }
 
 template<class TRecord>
-bool ReadFields( TRecord& o_rRecord, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool Write( const TRecord& i_rRecord, IVideoAttributes& o_rMap, const std::string& i_rPrefix )
 {
-  VFieldReader Reader( i_rAttributes, i_rPrefix );
-  VFields<TRecord>::Visit( o_rRecord, Reader );
-  return Reader.IsGood();
+  const auto WriteOne = [&]<class TMember, class TStored>( const VField<TMember, TStored>& i_rField )
+  { o_rMap.Set( i_rPrefix + i_rField.m_pKey, ToStored<TStored>( std::invoke( i_rField.m_Member, i_rRecord ) ) ); };
+  std::apply( [&]( const auto&... i_rField ) { ( WriteOne( i_rField ), ... ); }, Fields<TRecord> );
+  return true;
+}
+
+// Stops at the first key that is missing, of another type or an unknown name.
+template<class TRecord>
+bool Read( TRecord& o_rRecord, const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
+{
+  const auto ReadOne = [&]<class TMember, class TStored>( const VField<TMember, TStored>& i_rField )
+  {
+    auto& rValue = std::invoke( i_rField.m_Member, o_rRecord );
+    auto Stored = ToStored<TStored>( rValue );
+    return i_rMap.Get( i_rPrefix + i_rField.m_pKey, Stored ) && FromStored( Stored, rValue );
+  };
+  return std::apply( [&]( const auto&... i_rField ) { return ( ReadOne( i_rField ) && ... ); }, Fields<TRecord> );
 }
 
 // Frame descriptions stand behind a flag that says whether there is one at all.
 template<class TRecord>
-bool WriteOptional( const TRecord& i_rRecord, bool i_bWhole, const char* i_pKey, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
+bool WriteOptional( const TRecord& i_rRecord, bool i_bWhole, const char* i_pKey, IVideoAttributes& o_rMap, const std::string& i_rPrefix )
 {
   if( !i_rRecord.IsEmpty() && !i_bWhole )
   {
     return false;
   }
-  o_rAttributes.Set( i_rPrefix + i_pKey, !i_rRecord.IsEmpty() );
-  return i_rRecord.IsEmpty() || WriteFields( i_rRecord, o_rAttributes, i_rPrefix );
+  o_rMap.Set( i_rPrefix + i_pKey, !i_rRecord.IsEmpty() );
+  return i_rRecord.IsEmpty() || Write( i_rRecord, o_rMap, i_rPrefix );
 }
 
 template<class TRecord>
-bool ReadOptional( TRecord& o_rRecord, const char* i_pKey, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool ReadOptional( TRecord& o_rRecord, const char* i_pKey, const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
   bool bPresent = false;
-  if( !i_rAttributes.Get( i_rPrefix + i_pKey, bPresent ) || !bPresent )
+  if( !i_rMap.Get( i_rPrefix + i_pKey, bPresent ) || !bPresent )
   {
     o_rRecord = TRecord();
     return true;
   }
-  return ReadFields( o_rRecord, i_rAttributes, i_rPrefix );
+  return Read( o_rRecord, i_rMap, i_rPrefix );
 }
 
 std::string ConversionPrefix( const std::string& i_rPrefix, size_t i_Index )
@@ -250,64 +199,52 @@ std::string ConversionPrefix( const std::string& i_rPrefix, size_t i_Index )
 
 }
 
-bool VideoFrameInfo::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
+bool VideoFrameInfo::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const
 {
-  return WriteOptional( *this, IsWhole(), "VideoFrameInfo.Present", o_rAttributes, i_rPrefix );
+  return WriteOptional( *this, IsWhole(), "VideoFrameInfo.Present", o_rMap, i_rPrefix );
 }
 
-bool VideoFrameInfo::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool VideoFrameInfo::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
-  return ReadOptional( *this, "VideoFrameInfo.Present", i_rAttributes, i_rPrefix );
+  return ReadOptional( *this, "VideoFrameInfo.Present", i_rMap, i_rPrefix );
 }
 
-bool AudioFrameInfo::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
+bool AudioFrameInfo::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const
 {
-  return WriteOptional( *this, m_SampleRate != 0 && m_Channels != 0, "AudioFrameInfo.Present", o_rAttributes, i_rPrefix );
+  return WriteOptional( *this, m_SampleRate != 0 && m_Channels != 0, "AudioFrameInfo.Present", o_rMap, i_rPrefix );
 }
 
-bool AudioFrameInfo::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool AudioFrameInfo::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
-  return ReadOptional( *this, "AudioFrameInfo.Present", i_rAttributes, i_rPrefix );
+  return ReadOptional( *this, "AudioFrameInfo.Present", i_rMap, i_rPrefix );
 }
 
-bool VTimingRecord::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
+bool VTimingRecord::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const { return Write( *this, o_rMap, i_rPrefix ); }
+
+bool VTimingRecord::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix ) { return Read( *this, i_rMap, i_rPrefix ); }
+
+bool VColourRecord::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const { return Write( *this, o_rMap, i_rPrefix ); }
+
+bool VColourRecord::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix ) { return Read( *this, i_rMap, i_rPrefix ); }
+
+bool VCameraHardwareRecord::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const
 {
-  return WriteFields( *this, o_rAttributes, i_rPrefix );
+  return Write( *this, o_rMap, i_rPrefix );
 }
 
-bool VTimingRecord::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool VCameraHardwareRecord::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
-  return ReadFields( *this, i_rAttributes, i_rPrefix );
+  return Read( *this, i_rMap, i_rPrefix );
 }
 
-bool VColourRecord::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
+bool VLensDistortionRecord::WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix ) const
 {
-  return WriteFields( *this, o_rAttributes, i_rPrefix );
+  return Write( *this, o_rMap, i_rPrefix );
 }
 
-bool VColourRecord::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool VLensDistortionRecord::ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
-  return ReadFields( *this, i_rAttributes, i_rPrefix );
-}
-
-bool VCameraHardwareRecord::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
-{
-  return WriteFields( *this, o_rAttributes, i_rPrefix );
-}
-
-bool VCameraHardwareRecord::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
-{
-  return ReadFields( *this, i_rAttributes, i_rPrefix );
-}
-
-bool VLensDistortionRecord::WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix ) const
-{
-  return WriteFields( *this, o_rAttributes, i_rPrefix );
-}
-
-bool VLensDistortionRecord::ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
-{
-  return ReadFields( *this, i_rAttributes, i_rPrefix );
+  return Read( *this, i_rMap, i_rPrefix );
 }
 
 const VEnumTable& GetEnumTable( VLensDistortionRecord::ERadialModel ) { return RadialModelTable; }
@@ -318,22 +255,22 @@ std::string ToName( VLensDistortionRecord::ERadialModel i_Model )
   return Name.empty() ? "<Unknown>" : Name;
 }
 
-bool WriteAttributes( const std::vector<VConversionRecord>& i_rRecords, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
+bool WriteAttributes( const std::vector<VConversionRecord>& i_rRecords, IVideoAttributes& o_rMap, const std::string& i_rPrefix )
 {
   for( size_t Index = 0; Index < i_rRecords.size(); ++Index )
   {
-    WriteFields( i_rRecords[Index], o_rAttributes, ConversionPrefix( i_rPrefix, Index ) );
+    Write( i_rRecords[Index], o_rMap, ConversionPrefix( i_rPrefix, Index ) );
   }
   return true;
 }
 
-bool ReadAttributes( std::vector<VConversionRecord>& o_rRecords, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool ReadAttributes( std::vector<VConversionRecord>& o_rRecords, const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
   o_rRecords.clear();
-  while( i_rAttributes.Has( ConversionPrefix( i_rPrefix, o_rRecords.size() ) + "Container" ) )
+  while( i_rMap.Has( ConversionPrefix( i_rPrefix, o_rRecords.size() ) + "Container" ) )
   {
     VConversionRecord Record;
-    if( !ReadFields( Record, i_rAttributes, ConversionPrefix( i_rPrefix, o_rRecords.size() ) ) )
+    if( !Read( Record, i_rMap, ConversionPrefix( i_rPrefix, o_rRecords.size() ) ) )
     {
       return false;
     }
@@ -342,14 +279,14 @@ bool ReadAttributes( std::vector<VConversionRecord>& o_rRecords, const IVideoAtt
   return true;
 }
 
-bool WriteAttributes( const ITimecode& i_rTimecode, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix )
+bool WriteAttributes( const ITimecode& i_rTimecode, IVideoAttributes& o_rMap, const std::string& i_rPrefix )
 {
-  return WriteFields( i_rTimecode, o_rAttributes, i_rPrefix );
+  return Write( i_rTimecode, o_rMap, i_rPrefix );
 }
 
-bool ReadAttributes( ITimecode& o_rTimecode, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix )
+bool ReadAttributes( ITimecode& o_rTimecode, const IVideoAttributes& i_rMap, const std::string& i_rPrefix )
 {
-  return ReadFields( o_rTimecode, i_rAttributes, i_rPrefix );
+  return Read( o_rTimecode, i_rMap, i_rPrefix );
 }
 
 }

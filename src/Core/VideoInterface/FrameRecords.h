@@ -43,8 +43,8 @@ struct VideoFrameInfo
   bool IsWhole() const { return m_ImageWidth != 0 && m_ImageHeight != 0 && m_PixelFormat != IPixelFormat::EUnspecified; }
 
   // An empty record writes its "Present" key as false and no more; one that is neither empty nor whole writes nothing and gives false.
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 struct AudioFrameInfo
@@ -60,8 +60,8 @@ struct AudioFrameInfo
   bool HasAudio() const { return m_SampleFormat != IAudioSampleFormat::EUnspecified && m_SampleRate != 0 && m_Channels != 0; }
 
   // The same rule as for VideoFrameInfo; whole means a rate and channels.
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 struct VTimingRecord
@@ -71,8 +71,8 @@ struct VTimingRecord
   int64_t m_StartOffsetInTicks = 0;
 
   bool operator==( const VTimingRecord& ) const = default;
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 struct VColourRecord
@@ -81,8 +81,8 @@ struct VColourRecord
   float m_GammaCorrection = 1.0f;
 
   bool operator==( const VColourRecord& ) const = default;
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 struct VCameraHardwareRecord
@@ -95,8 +95,8 @@ struct VCameraHardwareRecord
   double m_PixelAspectRatio = 0.0;
 
   bool operator==( const VCameraHardwareRecord& ) const = default;
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 // Lens calibration; the model's enumeration is "LensDistortionCalibration.ERadialModel".
@@ -114,8 +114,8 @@ struct VLensDistortionRecord
   std::array<double, 3> m_Parameters{};
 
   bool operator==( const VLensDistortionRecord& ) const = default;
-  bool WriteAttributes( IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} ) const;
-  bool ReadAttributes( const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+  bool WriteAttributes( IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} ) const;
+  bool ReadAttributes( const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 };
 
 // "<Unknown>" for a value without a name.
@@ -131,11 +131,11 @@ struct VConversionRecord
 
   bool operator==( const VConversionRecord& ) const = default;
 };
-bool WriteAttributes( const std::vector<VConversionRecord>& i_rRecords, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} );
-bool ReadAttributes( std::vector<VConversionRecord>& o_rRecords, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+bool WriteAttributes( const std::vector<VConversionRecord>& i_rRecords, IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} );
+bool ReadAttributes( std::vector<VConversionRecord>& o_rRecords, const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 
 // All nine fields, valid or not: who stores a start timecode asks IsValid first.
-bool WriteAttributes( const ITimecode& i_rTimecode, IVideoAttributes& o_rAttributes, const std::string& i_rPrefix = {} );
-bool ReadAttributes( ITimecode& o_rTimecode, const IVideoAttributes& i_rAttributes, const std::string& i_rPrefix = {} );
+bool WriteAttributes( const ITimecode& i_rTimecode, IVideoAttributes& o_rMap, const std::string& i_rPrefix = {} );
+bool ReadAttributes( ITimecode& o_rTimecode, const IVideoAttributes& i_rMap, const std::string& i_rPrefix = {} );
 
 }
