@@ -224,6 +224,8 @@ STAGECORE_SEGMENT( VolumeProperties )
 STAGECORE_SEGMENT( ObjectPreset )
 STAGECORE_SEGMENT( TemporarySettings )
 STAGECORE_SEGMENT( SmartObject )
+STAGECORE_SEGMENT( IXOMSystem )
+STAGECORE_SEGMENT( Device )
 STAGECORE_SEGMENT( CameraCalibrationMarkerBaseline )
 }
 
