@@ -213,6 +213,7 @@ private:
   static VCaptureRange MakeRange( const VGlobalSyncSessionInfo& i_rInfo, KVZ::VTick i_Start, KVZ::VTick i_End );
   void FillStatus( const VCaptureSessionStatus& i_rBuffer, const VGlobalSyncSessionInfo* i_pInfo, KVZ::ICaptureStatus& io_rStatus ) const;
   double BufferFill() const;
+  KVZ::ICaptureStatus ReadCaptureStatus();
   void UpdateBusy( uint32_t i_State );
   void TellBusy();
   VCaptureState CurrentCapture() const;
@@ -232,13 +233,13 @@ private:
 
   std::atomic<uint64_t> m_DroppedFrames{ 0 };
   std::atomic<uint64_t> m_RefusedFrames{ 0 };
+  std::atomic<bool> m_bBusyTold{ false };   // by the strand
 
   // Delivery thread only
   KVZ::VCaptureSessionId m_ExhaustedCapture;   // ended for want of memory; frames are refused until its readers have finished
 
   // Strand only
   KVZ::VCaptureSessionId m_PreparedCapture;   // BeginCapture has run for it
-  bool m_bBusyTold = false;
 
   mutable boost::mutex m_Mutex;
   KVZ::ISourceSyncSession m_Session GUARDED_BY( m_Mutex );   // to be offered; m_Id 0 for none
@@ -248,7 +249,6 @@ private:
   VTriggerPlan m_TriggerPlan GUARDED_BY( m_Mutex );
   bool m_bEnabled GUARDED_BY( m_Mutex ) = true;
   VCaptureState m_Capture GUARDED_BY( m_Mutex );
-  bool m_bBusy GUARDED_BY( m_Mutex ) = false;
 
   boost::mutex m_WakeMutex;                             // never held with another
   uint64_t m_WakeToken GUARDED_BY( m_WakeMutex ) = 0;   // left by a reader that found nothing

@@ -21,6 +21,8 @@ VToken LastBefore( const VGlobalSyncSessionInfo& i_rInfo, VTick i_End )
   return Token;
 }
 
+bool IsBusy( uint32_t i_State ) { return ( i_State & BusyStates ) != 0; }
+
 bool IsTime( VTick i_Tick ) { return i_Tick.IsValid() && !i_Tick.IsOpen(); }
 
 // The source's clocks, and all others, at a global tick.
@@ -227,6 +229,13 @@ void VDataSource::CancelCapture()
 
 KVZ::ICaptureStatus VDataSource::GetCaptureStatus()
 {
+  const KVZ::ICaptureStatus Status = ReadCaptureStatus();
+  UpdateBusy( Status.m_State );
+  return Status;
+}
+
+KVZ::ICaptureStatus VDataSource::ReadCaptureStatus()
+{
   const VCaptureState Capture = CurrentCapture();
   KVZ::ICaptureStatus Status = Capture.m_LastStatus;
   VCaptureSessionStatus Buffer;
@@ -246,7 +255,6 @@ KVZ::ICaptureStatus VDataSource::GetCaptureStatus()
       m_Capture.m_LastStatus = Status;
     }
   }
-  UpdateBusy( Status.m_State );
   return Status;
 }
 
@@ -281,38 +289,27 @@ double VDataSource::BufferFill() const
   return Total > 0.0 ? Used / Total : 0.0;
 }
 
-// Whoever asks for the status may find the change; the hook hears of it on the strand, in order.
+// Whoever asks for the status may find a change. What is told is read anew on the strand, where no older report can overtake a newer one.
 void VDataSource::UpdateBusy( uint32_t i_State )
 {
-  const bool bBusy = ( i_State & BusyStates ) != 0;
+  if( IsBusy( i_State ) != m_bBusyTold )
   {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( m_bBusy == bBusy )
-    {
-      return;
-    }
-    m_bBusy = bBusy;
-  }
-  PostToStrand(
-    [pWeak = KVZ::WeakFrom( this )]
-    {
-      if( const auto pThis = pWeak.lock() )
+    PostToStrand(
+      [pWeak = KVZ::WeakFrom( this )]
       {
-        pThis->TellBusy();
-      }
-    } );
+        if( const auto pThis = pWeak.lock() )
+        {
+          pThis->TellBusy();
+        }
+      } );
+  }
 }
 
 void VDataSource::TellBusy()
 {
-  bool bBusy = false;
+  const bool bBusy = IsBusy( ReadCaptureStatus().m_State );
+  if( m_bBusyTold.exchange( bBusy ) != bBusy )
   {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    bBusy = m_bBusy;
-  }
-  if( bBusy != m_bBusyTold )
-  {
-    m_bBusyTold = bBusy;
     OnBusyChanged( bBusy );
   }
 }

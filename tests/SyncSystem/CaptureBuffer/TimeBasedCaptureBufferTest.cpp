@@ -233,6 +233,13 @@ TEST_F( TimeBasedCaptureBuffer, ForcedSessionIsContinuedByAFrameWithItsReadings 
     EXPECT_EQ( m_Reading, Period * 2 );
     EXPECT_EQ( Record( Id ).m_ContinuousSince.at( Timecode ), 1u ) << bEmpty;   // also across the forced session
   }
+  m_pBuffer->RequestNewBufferSession();
+  uint32_t Id = 0;
+  ASSERT_TRUE( m_pBuffer->ForceNewSyncSession( m_Timing, Id ) );
+  EXPECT_EQ( BufferSession(), 2u ) << "one that was asked for begins here";
+  Add();
+  EXPECT_EQ( m_Id, Id );
+  EXPECT_EQ( BufferSession(), 2u ) << "and not once more";
 }
 
 TEST_F( TimeBasedCaptureBuffer, PositionsAndTicks )

@@ -2,6 +2,8 @@
 
 #include "tests/support/LogCapture.h"
 
+#include <algorithm>
+
 namespace
 {
 
@@ -43,6 +45,15 @@ protected:
     m_Rig.OnStrand( [&] { m_Rig.m_pSource->EndCapture( i_End ); } );
   }
 
+  // Of the 50 blocks that there are.
+  void TakeMemory( int i_Blocks )
+  {
+    for( int Block = 0; Block < i_Blocks; ++Block )
+    {
+      m_Taken.push_back( m_Rig.m_Memory.m_pAllocator->Allocate( m_Rig.m_Memory.m_pAllocator->MaxAllocation() ) );
+    }
+  }
+
   // What the client can read just now.
   std::vector<int64_t> Drain()
   {
@@ -73,8 +84,14 @@ protected:
     return Indices;
   }
 
+  void TearDown() override
+  {
+    std::for_each( m_Taken.begin(), m_Taken.end(), [this]( void* i_pBlock ) { m_Rig.m_Memory.m_pAllocator->Free( i_pBlock ); } );
+  }
+
   VSourceRig m_Rig;
   uint32_t m_Client = 0;
+  std::vector<void*> m_Taken;
 };
 
 TEST_F( DataSourceCaptures, TakesTheFramesFromStartToBeforeEnd )
@@ -257,6 +274,40 @@ TEST_F( DataSourceCaptures, FailuresOfThePreparationReachTheStatus )
   EXPECT_EQ( Drain(), Range( 0, 0 ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Idle );
   EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+
+  m_Rig.m_pSource->m_bBegins = true;
+  m_Rig.m_pSource->m_BeginErrors.clear();
+  ASSERT_TRUE( Start( 2, At( 2 ), At( 5 ) ) );
+  EXPECT_EQ( m_Rig.m_pSource->m_Begun, ( std::vector<uint32_t>{ 1, 2, 2 } ) ) << "another try prepares anew";
+  EXPECT_EQ( Drain(), Range( 2, 5 ) );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::None );
+}
+
+// The readers have passed every frame, so that memory which is needed elsewhere takes the newest one too.
+TEST_F( DataSourceCaptures, EndsAtANewestFrameThatHasBeenEvicted )
+{
+  ASSERT_TRUE( Start( 1, At( 4 ), VTick::Open() ) );
+  EXPECT_EQ( Drain(), Range( 4, 10 ) );
+  TakeMemory( 50 );
+  SyncSystem::VToken Newest;
+  ASSERT_FALSE( m_Rig.m_pSource->Buffer()->GetNewestToken( Newest ) );
+  EndAt( VTick::Open() );
+  EXPECT_EQ( m_Rig.m_pSource->m_Ends, ( std::vector<VTick>{ Period * 9 } ) );
+  Drain();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::None );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 6 );
+}
+
+TEST_F( DataSourceCaptures, RunsOutOfMemoryWithoutAFrameLeft )
+{
+  ASSERT_TRUE( Start( 1, At( 4 ), At( 20 ) ) );
+  Drain();
+  TakeMemory( 51 );
+  Drain();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::MemoryExhausted );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 6 );
 }
 
 TEST_F( DataSourceCaptures, ARangeThatCannotBeHadFailsWithItsFlag )
