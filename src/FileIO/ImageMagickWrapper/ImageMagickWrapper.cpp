@@ -15,8 +15,6 @@ namespace ImageMagickWrapper
 namespace
 {
 
-constexpr const char* CoderPathVariable = "MAGICK_CODER_MODULE_PATH";
-
 // Takes the function of the first of the two names that is there.
 template<class TFunction>
 bool Find( void* i_pHandle, TFunction& o_rFunction, const char* i_pName, const char* i_pOtherName = nullptr )
@@ -47,10 +45,15 @@ bool FindAll( void* i_pHandle, VFunctions& o_rFunctions )
     Find( i_pHandle, r.MagickRelinquishMemory, "MagickRelinquishMemory" );
 }
 
-bool HasCoders( const boost::filesystem::path& i_rFolder )
+// Points an ImageMagick that is shipped beside the program to its coder modules there. One that belongs to the system knows where its own
+// are and would find none of them any more if it were sent to a folder without them. A person's own setting stays in force.
+void SetCoderPath( const boost::filesystem::path& i_rFolder )
 {
   boost::system::error_code Error;
-  return boost::filesystem::exists( i_rFolder / "png.la", Error ) || boost::filesystem::exists( i_rFolder / "png.so", Error );
+  if( boost::filesystem::exists( i_rFolder / "png.la", Error ) || boost::filesystem::exists( i_rFolder / "png.so", Error ) )
+  {
+    setenv( "MAGICK_CODER_MODULE_PATH", i_rFolder.c_str(), 0 );
+  }
 }
 
 }
@@ -64,26 +67,25 @@ VPlaces SystemPlaces()
 
 VLibrary::VLibrary( const VPlaces& i_rPlaces )
 {
-  if( !dlopen( nullptr, RTLD_NOW ) )
+  const char* pFault = nullptr;
+  boost::system::error_code Error;
+  const boost::filesystem::path Program = boost::filesystem::read_symlink( i_rPlaces.m_ProgramLink, Error );
+  if( Error )
   {
-    KVZ_LOG_ERROR( "ImageMagickWrapper", "Could not get module handle." );
+    pFault = "Could not get module handle.";
   }
-  else if( !SetCoderPath( i_rPlaces.m_ProgramLink ) )
+  else if( !Program.has_parent_path() )
   {
-    KVZ_LOG_ERROR( "ImageMagickWrapper", "Could not get module filename." );
-  }
-  else if( !Load( i_rPlaces.m_Libraries ) )
-  {
-    KVZ_LOG_ERROR( "ImageMagickWrapper", "Could not load MagickWand DLL" );
-  }
-  else if( !FindAll( m_pHandle, m_Functions ) )
-  {
-    KVZ_LOG_ERROR( "ImageMagickWrapper", "Could not set up function pointers for ImageMagick library." );
+    pFault = "Could not get module filename.";
   }
   else
   {
-    m_Functions.MagickWandGenesis();
-    m_bReady = true;
+    SetCoderPath( Program.parent_path() );
+    pFault = Open( i_rPlaces.m_Libraries );
+  }
+  if( pFault )
+  {
+    KVZ_LOG_ERROR( "ImageMagickWrapper", pFault );
   }
 }
 
@@ -95,36 +97,26 @@ VLibrary::~VLibrary()
   }
 }
 
-// Points an ImageMagick that is shipped beside the program to its coder modules there. One that belongs to the system knows where its own
-// are and would find none of them any more if it were sent to a folder without them. A person's own setting stays in force.
-bool VLibrary::SetCoderPath( const std::string& i_rProgramLink ) const
+// Null where all went well, otherwise what did not.
+const char* VLibrary::Open( const std::vector<std::string>& i_rNames )
 {
-  boost::system::error_code Error;
-  const boost::filesystem::path Program = boost::filesystem::read_symlink( i_rProgramLink, Error );
-  if( Error || !Program.has_parent_path() )
+  void* pHandle = nullptr;
+  for( auto Name = i_rNames.begin(); Name != i_rNames.end() && !pHandle; ++Name )
   {
-    return false;
+    m_bForeign = dlopen( Name->c_str(), RTLD_NOW | RTLD_LOCAL | RTLD_NOLOAD ) != nullptr;
+    pHandle = dlopen( Name->c_str(), RTLD_NOW | RTLD_LOCAL );
   }
-  const boost::filesystem::path Folder = Program.parent_path();
-  if( HasCoders( Folder ) )
+  if( !pHandle )
   {
-    setenv( CoderPathVariable, Folder.c_str(), 0 );
+    return "Could not load MagickWand DLL";
   }
-  return true;
-}
-
-bool VLibrary::Load( const std::vector<std::string>& i_rNames )
-{
-  for( const std::string& rName : i_rNames )
+  if( !FindAll( pHandle, m_Functions ) )
   {
-    m_bForeign = dlopen( rName.c_str(), RTLD_NOW | RTLD_LOCAL | RTLD_NOLOAD ) != nullptr;
-    m_pHandle = dlopen( rName.c_str(), RTLD_NOW | RTLD_LOCAL );
-    if( m_pHandle )
-    {
-      return true;
-    }
+    return "Could not set up function pointers for ImageMagick library.";
   }
-  return false;
+  m_Functions.MagickWandGenesis();
+  m_bReady = true;
+  return nullptr;
 }
 
 const VLibrary& Instance()

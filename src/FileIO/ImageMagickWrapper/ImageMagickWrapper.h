@@ -70,10 +70,8 @@ public:
   const VFunctions* Functions() const { return m_bReady ? &m_Functions : nullptr; }
 
 private:
-  bool SetCoderPath( const std::string& i_rProgramLink ) const;
-  bool Load( const std::vector<std::string>& i_rNames );
+  const char* Open( const std::vector<std::string>& i_rNames );
 
-  void* m_pHandle = nullptr;
   VFunctions m_Functions;
   bool m_bForeign = false;   // somebody else loaded it first
   bool m_bReady = false;
