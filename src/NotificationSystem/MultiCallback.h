@@ -140,7 +140,7 @@ private:
     {
       return nullptr;
     }
-    const VEntry pEntry = *Found;
+    VEntry pEntry = *Found;
     auto pList = std::make_shared<VList>( m_pList->begin(), Found );
     pList->insert( pList->end(), Found + 1, m_pList->end() );
     m_pList = pList->empty() ? nullptr : std::move( pList );
@@ -301,8 +301,7 @@ private:
     }
     const auto pMap = std::make_shared<VMap>( *m_pMap );
     std::erase_if( *pMap, IsEmpty );
-    const std::shared_ptr<const VMap> pFormer = std::exchange( m_pMap, pMap->empty() ? nullptr : pMap );
-    return pFormer;
+    return std::exchange( m_pMap, pMap->empty() ? nullptr : pMap );
   }
 
   const std::shared_ptr<KVZ::IPostalService> m_pDefaultService;

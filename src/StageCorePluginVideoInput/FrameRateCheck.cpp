@@ -1,6 +1,7 @@
 #include "StageCorePluginVideoInput/FrameRateCheck.h"
 
 #include "StageCoreRuntime/GlobalLog.h"
+#include "SyncSystem/Tick.h"
 
 #include <algorithm>
 #include <array>
@@ -11,7 +12,7 @@ namespace
 
 using KVZ::IGenlockStandard;
 
-constexpr double TicksPerSecond = 135000000.0;
+constexpr auto TicksPerSecond = static_cast<double>( KVZ::VTick::TicksPerSecond );
 
 // 30, 29.97, 25, 24 and 23.98 frames a second
 constexpr std::array<int64_t, 5> BasePeriods = { 4500000, 4504500, 5400000, 5625000, 5630625 };

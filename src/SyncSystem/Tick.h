@@ -54,7 +54,7 @@ private:
 
 using VTick = ITick<135000000>;
 
-constexpr VTick SecondsToTick135( int64_t i_Seconds ) { return VTick( i_Seconds * 135000000 ); }
-constexpr VTick MillisecondsToTick135( int64_t i_Milliseconds ) { return VTick( i_Milliseconds * 135000 ); }
+constexpr VTick SecondsToTick135( int64_t i_Seconds ) { return VTick( i_Seconds * VTick::TicksPerSecond ); }
+constexpr VTick MillisecondsToTick135( int64_t i_Milliseconds ) { return VTick( i_Milliseconds * ( VTick::TicksPerSecond / 1000 ) ); }
 
 }

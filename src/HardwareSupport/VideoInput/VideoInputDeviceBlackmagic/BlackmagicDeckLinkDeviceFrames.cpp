@@ -3,6 +3,7 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceModes.h"
 
 #include "StageCoreRuntime/GlobalLog.h"
+#include "SyncSystem/Tick.h"
 
 #include <boost/thread/lock_guard.hpp>
 
@@ -20,7 +21,6 @@ namespace
 using namespace DeckLinkAPI;
 
 constexpr const char* LogCategory = "VideoInputDeviceBlackmagic";
-constexpr int64_t TicksPerSecond = 135000000;
 
 KVZ::VideoFrameInfo DescribeImage( IDeckLinkVideoInputFrame& i_rVideo, KVZ::IPixelFormat::Enum i_PixelFormat,
   KVZ::IInterlacedFormat::Enum i_Interlaced )
@@ -127,7 +127,7 @@ void VBlackmagicDeckLinkDevice::VImpl::CountDroppedFrames( IDeckLinkVideoInputFr
 {
   int64_t Time = 0;
   int64_t Duration = 0;
-  if( i_rVideo.GetHardwareReferenceTimestamp( TicksPerSecond, &Time, &Duration ) < 0 || Duration <= 0 )
+  if( i_rVideo.GetHardwareReferenceTimestamp( KVZ::VTick::TicksPerSecond, &Time, &Duration ) < 0 || Duration <= 0 )
   {
     return;
   }

@@ -1,6 +1,7 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceTimecode.h"
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
+#include "SyncSystem/Tick.h"
 
 #include <array>
 #include <span>
@@ -15,8 +16,6 @@ using KVZ::ITimecodeSource;
 using KVZ::ITimecodeStandard;
 
 namespace Format = DeckLinkAPI::TimecodeFormat;
-
-constexpr int64_t TicksPerSecond = 135000000;
 
 struct VSourceRow
 {
@@ -98,7 +97,7 @@ VTimecodeReading ReadTimecode( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rFrame, 
   VTimecodeReading Reading;
   int64_t Time = 0;
   int64_t Duration = 0;
-  if( i_rFrame.GetStreamTime( &Time, &Duration, TicksPerSecond ) < 0 )
+  if( i_rFrame.GetStreamTime( &Time, &Duration, KVZ::VTick::TicksPerSecond ) < 0 )
   {
     return Reading;
   }
