@@ -16,7 +16,7 @@ struct VFontCell
   constexpr size_t Bytes() const { return size_t{ m_Width } * m_Height; }
 };
 
-constexpr std::array FontCells = { VFontCell{ 12, 20 }, VFontCell{ 19, 32 }, VFontCell{ 28, 48 }, VFontCell{ 38, 64 }, VFontCell{ 43, 72 } };
+inline constexpr std::array FontCells = { VFontCell{ 12, 20 }, VFontCell{ 19, 32 }, VFontCell{ 28, 48 }, VFontCell{ 38, 64 }, VFontCell{ 43, 72 } };
 constexpr char FirstFontCharacter = ' ';
 constexpr char LastFontCharacter = '~';
 constexpr size_t FontCharacters = LastFontCharacter - FirstFontCharacter + 1;
