@@ -63,18 +63,20 @@ bool VStageCoreParameterHandler::OfferChoices( const std::string& i_rKey, const 
   return pParameter && !i_rChoices.empty() && pParameter->SetEnum( i_rChoices );
 }
 
-bool VStageCoreParameterHandler::OfferChoicesAndCorrect( const std::string& i_rKey, const VParameterChoices& i_rChoices ) const
+bool VStageCoreParameterHandler::OfferChoicesAndCorrect( const std::string& i_rKey, const VParameterChoices& i_rChoices,
+  const KVZ::Variant& i_rFallback ) const
 {
   const std::shared_ptr<VParameter> pParameter = GetParameter( i_rKey );
-  if( !OfferChoices( i_rKey, i_rChoices ) )
+  if( !pParameter || i_rChoices.empty() )
   {
     return false;
   }
+  pParameter->SetEnum( i_rChoices );
   KVZ::Variant Value;
   const auto IsValue = [&Value]( const KVZ::VLabelledVariant& i_rChoice ) { return i_rChoice.m_Value == Value; };
   if( !pParameter->GetValue( Value ) || std::none_of( i_rChoices.begin(), i_rChoices.end(), IsValue ) )
   {
-    pParameter->SetValueInternal( i_rChoices.front().m_Value );
+    pParameter->SetValueInternal( i_rFallback.IsEmpty() ? i_rChoices.front().m_Value : i_rFallback );
   }
   return true;
 }

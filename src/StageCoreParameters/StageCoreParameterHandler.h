@@ -85,8 +85,9 @@ protected:
 
   // Replaces the choices of a parameter. False, with nothing changed, for an empty list or one with the same label twice.
   bool OfferChoices( const std::string& i_rKey, const VParameterChoices& i_rChoices ) const;
-  // If the parameter's value is none of the new choices, the first of them becomes the value too, by the owner's write.
-  bool OfferChoicesAndCorrect( const std::string& i_rKey, const VParameterChoices& i_rChoices ) const;
+  // If the parameter's value is none of the new choices, the fallback becomes the value too, by the owner's write; an empty one stands for the
+  // first choice. That holds for choices with the same label twice as well, although they are not shown. False for an empty list alone.
+  bool OfferChoicesAndCorrect( const std::string& i_rKey, const VParameterChoices& i_rChoices, const KVZ::Variant& i_rFallback = {} ) const;
 
   // Runs a reaction later on the postal service, if the handler still lives then.
   template<class THandler, class TReaction>

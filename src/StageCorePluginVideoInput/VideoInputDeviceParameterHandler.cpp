@@ -216,12 +216,12 @@ void VVideoInputDeviceParameterHandler::UpdateSourceEnabled()
 // Rounds to whole beats of the master clock.
 void VVideoInputDeviceParameterHandler::ApplyTimeOffset()
 {
-  int64_t Offset = 0;
   const std::shared_ptr<KVZ::IBaseLineClock> pClock = m_pSourceRegistry->GetMasterClock();
-  if( !pClock || pClock->GetPeriod().Count() <= 0 || !Read( Keys::TimeOffsetTicksKey(), Offset ) )
+  if( !pClock || pClock->GetPeriod().Count() <= 0 )
   {
     return;
   }
+  const auto Offset = ReadOr<int64_t>( Keys::TimeOffsetTicksKey(), 0 );
   const int64_t Period = pClock->GetPeriod().Count();
   const int64_t Beats = std::llround( static_cast<double>( Offset ) / static_cast<double>( Period ) );
   m_pDataSource->SetTimecodeAdjustment( KVZ::VTick( Beats * Period ) );

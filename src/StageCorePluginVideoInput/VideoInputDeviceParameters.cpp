@@ -214,9 +214,10 @@ void VVideoInputDeviceParameterHandler::CreateAudioSetup()
   VParameter& rChannels = AddParameter<uint32_t>( Keys::AudioChannelCount( m_DevicePath ), AudioChannelCountText );
   if( !Counts.empty() )
   {
-    rChannels.SetValueDefault( Variant::Make( *Counts.rbegin() ) );
+    const Variant Most = Variant::Make( *Counts.rbegin() );
+    rChannels.SetValueDefault( Most );
+    OfferChoicesAndCorrect( Keys::AudioChannelCountKey(), Choices, Most );
   }
-  OfferChoicesAndCorrect( Keys::AudioChannelCountKey(), Choices );
 
   AddParameter<KVZ::IAudioSampleFormat::Enum>( Keys::AudioSampleFormat( m_DevicePath ), AudioSampleFormatText )
     .SetValueDefault( Variant::Make( KVZ::IAudioSampleFormat::EInt16 ) );

@@ -38,6 +38,23 @@ public:
   int m_ConnectedCalls = 0;
 };
 
+// Whose list changes while it is being read.
+class VRestlessFolders : public TestSupport::VFakeCaptureTargets
+{
+public:
+  void GetFolderAliases( std::vector<std::string>& o_rAliases ) override
+  {
+    VFakeCaptureTargets::GetFolderAliases( o_rAliases );
+    if( !std::exchange( m_bChanged, true ) )
+    {
+      SetAliases( { "Other" } );
+    }
+  }
+
+private:
+  bool m_bChanged = false;
+};
+
 class ParameterHandler : public testing::Test
 {
 protected:
@@ -74,7 +91,7 @@ protected:
   const std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
   const std::shared_ptr<TestSupport::VFakeParameterRegistry> m_pRegistry = std::make_shared<TestSupport::VFakeParameterRegistry>();
-  const std::shared_ptr<TestSupport::VFakeCaptureTargets> m_pFolders = std::make_shared<TestSupport::VFakeCaptureTargets>();
+  std::shared_ptr<TestSupport::VFakeCaptureTargets> m_pFolders = std::make_shared<TestSupport::VFakeCaptureTargets>();
   const VDataPath m_Device = DeviceSchemas::VideoInput::Path( "vi:0" );
   std::shared_ptr<VTestHandler> m_pHandler;
 };
@@ -208,6 +225,14 @@ TEST_F( ParameterHandler, AFolderThatHasGoneGivesWayToTheDefaultOne )
   EXPECT_EQ( Value<std::string>( "CaptureDirectory" ), "Default" );
   EXPECT_EQ( LabelsOf( "CaptureDirectory" ), ( Labels{ "None", "Default", "Other" } ) );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ Message } );
+}
+
+TEST_F( ParameterHandler, AFolderThatComesWhileTheyAreReadIsOffered )
+{
+  m_pFolders = std::make_shared<VRestlessFolders>();
+  Create();
+  m_pService->RunAll();
+  EXPECT_EQ( LabelsOf( "CaptureDirectory" ), ( Labels{ "None", "Other" } ) );
 }
 
 TEST_F( ParameterHandler, ASavedFolderThatNoLongerExistsGivesWayAtOnce )

@@ -1,5 +1,4 @@
 // What a video input publishes when it appears, and what it keeps of saved settings.
-#include "StageCorePluginVideoInput/VideoInputSystemParameterHandler.h"
 #include "tests/StageCorePluginVideoInput/Parameters/HandlerFixture.h"
 
 #include "Core/VideoInterface/Schemas.h"
@@ -44,17 +43,9 @@ TEST_F( VParameters, TellWhatTheDeviceIs )
   EXPECT_EQ( Value<uint32_t>( "AudioChannelCount" ), 16u );
   EXPECT_EQ( LabelsOf( "AudioSampleRate" ), Labels{ "48000 Hz" } );
   EXPECT_EQ( Value<double>( "Threshold" ), 0.6 );
-  for( const char* pKey : { "UserId", "DriverName", "DeviceName", "Status", "VideoStandard", "TimecodeStandard", "Connected", "ConnectionCount" } )
-  {
-    EXPECT_TRUE( m_pHandler->GetParameter( pKey )->IsReadOnly() ) << pKey;
-  }
-  for( const char* pKey : { "UserId", "PixelAspectRatio", "GreyscaleMode", "Connected", "ConnectionCount" } )
-  {
-    EXPECT_TRUE( m_pHandler->GetParameter( pKey )->IsHidden() ) << pKey;
-  }
-  const auto pOffset = m_pHandler->GetParameter( "TimeOffsetTicks" );
-  EXPECT_EQ( pOffset->GetDataConversionHint(), Parameter::DataConversionHint::EMillisecondsToTick135 );
-  EXPECT_TRUE( pOffset->IsAdvanced() && !pOffset->IsHidden() );
+  EXPECT_TRUE( m_pHandler->GetParameter( "Status" )->IsReadOnly() );
+  EXPECT_TRUE( m_pHandler->GetParameter( "PixelAspectRatio" )->IsHidden() );
+  EXPECT_EQ( m_pHandler->GetParameter( "TimeOffsetTicks" )->GetDataConversionHint(), Parameter::DataConversionHint::EMillisecondsToTick135 );
 }
 
 TEST_F( VParameters, WithoutASignalNothingIsConnectedAndTheSourceStaysOut )
@@ -64,6 +55,7 @@ TEST_F( VParameters, WithoutASignalNothingIsConnectedAndTheSourceStaysOut )
   EXPECT_EQ( Value<uint32_t>( "ConnectionCount" ), 1u );
   EXPECT_TRUE( Value<bool>( "Enabled" ) );
   EXPECT_EQ( m_pSource->m_Enabled, false );
+  EXPECT_EQ( m_pSource->m_Ratio, 1.0 );
   EXPECT_FALSE( VDataReader( *m_pStore ).Exists( DeviceSchemas::MaskGrid( m_Device ) ) );
   EXPECT_EQ( Warning(), "" );
 }
@@ -101,6 +93,14 @@ TEST_F( VParameters, SavedSettingsSurviveAndAreApplied )
   EXPECT_EQ( m_pSource->m_UseTimecode, false );
   EXPECT_EQ( m_pSource->m_Adjustment, 2700000 );
   EXPECT_EQ( m_pSource->m_Ratio, 16.0 / 11.0 );
+}
+
+TEST_F( VParameters, ASavedChannelCountThatTheCardLacksBecomesTheLargest )
+{
+  m_pDevice->m_AudioChannelCounts = { 0, 2, 8, 16 };
+  Save( Keys::AudioChannelCount( m_Device ), uint32_t{ 4 } );
+  Create();
+  EXPECT_EQ( Value<uint32_t>( "AudioChannelCount" ), 16u );
 }
 
 TEST_F( VParameters, ASavedValueOfAnotherTypeCountsAsAbsent )
@@ -179,11 +179,4 @@ TEST_F( VParameters, DeviceControlsExistWhereTheDeviceHasThem )
   EXPECT_TRUE( Set( "Exposure", 19999.6 ) );
   EXPECT_TRUE( Set( "AutoWhiteBalance", false ) );
   EXPECT_EQ( m_pDevice->m_ControlWrites, ( std::vector<std::pair<std::string, int32_t>>{ { "Exposure", 20000 }, { "AutoWhiteBalance", 0 } } ) );
-}
-
-TEST_F( VParameters, TheSystemsGroupIsRegisteredAndEmpty )
-{
-  const auto pHandler = KVZ::MakeShared<VVideoInputSystemParameterHandler>( m_pService, m_pStore, m_pRegistry );
-  ASSERT_EQ( m_pRegistry->m_Groups.size(), 1u );
-  EXPECT_TRUE( m_pRegistry->m_Groups[0]->GetParameters().empty() );
 }

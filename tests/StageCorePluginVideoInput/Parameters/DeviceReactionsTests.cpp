@@ -122,16 +122,6 @@ TEST_F( VReactions, AChangedFormatRestartsAStreamingDeviceAndNoOther )
   EXPECT_TRUE( m_pHandler->StopCapture() );
 }
 
-TEST_F( VReactions, WhatIsNotOfferedIsRefused )
-{
-  Create();
-  EXPECT_FALSE( Set( "PixelFormat", IPixelFormat::ELuminance8 ) );
-  EXPECT_FALSE( Set( "AudioChannelCount", uint32_t{ 3 } ) );
-  EXPECT_FALSE( Set( "AudioSampleRate", uint32_t{ 44100 } ) );
-  EXPECT_FALSE( Set( "Status", EStatus::EUnavailable ) );
-  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
-}
-
 TEST_F( VReactions, ADeviceIsNotStartedWithoutAPixelFormat )
 {
   Create();
@@ -179,6 +169,11 @@ TEST_F( VReactions, AValueThatIsNoLongerOfferedGivesWayToTheFirst )
   m_pService->RunAll();
   EXPECT_EQ( Value<IPixelFormat::Enum>( "PixelFormat" ), *m_pDevice->m_PixelFormats.begin() );
   EXPECT_EQ( m_pDevice->m_Starts.back().m_PixelFormat, *m_pDevice->m_PixelFormats.begin() ) << "and the device restarts with it";
+
+  const auto Unnamed = static_cast<IPixelFormat::Enum>( 9000 );
+  m_pDevice->SetPixelFormats( { Unnamed, static_cast<IPixelFormat::Enum>( 9001 ) } );
+  m_pService->RunAll();
+  EXPECT_EQ( Value<IPixelFormat::Enum>( "PixelFormat" ), Unnamed ) << "also where two of the same label cannot be listed";
 }
 
 TEST_F( VReactions, TheTimecodeSourceDefaultsToTheWidestThatThereIs )
@@ -234,15 +229,10 @@ TEST_F( VReactions, TheTimeOffsetIsAWholeNumberOfMasterBeats )
   m_pSources->SetMasterPeriod( KVZ::VTick( 0 ) );
   m_pService->RunAll();
   EXPECT_EQ( m_pSource->m_Adjustment, -2252250 );
-}
-
-TEST_F( VReactions, UseOfTimecodeReachesTheSource )
-{
-  Create();
-  Set( "UseTimecodeForSync", false );
-  EXPECT_EQ( m_pSource->m_UseTimecode, false );
-  Set( "UseTimecodeForSync", true );
-  EXPECT_EQ( m_pSource->m_UseTimecode, true );
+  VDataWriter( *m_pStore ).RemoveValue( Keys::TimeOffsetTicks( m_Device ) );
+  m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  m_pService->RunAll();
+  EXPECT_EQ( m_pSource->m_Adjustment, 0 ) << "none is none";
 }
 
 TEST_F( VReactions, AFrameRateThatCannotLockIsToldToTheUser )

@@ -101,7 +101,7 @@ TEST( FrameRateCheck, AFreeSystemsRateGivesTheNearestPeriod )
   {
     EXPECT_EQ( FrameRateCheck::SystemPeriod( Unusable ), 0 ) << Unusable;
   }
-  EXPECT_FALSE( FrameRateCheck::AreCompatible( FrameRateCheck::SystemPeriod( -25.0 ), 0 ) );
+  EXPECT_FALSE( FrameRateCheck::AreCompatible( FrameRateCheck::SystemPeriod( -25.0 ), 5400000 ) );
 }
 
 TEST( FrameRateCheck, NoPeriodIsCompatibleWithNothing )
