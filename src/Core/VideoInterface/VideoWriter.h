@@ -60,6 +60,8 @@ public:
     uint64_t i_FrameKey ) = 0;
   virtual bool Close() = 0;
   virtual ~IVideoWriter() = default;
+  // Frames of this file whose WriteFrame gave true before it was known that the disk would not take them whole.
+  virtual uint64_t CountIncompleteFrames() const { return 0; }
 };
 
 // The process-wide capabilities of a container, whether or not its writer is part of the build; all answers are false for a value outside

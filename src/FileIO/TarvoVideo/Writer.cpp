@@ -47,6 +47,7 @@ bool VWriter::DoOpen( const std::string& i_rPath )
   }
   m_pStream = std::make_unique<WriterSupport::VWatchedStream>( std::move( pStream ) );
   m_Index.clear();
+  m_IncompleteFrames = 0;
   return true;
 }
 
@@ -134,6 +135,7 @@ bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
   if( !bVideoWritten || !m_pStream->Write( m_AudioSpans ) )
   {
     m_Index.erase( Entry );
+    m_IncompleteFrames += bVideoWritten ? 1 : 0;
   }
   return bVideoWritten;
 }

@@ -28,6 +28,7 @@ public:
 
   const KVZ::IVideoWriterCapabilities& GetCapabilities() const override { return m_Capabilities; }
   bool IsOpen() const override { return m_pStream != nullptr; }
+  uint64_t CountIncompleteFrames() const override { return m_IncompleteFrames; }
 
 private:
   using VSpans = std::vector<KVZ::IOutputStream::VSpan>;
@@ -62,7 +63,8 @@ private:
   KVZ::VideoFrameInfo m_Video;   // as stored
   KVZ::AudioFrameInfo m_Audio;   // as stored
   std::map<uint64_t, VRecord> m_Index;
-  VSpans m_VideoSpans;   // both kept for their memory
+  uint64_t m_IncompleteFrames = 0;   // without their sound
+  VSpans m_VideoSpans;               // both kept for their memory
   VSpans m_AudioSpans;
 };
 

@@ -24,6 +24,7 @@ struct VResult
   bool m_bHeader = false;
   bool m_bClosed = false;
   size_t m_Written = 0;   // frames whose call gave true
+  size_t m_Incomplete = 0;
   bool m_bLaterRefused = true;
 };
 
@@ -46,6 +47,7 @@ VResult WriteSmallFile( VSmallFile& io_rFile )
   }
   WriteFrame( Keys[1], 1 );
   Result.m_bClosed = io_rFile.m_Writer.Close();
+  Result.m_Incomplete = io_rFile.m_Writer.CountIncompleteFrames();
   return Result;
 }
 
@@ -56,6 +58,10 @@ void CheckLeftBehind( const VSmallFile& i_rFile, const VResult& i_rResult )
   EXPECT_TRUE( i_rResult.m_bLaterRefused );
   EXPECT_FALSE( i_rFile.m_Writer.IsOpen() );
   const VFound Found = ReadAll( *i_rFile.m_pBytes );
+  if( i_rResult.m_bHeader && i_rResult.m_Written < std::size( Keys ) )
+  {
+    EXPECT_EQ( Found.m_Frames.size(), i_rResult.m_Written - i_rResult.m_Incomplete );
+  }
   if( Found.m_bFinished )
   {
     EXPECT_EQ( Found.m_Error, "" );

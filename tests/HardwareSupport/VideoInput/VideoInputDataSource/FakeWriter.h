@@ -7,6 +7,7 @@
 #include <limits>
 #include <map>
 #include <memory>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -15,7 +16,9 @@ struct VFakeFile
   static constexpr uint64_t Never = std::numeric_limits<uint64_t>::max();
 
   uint64_t m_FailingCall = Never;   // 0 opens, 1 writes the header, 2 the first frame and so on
+  bool m_bThrows = false;           // and that call throws: memory runs out around the writer
   bool m_bCloseFails = false;
+  uint64_t m_IncompleteFrames = 0;   // as the writer counts them
 
   bool m_bOpen = false;
   int m_Closes = 0;
@@ -87,9 +90,18 @@ public:
     ++m_pFile->m_Closes;
     return !m_pFile->m_bCloseFails;
   }
+  uint64_t CountIncompleteFrames() const override { return m_pFile->m_IncompleteFrames; }
 
 private:
-  bool Succeeds() { return m_Calls++ != m_pFile->m_FailingCall; }
+  bool Succeeds()
+  {
+    const bool bSucceeds = m_Calls++ != m_pFile->m_FailingCall;
+    if( !bSucceeds && m_pFile->m_bThrows )
+    {
+      throw std::bad_alloc();
+    }
+    return bSucceeds;
+  }
   static std::vector<uint8_t> BytesOf( const KVZ::VBufferList& i_rBuffers )
   {
     std::vector<uint8_t> Bytes;
