@@ -56,7 +56,7 @@ int Get( VHostSession& i_rSession, const VOptions& i_rOptions )
   if( !Setting )
   {
     Complain( "There is no setting \"" + i_rOptions.m_Path + "\"; \"params list\" shows them all." );
-    return ExitFailed;
+    return ExitUsage;
   }
   std::cout << ( i_rOptions.m_bJson ? ToJson( *Setting ).dump( 2 ) : Setting->m_Value ) << "\n";
   return ExitComplete;
@@ -69,7 +69,7 @@ int Set( VHostSession& i_rSession, const VOptions& i_rOptions )
   if( !i_rSession.Settings().Set( i_rOptions.m_Path, i_rOptions.m_Value, Error ) )
   {
     Complain( Error );
-    return ExitFailed;
+    return ExitUsage;
   }
   const double Until = i_rSession.Host().Time().Now() + SettleSeconds;
   while( !i_rSession.Settings().IsSettled( i_rOptions.m_Path ) && i_rSession.Host().Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
