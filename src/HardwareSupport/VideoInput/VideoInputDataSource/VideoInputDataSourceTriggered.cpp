@@ -45,6 +45,10 @@ VVideoInputDataSourceTriggered::VVideoInputDataSourceTriggered( std::shared_ptr<
     m_pTriggerService( std::move( i_pTriggerService ) ),
     m_pTimer( MakeTimer( Options() ) )
 {
+  if( !m_pTimer )
+  {
+    KVZ_LOG_ERROR( Log(), "The source's postal service has no timer: once armed, the source takes no frames." );
+  }
 }
 
 VVideoInputDataSourceTriggered::~VVideoInputDataSourceTriggered() = default;

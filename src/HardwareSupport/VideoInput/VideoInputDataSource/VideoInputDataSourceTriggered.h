@@ -1,5 +1,6 @@
 // A data source for devices that deliver frames only when triggered. Its frames have no clock but the counter; a global session begins once
-// the frames of the time before have stopped.
+// the frames of the time before have stopped. The host arms it for the session before that one: it arms the source anew whenever it does, also
+// for the session that the source has asked for itself.
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
