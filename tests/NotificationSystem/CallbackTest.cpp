@@ -102,16 +102,6 @@ TEST( Callback, AReplacementMadeDuringACallSurvivesItsDeregistration )
   EXPECT_EQ( Calls, 1 );
 }
 
-TEST( Callback, PassesOtherExceptionsOnAndStaysSet )
-{
-  VCallback<void()> Callback;
-  Callback.Set( [] { throw std::runtime_error( "no" ); } );
-  EXPECT_THROW( Callback(), std::runtime_error );
-  EXPECT_TRUE( Callback.IsSet() );
-  Callback.Set( {} );
-  EXPECT_THROW( Callback(), std::bad_function_call );
-}
-
 TEST( Callback, HoldsNoLockWhileACallableEnds )
 {
   VCallback<void()> Plain;
@@ -127,23 +117,6 @@ TEST( Callback, HoldsNoLockWhileACallableEnds )
   Postal.Set( [p = CallsBackWhenDestroyed( Postal )] { throw VDeregisterWeakCallbackException(); } );
   EXPECT_FALSE( Plain() );
   EXPECT_FALSE( Postal() );
-}
-
-TEST( CallbackPostal, WithoutAServiceBehavesAsAPlainSlot )
-{
-  const auto pService = std::make_shared<VManualPostalService>();
-  VCallbackPostal<void( uint64_t )> Callback( pService );
-  uint64_t Last = 0;
-  EXPECT_FALSE( Callback( 1 ) );
-  EXPECT_FALSE( Callback.Clear() );
-  EXPECT_FALSE( Callback.IsSet() );
-  Callback.SetImmediate( [&]( uint64_t i_Number ) { Last = i_Number; } );
-  EXPECT_TRUE( Callback( 2 ) );
-  EXPECT_EQ( Last, 2u );
-  Callback.Set( []( uint64_t ) { throw VDeregisterWeakCallbackException(); }, nullptr );
-  EXPECT_FALSE( Callback( 3 ) );
-  EXPECT_FALSE( Callback.IsSet() );
-  EXPECT_EQ( pService->Pending(), 0u );
 }
 
 TEST( CallbackPostal, RunsOnItsServiceWithCopiesOfTheArguments )

@@ -88,18 +88,6 @@ TEST( MultiCallback, ARunningRoundGoesThroughTheListAsItWas )
   EXPECT_FALSE( Callbacks() );
 }
 
-TEST( MultiCallback, PassesOtherExceptionsOn )
-{
-  VMultiCallback<void()> Callbacks;
-  std::string Ran;
-  Callbacks.Add( [&] { Ran += "a"; } );
-  Callbacks.Add( [&] { throw std::runtime_error( "no" ); } );
-  Callbacks.Add( [&] { Ran += "b"; } );
-  EXPECT_THROW( Callbacks(), std::runtime_error );
-  EXPECT_EQ( Ran, "a" );
-  EXPECT_EQ( Callbacks.Count(), 3u );
-}
-
 TEST( MultiCallbackPostal, RunsEachServicesListAsOneItemInOrder )
 {
   const auto pDefault = std::make_shared<VManualPostalService>();

@@ -225,35 +225,6 @@ TEST_F( DeckLinkClip, AFormatEventShowsTheClipInTheNewStandard )
   EXPECT_EQ( m_Client.m_Seen[3].m_Height, 576 );
 }
 
-TEST_F( DeckLinkClip, ByTheClockAClipPlaysFromItsFirstPicture )
-{
-  MakeClip( File( "clip.mkv" ), "720x576", "25", 30, 1.2 );
-  Plug( "decklink:speed=4,loop=0,input=" + File( "clip.mkv" ), false );
-  boost::mutex Mutex;
-  boost::condition_variable Changed;
-  KeepContent();
-  const auto Keep = m_Client.m_OnFrame;
-  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
-  {
-    const boost::lock_guard<boost::mutex> Lock( Mutex );
-    if( m_Pictures.size() < 31 )
-    {
-      Keep( i_pFrame, i_pPacket );
-    }
-    Changed.notify_all();
-  };
-  Enable( FourCharacterCode( "pal " ) );
-  Start();
-  {
-    boost::unique_lock<boost::mutex> Lock( Mutex );
-    Changed.wait( Lock, [&] { return m_Pictures.size() == 31; } );
-  }
-  m_pInput->StopStreams();
-  RunFFmpeg( { "-i", File( "clip.mkv" ), "-map", "0:v", "-pix_fmt", "uyvy422", "-f", "rawvideo", File( "raw" ) } );
-  ExpectPictures( 0, ReadFile( File( "raw" ) ) );
-  EXPECT_FALSE( m_Client.m_Seen[30].m_bSignal );
-}
-
 TEST( ClipInput, WhatCannotBeOpenedIsRefusedWithFFmpegsReason )
 {
   const TestSupport::VTemporaryFolder Folder;

@@ -134,48 +134,6 @@ TEST_F( DeckLinkDiscovery, AScriptTakesACardOutAndPutsItBackAsANewOne )
   pFirst->SetCallback( nullptr );
 }
 
-TEST_F( DeckLinkDiscovery, ALateFrameComesLateWithItsOwnTimeAndHoldsUpNoOther )
-{
-  const TestSupport::VTemporaryFolder Folder;
-  std::ofstream( Folder.File( "script.json" ) ) << R"([{ "frame": 0, "do": "late", "milliseconds": 60 }])";
-  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
-  VClient Client;
-  boost::latch Enough( 3 );
-  std::vector<std::chrono::steady_clock::time_point> Times;
-  Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
-  {
-    if( Times.size() < 3 )
-    {
-      Times.push_back( std::chrono::steady_clock::now() );
-      Client.m_Seen.push_back( Look( *i_pFrame, i_pPacket ) );
-      Enough.count_down();
-    }
-  };
-  // Streams run before the card's first frame
-  VPointer<IDeckLinkInput> pInput;
-  m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard )
-  {
-    pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput );
-    pInput->SetCallback( &Client );
-    pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
-    pInput->StartStreams();
-  };
-  pDiscovery->InstallDeviceNotifications( &m_Watcher );
-  const auto Before = std::chrono::steady_clock::now();
-  std::string Error;
-  m_Cards.push_back( Control().AddCard( ( "decklink:pattern=counter,script=" + Folder.File( "script.json" ) ).c_str(), {}, Error ) );
-  Enough.wait();
-  pInput->StopStreams();
-  pInput->SetCallback( nullptr );
-  EXPECT_GE( Times[0] - Before, std::chrono::milliseconds( 60 ) );
-  EXPECT_GE( Times[2] - Before, std::chrono::milliseconds( 80 ) );
-  for( uint32_t i = 0; i < 3; ++i )
-  {
-    EXPECT_EQ( Client.m_Seen[i].m_Counter, i );
-    EXPECT_EQ( Client.m_Seen[i].m_StreamTime, i * 5400000 );
-  }
-}
-
 TEST_F( DeckLinkDiscovery, AnArrivalMayUninstallOrAddMore )
 {
   VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();

@@ -19,33 +19,6 @@ protected:
 
 }
 
-TEST_F( DeckLinkThreads, ACardRunsOnItsOwnThread )
-{
-  Plug( "decklink:pattern=counter,speed=50", false );
-  boost::latch Enough( 20 );
-  const boost::thread::id TestThread = boost::this_thread::get_id();
-  m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
-  {
-    if( m_Client.m_Seen.size() < 20 )
-    {
-      EXPECT_NE( boost::this_thread::get_id(), TestThread );
-      m_Client.m_Seen.push_back( Look( *i_pFrame, i_pPacket ) );
-      Enough.count_down();
-    }
-  };
-  RestartOnFormat();
-  Enable( ModeNTSC, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
-  Start();
-  Enough.wait();
-  m_pInput->StopStreams();
-  for( size_t i = 1; i < 20; ++i )
-  {
-    EXPECT_EQ( *m_Client.m_Seen[i].m_Counter, *m_Client.m_Seen[i - 1].m_Counter + 1 );
-    EXPECT_EQ( m_Client.m_Seen[i].m_HardwareTime - m_Client.m_Seen[i - 1].m_HardwareTime, 5400000 );
-  }
-  EXPECT_FALSE( Control().Step( m_Card, 1 ) ) << "only a card with a manual clock is stepped";
-}
-
 TEST_F( DeckLinkThreads, OnlyStopWaitsForARunningCallback )
 {
   Plug( "decklink" );

@@ -167,16 +167,6 @@ TEST_F( VideoInputEngine, WithoutCardsNothingComesAndNothingGoes )
   EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "RemoveParameterGroup System.VideoInput" } ) );
 }
 
-TEST_F( VideoInputEngine, LooksForHardwareWhenTheHostSaysSo )
-{
-  AddCard();
-  MakeAndStart();
-  const int64_t WithoutCards = Control().ReferencesHeld();
-  m_pHost->m_pHardwareStart->Fire();
-  EXPECT_GT( Control().ReferencesHeld(), WithoutCards );
-  WaitFor( "AddSource vi:0" );
-}
-
 TEST_F( VideoInputEngine, AStartOfHardwareAfterItsEndDoesNothing )
 {
   AddCard();

@@ -87,22 +87,6 @@ TEST( BalancingAllocator, GuaranteesHoldAgainstAGreedyClient )
   }
 }
 
-TEST( BalancingAllocator, GuaranteesHoldForAThirdClientWhileTwoCompete )
-{
-  const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-  const auto pFirst = pPool->MakeClient();
-  const auto pSecond = pPool->MakeClient();
-  const auto pIdle = pPool->MakeClient();
-  ASSERT_TRUE( pPool->Configure( 30, 0, 5 ) );
-  std::vector<void*> First, Second, Idle;
-  EXPECT_EQ( TakeAtMost( *pFirst, 30, First ), 20u );
-  EXPECT_EQ( TakeAtMost( *pSecond, 15, Second ), 5u );
-  EXPECT_EQ( TakeAtMost( *pIdle, 30, Idle ), 5u );
-  FreeAll( First, *pFirst );
-  FreeAll( Second, *pFirst );
-  FreeAll( Idle, *pFirst );
-}
-
 // Who asks more recently gets what lies beyond the guarantees, and the other one must give up its own to go on.
 TEST( BalancingAllocator, BlocksMoveToTheClientThatAsks )
 {

@@ -176,17 +176,3 @@ TEST( DataStoreThreads, ReadersNeverSeeHalfAWrite )
   EXPECT_EQ( Torn, 0 );
   EXPECT_EQ( Heard, 2 * Rounds );
 }
-
-TEST( DataStoreThreads, AMovedGuardsLockIsFreeForOthersAfterItsLastOwner )
-{
-  StageHost::VDataStore Store;
-  const VDataPath Path{ "A" };
-  auto pWriter = std::make_unique<VDataWriter>( Store );
-  auto pOwner = std::make_unique<VDataWriter>( std::move( *pWriter ) );
-  pWriter.reset();
-  std::thread Other( [&] { VDataWriter( Store ).SetValue( Path, KVZ::Variant::Make( 2 ) ); } );
-  pOwner->SetValue( Path, KVZ::Variant::Make( 1 ) );
-  pOwner.reset();
-  Other.join();
-  EXPECT_EQ( VDataReader( Store ).GetValue( Path ), KVZ::Variant::Make( 2 ) );
-}

@@ -11,14 +11,12 @@
 
 #include <dlfcn.h>
 #include <future>
-#include <set>
 
 namespace
 {
 
 using KVZ::IPixelFormat;
 using KVZ::ITimecodeSource;
-using KVZ::IVideoStandard;
 using VideoInputHAL::IVideoInputDevice;
 using VideoInputHAL::VBlackmagicDeckLinkDriver;
 using VideoInputHAL::VVideoInputDeviceManager;
@@ -55,7 +53,6 @@ protected:
   std::shared_ptr<VHeapAllocator> m_pAllocator = std::make_shared<VHeapAllocator>();
   std::shared_ptr<VFrameReceiver> m_pReceiver = std::make_shared<VFrameReceiver>();
   std::vector<std::shared_ptr<IVideoInputDevice>> m_Arrived;
-  std::vector<unsigned int> m_Dropped;
   std::shared_ptr<VBlackmagicDeckLinkDriver> m_pDriver;
 
   void SetUp() override
@@ -87,12 +84,6 @@ protected:
     EXPECT_TRUE( Control().RunEvent( m_Card, i_pEvent, Error ) ) << Error;
   }
   void Step( uint64_t i_Frames ) { EXPECT_TRUE( Control().Step( m_Card, i_Frames ) ); }
-  VirtualCards::VCardCounters Counters() const
-  {
-    VirtualCards::VCardCounters Counters;
-    Control().GetCounters( m_Card, Counters );
-    return Counters;
-  }
 
   // The newest device, wired as the engine does.
   IVideoInputDevice& Wire()
@@ -100,7 +91,6 @@ protected:
     m_pService->RunAll();
     IVideoInputDevice& rDevice = *m_Arrived.back();
     rDevice.SetDeviceIndex( static_cast<int32_t>( m_Arrived.size() - 1 ) );
-    rDevice.GetDroppedFramesCallback().Add( [this]( unsigned int i_Count ) { m_Dropped.push_back( i_Count ); }, m_pService );
     rDevice.SetDataCallback( m_pReceiver );
     rDevice.SetAllocator( m_pAllocator );
     return rDevice;
@@ -131,22 +121,6 @@ protected:
   }
 };
 
-TEST_F( DeckLinkVirtualCard, FindsTheSignalOfACardThatWasThereBefore )
-{
-  AddCard( "standard=HD_1280_720P_5000" );
-  m_pDriver->StartDiscovery();
-  IVideoInputDevice& rDevice = Wire();
-  EXPECT_EQ( rDevice.GetDeviceName(), "DeckLink C1" );
-  EXPECT_EQ( rDevice.GetVideoStandard(), IVideoStandard::EUnspecified );
-
-  Step( 1 );
-  EXPECT_EQ( rDevice.GetVideoStandard(), IVideoStandard::EHD_1280_720P_5000 );
-  std::set<IPixelFormat::Enum> Formats;
-  rDevice.GetSupportedPixelFormats( Formats );
-  EXPECT_EQ( Formats, ( std::set<IPixelFormat::Enum>{ IPixelFormat::EU8Y8V8Y8, IPixelFormat::EU10Y10V10Y10 } ) );
-  EXPECT_EQ( m_pReceiver->Count(), 0u );
-}
-
 TEST_F( DeckLinkVirtualCard, DeliversEveryFrameWithItsSoundAndTimecode )
 {
   Capture( "standard=HD_1280_720P_5000,pattern=counter,audio=ramp" );
@@ -170,89 +144,6 @@ TEST_F( DeckLinkVirtualCard, DeliversEveryFrameWithItsSoundAndTimecode )
   EXPECT_EQ( Timecodes(),
     ( std::vector<std::string>{ "01:00:00:00+0", "01:00:00:01+0", "01:00:00:01+2700000", "01:00:00:02+0", "01:00:00:02+2700000",
       "01:00:00:03+0" } ) );
-}
-
-TEST_F( DeckLinkVirtualCard, ChangesItsPixelFormatWhileCapturing )
-{
-  IVideoInputDevice& rDevice = Capture( "standard=SD_720_576I_5000" );
-  struct VRow
-  {
-    IPixelFormat::Enum m_Format;
-    size_t m_Bytes;
-  };
-  for( const VRow& rRow : { VRow{ IPixelFormat::EU10Y10V10Y10, 15 * 128 * 576 }, VRow{ IPixelFormat::EU8Y8V8Y8, 720 * 576 * 2 } } )
-  {
-    ASSERT_TRUE( Start( rDevice, rRow.m_Format, 16 ).Succeeded() );
-    Step( 2 );
-    const auto Frame = m_pReceiver->Frames().back();
-    EXPECT_EQ( Frame.m_Header.m_VideoInfo.m_PixelFormat, rRow.m_Format );
-    EXPECT_EQ( Frame.m_Image.size(), rRow.m_Bytes );
-    EXPECT_EQ( Frame.m_Audio.size(), 1920u * 2u * 16u );
-  }
-  // A signal of the other colour space is announced again and again; frames come all the same.
-  const uint64_t Announced = Counters().m_FormatChanges;
-  const size_t Before = m_pReceiver->Count();
-  ASSERT_TRUE( Start( rDevice, IPixelFormat::EB8G8R8u8 ).Succeeded() );
-  Step( 3 );
-  EXPECT_EQ( Counters().m_FormatChanges, Announced + 3 );
-  EXPECT_EQ( m_pReceiver->Count(), Before + 3 );
-  EXPECT_EQ( m_pReceiver->Frames().back().m_Image.size(), 720u * 576u * 4u );
-}
-
-TEST_F( DeckLinkVirtualCard, FollowsTheSignalIntoAnotherStandard )
-{
-  IVideoInputDevice& rDevice = Capture( "standard=SD_720_576I_5000" );
-  Step( 2 );
-  Happen( R"({"do": "format", "standard": "HD_1280_720P_5994"})" );
-  Step( 2 );
-  EXPECT_EQ( rDevice.GetVideoStandard(), IVideoStandard::EHD_1280_720P_5994 );
-  EXPECT_EQ( rDevice.GetStatus(), IVideoInputDevice::EStatus::ECapturing );
-  const auto Frame = m_pReceiver->Frames().back();
-  EXPECT_EQ( Frame.m_Header.m_VideoInfo.m_ImageWidth, 1280u );
-  EXPECT_EQ( Frame.m_Period, 2252250 );
-}
-
-TEST_F( DeckLinkVirtualCard, LosesTheSignalAndFindsItAgain )
-{
-  IVideoInputDevice& rDevice = Capture( "standard=SD_720_576I_5000" );
-  Step( 2 );
-  Happen( R"({"do": "signal-loss", "frames": 3})" );
-  Step( 3 );
-  EXPECT_EQ( rDevice.GetVideoStandard(), IVideoStandard::EUnspecified );
-  EXPECT_EQ( rDevice.GetTimecode().m_Standard, KVZ::ITimecodeStandard::ETimecodeNone );
-  EXPECT_EQ( m_pReceiver->Count(), 2u );
-  Step( 2 );
-  EXPECT_EQ( rDevice.GetVideoStandard(), IVideoStandard::ESD_720_576I_5000 );
-  EXPECT_EQ( Timecodes(), ( std::vector<std::string>{ "01:00:00:01+0", "01:00:00:02+0", "01:00:00:06+0", "01:00:00:07+0" } ) );
-}
-
-TEST_F( DeckLinkVirtualCard, CountsDroppedFramesAndFollowsATimecodeJump )
-{
-  Capture( "standard=SD_720_576I_5000" );
-  Step( 2 );
-  Happen( R"({"do": "drop", "frames": 4})" );
-  Step( 6 );
-  Happen( R"({"do": "timecode-jump", "to": "10:00:00:00"})" );
-  Step( 2 );
-  m_pService->RunAll();
-  ASSERT_EQ( m_Dropped.size(), 2u );
-  EXPECT_GT( m_Dropped[0], 80000u );   // the card's running time
-  EXPECT_EQ( m_Dropped[1], 4u );
-  EXPECT_EQ( Timecodes(),
-    ( std::vector<std::string>{ "01:00:00:01+0", "01:00:00:02+0", "01:00:00:07+0", "01:00:00:08+0", "10:00:00:00+0", "10:00:00:01+0" } ) );
-}
-
-TEST_F( DeckLinkVirtualCard, ACardInUseByAnotherProgramCannotBeStarted )
-{
-  IVideoInputDevice& rDevice = Capture( "standard=SD_720_576I_5000" );
-  TestSupport::VLogCapture Log( "VideoInputDeviceBlackmagic", 2 );
-  Control().SetBusy( m_Card, true );
-  EXPECT_EQ( Start( rDevice ).m_Code, static_cast<int32_t>( 0x80000007u ) );
-  EXPECT_TRUE( Log.Has( "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." ) );
-  Control().SetBusy( m_Card, false );
-  EXPECT_TRUE( Start( rDevice ).Succeeded() );
-  Step( 1 );
-  EXPECT_EQ( m_pReceiver->Count(), 1u );
 }
 
 TEST_F( DeckLinkVirtualCard, ACardThatComesBackIsANewDevice )
