@@ -22,10 +22,15 @@ namespace UtilsMemory
 class VBalancingAllocator;
 }
 
+namespace KVZ
+{
+class IFlowNodeFactory;
+}
+
 namespace StageCorePluginInterface
 {
 
-class IFlowNodeFactory;
+using KVZ::IFlowNodeFactory;
 
 // Destroys what it was given when the host stops, in reverse order.
 class IShutdownManager
@@ -64,7 +69,8 @@ public:
   virtual ~ISourceRegistry() = default;
 };
 
-// Where one file of a capture goes: Folder / (BaseName + "_" + DeviceLabel + "." + Extension).
+// Where one file of a capture goes: Folder / (BaseName + "_" + DeviceLabel + "." + Extension). An image sequence has no extension here, and its
+// frames go to Folder / (BaseName + "_" + DeviceLabel + "_%FRAME%"), which the writer completes.
 struct VCaptureTarget
 {
   std::string m_Folder;
@@ -75,6 +81,9 @@ struct VCaptureTarget
   int32_t m_VideoPayload = 0;               // KVZ::IVideoPayload::Enum
   int32_t m_AudioPayload = 0;               // KVZ::IAudioPayload::Enum
   uint32_t m_AudioChannels = 0xFFFFFFFFu;   // channels to keep; all ones keeps what was captured
+  int32_t m_PixelFormat = 0;                // KVZ::IPixelFormat::Enum of uncompressed video; 0 keeps what was captured
+  int32_t m_JPEGQuality = 0;                // 1 to 100; 0 leaves the choice to the module
+  bool m_bBurnInTimecode = false;           // each frame's timecode is drawn into its picture
 };
 
 // What became of one file of a capture.
@@ -82,10 +91,10 @@ struct VCaptureFileReport
 {
   KVZ::VCaptureSessionId m_CaptureSessionId;
   std::string m_DeviceURN;
-  std::string m_Path;
+  std::string m_Path;        // of an image sequence the folder and the pattern of its names
   int32_t m_Container = 0;   // KVZ::IVideoContainer::Enum
   uint64_t m_FramesWritten = 0;
-  uint64_t m_Bytes = 0;   // of the file after it was closed
+  uint64_t m_Bytes = 0;   // of the file after it was closed; of an image sequence all files in its folder
   bool m_bFailed = false;
   std::string m_Error;                           // empty unless failed
   KVZ::ITimecode m_StartTimecode;                // of the first frame
