@@ -124,19 +124,19 @@ const VEbmlElement& VEbmlParser::Find( const VPath& i_rPath ) const
 double VEbmlParser::Real( const VPath& i_rPath ) const
 {
   const VEbmlElement& rElement = Find( i_rPath );
-  const uint64_t Bits = Number( rElement );
+  const uint64_t Bits = NumberOf( rElement );
   return rElement.m_Size == 4 ? std::bit_cast<float>( static_cast<uint32_t>( Bits ) ) : std::bit_cast<double>( Bits );
 }
 
-uint64_t VEbmlParser::Number( const VEbmlElement& i_rElement ) const { return BigEndian( i_rElement.m_Data, i_rElement.m_Size ); }
+uint64_t VEbmlParser::NumberOf( const VEbmlElement& i_rElement ) const { return BigEndian( i_rElement.m_Data, i_rElement.m_Size ); }
 
-std::string VEbmlParser::Text( const VEbmlElement& i_rElement ) const
+std::string VEbmlParser::TextOf( const VEbmlElement& i_rElement ) const
 {
-  const VBytes Data = Bytes( i_rElement );
+  const VBytes Data = BytesOf( i_rElement );
   return { Data.begin(), Data.end() };
 }
 
-VEbmlParser::VBytes VEbmlParser::Bytes( const VEbmlElement& i_rElement ) const
+VEbmlParser::VBytes VEbmlParser::BytesOf( const VEbmlElement& i_rElement ) const
 {
   const auto Begin = m_Bytes.begin() + static_cast<std::ptrdiff_t>( i_rElement.m_Data );
   return { Begin, Begin + static_cast<std::ptrdiff_t>( i_rElement.m_Size ) };
@@ -147,10 +147,10 @@ std::vector<VMatroskaBlock> ReadBlocks( const VEbmlParser& i_rFile )
   std::vector<VMatroskaBlock> Blocks;
   for( const VEbmlElement* pCluster : i_rFile.FindAll( { Ebml::Segment, Ebml::Cluster } ) )
   {
-    const uint64_t Time = i_rFile.Number( *VEbmlParser::FindIn( pCluster->m_Children, { Ebml::Timestamp } ).at( 0 ) );
+    const uint64_t Time = i_rFile.NumberOf( *VEbmlParser::FindIn( pCluster->m_Children, { Ebml::Timestamp } ).at( 0 ) );
     for( const VEbmlElement* pGroup : VEbmlParser::FindIn( pCluster->m_Children, { Ebml::BlockGroup } ) )
     {
-      const auto Data = i_rFile.Bytes( *VEbmlParser::FindIn( pGroup->m_Children, { Ebml::Block } ).at( 0 ) );
+      const auto Data = i_rFile.BytesOf( *VEbmlParser::FindIn( pGroup->m_Children, { Ebml::Block } ).at( 0 ) );
       const auto Offset = static_cast<int16_t>( Data.at( 1 ) << 8 | Data.at( 2 ) );
       if( ( Data[0] & 0x80 ) == 0 || Data.at( 3 ) != 0 )
       {
@@ -160,7 +160,7 @@ std::vector<VMatroskaBlock> ReadBlocks( const VEbmlParser& i_rFile )
       Block.m_Cluster = pCluster->m_Position;
       Block.m_Track = Data[0] & 0x7F;
       Block.m_Time = Time + static_cast<uint64_t>( int64_t{ Offset } );
-      Block.m_Duration = i_rFile.Number( *VEbmlParser::FindIn( pGroup->m_Children, { Ebml::BlockDuration } ).at( 0 ) );
+      Block.m_Duration = i_rFile.NumberOf( *VEbmlParser::FindIn( pGroup->m_Children, { Ebml::BlockDuration } ).at( 0 ) );
       Block.m_Data.assign( Data.begin() + 4, Data.end() );
       Blocks.push_back( std::move( Block ) );
     }
@@ -175,7 +175,7 @@ std::vector<VMatroskaCue> ReadCues( const VEbmlParser& i_rFile )
   for( const VEbmlElement* pPoint : i_rFile.FindAll( { Ebml::Segment, Ebml::Cues, Ebml::CuePoint } ) )
   {
     const auto Number = [&]( const VEbmlParser::VPath& i_rPath )
-    { return i_rFile.Number( *VEbmlParser::FindIn( pPoint->m_Children, i_rPath ).at( 0 ) ); };
+    { return i_rFile.NumberOf( *VEbmlParser::FindIn( pPoint->m_Children, i_rPath ).at( 0 ) ); };
     Cues.push_back( { Number( { Ebml::CueTime } ), Number( { Ebml::CueTrackPositions, Ebml::CueTrack } ),
       Start + Number( { Ebml::CueTrackPositions, Ebml::CueClusterPosition } ) } );
   }
@@ -188,7 +188,7 @@ std::vector<VMatroskaSeek> ReadSeeks( const VEbmlParser& i_rFile )
   std::vector<VMatroskaSeek> Seeks;
   for( const VEbmlElement* pSeek : i_rFile.FindAll( { Ebml::Segment, Ebml::SeekHead, Ebml::Seek } ) )
   {
-    const auto Number = [&]( Ebml::EId i_Id ) { return i_rFile.Number( *VEbmlParser::FindIn( pSeek->m_Children, { i_Id } ).at( 0 ) ); };
+    const auto Number = [&]( Ebml::EId i_Id ) { return i_rFile.NumberOf( *VEbmlParser::FindIn( pSeek->m_Children, { i_Id } ).at( 0 ) ); };
     Seeks.push_back( { static_cast<uint32_t>( Number( Ebml::SeekID ) ), Start + Number( Ebml::SeekPosition ) } );
   }
   return Seeks;
@@ -199,7 +199,7 @@ std::map<std::string, std::string> ReadTags( const VEbmlParser& i_rFile )
   std::map<std::string, std::string> Tags;
   for( const VEbmlElement* pTag : i_rFile.FindAll( { Ebml::Segment, Ebml::Tags, Ebml::Tag, Ebml::SimpleTag } ) )
   {
-    const auto Text = [&]( Ebml::EId i_Id ) { return i_rFile.Text( *VEbmlParser::FindIn( pTag->m_Children, { i_Id } ).at( 0 ) ); };
+    const auto Text = [&]( Ebml::EId i_Id ) { return i_rFile.TextOf( *VEbmlParser::FindIn( pTag->m_Children, { i_Id } ).at( 0 ) ); };
     Tags[Text( Ebml::TagName )] = Text( Ebml::TagString );
   }
   return Tags;

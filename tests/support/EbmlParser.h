@@ -109,13 +109,13 @@ public:
 
   // Of the first element there. Throw std::runtime_error where there is none.
   const VEbmlElement& Find( const VPath& i_rPath ) const;
-  uint64_t Number( const VPath& i_rPath ) const { return Number( Find( i_rPath ) ); }
-  std::string Text( const VPath& i_rPath ) const { return Text( Find( i_rPath ) ); }
+  uint64_t Number( const VPath& i_rPath ) const { return NumberOf( Find( i_rPath ) ); }
+  std::string Text( const VPath& i_rPath ) const { return TextOf( Find( i_rPath ) ); }
   double Real( const VPath& i_rPath ) const;
 
-  uint64_t Number( const VEbmlElement& i_rElement ) const;
-  std::string Text( const VEbmlElement& i_rElement ) const;
-  VBytes Bytes( const VEbmlElement& i_rElement ) const;
+  uint64_t NumberOf( const VEbmlElement& i_rElement ) const;
+  std::string TextOf( const VEbmlElement& i_rElement ) const;
+  VBytes BytesOf( const VEbmlElement& i_rElement ) const;
 
 private:
   std::vector<VEbmlElement> Parse( uint64_t i_Begin, uint64_t i_End, bool i_bMayBeCut ) const;

@@ -19,7 +19,11 @@ void VEssence::Store( const VHeader& i_rHeader )
   m_AudioPayload = i_rHeader.m_AudioPayload;
   m_Video = i_rHeader.m_rVideo;
   m_Audio = i_rHeader.m_rAudio;
-  VideoEncoding::PixelFormatForPayloadFormat( m_VideoPayload, i_rHeader.m_rVideo.m_PixelFormat, m_Video.m_PixelFormat );
+  // H.264 comes as it is stored.
+  if( m_VideoPayload != KVZ::IVideoPayload::EVideoH264 )
+  {
+    VideoEncoding::PixelFormatForPayloadFormat( m_VideoPayload, i_rHeader.m_rVideo.m_PixelFormat, m_Video.m_PixelFormat );
+  }
   bool bConversionNeeded = false;
   AudioEncoding::SampleFormatForPayloadFormat( m_AudioPayload, i_rHeader.m_rAudio.m_SampleFormat, m_Audio.m_SampleFormat, bConversionNeeded );
   if( m_Audio.m_SampleFormat == KVZ::IAudioSampleFormat::EUnspecified )
@@ -54,8 +58,8 @@ bool VEssence::HasStoredSize( const VFrame& i_rFrame, const KVZ::VLogCategory& i
   const KVZ::VideoFrameInfo& rInfo = i_rFrame.m_rVideoInfo;
   if( rInfo.m_ImageWidth != m_Video.m_ImageWidth || rInfo.m_ImageHeight != m_Video.m_ImageHeight )
   {
-    KVZ_LOG_ERROR( i_rCategory, "Frame %1% of %2% x %3% pixels does not fit the file's %4% x %5%.", i_rFrame.m_Key, rInfo.m_ImageWidth,
-      rInfo.m_ImageHeight, m_Video.m_ImageWidth, m_Video.m_ImageHeight );
+    KVZ_LOG_ERROR( i_rCategory, "A frame of %1% x %2% pixels does not fit the file's %3% x %4%.", rInfo.m_ImageWidth, rInfo.m_ImageHeight,
+      m_Video.m_ImageWidth, m_Video.m_ImageHeight );
     return false;
   }
   return true;

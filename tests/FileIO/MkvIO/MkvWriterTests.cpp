@@ -1,0 +1,286 @@
+#include "tests/FileIO/MkvIO/SmallMovie.h"
+#include "tests/support/EbmlParser.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+using namespace KVZ;
+using namespace MkvIO;
+using namespace TestSupport;
+
+namespace
+{
+
+constexpr uint64_t Period = 33366;   // of 29.97 frames a second in the file's unit, a microsecond
+
+class MkvWriter : public testing::Test
+{
+protected:
+  VEbmlParser Parse() const { return VEbmlParser( *m_Movie.m_pBytes ); }
+
+  void WriteFrames( uint64_t i_Count )
+  {
+    for( uint64_t Frame = 0; Frame < i_Count; ++Frame )
+    {
+      ASSERT_TRUE( m_Movie.WriteFrame( "ABCD", "abcd", Frame ) );
+    }
+  }
+
+  const VLogCapture m_Log{ "MkvIO" };
+  VSmallMovie m_Movie;
+};
+
+std::vector<uint32_t> Ids( const std::vector<VEbmlElement>& i_rElements )
+{
+  std::vector<uint32_t> Result;
+  std::transform( i_rElements.begin(), i_rElements.end(), std::back_inserter( Result ), []( const auto& i_rElement ) { return i_rElement.m_Id; } );
+  return Result;
+}
+
+uint32_t IdAt( const VEbmlParser& i_rFile, uint64_t i_Position )
+{
+  for( const VEbmlElement& rElement : i_rFile.Find( { Ebml::Segment } ).m_Children )
+  {
+    if( rElement.m_Position == i_Position ) return rElement.m_Id;
+  }
+  return 0;
+}
+
+}
+
+TEST_F( MkvWriter, ASmallFileHoldsTheseElements )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  ASSERT_TRUE( m_Movie.WriteFrame( "ABCD", "abcd" ) );
+  ASSERT_TRUE( m_Movie.WriteFrame( "EFGH", "" ) );
+  ASSERT_TRUE( m_Movie.WriteFrame( "IJKL", "ijklmnop" ) );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  EXPECT_EQ( File.Text( { Ebml::Head, Ebml::DocType } ), "matroska" );
+  EXPECT_EQ( File.Number( { Ebml::Head, Ebml::DocTypeVersion } ), 1u );
+  EXPECT_EQ( File.Number( { Ebml::Head, Ebml::DocTypeReadVersion } ), 1u );
+
+  const VEbmlElement& rSegment = File.Find( { Ebml::Segment } );
+  EXPECT_EQ( rSegment.m_SizeBytes, 5 );
+  EXPECT_FALSE( rSegment.m_bUnknownSize );
+  EXPECT_EQ( rSegment.End(), m_Movie.m_pBytes->size() );
+  EXPECT_EQ( Ids( rSegment.m_Children ),
+    ( std::vector<uint32_t>{ Ebml::SeekHead, Ebml::Void, Ebml::Info, Ebml::Tracks, Ebml::Tags, Ebml::Cluster, Ebml::Cluster, Ebml::Cluster,
+      Ebml::Cues } ) );
+  EXPECT_EQ( rSegment.m_Children[2].m_Position - rSegment.m_Data, 2003u ) << "the place of the seek head";
+
+  const auto Blocks = ReadBlocks( File );
+  const auto Is = [&]( size_t i_Block, uint64_t i_Track, uint64_t i_Frame, const std::string& i_rData )
+  {
+    const VMatroskaBlock& rBlock = Blocks.at( i_Block );
+    EXPECT_EQ( rBlock.m_Track, i_Track );
+    EXPECT_EQ( rBlock.m_Time, i_Frame * Period );
+    EXPECT_EQ( rBlock.m_Duration, Period );
+    EXPECT_EQ( rBlock.m_Data, Text( i_rData ) );
+  };
+  ASSERT_EQ( Blocks.size(), 5u );
+  Is( 0, 1, 0, "ABCD" );
+  Is( 1, 2, 0, "abcd" );
+  Is( 2, 1, 1, "EFGH" );
+  Is( 3, 1, 2, "IJKL" );
+  Is( 4, 2, 2, "ijklmnop" );
+  EXPECT_TRUE( m_Log.Texts().empty() );
+}
+
+TEST_F( MkvWriter, InfoTellsScaleDurationAndMakers )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  EXPECT_EQ( Parse().Real( { Ebml::Segment, Ebml::Info, Ebml::Duration } ), 0.0 );
+  WriteFrames( 7 );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  EXPECT_EQ( File.Number( { Ebml::Segment, Ebml::Info, Ebml::TimestampScale } ), 1000u );
+  EXPECT_EQ( File.Real( { Ebml::Segment, Ebml::Info, Ebml::Duration } ), 7.0 * Period );
+  EXPECT_EQ( File.Text( { Ebml::Segment, Ebml::Info, Ebml::WritingApp } ), "Tarvo MkvWriter" );
+  EXPECT_EQ( File.Text( { Ebml::Segment, Ebml::Info, Ebml::MuxingApp } ).find( "libebml v" ), 0u );
+  EXPECT_NE( File.Text( { Ebml::Segment, Ebml::Info, Ebml::MuxingApp } ).find( " + zzlibmatroska v" ), std::string::npos );
+  EXPECT_EQ( File.Find( { Ebml::Segment, Ebml::Info, Ebml::SegmentUID } ).m_Size, 16u );
+  EXPECT_EQ( File.Find( { Ebml::Segment, Ebml::Info, Ebml::DateUTC } ).m_Size, 8u );
+}
+
+TEST_F( MkvWriter, EveryClusterIsInOneSeekHeadAndEveryBlockInTheCues )
+{
+  constexpr uint64_t Frames = 300;   // more than the main seek head has room for
+  ASSERT_TRUE( m_Movie.Begin() );
+  WriteFrames( Frames );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  const auto Clusters = File.FindAll( { Ebml::Segment, Ebml::Cluster } );
+  ASSERT_EQ( Clusters.size(), Frames );
+
+  const auto SeekHeads = File.FindAll( { Ebml::Segment, Ebml::SeekHead } );
+  ASSERT_EQ( SeekHeads.size(), 2u );
+  EXPECT_EQ( SeekHeads[1]->End(), m_Movie.m_pBytes->size() );
+  // Entries until fewer than 75 of 2000 bytes are left, then those of Cues and the secondary seek head
+  EXPECT_GT( SeekHeads[0]->m_Size, 2000u - 75u );
+  EXPECT_LE( SeekHeads[0]->m_Size, 2000u );
+  std::vector<uint64_t> Indexed;
+  std::vector<uint32_t> Others;
+  for( const VMatroskaSeek& rSeek : ReadSeeks( File ) )
+  {
+    EXPECT_EQ( IdAt( File, rSeek.m_Position ), rSeek.m_Id );
+    rSeek.m_Id == Ebml::Cluster ? Indexed.push_back( rSeek.m_Position ) : Others.push_back( rSeek.m_Id );
+  }
+  EXPECT_EQ( Others, ( std::vector<uint32_t>{ Ebml::Info, Ebml::Tracks, Ebml::Tags, Ebml::Cues, Ebml::SeekHead } ) );
+
+  const auto Cues = ReadCues( File );
+  ASSERT_EQ( Cues.size(), 2 * Frames );
+  for( uint64_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    EXPECT_EQ( Indexed.at( Frame ), Clusters[Frame]->m_Position );
+    for( const uint64_t Track : { 1u, 2u } )
+    {
+      const VMatroskaCue& rCue = Cues[2 * Frame + Track - 1];
+      EXPECT_EQ( rCue.m_Time, Frame * Period );
+      EXPECT_EQ( rCue.m_Track, Track );
+      EXPECT_EQ( rCue.m_Cluster, Clusters[Frame]->m_Position );
+    }
+  }
+}
+
+TEST_F( MkvWriter, WithoutFramesThereIsAFileWithoutCues )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  EXPECT_TRUE( m_Movie.m_Writer.Close() );
+  EXPECT_FALSE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  EXPECT_EQ( Ids( File.Find( { Ebml::Segment } ).m_Children ),
+    ( std::vector<uint32_t>{ Ebml::SeekHead, Ebml::Void, Ebml::Info, Ebml::Tracks, Ebml::Tags } ) );
+  EXPECT_FALSE( File.Find( { Ebml::Segment } ).m_bUnknownSize );
+}
+
+TEST_F( MkvWriter, BothAttributeMapsAreFoundAgainAsTags )
+{
+  VDescription Description;
+  Description.m_Video = VideoInfo( IPixelFormat::EBayerGB8 );
+  Description.m_Timecode = { ITimecodeStandard::ETimecode30Drop, 1, 2, 3, 30 };   // stored though it is none
+  Description.m_Attributes.Set( "Text", "gr\xC3\xBC\xC3\x9F & <Gott>" );
+  Description.m_Attributes.Set( "Bool", true );
+  Description.m_Attributes.Set( "Int8", static_cast<char>( -7 ) );
+  Description.m_Attributes.Set( "UInt8", uint8_t{ 200 } );
+  Description.m_Attributes.Set( "Int64", int64_t{ -9000000000000000000 } );
+  Description.m_Attributes.Set( "UInt64", uint64_t{ 18000000000000000000u } );
+  Description.m_Attributes.Set( "Float", 0.1f );
+  Description.m_Attributes.Set( "Double", 1.0 / 3.0 );
+  Description.m_Attributes.Set( "Empty", "" );
+  Description.m_Attributes.Set( "Saturation", "the caller's" );   // gives way
+  ASSERT_TRUE( m_Movie.Begin( Description ) );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  const auto Tags = ReadTags( File );
+  const auto Is = [&]( const std::string& i_rName, const std::string& i_rText )
+  { EXPECT_TRUE( Tags.count( "Tarvo." + i_rName ) != 0 && Tags.at( "Tarvo." + i_rName ) == i_rText ) << i_rName; };
+  Is( "Internal.VideoFrameInfo.Present", "true" );
+  Is( "Internal.VideoFrameInfo.PixelFormat", "BayerGB8" );
+  Is( "Internal.VideoFrameInfo.ImageWidth", "4" );
+  Is( "Internal.VideoFrameInfo.PixelAspectRatio", "1" );
+  Is( "Internal.AudioFrameInfo.SampleFormat", "Int16" );
+  Is( "Internal.AudioFrameInfo.Channels", "2" );
+  Is( "External.Text", "gr\xC3\xBC\xC3\x9F & <Gott>" );
+  Is( "External.Bool", "true" );
+  Is( "External.Int8", "-7" );
+  Is( "External.UInt8", "200" );
+  Is( "External.Int64", "-9000000000000000000" );
+  Is( "External.UInt64", "18000000000000000000" );
+  Is( "External.Float", "0.1" );
+  Is( "External.Double", "0.3333333333333333" );
+  Is( "External.Empty", "" );
+  Is( "External.TicksPerSecond", "135000000" );
+  Is( "External.FramePeriodInTicks", "4504500" );
+  Is( "External.StartOffsetInTicks", "0" );
+  Is( "External.Saturation", "1" );
+  Is( "External.Timecode.Frames", "30" );
+  EXPECT_EQ( Tags.size(), 13u + 10u + 4u + 9u );
+  const auto Targets = File.FindAll( { Ebml::Segment, Ebml::Tags, Ebml::Tag, Ebml::Targets } );
+  ASSERT_EQ( Targets.size(), 1u );
+  EXPECT_EQ( Ids( Targets[0]->m_Children ), std::vector<uint32_t>{ Ebml::TagAttachmentUID } );
+}
+
+TEST_F( MkvWriter, FrameKeysCountTheFrames )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 1 ) );
+  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "", 0 ) );
+  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "" ) );
+  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 3 ) );
+  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 1 ) );
+  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "", 2 ) );
+  EXPECT_TRUE( m_Movie.m_Writer.Close() );
+  EXPECT_EQ( ReadBlocks( Parse() ).size(), 3u );
+}
+
+TEST_F( MkvWriter, FramesInPiecesAreJoinedAndWrongOnesRefused )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  const auto Write = [&]( const std::vector<std::string>& i_rPieces, const VideoFrameInfo& i_rInfo = VideoInfo() )
+  {
+    VBufferList Video;
+    for( const std::string& rPiece : i_rPieces )
+    {
+      Video.push_back( Buffer( Text( rPiece ) ) );
+    }
+    VBufferList Audio = { Buffer( Text( "ab" ) ), Buffer( Text( "" ) ), Buffer( Text( "cd" ) ) };
+    return m_Movie.m_Writer.WriteFrame( Video, i_rInfo, Audio, SmallAudio, VMkvWriter::AnyKey );
+  };
+  EXPECT_TRUE( Write( { "AB", "C", "", "D" } ) );
+  EXPECT_FALSE( Write( { "AB", "CDE" } ) );
+  EXPECT_FALSE( Write( { "ABC" } ) );
+  EXPECT_EQ( m_Log.Count( "Unexpected total size of buffers provided." ), 2u );
+  EXPECT_FALSE( Write( {} ) );
+  EXPECT_FALSE( Write( { "ABCD" }, VideoInfo( IPixelFormat::ELuminance8, 2, 2 ) ) );
+  EXPECT_TRUE( m_Log.Has( "A frame of 2 x 2 pixels does not fit the file's 4 x 1." ) );
+  EXPECT_TRUE( Write( { "EFGH" } ) );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const auto Blocks = ReadBlocks( Parse() );
+  ASSERT_EQ( Blocks.size(), 4u );
+  EXPECT_EQ( Blocks[0].m_Data, Text( "ABCD" ) );
+  EXPECT_EQ( Blocks[1].m_Data, Text( "abcd" ) );
+  EXPECT_EQ( Blocks[2].m_Data, Text( "EFGH" ) );
+}
+
+TEST_F( MkvWriter, SoundKeepsTheHeadersChannels )
+{
+  VDescription Description;
+  Description.m_Audio = { IAudioSampleFormat::EInt16, 48000, 1 };
+  ASSERT_TRUE( m_Movie.Begin( Description ) );
+  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "aabbccdd" ) );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  EXPECT_EQ( ReadBlocks( Parse() ).at( 1 ).m_Data, Text( "aacc" ) );
+}
+
+TEST_F( MkvWriter, WithoutSoundThereIsOneTrack )
+{
+  VDescription Description;
+  Description.m_Audio = {};
+  ASSERT_TRUE( m_Movie.Begin( Description ) );
+  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "aabb" ) );
+  ASSERT_TRUE( m_Movie.m_Writer.Close() );
+  const VEbmlParser File = Parse();
+  EXPECT_EQ( File.FindAll( { Ebml::Segment, Ebml::Tracks, Ebml::TrackEntry } ).size(), 1u );
+  EXPECT_EQ( ReadBlocks( File ).size(), 1u );
+  EXPECT_EQ( ReadCues( File ).size(), 1u );
+  EXPECT_EQ( ReadTags( File ).at( "Tarvo.Internal.AudioFrameInfo.Present" ), "false" );
+}
+
+TEST_F( MkvWriter, PeriodsThatCannotBeStoredAreRefused )
+{
+  const auto Begin = [&]( const VTimingRecord& i_rTiming )
+  {
+    VSmallMovie Movie;
+    VDescription Description;
+    Description.m_Timing = i_rTiming;
+    return Movie.Begin( Description ) && Movie.WriteFrame( "ABCD", "" ) && Movie.WriteFrame( "ABCD", "" ) && Movie.m_Writer.Close();
+  };
+  EXPECT_FALSE( Begin( { 0, 1, 0 } ) );
+  EXPECT_FALSE( Begin( { 1, 5, 0 } ) );
+  EXPECT_TRUE( m_Log.Has( "A frame period of 5000000000 ns is longer than the 4294967295 ns that can be stored." ) );
+  EXPECT_TRUE( Begin( { 1, 4, 0 } ) );
+  EXPECT_TRUE( Begin( {} ) );
+}
