@@ -104,13 +104,7 @@ TEST_F( ParameterHandler, RegistersItsGroupWhileItLives )
   ASSERT_EQ( m_pRegistry->m_Groups.size(), 1u );
   const auto pGroup = m_pRegistry->m_Groups[0];
   EXPECT_EQ( pGroup->GetPath(), m_Device );
-  std::string Names;
-  for( const auto& pParameter : pGroup->GetParameters() )
-  {
-    Names += pParameter->GetName() + " ";
-  }
-  EXPECT_EQ( Names,
-    "DisplayType Connected ConnectionCount Enabled Name CaptureDirectory VideoContainer VideoPayload AudioPayload ProcessInRealtime " );
+  EXPECT_EQ( pGroup->GetParameters().size(), 10u );
   m_pHandler.reset();
   EXPECT_TRUE( m_pRegistry->m_Groups.empty() );
   m_pService->RunAll();

@@ -5,8 +5,6 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <set>
-#include <thread>
 #include <vector>
 
 namespace
@@ -128,49 +126,6 @@ TEST( CaptureBufferAllocator, RecoveryMakesRoom )
   }
   EXPECT_GE( Frames.size() - Next, 9u );   // no more was freed than was needed
   while( Next < Frames.size() ) Memory.m_Allocator.Free( Frames[Next++] );
-}
-
-// Allocations of several threads never overlap, whoever frees them, and no block is lost.
-TEST( CaptureBufferAllocator, Threads )
-{
-  VMemory Memory( 100000 );
-  struct VNote
-  {
-    uint32_t m_Thread;
-    uint32_t m_Index;
-  };
-  constexpr uint32_t Count = 20000;
-  constexpr uint32_t Threads = 3;
-  std::vector<std::atomic<VNote*>> Handed( Threads * Count );
-  const auto Allocate = [&]( uint32_t i_Thread )
-  {
-    for( uint32_t Index = 0; Index < Count; ++Index )
-    {
-      auto* pNote = static_cast<VNote*>( Memory.m_Allocator.Allocate( 96 ) );
-      *pNote = { i_Thread, Index };
-      Handed[i_Thread * Count + Index].store( pNote, std::memory_order_release );
-    }
-  };
-  std::atomic<uint32_t> Wrong{ 0 };
-  const auto Free = [&]( uint32_t i_Thread )
-  {
-    for( uint32_t Index = 0; Index < Count; ++Index )
-    {
-      VNote* pNote = nullptr;
-      while( !( pNote = Handed[i_Thread * Count + Index].load( std::memory_order_acquire ) ) ) std::this_thread::yield();
-      if( pNote->m_Thread != i_Thread || pNote->m_Index != Index ) ++Wrong;
-      Memory.m_Allocator.Free( pNote );
-    }
-  };
-  std::vector<std::thread> Running;
-  for( uint32_t Thread = 0; Thread < Threads; ++Thread )
-  {
-    Running.emplace_back( Allocate, Thread );
-    Running.emplace_back( Free, Thread );
-  }
-  for( std::thread& rThread : Running ) rThread.join();
-  EXPECT_EQ( Wrong, 0u );
-  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 0u );
 }
 
 }
