@@ -16,6 +16,16 @@ using UtilsMemory::VByteVector;
 
 constexpr size_t Depth = 8;   // bits a channel
 
+// Pixels. Version 6 ends the process where an image has none or exceeds the system's policy, which allows twice this side in a common setting.
+constexpr uint32_t MaxSide = 8192;
+
+bool IsImage( const KVZ::VideoFrameInfo& i_rInfo, const uint8_t* i_pPixels, size_t i_Size )
+{
+  const auto IsSide = []( uint32_t i_Side ) { return 0 < i_Side && i_Side <= MaxSide; };
+  return i_pPixels && IsSide( i_rInfo.m_ImageWidth ) && IsSide( i_rInfo.m_ImageHeight ) &&
+    i_Size >= KVZ::GetImageSize( i_rInfo.m_PixelFormat, i_rInfo.m_ImageWidth, i_rInfo.m_ImageHeight );
+}
+
 struct VRow
 {
   int m_ImageType;
@@ -70,6 +80,8 @@ public:
   bool SetFile( const uint8_t* i_pBytes, size_t i_Size ) { return Check( m_r.MagickReadImageBlob( m_pWand, i_pBytes, i_Size ) ); }
 
   int GetType() { return m_r.MagickIdentifyImageType( m_pWand ); }
+  // The type tells what the pixels are. Version 6 tells how the file stores them: a grey one may be a palette to it.
+  bool IsTypeOfPixels() const { return m_r.MagickIdentifyImageType != m_r.MagickGetImageType; }
   size_t GetWidth() { return m_r.MagickGetImageWidth( m_pWand ); }
   size_t GetHeight() { return m_r.MagickGetImageHeight( m_pWand ); }
 
@@ -96,6 +108,24 @@ private:
   MagickWand* const m_pWand;
 };
 
+// Makes an R8G8B8 image whose channels are equal everywhere a Luminance8 one.
+void MakeGreyIfItIs( KVZ::VideoFrameInfo& io_rInfo, VByteVector& io_rPixels )
+{
+  for( size_t Index = 0; Index < io_rPixels.size(); Index += 3 )
+  {
+    if( io_rPixels[Index] != io_rPixels[Index + 1] || io_rPixels[Index] != io_rPixels[Index + 2] )
+    {
+      return;
+    }
+  }
+  for( size_t Pixel = 0; Pixel < io_rPixels.size() / 3; ++Pixel )
+  {
+    io_rPixels[Pixel] = io_rPixels[3 * Pixel];
+  }
+  io_rPixels.resize( io_rPixels.size() / 3 );
+  io_rInfo.m_PixelFormat = IPixelFormat::ELuminance8;
+}
+
 }
 
 bool EncodeImage( const VLibrary& i_rLibrary, const VFileKind& i_rKind, const uint8_t* i_pPixels, size_t i_Size, const KVZ::VideoFrameInfo& i_rInfo,
@@ -103,7 +133,7 @@ bool EncodeImage( const VLibrary& i_rLibrary, const VFileKind& i_rKind, const ui
 {
   const VFunctions* const pFunctions = i_rLibrary.Functions();
   const VRow* const pRow = FindRow( [&]( const VRow& i_rRow ) { return i_rRow.m_bWritten && i_rRow.m_PixelFormat == i_rInfo.m_PixelFormat; } );
-  if( !pFunctions || !pRow || i_Size < KVZ::GetImageSize( i_rInfo.m_PixelFormat, i_rInfo.m_ImageWidth, i_rInfo.m_ImageHeight ) )
+  if( !pFunctions || !pRow || !IsImage( i_rInfo, i_pPixels, i_Size ) )
   {
     return false;
   }
@@ -138,6 +168,10 @@ bool DecodeImage( const VLibrary& i_rLibrary, const VFileKind& i_rKind, const ui
   if( !Wand.GetPixels( Info, *pRow, Pixels.data() ) )
   {
     return false;
+  }
+  if( pRow->m_PixelFormat == IPixelFormat::ER8G8B8 && !Wand.IsTypeOfPixels() )
+  {
+    MakeGreyIfItIs( Info, Pixels );
   }
   o_rInfo = Info;
   o_rPixels = std::move( Pixels );

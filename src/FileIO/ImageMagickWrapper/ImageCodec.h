@@ -14,7 +14,7 @@ struct VFileKind
   const char* m_pCategory;   // of the log
 };
 
-// Luminance8 and R8G8B8 alone. False, with a line in the log where the library has refused, leaves the output as it is.
+// Luminance8 and R8G8B8 alone, sides of 1 to 8192 pixels. False, with a line in the log where the library has refused, leaves the output as it is.
 bool EncodeImage( const VLibrary& i_rLibrary, const VFileKind& i_rKind, const uint8_t* i_pPixels, size_t i_Size, const KVZ::VideoFrameInfo& i_rInfo,
   UtilsMemory::VByteVector& o_rBytes );
 

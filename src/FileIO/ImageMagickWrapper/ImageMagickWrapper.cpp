@@ -37,7 +37,7 @@ bool FindAll( void* i_pHandle, VFunctions& o_rFunctions )
     Find( i_pHandle, r.MagickGetImageBlob, "MagickGetImageBlob" ) && Find( i_pHandle, r.DestroyMagickWand, "DestroyMagickWand" ) &&
     Find( i_pHandle, r.MagickGetImageDepth, "MagickGetImageDepth" ) && Find( i_pHandle, r.MagickSetImageDepth, "MagickSetImageDepth" ) &&
     Find( i_pHandle, r.MagickGetImageType, "MagickGetImageType" ) &&
-    // Version 6 has no such function: there the query of the type identifies already.
+    // Version 6 has no such function.
     Find( i_pHandle, r.MagickIdentifyImageType, "MagickIdentifyImageType", "MagickGetImageType" ) &&
     Find( i_pHandle, r.MagickGetImageHeight, "MagickGetImageHeight" ) && Find( i_pHandle, r.MagickGetImageWidth, "MagickGetImageWidth" ) &&
     Find( i_pHandle, r.MagickReadImageBlob, "MagickReadImageBlob" ) && Find( i_pHandle, r.MagickGetException, "MagickGetException" ) &&

@@ -1,0 +1,204 @@
+// PNG and TIFF, written by us and read by us and by others.
+#include "FileIO/PNGIO/PNGIO.h"
+#include "FileIO/TIFFIO/TIFFIO.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/ProgramRun.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <boost/thread/thread.hpp>
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <fstream>
+#include <numeric>
+#include <random>
+
+using ImageMagickWrapper::VFunctions;
+using KVZ::IPixelFormat;
+using UtilsMemory::VByteVector;
+
+namespace
+{
+
+struct VKind
+{
+  const char* m_pName;
+  const char* m_pCategory;
+  const char* m_pIdentity;   // of a 61 by 37 image, as ImageMagick's program tells it
+  decltype( &PNGIO::PNGWriter ) m_pWriter;
+  decltype( &PNGIO::PNGReader ) m_pReader;
+};
+
+constexpr VKind Kinds[] = { { "png", "PNGIO", "PNG 61 37 8", &PNGIO::PNGWriter, &PNGIO::PNGReader },
+  { "tiff", "TIFFIO", "TIFF 61 37 8", &TIFFIO::TIFFWriter, &TIFFIO::TIFFReader } };
+
+const ImageMagickWrapper::VLibrary& Library() { return ImageMagickWrapper::Instance(); }
+
+struct VImage
+{
+  KVZ::VideoFrameInfo m_Info;
+  VByteVector m_Pixels;
+};
+
+// Holds every value of a channel.
+VImage MakeImage( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height, uint32_t i_Seed = 1 )
+{
+  VImage Image;
+  Image.m_Info.m_ImageWidth = i_Width;
+  Image.m_Info.m_ImageHeight = i_Height;
+  Image.m_Info.m_PixelFormat = i_Format;
+  Image.m_Pixels.resize( KVZ::GetImageSize( i_Format, i_Width, i_Height ) );
+  std::mt19937 Random( i_Seed );
+  for( size_t Index = 0; Index < Image.m_Pixels.size(); ++Index )
+  {
+    Image.m_Pixels[Index] = static_cast<uint8_t>( Index < 256 ? Index : Random() );
+  }
+  return Image;
+}
+
+bool Write( const VKind& i_rKind, const VImage& i_rImage, VByteVector& o_rFile )
+{
+  return i_rKind.m_pWriter( i_rImage.m_Pixels.data(), i_rImage.m_Pixels.size(), i_rImage.m_Info, o_rFile, Library() );
+}
+
+bool Read( const VKind& i_rKind, const VByteVector& i_rFile, VImage& o_rImage )
+{
+  return i_rKind.m_pReader( i_rFile.data(), i_rFile.size(), o_rImage.m_Info, o_rImage.m_Pixels, Library() );
+}
+
+bool ComesBack( const VKind& i_rKind, const VImage& i_rImage )
+{
+  VByteVector File;
+  VImage Read;
+  return Write( i_rKind, i_rImage, File ) && ::Read( i_rKind, File, Read ) && Read.m_Info == i_rImage.m_Info && Read.m_Pixels == i_rImage.m_Pixels;
+}
+
+// Every channel of an image through a wand, with the given type.
+VByteVector MakeForeignFile( const VKind& i_rKind, const char* i_pMap, int i_Type, const std::vector<uint8_t>& i_rPixels, size_t i_Width )
+{
+  const VFunctions& r = *Library().Functions();
+  ImageMagickWrapper::MagickWand* const pWand = r.NewMagickWand();
+  const size_t Height = i_rPixels.size() / i_Width / std::string( i_pMap ).size();
+  EXPECT_EQ( r.MagickConstituteImage( pWand, i_Width, Height, i_pMap, ImageMagickWrapper::CharPixel, i_rPixels.data() ), 1 );
+  r.MagickSetImageDepth( pWand, 8 );
+  r.MagickSetImageFormat( pWand, i_rKind.m_pName );
+  r.MagickSetImageType( pWand, i_Type );
+  size_t Size = 0;
+  unsigned char* const pBlob = r.MagickGetImageBlob( pWand, &Size );
+  const VByteVector File( pBlob, pBlob + Size );
+  r.MagickRelinquishMemory( pBlob );
+  r.DestroyMagickWand( pWand );
+  return File;
+}
+
+// What another program sees in a file, in our pixel format.
+std::string ReadWith( const std::vector<std::string>& i_rCommand )
+{
+  const TestSupport::VRunResult Result = TestSupport::RunProgram( i_rCommand );
+  EXPECT_EQ( Result.m_ExitCode, 0 ) << Result.m_Error;
+  return Result.m_Output;
+}
+
+}
+
+TEST( ImageFiles, ComeBackBitExactFromOurReaderAndOthers )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  for( const VKind& rKind : Kinds )
+  {
+    for( const IPixelFormat::Enum Format : { IPixelFormat::ELuminance8, IPixelFormat::ER8G8B8 } )
+    {
+      SCOPED_TRACE( rKind.m_pName + KVZ::ToName( Format ) );
+      const bool bGrey = Format == IPixelFormat::ELuminance8;
+      const VImage Image = MakeImage( Format, 61, 37 );
+      EXPECT_TRUE( ComesBack( rKind, Image ) );
+
+      VByteVector File;
+      ASSERT_TRUE( Write( rKind, Image, File ) );
+      const std::string Path = Folder.File( "image." + std::string( rKind.m_pName ) );
+      std::ofstream( Path, std::ios::binary ).write( reinterpret_cast<const char*>( File.data() ), static_cast<std::streamsize>( File.size() ) );
+      const std::string Pixels( Image.m_Pixels.begin(), Image.m_Pixels.end() );
+      EXPECT_TRUE(
+        ReadWith( { "ffmpeg", "-nostdin", "-v", "error", "-i", Path, "-f", "rawvideo", "-pix_fmt", bGrey ? "gray" : "rgb24", "-" } ) == Pixels );
+      EXPECT_TRUE( ReadWith( { "convert", Path, "-depth", "8", bGrey ? "gray:-" : "rgb:-" } ) == Pixels );
+      EXPECT_EQ( ReadWith( { "identify", "-format", "%m %w %h %z", Path } ), rKind.m_pIdentity );
+    }
+  }
+}
+
+TEST( ImageFiles, OfFewColoursComeBackInColour )
+{
+  for( const VKind& rKind : Kinds )
+  {
+    std::vector<uint8_t> Pixels;
+    while( Pixels.size() < 300 )
+    {
+      Pixels.insert( Pixels.end(), { 255, 0, 10, 20, 90, 200 } );
+    }
+    VImage Image;
+    ASSERT_TRUE( Read( rKind, MakeForeignFile( rKind, "RGB", ImageMagickWrapper::ImageType::Palette, Pixels, 10 ), Image ) );
+    EXPECT_EQ( Image.m_Info.m_PixelFormat, IPixelFormat::ER8G8B8 );
+    EXPECT_EQ( Image.m_Info.m_ImageHeight, 10u );
+    EXPECT_EQ( std::vector<uint8_t>( Image.m_Pixels.begin(), Image.m_Pixels.end() ), Pixels );
+  }
+}
+
+TEST( ImageFiles, RefusalsSayWhy )
+{
+  constexpr int TrueColorWithAlpha = 7;
+  for( const VKind& rKind : Kinds )
+  {
+    const TestSupport::VLogCapture Log( rKind.m_pCategory );
+    const VByteVector Kept{ 1, 2, 3 };
+    VByteVector File = Kept;
+    // What the library is not asked about
+    EXPECT_FALSE( Write( rKind, MakeImage( IPixelFormat::EB8G8R8, 4, 4 ), File ) );
+    VImage Short = MakeImage( IPixelFormat::ER8G8B8, 4, 4 );
+    Short.m_Pixels.pop_back();
+    EXPECT_FALSE( Write( rKind, Short, File ) );
+    // What would end the process
+    for( const uint32_t Side : { 0u, 17000u } )
+    {
+      VImage Odd = MakeImage( IPixelFormat::ELuminance8, 17000, 1 );
+      Odd.m_Info.m_ImageWidth = Side;
+      EXPECT_FALSE( Write( rKind, Odd, File ) );
+    }
+    EXPECT_TRUE( Log.Texts().empty() );
+    // What it does not like
+    const VImage Whole = MakeImage( IPixelFormat::ER8G8B8, 4, 4 );
+    const ImageMagickWrapper::VFileKind NoKind{ "nosuchformat", rKind.m_pCategory };
+    EXPECT_FALSE( ImageMagickWrapper::EncodeImage( Library(), NoKind, Whole.m_Pixels.data(), Whole.m_Pixels.size(), Whole.m_Info, File ) );
+    EXPECT_EQ( File, Kept );
+    VImage Image;
+    EXPECT_FALSE( Read( rKind, Kept, Image ) );
+    std::vector<uint8_t> Pixels( 64 );
+    std::iota( Pixels.begin(), Pixels.end(), uint8_t{ 7 } );
+    EXPECT_FALSE( Read( rKind, MakeForeignFile( rKind, "RGBA", TrueColorWithAlpha, Pixels, 4 ), Image ) );
+    EXPECT_TRUE( Image.m_Info.IsEmpty() );
+    const std::vector<std::string> Texts = Log.Texts();
+    ASSERT_EQ( Texts.size(), 3u );
+    EXPECT_EQ( Texts[0].find( "ImageMagick exception: " ), 0u );
+    EXPECT_EQ( Texts[1].find( "ImageMagick exception: no decode delegate for this image format" ), 0u );
+    EXPECT_EQ( Texts[2], "Unsupported format" );
+  }
+}
+
+TEST( ImageFiles, SeveralThreadsAtOnce )
+{
+  std::atomic<int> Good{ 0 };
+  boost::thread_group Threads;
+  for( uint32_t Number = 0; Number < 4; ++Number )
+  {
+    Threads.create_thread(
+      [&Good, Number]
+      {
+        for( uint32_t Round = 0; Round < 6; ++Round )
+        {
+          const IPixelFormat::Enum Format = Round % 2 ? IPixelFormat::ER8G8B8 : IPixelFormat::ELuminance8;
+          Good += ComesBack( Kinds[( Number + Round / 2 ) % 2], MakeImage( Format, 64 + Number, 48, Number * 10 + Round ) );
+        }
+      } );
+  }
+  Threads.join_all();
+  EXPECT_EQ( Good, 24 );
+}
