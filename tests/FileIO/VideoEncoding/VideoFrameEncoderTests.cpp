@@ -73,17 +73,17 @@ protected:
   {
     m_Parts.m_ConverterMakers[EConverter::Software] = [this] { return m_pConverter; };
     m_Parts.m_Compressors[IVideoPayload::EImagePNG] =
-      [this]( const VCompressionInput& i_rInput, std::vector<uint8_t>& o_rOutput, std::vector<uint8_t>& )
+      [this]( const VCompressionInput& i_rInput, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& )
     {
       m_Compressed = i_rInput.m_rInfo.m_PixelFormat;
       m_Quality = i_rInput.m_JPEGQuality;
       o_rOutput.assign( i_rInput.m_pPixels, i_rInput.m_pPixels + 1 );
       return m_bCompressorWorks;
     };
-    m_Parts.m_DrawText = []( IPixelFormatConverter&, const VideoFrameInfo&, const VBurnInSettings& i_rSettings, uint8_t* io_pPixels, size_t )
+    m_Parts.m_DrawText = [this]( IPixelFormatConverter&, const VideoFrameInfo&, const VBurnInSettings& i_rSettings, uint8_t* io_pPixels, size_t )
     {
       io_pPixels[0] = static_cast<uint8_t>( i_rSettings.m_Text[0] );
-      return true;
+      return m_bDrawerWorks;
     };
   }
 
@@ -102,6 +102,7 @@ protected:
   IPixelFormat::Enum m_Compressed = IPixelFormat::EUnspecified;
   int m_Quality = 0;
   bool m_bCompressorWorks = true;
+  bool m_bDrawerWorks = true;
   const TestSupport::VLogCapture m_Log{ "VideoEncoding" };
 };
 
@@ -172,12 +173,30 @@ TEST_F( VideoFrameEncoder, ACompressedPayloadChoosesItsOwnFormat )
   EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Error encoding data in 'Luminance8' pixel format to 'ImagePNG'." } );
 }
 
+// All steps before compression are gone through first, and change nothing.
+TEST_F( VideoFrameEncoder, APayloadWithoutACompressorIsRefusedLast )
+{
+  MakeEncoder();
+  const VBufferList Before = m_Video;
+  EXPECT_FALSE( Encode( IPixelFormat::ER8G8B8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 ) );
+  EXPECT_EQ( m_Video, Before );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 ) );
+  EXPECT_EQ( m_Video.size(), 1u );
+  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::EUnspecified );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::ENone, IPixelFormat::ELuminance8 ) );
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, static_cast<IVideoPayload::Enum>( 77 ), IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.", "Unsupported video payload format 'VideoH264'.",
+      "Unsupported video payload format 'None'.", "Unsupported video payload format 'Unspecified'." } ) );
+}
+
 TEST_F( VideoFrameEncoder, RefusalsSayWhy )
 {
   MakeEncoder();
   EXPECT_FALSE( Encode( IPixelFormat::ER8G8B8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EVideoH264, IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, static_cast<IVideoPayload::Enum>( 77 ), IPixelFormat::EU8Y8V8Y8 ) );
+  m_Encoder->SetBurnIn( { "T" } );
+  m_bDrawerWorks = false;
+  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
   m_Parts.m_ConverterMakers.clear();
   m_Parts.m_DrawText = {};
   MakeEncoder();
@@ -185,9 +204,27 @@ TEST_F( VideoFrameEncoder, RefusalsSayWhy )
   m_Encoder->SetBurnIn( { "T" } );
   EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
   EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.", "Unsupported video payload format 'VideoH264'.",
-      "Unsupported video payload format 'Unspecified'.", "Error converting pixel format from 'U8Y8V8Y8' to 'Luminance8'.",
+    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.",
+      "Error burning text into an image in 'U8Y8V8Y8' pixel format.", "Error converting pixel format from 'U8Y8V8Y8' to 'Luminance8'.",
       "Burn-in text is not available." } ) );
+}
+
+TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
+{
+  std::string Made;
+  for( const EConverter Converter : { EConverter::OpenGLFirst, EConverter::Software, EConverter::OpenGLSecond } )
+  {
+    m_Parts.m_ConverterMakers[Converter] = [this, &Made, Converter]
+    {
+      Made += std::to_string( static_cast<int>( Converter ) );
+      return m_pConverter;
+    };
+  }
+  for( const int Argument : { 1, 2, 3, 0, 17 } )
+  {
+    VVideoFrameEncoder( static_cast<EConverter>( Argument ), m_Parts );
+  }
+  EXPECT_EQ( Made, "12333" );
 }
 
 TEST( PixelFormatForPayload, JpegKeepsWhatItsCompressorTakes )

@@ -1,0 +1,143 @@
+// The encoder with its real compressors.
+#include "CoreVideoUtils/FrameSize.h"
+#include "FileIO/PNGIO/PNGIO.h"
+#include "FileIO/TIFFIO/TIFFIO.h"
+#include "FileIO/VideoEncoding/ImageCompressors.h"
+#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "tests/support/LogCapture.h"
+
+#include <boost/thread/thread.hpp>
+#include <gtest/gtest.h>
+#include <turbojpeg.h>
+
+#include <atomic>
+#include <random>
+
+using namespace KVZ;
+using namespace VideoEncoding;
+
+namespace
+{
+
+VideoFrameInfo Info( IPixelFormat::Enum i_Format )
+{
+  VideoFrameInfo Result;
+  Result.m_ImageWidth = 64;
+  Result.m_ImageHeight = 40;
+  Result.m_PixelFormat = i_Format;
+  return Result;
+}
+
+VBufferList Noise( const VideoFrameInfo& i_rInfo, uint32_t i_Seed = 1 )
+{
+  auto pBuffer = std::make_shared<IStandardBuffer>( CoreVideoUtils::GetFrameSize( i_rInfo ) );
+  std::mt19937 Random( i_Seed );
+  std::generate( pBuffer->Bytes().begin(), pBuffer->Bytes().end(), [&] { return static_cast<uint8_t>( Random() ); } );
+  return { pBuffer };
+}
+
+std::vector<uint8_t> BytesOf( const VBufferList& i_rList ) { return { i_rList.at( 0 )->Data(), i_rList.at( 0 )->Data() + i_rList.at( 0 )->Size() }; }
+
+// TurboJPEG's own bytes for an R8G8B8 image.
+std::vector<uint8_t> TurboJPEG( const VBufferList& i_rPixels, int i_Quality )
+{
+  const tjhandle Handle = tjInitCompress();
+  unsigned char* pImage = nullptr;
+  unsigned long Size = 0;
+  EXPECT_EQ( tjCompress2( Handle, i_rPixels.at( 0 )->Data(), 64, 0, 40, TJPF_RGB, &pImage, &Size, TJSAMP_444, i_Quality, 0 ), 0 );
+  const std::vector<uint8_t> Image( pImage, pImage + Size );
+  tjFree( pImage );
+  tjDestroy( Handle );
+  return Image;
+}
+
+VEncoderParts Parts( std::map<IVideoPayload::Enum, VCompressor> i_Compressors )
+{
+  VEncoderParts Result;
+  Result.m_Compressors = std::move( i_Compressors );
+  return Result;
+}
+
+class Compression : public testing::Test
+{
+protected:
+  bool Encode( const VVideoFrameEncoder& i_rEncoder, VBufferList& io_rVideo, IVideoPayload::Enum i_Payload )
+  {
+    return i_rEncoder.Encode( m_Allocator, io_rVideo, Info( IPixelFormat::ER8G8B8 ), i_Payload, IPixelFormat::EUnspecified );
+  }
+
+  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+};
+
+}
+
+TEST_F( Compression, EachPayloadHasItsCompressor )
+{
+  VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors() ) );
+  const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ) );
+  VBufferList Video = Pixels;
+  ASSERT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageJPEG ) );
+  EXPECT_EQ( BytesOf( Video ), TurboJPEG( Pixels, 90 ) );   // the quality where nobody has set one
+  Encoder.SetJPEGQuality( 35 );
+  Video = Pixels;
+  ASSERT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageJPEG ) );
+  EXPECT_EQ( BytesOf( Video ), TurboJPEG( Pixels, 35 ) );
+
+  VideoFrameInfo Read;
+  UtilsMemory::VByteVector Bytes;
+  Video = Pixels;
+  ASSERT_TRUE( Encode( Encoder, Video, IVideoPayload::EImagePNG ) );
+  ASSERT_TRUE( PNGIO::PNGReader( Video.at( 0 )->Data(), Video.at( 0 )->Size(), Read, Bytes ) );
+  EXPECT_EQ( std::vector<uint8_t>( Bytes.begin(), Bytes.end() ), BytesOf( Pixels ) );
+  EXPECT_EQ( BytesOf( Video ).at( 0 ), 0x89 );
+  Video = Pixels;
+  ASSERT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageTIFF ) );
+  ASSERT_TRUE( TIFFIO::TIFFReader( Video.at( 0 )->Data(), Video.at( 0 )->Size(), Read, Bytes ) );
+  EXPECT_EQ( std::vector<uint8_t>( Bytes.begin(), Bytes.end() ), BytesOf( Pixels ) );
+  EXPECT_EQ( BytesOf( Video ).at( 0 ), 'I' );
+}
+
+TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
+{
+  const TestSupport::VLogCapture Log;
+  const ImageMagickWrapper::VLibrary Missing( { { "libNoMagickWand.so.1" } } );
+  const VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors( Missing ) ) );
+  const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ) );
+  for( const IVideoPayload::Enum Payload : { IVideoPayload::EImagePNG, IVideoPayload::EImageTIFF, IVideoPayload::EImagePNG } )
+  {
+    VBufferList Video = Pixels;
+    EXPECT_FALSE( Encode( Encoder, Video, Payload ) );
+    EXPECT_EQ( Video, Pixels );
+  }
+  VBufferList Video = Pixels;
+  EXPECT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageJPEG ) );
+  Video = Pixels;
+  const VideoFrameInfo RGB = Info( IPixelFormat::ER8G8B8 );
+  EXPECT_TRUE( Encoder.Encode( m_Allocator, Video, RGB, IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
+  EXPECT_EQ( Log.Texts(),
+    ( std::vector<std::string>{ "Could not load MagickWand DLL", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'.",
+      "Error encoding data in 'R8G8B8' pixel format to 'ImageTIFF'.", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'." } ) );
+}
+
+TEST_F( Compression, OneEncoderServesSeveralThreads )
+{
+  const VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors() ) );
+  std::atomic<int> Good{ 0 };
+  boost::thread_group Threads;
+  for( uint32_t Number = 0; Number < 4; ++Number )
+  {
+    Threads.create_thread(
+      [this, &Encoder, &Good, Number]
+      {
+        for( uint32_t Frame = 0; Frame < 20; ++Frame )
+        {
+          const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ), Number * 100 + Frame );
+          VBufferList Video = Pixels;
+          Good += Encode( Encoder, Video, IVideoPayload::EImageJPEG ) && BytesOf( Video ) == TurboJPEG( Pixels, 90 );
+        }
+      } );
+  }
+  Threads.join_all();
+  EXPECT_EQ( Good, 80 );
+}
