@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <utility>
 
 namespace StageHost
 {
@@ -166,12 +167,13 @@ void VRecording::PollDevice( VDevice& io_rDevice )
   const auto Sync = io_rDevice.m_pSource->Temporal().GetSourceSyncStatus();   // first: what it counts lies before the status
   io_rDevice.m_Status = io_rDevice.m_pSource->Capture().GetCaptureStatus();
   CountArrivals( io_rDevice, Sync );
-  io_rDevice.m_Sync = Sync;
-  // A signal that comes back after the end makes the card count its absence: that is behind the range.
-  const bool bCutOff = HasEnded( io_rDevice.m_Status ) && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0;
-  if( !bHadEnded && !bCutOff )
+  const auto Before = std::exchange( io_rDevice.m_Sync, Sync );
+  // A signal that comes back makes the card count its absence just before its first frame ends the capture: what is counted while the capture goes on
+  // belongs to the range if it still goes on at the next look.
+  const bool bEnded = HasEnded( io_rDevice.m_Status );
+  if( !bHadEnded && !( bEnded && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0 ) )
   {
-    io_rDevice.m_Dropped = Sync.m_DroppedFrames - io_rDevice.m_DroppedAtStart;
+    io_rDevice.m_Dropped = ( bEnded ? Sync : Before ).m_DroppedFrames - io_rDevice.m_DroppedAtStart;
   }
   io_rDevice.m_PeakFill = std::max( io_rDevice.m_PeakFill, io_rDevice.m_Status.m_BufferFill );
   io_rDevice.m_PeakBacklog = std::max( io_rDevice.m_PeakBacklog, FramesOf( io_rDevice.m_Status.m_AvailableDuration, io_rDevice.m_Period ) );

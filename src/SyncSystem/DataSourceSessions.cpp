@@ -159,13 +159,14 @@ KVZ::ISourceTemporal::ISourceSyncStatus VDataSource::GetSourceSyncStatus()
 KVZ::ISourceTemporal::ISourceSyncStatus VDataSource::MakeSyncStatus() const
 {
   ISourceSyncStatus Status;
+  // Read before the session, so that what a new session has counted is not told beside the old one.
+  Status.m_DroppedFrames = m_DroppedFrames.load( std::memory_order_acquire );
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     Status.m_Session = m_Session;
     Status.m_bEnabled = m_bEnabled;
     Status.m_LastDeclared = m_LastDeclared;
   }
-  Status.m_DroppedFrames = m_DroppedFrames.load( std::memory_order_relaxed );
   Status.m_RefusedFrames = m_RefusedFrames.load( std::memory_order_relaxed );
   VSyncSessionRecord Record;
   int64_t Frames = 0;

