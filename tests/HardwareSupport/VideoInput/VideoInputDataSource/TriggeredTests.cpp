@@ -1,6 +1,7 @@
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSourceTriggered.h"
 
 #include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
+#include "tests/support/LogCapture.h"
 
 namespace
 {
@@ -122,6 +123,14 @@ TEST_F( TriggeredSource, FramesHaveNoClockButTheCounter )
   ASSERT_TRUE( m_pSource->Buffer()->GetSourceSyncSession( 1, Session ) );
   EXPECT_EQ( Session.m_StartTime.m_TickByClock.size(), 1u );
   EXPECT_EQ( Session.m_BeatPeriod, Period );
+}
+
+TEST( TriggeredSourceWithoutATimer, SaysSo )
+{
+  const TestSupport::VLogCapture Log( "Hal.vi:0", 2 );
+  VVideoRig Rig;
+  Rig.Make<VTestTriggeredSource>();   // on a postal service that has none
+  EXPECT_EQ( Log.Lines().size(), 1u );
 }
 
 TEST_F( TriggeredSource, OffersASessionOfItsOwnPeriod )

@@ -1,10 +1,6 @@
-// Captures into real files, read back by an independent reader; and everybody at work at once.
-#include "FileIO/TarvoVideo/Writer.h"
-#include "NotificationSystem/AsioPostalService.h"
-
+// Everybody at work at once: a device that misses frames, a live reader, an engine that joins and captures, the writing threads, and who asks
+// for the status.
 #include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
-#include "tests/support/FailingStream.h"
-#include "tests/support/TvidParser.h"
 
 #include <atomic>
 #include <thread>
@@ -13,76 +9,6 @@ namespace
 {
 
 using SyncSystem::ECaptureState;
-
-VideoInputHAL::VVideoInputDataSourceOptions WithNativeWriter( const WriterSupport::VStreamMaker& i_rStreamMaker = WriterSupport::MakeFile )
-{
-  auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
-  pFactory->Register( KVZ::IVideoContainer::ETVID,
-    [i_rStreamMaker]( auto, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
-    { return std::make_shared<TarvoVideo::VWriter>( std::move( i_pEncoder ), i_rStreamMaker ); } );
-  VideoInputHAL::VVideoInputDataSourceOptions Options;
-  Options.m_pWriterFactory = pFactory;
-  return Options;
-}
-
-void Record( VVideoRig& io_rRig, VTestVideoSource& io_rSource, int64_t i_First, int64_t i_End )
-{
-  io_rRig.DeliverMany( 10 );
-  io_rRig.Join( io_rSource, 1 );
-  const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) };
-  io_rRig.OnStrand( io_rSource, [&] { EXPECT_TRUE( io_rSource.StartCapture( Header, At( i_First ), At( i_End ), false, 0 ) ); } );
-  io_rRig.m_pWriterService->RunAll();
-}
-
-void ExpectFrames( const std::string& i_rPath, size_t i_Count, int64_t i_First )
-{
-  TestSupport::VTvidParser File( i_rPath );
-  ASSERT_EQ( File.Frames().size(), i_Count );
-  for( size_t Index = 0; Index < i_Count; ++Index )
-  {
-    EXPECT_EQ( File.Video( File.Frames()[Index] ), std::vector<uint8_t>( 64, static_cast<uint8_t>( static_cast<int64_t>( Index ) + i_First ) ) );
-  }
-}
-
-TEST( NativeFile, HoldsTheRange )
-{
-  VVideoRig Rig;
-  const auto pSource = Rig.Make<VTestVideoSource>( WithNativeWriter() );
-  Record( Rig, *pSource, 2, 9 );
-  ExpectFrames( Rig.Path(), 7, 2 );
-  TestSupport::VTvidParser File( Rig.Path() );
-  EXPECT_TRUE( File.IsFinished() );
-  EXPECT_EQ( File.Number( "StartOffsetInTicks" ), At( 2 ).Count() );
-  EXPECT_EQ( File.Number( "FramePeriodInTicks" ), Period.Count() );
-  EXPECT_EQ( File.Text( "CameraHardware.DeviceURN" ), "vi:0" );
-  EXPECT_EQ( File.Text( "Capture.Name" ), "Take" );
-  const auto Report = Rig.m_pTargets->Reports().at( 0 );
-  EXPECT_EQ( Report.m_Bytes, File.FileSize() );
-  EXPECT_EQ( Report.m_FramesWritten, 7u );
-}
-
-TEST( NativeFile, OnAFullDiskStaysReadableUpToThere )
-{
-  VVideoRig Whole;
-  const auto pWholeSource = Whole.Make<VTestVideoSource>( WithNativeWriter() );
-  Record( Whole, *pWholeSource, 0, 10 );
-  // In the picture of the fourth frame.
-  const TestSupport::VFault Full{ .m_Offset = TestSupport::VTvidParser( Whole.Path() ).Frames().at( 3 ).m_VideoPosition + 10 };
-
-  VVideoRig Rig;
-  const auto FullDisk = [Full]( const std::string& i_rPath ) -> std::unique_ptr<UtilsIO::IClosableStream>
-  { return std::make_unique<TestSupport::VFailingStream>( WriterSupport::MakeFile( i_rPath ), Full ); };
-  const auto pSource = Rig.Make<VTestVideoSource>( WithNativeWriter( FullDisk ) );
-  Record( Rig, *pSource, 0, 10 );
-  const auto Status = pSource->GetCaptureStatus();
-  EXPECT_EQ( Status.m_State, ECaptureState::Complete );
-  EXPECT_EQ( Status.m_Errors, ( std::vector<std::string>{ "Failed attempting to write data to file \"" + Rig.Path() + "\"" } ) );
-  const auto Report = Rig.m_pTargets->Reports().at( 0 );
-  EXPECT_TRUE( Report.m_bFailed );
-  EXPECT_EQ( Report.m_FramesWritten, 3u );
-  EXPECT_EQ( Report.m_Bytes, Full.m_Offset );
-  ExpectFrames( Rig.Path(), 3, 0 );
-}
 
 // A device, a live reader, an engine that takes one capture after another, and each capture's writing thread.
 class VBusySource
@@ -105,9 +31,9 @@ public:
   {
     while( !m_bCaptured )
     {
-      if( m_Delivered - m_AtCapture < FramesAhead && m_rRig.Deliver() )
+      if( m_Delivered - m_AtCapture < FramesAhead && m_rRig.Deliver() && ++m_Delivered % 400 == 0 )
       {
-        ++m_Delivered;
+        m_rRig.m_NextIndex += 2;
       }
       std::this_thread::yield();
     }
@@ -128,6 +54,16 @@ public:
         const auto* pFrame = VVideoInputDataSource::FrameOf( rFrame.m_Frame.Frame() );
         m_bLiveWhole = m_bLiveWhole && pFrame->Image()[0] == pFrame->Image()[pFrame->m_ImageBytes - 1];
       }
+    }
+  }
+
+  void AskForStatus()
+  {
+    while( !m_bCaptured )
+    {
+      m_pSource->GetSourceTimingInfo();
+      m_pSource->GetOldestGlobalSyncSession();
+      m_pSource->GetCaptureStatus();
     }
   }
 
@@ -188,9 +124,11 @@ TEST( VideoInputDataSourceThreads, EveryFileHoldsAnUnbrokenRun )
     VBusySource Busy( Rig );
     std::thread Device( [&] { Busy.Deliver(); } );
     std::thread Reader( [&] { Busy.ReadLive(); } );
+    std::thread Status( [&] { Busy.AskForStatus(); } );
     Busy.Capture( 40 );
     Device.join();
     Reader.join();
+    Status.join();
     EXPECT_TRUE( Busy.m_bLiveWhole );
     Rig.m_pSource.reset();
   }
