@@ -23,7 +23,7 @@ std::string Ask( const std::vector<std::string>& i_rArguments )
 
 std::vector<uint8_t> Decode( const std::string& i_rPath, const std::vector<std::string>& i_rOptions )
 {
-  std::vector<std::string> Arguments = { "ffmpeg", "-nostdin", "-v", "warning", "-i", i_rPath };
+  std::vector<std::string> Arguments = { "ffmpeg", "-nostdin", "-v", "error", "-i", i_rPath };
   Arguments.insert( Arguments.end(), i_rOptions.begin(), i_rOptions.end() );
   Arguments.push_back( "-" );
   const std::string Bytes = Ask( Arguments );
@@ -52,7 +52,7 @@ std::map<std::string, std::string> AskFFprobe( const std::string& i_rPath )
 // Each packet as it lies in the file: no frame is repeated or left out for the sake of a constant rate.
 std::vector<uint8_t> DecodeVideo( const std::string& i_rPath, const std::string& i_rPixelFormat )
 {
-  return Decode( i_rPath, { "-map", "0:v:0", "-vsync", "passthrough", "-pix_fmt", i_rPixelFormat, "-f", "rawvideo" } );
+  return Decode( i_rPath, { "-map", "0:v:0", "-fps_mode", "passthrough", "-pix_fmt", i_rPixelFormat, "-f", "rawvideo" } );
 }
 
 std::vector<uint8_t> DecodeAudio( const std::string& i_rPath, const std::string& i_rSampleFormat )

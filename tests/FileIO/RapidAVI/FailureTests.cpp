@@ -1,0 +1,174 @@
+// What the writer says, and what it leaves behind, when the disk fails.
+#include "tests/FileIO/RapidAVI/AviFile.h"
+#include "tests/support/FileSizeLimit.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <gtest/gtest.h>
+
+using namespace KVZ;
+using namespace RapidAVI;
+
+namespace
+{
+
+constexpr uint32_t Frames = 7;
+constexpr VSegmentLimits ThreeRiffs{ 80, 80 };
+
+struct VResult
+{
+  bool m_bHeader = false;
+  bool m_bClosed = false;
+  uint32_t m_Written = 0;
+  bool m_bLaterRefused = true;
+};
+
+// Goes on after a failure as no client would.
+VResult WriteSmallFile( VAviFile& io_rFile )
+{
+  VResult Result;
+  Result.m_bHeader = io_rFile.OpenAndWriteHeader();
+  bool bFailed = !Result.m_bHeader;
+  for( uint32_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    const bool bWritten = io_rFile.WriteFrame( VRapidAVIWriter::AppendKey, Noise( 8, Frame ), Noise( 2, Frame ) );
+    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
+    Result.m_Written += bWritten ? 1 : 0;
+    bFailed = bFailed || !bWritten;
+  }
+  Result.m_bClosed = io_rFile.m_Writer.Close();
+  return Result;
+}
+
+// The frames that a walk finds up to the first place that makes no sense.
+std::vector<VBytes> WalkFrames( const VBytes& i_rBytes )
+{
+  std::vector<VBytes> Found;
+  const std::string Text( i_rBytes.begin(), i_rBytes.end() );
+  for( size_t Position = Text.find( "00db\x08", Text.find( "movi" ) ); Position < Text.size(); Position = Text.find( "00db\x08", Position + 16 ) )
+  {
+    // Of an index, the id is followed by the base.
+    if( Text.compare( Position + 5, 3, std::string( 3, '\0' ) ) == 0 && Position + 16 <= Text.size() && Text[Position - 4] != '\x01' )
+    {
+      Found.emplace_back( i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position + 8 ),
+        i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position + 16 ) );
+    }
+  }
+  return Found;
+}
+
+void CheckLeftBehind( const VAviFile& i_rFile, const VResult& i_rResult )
+{
+  EXPECT_FALSE( i_rResult.m_bClosed );
+  EXPECT_TRUE( i_rResult.m_bLaterRefused );
+  EXPECT_FALSE( i_rFile.m_Writer.IsOpen() );
+  const std::vector<VBytes> Found = WalkFrames( *i_rFile.m_pBytes );
+  EXPECT_GE( Found.size(), i_rResult.m_Written );
+  for( uint32_t Frame = 0; Frame < std::min<size_t>( Found.size(), i_rResult.m_Written ); ++Frame )
+  {
+    EXPECT_EQ( Found[Frame], Noise( 8, Frame ) );
+  }
+}
+
+// Whether the file is whole but for what was refused, with every index right.
+bool IsConsistent( const VAviFile& i_rFile, const VResult& i_rResult )
+{
+  try
+  {
+    const TestSupport::VAviParser Parser = i_rFile.Parse();
+    EXPECT_GE( Parser.TotalFrames(), i_rResult.m_Written );
+    EXPECT_EQ( Parser.Chunks( 0 ).size(), Parser.TotalFrames() );
+    return Parser.CountIndexed( 0 ) == Parser.TotalFrames();
+  }
+  catch( const std::runtime_error& )
+  {
+    return false;
+  }
+}
+
+}
+
+// In the headers every place is like its neighbours.
+TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame )
+{
+  VAviFile Whole( {}, ThreeRiffs );
+  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
+  ASSERT_EQ( WalkFrames( *Whole.m_pBytes ).size(), Frames );
+  const uint64_t Size = Whole.m_pBytes->size();
+  const uint64_t HeaderEnd = Whole.Parse().Headers().m_Data + Whole.Parse().Headers().m_Size;
+  for( uint64_t Offset = 0; Offset < Size; Offset += Offset + 97 < HeaderEnd ? 97 : 1 )
+  {
+    SCOPED_TRACE( Offset );
+    VAviFile File( {}, ThreeRiffs, { .m_Offset = Offset } );
+    const VResult Result = WriteSmallFile( File );
+    EXPECT_LE( File.m_pBytes->size(), Offset );
+    EXPECT_EQ( Result.m_bHeader, Offset >= HeaderEnd );
+    CheckLeftBehind( File, Result );
+  }
+}
+
+// Here the stream works again after the failure, so that only the writer's own memory keeps it.
+TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
+{
+  VAviFile Whole( {}, ThreeRiffs );
+  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
+  const uint64_t Operations = Whole.m_Operations;
+  ASSERT_GT( Operations, 50u );
+  size_t Consistent = 0;
+  size_t InFrames = 0;
+  for( uint64_t Operation = 0; Operation < Operations; ++Operation )
+  {
+    SCOPED_TRACE( Operation );
+    VAviFile File( {}, ThreeRiffs, { .m_Operation = Operation } );
+    const VResult Result = WriteSmallFile( File );
+    CheckLeftBehind( File, Result );
+    if( Result.m_bHeader && Result.m_Written < Frames )
+    {
+      // What was written before is brought into the indexes all the same.
+      ++InFrames;
+      Consistent += IsConsistent( File, Result ) ? 1 : 0;
+    }
+  }
+  EXPECT_GT( InFrames, 50u );
+  EXPECT_EQ( Consistent, InFrames );
+}
+
+TEST( AviWriterFailures, OnARealDisk )
+{
+  const VSettings Settings{ .m_Video = Video( IPixelFormat::EU8Y8V8Y8, 100, 100 ), .m_Audio = {} };
+  VRapidAVIWriter Full;
+  ASSERT_TRUE( Full.Open( "/dev/full" ) );
+  EXPECT_FALSE( Settings.WriteHeader( Full ) );
+  EXPECT_FALSE( Full.Close() );
+
+  const TestSupport::VTemporaryFolder Folder;
+  const TestSupport::VFileSizeLimit Limit( 90000 );
+  VRapidAVIWriter Writer;
+  ASSERT_TRUE( Writer.Open( Folder.File( "cut.avi" ) ) );
+  ASSERT_TRUE( Settings.WriteHeader( Writer ) );
+  uint32_t Written = 0;
+  while( Settings.WriteFrame( Writer, Written, Noise( 20000, Written ), {} ) )
+  {
+    ++Written;
+  }
+  EXPECT_EQ( Written, 3u );
+  EXPECT_FALSE( Writer.Close() );
+
+  // The indexes have taken the place of the frame that was cut off.
+  VBytes Bytes = TestSupport::VRiffParser::ReadFile( Folder.File( "cut.avi" ) );
+  const auto Attributes = std::search( Bytes.begin(), Bytes.end(), "TMSL", "TMSL" + 4 );
+  ASSERT_NE( Attributes, Bytes.end() );
+  Bytes.erase( Attributes - 8, Bytes.end() );
+  const TestSupport::VAviParser Parser( Bytes );
+  EXPECT_EQ( Parser.TotalFrames(), 3u );
+  EXPECT_EQ( Parser.CountIndexed( 0 ), 3u );
+}
+
+TEST( AviWriterFailures, AFileWithoutAHeaderIsClosedAsAFailure )
+{
+  VRapidAVIWriter Unopened;
+  EXPECT_FALSE( Unopened.Close() );
+  VAviFile File;
+  ASSERT_TRUE( File.m_Writer.Open( "memory" ) );
+  EXPECT_FALSE( File.m_Writer.Close() );
+  EXPECT_FALSE( File.m_Writer.IsOpen() );
+}

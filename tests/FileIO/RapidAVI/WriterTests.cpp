@@ -1,0 +1,469 @@
+#include "FileIO/WriterSupport/AttributeBlock.h"
+#include "tests/FileIO/RapidAVI/AviFile.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+
+using namespace KVZ;
+using namespace RapidAVI;
+
+namespace
+{
+
+// Bytes put together piece by piece, numbers little-endian.
+class VBuilder
+{
+public:
+  VBuilder& Raw( const std::string& i_rText )
+  {
+    m_Bytes.insert( m_Bytes.end(), i_rText.begin(), i_rText.end() );
+    return *this;
+  }
+  VBuilder& U32( uint64_t i_Value ) { return Number( i_Value, 4 ); }
+  VBuilder& U16( uint64_t i_Value ) { return Number( i_Value, 2 ); }
+  VBuilder& U64( uint64_t i_Value ) { return Number( i_Value, 8 ); }
+  VBuilder& Number( uint64_t i_Value, size_t i_Size )
+  {
+    for( ; i_Size != 0; --i_Size )
+    {
+      m_Bytes.push_back( static_cast<uint8_t>( i_Value ) );
+      i_Value >>= 8;
+    }
+    return *this;
+  }
+  VBuilder& Zeros( size_t i_Count )
+  {
+    m_Bytes.resize( m_Bytes.size() + i_Count );
+    return *this;
+  }
+
+  VBytes m_Bytes;
+};
+
+// Two frames of 4 x 1 pixels, the first with one sample of sound and the second with none, up to the attributes.
+VBytes ExpectedFile()
+{
+  VBuilder File;
+  File.Raw( "RIFF" ).U32( 33626 ).Raw( "AVI " );
+  File.Raw( "LIST" ).U32( 33416 ).Raw( "hdrl" );
+  File.Raw( "avih" ).U32( 56 ).U32( 40000 ).U32( 200 ).U32( 0 ).U32( 0x810 );   // period, bytes a second, padding, flags
+  File.U32( 2 ).U32( 0 ).U32( 2 ).U32( 0 ).U32( 4 ).U32( 1 ).Zeros( 16 );       // frames, initial, streams, buffer, width, height
+
+  File.Raw( "LIST" ).U32( 16532 ).Raw( "strl" );
+  File.Raw( "strh" ).U32( 56 ).Raw( "vidsUYVY" ).U32( 0 ).U32( 0 ).U32( 0 );       // flags, priority and language, initial
+  File.U32( 1 ).U32( 25 ).U32( 0 ).U32( 2 ).U32( 8 ).U32( 0xFFFFFFFF ).U32( 0 );   // scale, rate, start, length, buffer, quality, sample
+  File.U16( 0 ).U16( 0 ).U16( 4 ).U16( 1 );                                        // left, top, right, bottom
+  File.Raw( "strf" ).U32( 40 ).U32( 40 ).U32( 4 ).U32( 1 ).U16( 1 ).U16( 16 );     // size, width, height, planes, bits
+  File.Raw( "UYVY" ).U32( 8 ).Zeros( 16 );                                         // compression, image size
+  File.Raw( "indx" ).U32( 0x4018 ).U16( 4 ).U16( 0 ).U32( 1 ).Raw( "00db" ).Zeros( 12 );
+  File.U64( 33490 ).U32( 48 ).U32( 2 ).Zeros( 0x4000 - 16 );   // position, size and entries of ix00
+
+  File.Raw( "LIST" ).U32( 16532 ).Raw( "strl" );
+  File.Raw( "strh" ).U32( 56 ).Raw( "auds" ).U32( 1 ).U32( 0 ).U32( 0 ).U32( 0 );   // handler, flags, priority and language, initial
+  File.U32( 1 ).U32( 48000 ).U32( 0 ).U32( 1 ).U32( 0x1000 );                       // scale, rate, start, length, buffer
+  File.U32( 0xFFFFFFFF ).U32( 2 ).Zeros( 8 );                                       // quality, sample
+  File.Raw( "strf" ).U32( 40 ).U16( 0xFFFE ).U16( 1 ).U32( 48000 ).U32( 96000 );    // tag, channels, rate, bytes a second
+  File.U16( 2 ).U16( 16 ).U16( 22 ).U16( 16 ).U32( 4 );                             // block, bits, extension, valid bits, mask
+  File.Raw( std::string( "\x01\0\0\0\0\0\x10\0\x80\0\0\xAA\0\x38\x9B\x71", 16 ) );
+  File.Raw( "indx" ).U32( 0x4018 ).U16( 4 ).U16( 0 ).U32( 1 ).Raw( "01wb" ).Zeros( 12 );
+  File.U64( 33538 ).U32( 40 ).U32( 1 ).Zeros( 0x4000 - 16 );
+
+  File.Raw( "LIST" ).U32( 260 ).Raw( "odml" ).Raw( "dmlh" ).U32( 248 ).U32( 2 ).Zeros( 244 );
+  File.Raw( "LIST" ).U32( 134 ).Raw( "movi" );
+  EXPECT_EQ( File.m_Bytes.size(), 33448u );   // the base
+  File.Raw( "00db" ).U32( 8 ).Raw( "ABCDEFGH" );
+  File.Raw( "01wb" ).U32( 2 ).Raw( "ab" );
+  File.Raw( "00db" ).U32( 8 ).Raw( "IJKLMNOP" );
+  File.Raw( "ix00" ).U32( 40 ).U16( 2 ).U16( 0x100 ).U32( 2 ).Raw( "00db" ).U64( 33448 ).U32( 0 );
+  File.U32( 8 ).U32( 8 ).U32( 34 ).U32( 8 );   // offset and size of each
+  File.Raw( "ix01" ).U32( 32 ).U16( 2 ).U16( 0x100 ).U32( 1 ).Raw( "01wb" ).U64( 33448 ).U32( 0 );
+  File.U32( 24 ).U32( 2 );
+  File.Raw( "idx1" ).U32( 48 );
+  File.Raw( "00db" ).U32( 0x10 ).U32( 4 ).U32( 8 );   // flags, offset, size
+  File.Raw( "01wb" ).U32( 0x10 ).U32( 20 ).U32( 2 );
+  File.Raw( "00db" ).U32( 0x10 ).U32( 30 ).U32( 8 );
+  EXPECT_EQ( File.m_Bytes.size(), 33634u );
+  return File.m_Bytes;
+}
+
+VBytes Bytes( const std::string& i_rText ) { return { i_rText.begin(), i_rText.end() }; }
+
+// A buffer that says it is long. Its bytes are not there.
+class VLongBuffer : public IBufferConst
+{
+public:
+  explicit VLongBuffer( uint64_t i_Size ) : m_Size( i_Size ) {}
+  const uint8_t* Data() const override { return nullptr; }
+  size_t Size() const override { return m_Size; }
+
+private:
+  const size_t m_Size;
+};
+
+// Keeps the small pieces of a file and where they lie; images are forgotten.
+class VSparseStream : public UtilsIO::IClosableStream
+{
+public:
+  using VPieces = std::map<uint64_t, VBytes>;
+
+  explicit VSparseStream( VPieces& o_rPieces ) : m_rPieces( o_rPieces ) {}
+
+  bool Read( void*, size_t ) override { return false; }
+  bool ReadBlock( void*, size_t, size_t& ) override { return false; }
+  bool IsGood() const override { return true; }
+  using UtilsIO::IClosableStream::Write;
+  bool Write( const void* i_pData, size_t i_Size ) override
+  {
+    if( i_Size < 20000 )
+    {
+      const auto* pBytes = static_cast<const uint8_t*>( i_pData );
+      m_rPieces[m_Position].assign( pBytes, pBytes + i_Size );
+    }
+    m_Position += i_Size;
+    return true;
+  }
+  bool Tell( uint64_t& o_rPosition ) override
+  {
+    o_rPosition = m_Position;
+    return true;
+  }
+  bool Seek( uint64_t i_Position ) override
+  {
+    m_Position = i_Position;
+    return true;
+  }
+  bool Close() override { return true; }
+
+private:
+  VPieces& m_rPieces;
+  uint64_t m_Position = 0;
+};
+
+// An encoder that compresses every image to the same bytes.
+std::shared_ptr<VideoEncoding::VVideoFrameEncoder> EncoderTo( const VBytes& i_rImage )
+{
+  VideoEncoding::VEncoderParts Parts;
+  Parts.m_Compressors[IVideoPayload::EImageJPEG] =
+    [i_rImage]( const VideoEncoding::VCompressionInput&, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& )
+  {
+    o_rOutput.assign( i_rImage.begin(), i_rImage.end() );
+    return true;
+  };
+  return std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software, Parts );
+}
+
+// SOI, APP0, so many segments of two bytes, SOS with its data and EOI.
+VBytes Image( size_t i_Tables, const std::string& i_rData )
+{
+  std::string Text( "\xFF\xD8\xFF\xE0\0\x10JFIF\0\1\1\0\0\1\0\1\0\0", 20 );
+  for( size_t Table = 0; Table < i_Tables; ++Table )
+  {
+    Text += std::string( "\xFF\xDB\0\4", 4 ) + "t" + static_cast<char>( '0' + Table );
+  }
+  return Bytes( Text + std::string( "\xFF\xDA\0\4s!", 6 ) + i_rData + "\xFF\xD9" );
+}
+
+class AviWriter : public testing::Test
+{
+protected:
+  const TestSupport::VLogCapture m_Log{ "RapidAVI" };
+};
+
+}
+
+TEST_F( AviWriter, ASmallFileIsTheseBytes )
+{
+  VAviFile File;
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  ASSERT_TRUE( File.WriteFrame( 0, Bytes( "ABCDEFGH" ), Bytes( "ab" ) ) );
+  VBufferList Video{ Buffer( Bytes( "IJK" ) ), Buffer( {} ), Buffer( Bytes( "LMNOP" ) ) };
+  VBufferList Audio;
+  ASSERT_TRUE( File.m_Writer.WriteFrame( Video, File.m_Settings.m_Video, Audio, MonoAudio, VRapidAVIWriter::AppendKey ) );
+  ASSERT_TRUE( File.m_Writer.Close() );
+  const VBytes Expected = ExpectedFile();
+  EXPECT_EQ( VBytes( File.m_pBytes->begin(), File.m_pBytes->begin() + static_cast<std::ptrdiff_t>( Expected.size() ) ), Expected );
+  EXPECT_EQ( File.Parse().Riff().Riffs().size(), 2u );
+  EXPECT_TRUE( m_Log.Texts().empty() );
+}
+
+TEST_F( AviWriter, TheAttributesEndTheFile )
+{
+  VSettings Settings;
+  Settings.m_Attributes.Set( "Take", "one" );
+  Settings.m_Timecode.m_Hours = 99;   // no valid one
+  VAviFile File( Settings );
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  ASSERT_TRUE( File.m_Writer.Close() );
+  const TestSupport::VAviParser Parser = File.Parse();
+  const VBytes Blocks = Parser.Riff().Content( Parser.Riff().Riffs().back() );
+  ISimpleInputStreamAdapter Stream( Blocks );
+  IVideoAttributes Internal;
+  IVideoAttributes External;
+  std::string Error;
+  ASSERT_TRUE( WriterSupport::ReadAttributeBlock( Stream, Blocks.size(), Internal, Error ) ) << Error;
+  ASSERT_TRUE( WriterSupport::ReadAttributeBlock( Stream, Blocks.size(), External, Error ) ) << Error;
+  EXPECT_TRUE( Stream.IsEnd() );
+  VideoFrameInfo Video;
+  EXPECT_TRUE( Video.ReadAttributes( Internal ) );
+  EXPECT_EQ( Video, Settings.m_Video );
+  VTimingRecord Timing;
+  EXPECT_TRUE( Timing.ReadAttributes( External ) );
+  EXPECT_EQ( Timing, Rate25 );
+  ITimecode Timecode;
+  EXPECT_TRUE( ReadAttributes( Timecode, External ) );
+  EXPECT_EQ( Timecode.m_Hours, 99 );
+  EXPECT_TRUE( External.Has( "Take" ) && External.Has( "Saturation" ) );
+
+  // The colour rides on the timing.
+  Settings.m_Timing = {};
+  VAviFile Untimed( Settings );
+  ASSERT_TRUE( Untimed.OpenAndWriteHeader() );
+  ASSERT_TRUE( Untimed.m_Writer.Close() );
+  EXPECT_LT( Untimed.m_pBytes->size(), File.m_pBytes->size() );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "The frame rate is not known: readers will take one of their own." } );
+}
+
+TEST_F( AviWriter, ARiffTakesFramesUntilItHasReachedItsLimit )
+{
+  // 8 bytes of image and 2 of sound count 24 and 18: the fourth image reaches 4 x 24 + 3 x 18 = 150 exactly.
+  VAviFile File( {}, { 150, 60 } );
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  for( uint32_t Frame = 0; Frame < 9; ++Frame )
+  {
+    ASSERT_TRUE( File.WriteFrame( Frame, Noise( 8, Frame ), Noise( 2, Frame ) ) );
+  }
+  ASSERT_TRUE( File.m_Writer.Close() );
+
+  const TestSupport::VAviParser Parser = File.Parse();
+  std::vector<std::string> Layout;
+  for( const TestSupport::VRiffChunk& rRiff : Parser.Riff().Riffs() )
+  {
+    std::string Text = rRiff.m_Form + ":";
+    for( const TestSupport::VRiffChunk& rChunk : rRiff.Count( "movi" ) == 0 ? rRiff.m_Children : rRiff.Child( "movi" ).m_Children )
+    {
+      Text += " " + rChunk.m_Id;
+    }
+    Layout.push_back( Text );
+  }
+  // The sound of a frame that ends a RIFF begins the next one.
+  EXPECT_EQ( Layout,
+    ( std::vector<std::string>{ "AVI : 00db 01wb 00db 01wb 00db 01wb 00db ix00 ix01", "AVIX: 01wb 00db 01wb 00db ix00 ix01",
+      "AVIX: 01wb 00db 01wb 00db ix00 ix01", "AVIX: 01wb 00db 01wb ix00 ix01", "TMSL:" } ) );
+  EXPECT_EQ( Parser.TotalFrames(), 9u );
+  EXPECT_EQ( Parser.StreamLength( 0 ), 9u );
+  EXPECT_EQ( Parser.StreamLength( 1 ), 9u );
+  EXPECT_EQ( Parser.CountIndexed( 0 ), 9u );
+  EXPECT_EQ( Parser.CountIndexed( 1 ), 9u );
+  for( uint32_t Frame = 0; Frame < 9; ++Frame )
+  {
+    EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 0 ).at( Frame ) ), Noise( 8, Frame ) );
+    EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 1 ).at( Frame ) ), Noise( 2, Frame ) );
+  }
+}
+
+TEST_F( AviWriter, ASuperIndexHoldsTheFirst1024Riffs )
+{
+  VAviFile File( {}, { 1, 1 } );
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  for( uint32_t Frame = 0; Frame < 1030; ++Frame )
+  {
+    ASSERT_TRUE( File.WriteFrame( Frame, Noise( 8, Frame ), {} ) );
+  }
+  ASSERT_TRUE( File.m_Writer.Close() );
+  const TestSupport::VAviParser Parser = File.Parse();
+  // The last one has the sound of the last frame alone.
+  EXPECT_EQ( Parser.Riff().Riffs().size(), 1030u + 1 + 1 );
+  EXPECT_EQ( Parser.SuperIndexEntries( 0 ), 1024u );
+  EXPECT_EQ( Parser.CountIndexed( 0 ), 1024u );
+  EXPECT_EQ( Parser.TotalFrames(), 1030u );
+  EXPECT_EQ( Parser.Chunks( 0 ).size(), 1030u );
+  EXPECT_TRUE( m_Log.Texts().empty() );
+}
+
+TEST_F( AviWriter, JPEGImagesGetAnAVI1Header )
+{
+  VSettings Settings;
+  Settings.m_Video = Video( IPixelFormat::ER8G8B8, 2, 1 );
+  Settings.m_Payload = IVideoPayload::EImageJPEG;
+  Settings.m_Audio = {};
+  const auto WriteImage = [&]( const VBytes& i_rImage )
+  {
+    VAviFile File( Settings, {}, {}, EncoderTo( i_rImage ) );
+    EXPECT_TRUE( File.OpenAndWriteHeader() );
+    const bool bWritten = File.WriteFrame( 0, Noise( 6, 0 ), {} );
+    EXPECT_TRUE( File.m_Writer.Close() );
+    return bWritten ? File.Parse().Riff().Content( File.Parse().Chunks( 0 ).at( 0 ) ) : VBytes();
+  };
+  // An odd size, with a byte of padding behind it.
+  const VBytes Stored = WriteImage( Image( 7, "data" ) );
+  VBytes Expected = Bytes( std::string( "\xFF\xD8\xFF\xE0\0\x10"
+                                        "AVI1\0\0\0\0\0\0\0\0\0\0",
+    20 ) );
+  const VBytes Whole = Image( 7, "data" );
+  Expected.insert( Expected.end(), Whole.begin() + 20, Whole.end() );
+  EXPECT_EQ( Stored, Expected );
+  EXPECT_EQ( WriteImage( Image( 7, "datum" ) ).size(), Expected.size() + 1 );
+  EXPECT_TRUE( m_Log.Texts().empty() );
+  EXPECT_EQ( WriteImage( Image( 6, "data" ) ), VBytes() );
+  EXPECT_EQ( WriteImage( Image( 8, "data" ) ), VBytes() );
+  EXPECT_EQ( m_Log.Count( "Generate JPEG not in expected format." ), 2u );
+  EXPECT_EQ( WriteImage( Bytes( "no image" ) ), VBytes() );
+}
+
+TEST_F( AviWriter, FramesThatDoNotFitAreRefusedAndLeaveNoTrace )
+{
+  VSettings Settings;
+  Settings.m_Audio.m_Channels = 2;
+  VAviFile File( Settings );
+  EXPECT_FALSE( File.WriteFrame( 0, Noise( 8, 0 ), {} ) );
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  EXPECT_FALSE( File.WriteFrame( 1, Noise( 8, 0 ), {} ) );
+  EXPECT_FALSE( File.WriteFrame( 0, Noise( 7, 0 ), {} ) );
+  VSettings Other = Settings;
+  Other.m_Video = Video( IPixelFormat::EU8Y8V8Y8, 2, 2 );
+  EXPECT_FALSE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), {} ) );
+  // Sound with more channels loses them, with fewer it is refused.
+  Other = Settings;
+  Other.m_Audio.m_Channels = 1;
+  EXPECT_FALSE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), Noise( 4, 0 ) ) );
+  Other.m_Audio.m_Channels = 4;
+  EXPECT_TRUE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), Bytes( "AABBCCDDEEFFGGHH" ) ) );
+  EXPECT_FALSE( File.WriteFrame( 0, Noise( 8, 1 ), {} ) );
+  EXPECT_TRUE( File.WriteFrame( 1, Noise( 8, 1 ), {} ) );
+  EXPECT_TRUE( File.m_Writer.Close() );
+  EXPECT_FALSE( File.m_Writer.Close() );
+  const TestSupport::VAviParser Parser = File.Parse();
+  EXPECT_EQ( Parser.TotalFrames(), 2u );
+  EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 1 ).at( 0 ) ), Bytes( "AABBEEFF" ) );
+  EXPECT_EQ( Parser.StreamLength( 1 ), 2u );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "WriteHeader must be called before WriteFrame is called.", "Frame 1 cannot be stored where frame 0 comes next.",
+      "Frame 0 of 7 bytes does not fit the file's 8.", "A frame of 2 x 2 pixels does not fit the file's 4 x 1.", "Encoding to 'Uncompressed' failed.",
+      "Frame 0 cannot be stored where frame 1 comes next." } ) );
+}
+
+TEST_F( AviWriter, NumbersThatAFieldCannotHoldAreRefused )
+{
+  const auto WritesHeader = []( const VSettings& i_rSettings ) { return VAviFile( i_rSettings ).OpenAndWriteHeader(); };
+  VSettings Settings;
+  Settings.m_Video = Video( IPixelFormat::EB8G8R8u8, 65536, 1 );
+  EXPECT_FALSE( WritesHeader( Settings ) );
+  Settings.m_Video = Video( IPixelFormat::EB8G8R8u8, 32768, 32768 );
+  EXPECT_FALSE( WritesHeader( Settings ) );
+  Settings.m_Video = Video( IPixelFormat::EB8G8R8u8, 7680, 4320 );
+  EXPECT_TRUE( WritesHeader( Settings ) );
+  Settings.m_Timing.m_FramePeriodInTicks = 2700000;
+  EXPECT_FALSE( WritesHeader( Settings ) );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "A width in pixels of 65536 cannot be stored: 65535 is the limit.",
+      "An image size in bytes of 4294967296 cannot be stored: 4294967295 is the limit.",
+      "A data rate in bytes a second of 6635520000 cannot be stored: 4294967295 is the limit." } ) );
+}
+
+TEST_F( AviWriter, WithoutASampleFormatThereIsNoSound )
+{
+  const TestSupport::VLogCapture Log( "AVIIO" );
+  VAviFile File;
+  ASSERT_TRUE( File.m_Writer.Open( "memory" ) );
+  ASSERT_TRUE(
+    File.m_Writer.WriteHeader( File.m_Settings.m_Video, {}, Rate25, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::EUncompressed ) );
+  EXPECT_TRUE( File.WriteFrame( 0, Noise( 8, 0 ), Noise( 2, 0 ) ) );
+  ASSERT_TRUE( File.m_Writer.Close() );
+  EXPECT_EQ( File.Parse().Headers().Count( "strl" ), 1u );
+  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported audio payload when writing AVI file." } );
+}
+
+TEST_F( AviWriter, ChunksAreClosedWithTheirSizes )
+{
+  const auto pBytes = std::make_shared<VBytes>();
+  VChunkWriter Out( std::make_unique<TestSupport::VMemoryFile>( pBytes ) );
+  EXPECT_TRUE( Out.OpenRiff( FourCC( "Test" ) ) );
+  EXPECT_TRUE( Out.OpenChunk( FourCC( "open" ) ) );
+  EXPECT_TRUE( Out.Write( "odd", 3 ) );
+  EXPECT_TRUE( Out.CloseChunk() );
+  EXPECT_TRUE( Out.OpenChunk( FourCC( "stat" ), 2 ) );
+  EXPECT_TRUE( Out.Reserve( 2 ) );
+  EXPECT_TRUE( Out.CloseChunk() );
+  EXPECT_TRUE( Out.CloseChunk() );
+  VBuilder Expected;
+  Expected.Raw( "RIFF" ).U32( 26 ).Raw( "Test" ).Raw( "open" ).U32( 3 ).Raw( "odd" ).Zeros( 1 ).Raw( "stat" ).U32( 2 ).Zeros( 2 );
+  EXPECT_EQ( *pBytes, Expected.m_Bytes );
+}
+
+TEST_F( AviWriter, PositionsBeyond4GiBAreIndexed )
+{
+  constexpr uint32_t Side = 32768;
+  constexpr uint64_t FrameBytes = uint64_t{ Side } * Side;   // 1 GiB
+  VSettings Settings;
+  Settings.m_Video = Video( IPixelFormat::ELuminance8, Side, Side );
+  Settings.m_Timing.m_FramePeriodInTicks = 135000000;
+  Settings.m_Audio = {};
+  VSparseStream::VPieces Pieces;
+  VRapidAVIWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<VSparseStream>( Pieces ); } );
+  ASSERT_TRUE( Writer.Open( "sparse" ) );
+  ASSERT_TRUE( Settings.WriteHeader( Writer ) );
+  for( uint64_t Key = 0; Key < 7; ++Key )
+  {
+    ASSERT_TRUE( Writer.WriteFrame( VFrameSet{ std::make_shared<VLongBuffer>( FrameBytes ), Settings.m_Video, {}, {} }, Key ) );
+  }
+  ASSERT_TRUE( Writer.Close() );
+
+  // Frames in each RIFF: 1, 2, 2, 2. A chunk of one GiB closes the first and the second one closes each other.
+  // RIFF, hdrl and avih; strl, strh, strf with its palette and indx; odml and dmlh; movi
+  constexpr uint64_t FirstBase = ( 12 + 12 + 64 ) + ( 12 + 64 + 1072 + 8 + 0x4018 ) + ( 12 + 256 ) + 12;
+  const auto Found = std::find_if( Pieces.begin(), Pieces.end(),
+    []( const auto& i_rPiece ) { return i_rPiece.second.size() == 4 * sizeof( VSuperIndexEntry ); } );
+  ASSERT_NE( Found, Pieces.end() );
+  std::array<VSuperIndexEntry, 4> Entries;
+  std::memcpy( Entries.data(), Found->second.data(), sizeof( Entries ) );
+  uint64_t Expected = FirstBase + 8 + FrameBytes;
+  for( size_t Entry = 0; Entry < Entries.size(); ++Entry )
+  {
+    const uint32_t Frames = Entry == 0 ? 1 : 2;
+    EXPECT_EQ( Entries[Entry].m_Position, Expected ) << Entry;
+    EXPECT_EQ( Entries[Entry].m_Duration, Frames );
+    VStandardIndexHeader Header;
+    std::memcpy( &Header, Pieces.at( Expected + 8 ).data(), sizeof( Header ) );
+    EXPECT_EQ( Header.m_BasePosition, Expected - Frames * ( 8 + FrameBytes ) );
+    // The rest of this index, "idx1" of the first RIFF, and the heads of the next one with two frames.
+    Expected += 8 + 24 + Frames * 8 + ( Entry == 0 ? 8 + 16 : 0 ) + 24 + 2 * ( 8 + FrameBytes );
+  }
+  EXPECT_TRUE( m_Log.Texts().empty() );
+}
+
+TEST_F( AviWriter, WhatDoesNotFit32BitsIsRefusedByName )
+{
+  VSettings Settings;
+  Settings.m_Audio = { IAudioSampleFormat::EUInt8, 48000, 1 };
+  VSparseStream::VPieces Pieces;
+  const auto WriteSounds = [&]( const VSegmentLimits& i_rLimits, const std::vector<uint64_t>& i_rSizes )
+  {
+    VRapidAVIWriter Writer(
+      {}, [&]( const std::string& ) { return std::make_unique<VSparseStream>( Pieces ); }, i_rLimits );
+    EXPECT_TRUE( Writer.Open( "sparse" ) );
+    EXPECT_TRUE( Settings.WriteHeader( Writer ) );
+    size_t Written = 0;
+    for( const uint64_t Size : i_rSizes )
+    {
+      Written += Writer.WriteFrame(
+        VFrameSet{ Buffer( Noise( 8, 0 ) ), Settings.m_Video, { std::make_shared<VLongBuffer>( Size ) }, Settings.m_Audio },
+        VRapidAVIWriter::AppendKey );
+    }
+    EXPECT_TRUE( Writer.Close() );
+    return Written;
+  };
+  constexpr uint64_t GiB = uint64_t{ 1 } << 30;
+  constexpr VSegmentLimits Usual;
+  constexpr VSegmentLimits Endless{ 100 * GiB, 100 * GiB };
+  EXPECT_EQ( WriteSounds( Usual, { 3 * GiB, GiB - 1, 1, 0 } ), 3u );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "The file is full: it can count no more than 4294967295 samples of sound." } );
+  EXPECT_EQ( WriteSounds( Usual, { 4 * GiB } ), 0u );
+  Settings.m_Audio.m_Channels = 8;
+  EXPECT_EQ( WriteSounds( Usual, { 4 * GiB } ), 0u );
+  EXPECT_EQ( WriteSounds( Endless, { 2 * GiB, 2 * GiB, GiB } ), 2u );
+  EXPECT_EQ( m_Log.Texts().at( 2 ), "A chunk of 4294967296 bytes cannot be stored: 4294967295 is the limit." );
+  EXPECT_EQ( m_Log.Texts().at( 3 ),
+    "A chunk of 2147483648 bytes cannot be stored: its RIFF would be longer than 4294967295 bytes, which is the limit." );
+}
