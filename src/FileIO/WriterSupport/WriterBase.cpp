@@ -2,22 +2,8 @@
 
 #include "Core/VideoInterface/EnumTable.h"
 
-#include <exception>
-
 namespace WriterSupport
 {
-
-template<class TOperation>
-bool VWriterBase::Guarded( const char* i_pName, TOperation i_Operation ) const
-try
-{
-  return i_Operation();
-}
-catch( const std::exception& rError )
-{
-  KVZ_LOG_ERROR( m_rCategory, "%1% failed: %2%", i_pName, rError.what() );
-  return false;
-}
 
 bool VWriterBase::Open( const std::string& i_rPath )
 {

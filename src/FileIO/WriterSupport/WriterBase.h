@@ -5,6 +5,8 @@
 #include "Core/VideoInterface/VideoWriter.h"
 #include "StageCoreRuntime/GlobalLog.h"
 
+#include <exception>
+
 namespace WriterSupport
 {
 
@@ -48,6 +50,21 @@ protected:
   const KVZ::VLogCategory& Category() const { return m_rCategory; }
   bool IsHeaded() const { return m_State == EState::Headed; }
 
+  // Runs a further operation of a container under the same promise: an exception becomes a line in the log and false.
+  template<class TOperation>
+  bool Guarded( const char* i_pName, TOperation i_Operation ) const
+  {
+    try
+    {
+      return i_Operation();
+    }
+    catch( const std::exception& rError )
+    {
+      KVZ_LOG_ERROR( m_rCategory, "%1% failed: %2%", i_pName, rError.what() );
+      return false;
+    }
+  }
+
 private:
   enum class EState
   {
@@ -64,8 +81,6 @@ private:
   virtual bool DoClose() = 0;
 
   bool CheckHeader( const VHeader& i_rHeader ) const;
-  template<class TOperation>
-  bool Guarded( const char* i_pName, TOperation i_Operation ) const;
 
   const KVZ::VLogCategory& m_rCategory;
   EState m_State = EState::New;

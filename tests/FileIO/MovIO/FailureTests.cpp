@@ -1,0 +1,191 @@
+// What the writer says, and what it leaves behind, when the disk fails.
+#include "tests/FileIO/MovIO/SmallMovie.h"
+#include "tests/support/FileSizeLimit.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <gtest/gtest.h>
+
+#include <stdexcept>
+
+using namespace KVZ;
+using namespace MovIO;
+
+namespace
+{
+
+constexpr uint8_t Frames = 4;
+
+VBytes Video( size_t i_Number ) { return VBytes( 16, static_cast<uint8_t>( 1 + i_Number ) ); }
+VBytes Audio( size_t i_Number ) { return VBytes( 6, static_cast<uint8_t>( 0x81 + i_Number ) ); }
+
+struct VResult
+{
+  bool m_bHeader = false;
+  bool m_bClosed = false;
+  size_t m_Written = 0;   // frames whose call gave true
+  bool m_bLaterRefused = true;
+};
+
+// Goes on after a failure as no client would.
+VResult WriteMovie( VSmallMovie& io_rMovie )
+{
+  VResult Result;
+  Result.m_bHeader = io_rMovie.Start();
+  bool bFailed = !Result.m_bHeader;
+  for( uint8_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    const bool bWritten = io_rMovie.Frame( Video( Result.m_Written ), Audio( Result.m_Written ) );
+    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
+    Result.m_Written += bWritten;
+    bFailed = bFailed || !bWritten;
+  }
+  Result.m_bClosed = io_rMovie.m_Writer.Close();
+  return Result;
+}
+
+// Frames that a reader finds; all must be what was written. -1 for a file that cannot be read.
+int CountWholeFrames( const VBytes& i_rBytes )
+try
+{
+  const auto Parser = TestSupport::VMovParser::OfBytes( i_rBytes );
+  const auto& rVideo = Parser.Track( "vide" );
+  const auto& rAudio = Parser.Track( "soun" );
+  EXPECT_EQ( rVideo.m_Samples.size(), rAudio.m_Samples.size() );
+  for( size_t Frame = 0; Frame < rVideo.m_Samples.size(); ++Frame )
+  {
+    EXPECT_EQ( Parser.Bytes( rVideo.m_Samples[Frame] ), Video( Frame ) );
+    EXPECT_EQ( Parser.Bytes( rAudio.m_Samples[Frame] ), Audio( Frame ) );
+  }
+  return static_cast<int>( rVideo.m_Samples.size() );
+}
+catch( const std::runtime_error& )
+{
+  return -1;
+}
+
+void CheckLeftBehind( const VSmallMovie& i_rMovie, const VResult& i_rResult )
+{
+  EXPECT_FALSE( i_rResult.m_bClosed );
+  EXPECT_TRUE( i_rResult.m_bLaterRefused );
+  EXPECT_FALSE( i_rMovie.m_Writer.IsOpen() );
+  const int Found = CountWholeFrames( *i_rMovie.m_pBytes );
+  EXPECT_TRUE( Found == -1 || Found == static_cast<int>( i_rResult.m_Written ) ) << Found;
+}
+
+}
+
+TEST( MovWriterFailures, ADiskThatIsFullAtAnyByteIsReported )
+{
+  VSmallMovie Whole;
+  ASSERT_TRUE( WriteMovie( Whole ).m_bClosed );
+  EXPECT_EQ( CountWholeFrames( *Whole.m_pBytes ), Frames );
+  for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
+  {
+    SCOPED_TRACE( Offset );
+    VSmallMovie Movie( {}, { .m_Offset = Offset } );
+    const VResult Result = WriteMovie( Movie );
+    EXPECT_LE( Movie.m_pBytes->size(), Offset );
+    CheckLeftBehind( Movie, Result );
+  }
+}
+
+// Here the stream works again after the failure, so that only the writer's own memory keeps it.
+TEST( MovWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
+{
+  VSmallMovie Whole;
+  ASSERT_TRUE( WriteMovie( Whole ).m_bClosed );
+  size_t Playable = 0;
+  for( uint64_t Operation = 0; Operation < Whole.m_Operations; ++Operation )
+  {
+    SCOPED_TRACE( Operation );
+    VSmallMovie Movie( {}, { .m_Operation = Operation } );
+    CheckLeftBehind( Movie, WriteMovie( Movie ) );
+    Playable += CountWholeFrames( *Movie.m_pBytes ) >= 0;
+  }
+  // After a frame that could not be written, the tables of those before it still come into the file.
+  EXPECT_GE( Playable, Frames );
+}
+
+// Tables that are larger than what is collected: the disk is full in the middle of one.
+TEST( MovWriterFailures, OneBadWriteIsTracedThroughTheAtomsAroundIt )
+{
+  constexpr size_t Many = 20000;
+  const TestSupport::VLogCapture Log( "MovIO" );
+  VSmallMovie Movie( VMovieSettings::Silent(), { .m_Offset = 52 + 16 * Many + 100000 } );
+  ASSERT_TRUE( Movie.Start() );
+  for( size_t Frame = 0; Frame < Many; ++Frame )
+  {
+    ASSERT_TRUE( Movie.Frame( VBytes( 16 ) ) );
+  }
+  EXPECT_FALSE( Movie.m_Writer.Close() );
+  std::vector<std::string> Expected;
+  for( const char* pAtom : { "co64", "stbl", "minf", "mdia", "trak", "moov", "TMSL" } )
+  {
+    Expected.push_back( "Could not write the '" + std::string( pAtom ) + "' atom." );
+  }
+  EXPECT_EQ( Log.Texts(), Expected );
+}
+
+TEST( MovWriterFailures, OnARealDisk )
+{
+  const VMovieSettings Settings = VMovieSettings::Silent();
+  VMovWriter Full( IVideoContainer::EMOV );
+  ASSERT_TRUE( Full.Open( "/dev/full" ) );
+  EXPECT_FALSE( WriteHeader( Full, Settings ) );
+  EXPECT_FALSE( Full.Close() );
+
+  // The tables find room where the last frame could not be finished.
+  const TestSupport::VTemporaryFolder Folder;
+  VMovieSettings Large = Settings;
+  Large.m_Video = VideoInfo( 100, 100, IPixelFormat::EU8Y8V8Y8 );
+  {
+    const TestSupport::VFileSizeLimit Limit( 75000 );
+    VMovWriter Writer( IVideoContainer::EMOV );
+    ASSERT_TRUE( Writer.Open( Folder.File( "cut.mov" ) ) && WriteHeader( Writer, Large ) );
+    size_t Written = 0;
+    while( AppendFrame( Writer, Large, VBytes( 20000, static_cast<uint8_t>( 'a' + Written ) ) ) )
+    {
+      ++Written;
+    }
+    EXPECT_EQ( Written, 3u );
+    EXPECT_FALSE( Writer.Close() );
+  }
+  const auto Parser = TestSupport::VMovParser::OfFile( Folder.File( "cut.mov" ) );
+  EXPECT_EQ( Parser.Root().Child( "free" ).m_End, 75000u );
+  const auto& rVideo = Parser.Track( "vide" );
+  ASSERT_EQ( rVideo.m_Samples.size(), 3u );
+  EXPECT_EQ( Parser.Bytes( rVideo.m_Samples[2] ), VBytes( 20000, 'c' ) );
+}
+
+// A stream that has run out of memory, and one that throws.
+class VThrowingStream : public TestSupport::VMemoryFile
+{
+public:
+  using TestSupport::VMemoryFile::VMemoryFile;
+  using TestSupport::VMemoryFile::Write;
+  bool Write( const void* i_pData, size_t i_Size ) override
+  {
+    if( i_Size == 16 )
+    {
+      throw std::runtime_error( "no memory" );
+    }
+    return TestSupport::VMemoryFile::Write( i_pData, i_Size );
+  }
+};
+
+TEST( MovWriterFailures, NoExceptionLeavesAnOperation )
+{
+  const VMovieSettings Settings = VMovieSettings::Silent();
+  VMovWriter Writer( IVideoContainer::EMOV, {},
+    []( const std::string& ) { return std::make_unique<VThrowingStream>( std::make_shared<VBytes>() ); } );
+  ASSERT_TRUE( Writer.Open( "memory" ) && WriteHeader( Writer, Settings ) );
+  EXPECT_FALSE( AppendFrame( Writer, Settings, VBytes( 16 ) ) );
+  const VBytes Video( 16 );
+  EXPECT_FALSE( Writer.WriteStoredFrame( { { Video.data(), Video.size() } }, {}, 'I' ) );
+  Writer.Close();
+  EXPECT_FALSE( Writer.IsOpen() );
+
+  VMovWriter Unopened( IVideoContainer::EMOV, {}, []( const std::string& ) -> std::unique_ptr<UtilsIO::IClosableStream> { throw std::bad_alloc(); } );
+  EXPECT_FALSE( Unopened.Open( "memory" ) );
+}
