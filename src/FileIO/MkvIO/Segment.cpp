@@ -23,6 +23,10 @@ using namespace libmatroska;
 namespace
 {
 
+// As many bytes as the known one will take.
+const VBytes UnknownSize = { 0x0F, 0xFF, 0xFF, 0xFF, 0xFF };
+static_assert( SegmentSizeBytes == 5 );
+
 void RenderHead( VMkvIOCallback& o_rFile )
 {
   libebml::EbmlHead Head;
@@ -55,8 +59,7 @@ void VSegment::BeginSegment()
 {
   VBytes Head;
   AppendId( Head, EBML_ID( KaxSegment ) );
-  Head.push_back( 0xFF >> ( SegmentSizeBytes - 1 ) );
-  Head.insert( Head.end(), SegmentSizeBytes - 1, 0xFF );
+  Head.insert( Head.end(), UnknownSize.begin(), UnknownSize.end() );
   m_rFile.write( Head.data(), Head.size() );
   m_DataStart = m_rFile.getFilePointer();
 }
@@ -161,7 +164,13 @@ bool VSegment::WriteSize()
   }
   VBytes Field( SegmentSizeBytes );
   libebml::CodedValueLength( Size, SegmentSizeBytes, Field.data() );
-  return WriteAt( m_DataStart - SegmentSizeBytes, Field );
+  const uint64_t Position = m_DataStart - SegmentSizeBytes;
+  if( WriteAt( Position, Field ) )
+  {
+    return true;
+  }
+  WriteAt( Position, UnknownSize );   // instead of half a size
+  return false;
 }
 
 }

@@ -1,0 +1,52 @@
+// A file of any size: small pieces are kept with the place where they lie, long ones, which are images, are counted and forgotten.
+#pragma once
+
+#include "Utils/UtilsIO/IClosableStream.h"
+
+#include <map>
+#include <vector>
+
+namespace TestSupport
+{
+
+class VSparseFile : public UtilsIO::IClosableStream
+{
+public:
+  static constexpr size_t SmallestImage = 4096;
+
+  using VPieces = std::map<uint64_t, std::vector<uint8_t>>;   // as they were written, by position
+
+  explicit VSparseFile( VPieces& o_rPieces ) : m_rPieces( o_rPieces ) {}
+
+  bool Read( void*, size_t ) override { return false; }
+  bool ReadBlock( void*, size_t, size_t& ) override { return false; }
+  bool IsGood() const override { return true; }
+  using UtilsIO::IClosableStream::Write;
+  bool Write( const void* i_pData, size_t i_Size ) override
+  {
+    if( i_Size < SmallestImage )
+    {
+      const auto* pBytes = static_cast<const uint8_t*>( i_pData );
+      m_rPieces[m_Position].assign( pBytes, pBytes + i_Size );
+    }
+    m_Position += i_Size;
+    return true;
+  }
+  bool Tell( uint64_t& o_rPosition ) override
+  {
+    o_rPosition = m_Position;
+    return true;
+  }
+  bool Seek( uint64_t i_Position ) override
+  {
+    m_Position = i_Position;
+    return true;
+  }
+  bool Close() override { return true; }
+
+private:
+  VPieces& m_rPieces;
+  uint64_t m_Position = 0;
+};
+
+}
