@@ -1,6 +1,13 @@
 #include "StageCorePluginVideoInput/Composition.h"
 
+#include "CoreVideoUtils/BurnInText.h"
+#include "CoreVideoUtils/PixelFormatConverter.h"
+#include "FileIO/ImageSequenceIO/ImageSequenceWriter.h"
+#include "FileIO/MkvIO/MkvWriter.h"
+#include "FileIO/MovIO/MovWriter.h"
+#include "FileIO/RapidAVI/Writer.h"
 #include "FileIO/TarvoVideo/Writer.h"
+#include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDriver.h"
 #include "StageCoreRuntime/Shared.h"
 
@@ -15,9 +22,24 @@ std::vector<VideoInputHAL::VDriverMaker> DriverMakers()
 std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory()
 {
   auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
+  for( const auto Container : { KVZ::IVideoContainer::EMOV, KVZ::IVideoContainer::EMP4 } )
+  {
+    pFactory->Register( Container,
+      []( KVZ::IVideoContainer::Enum i_Container, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
+      { return std::make_shared<MovIO::VMovWriter>( i_Container, std::move( i_pEncoder ) ); } );
+  }
+  pFactory->Register( KVZ::IVideoContainer::EAVI,
+    []( KVZ::IVideoContainer::Enum, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
+    { return std::make_shared<RapidAVI::VRapidAVIWriter>( std::move( i_pEncoder ) ); } );
   pFactory->Register( KVZ::IVideoContainer::ETVID,
     []( KVZ::IVideoContainer::Enum, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
     { return std::make_shared<TarvoVideo::VWriter>( std::move( i_pEncoder ) ); } );
+  pFactory->Register( KVZ::IVideoContainer::EMKV,
+    []( KVZ::IVideoContainer::Enum, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
+    { return std::make_shared<MkvIO::VMkvWriter>( std::move( i_pEncoder ) ); } );
+  pFactory->Register( KVZ::IVideoContainer::EIMAGES,
+    []( KVZ::IVideoContainer::Enum, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
+    { return std::make_shared<ImageSequenceIO::VImageSequenceWriter>( std::move( i_pEncoder ) ); } );
   return pFactory;
 }
 
@@ -34,6 +56,17 @@ std::vector<KVZ::IVideoContainer::Enum> WritableContainers()
     }
   }
   return Containers;
+}
+
+VideoEncoding::VEncoderParts EncoderParts()
+{
+  VideoEncoding::VEncoderParts Parts;
+  Parts.m_ConverterMakers[VideoEncoding::EConverter::Software] = [] { return std::make_shared<CoreVideoUtils::VPixelFormatConverter>(); };
+  Parts.m_Compressors = VideoEncoding::ImageCompressors();
+  Parts.m_DrawText = []( KVZ::IPixelFormatConverter& i_rConverter, const KVZ::VideoFrameInfo& i_rInfo, const VideoEncoding::VBurnInSettings& i_rText,
+                       uint8_t* io_pPixels, size_t i_Size )
+  { return CoreVideoUtils::BurnInText( i_rConverter, i_rInfo, i_rText.m_SizeIndex, i_rText.m_X, i_rText.m_Y, i_rText.m_Text, io_pPixels, i_Size ); };
+  return Parts;
 }
 
 }

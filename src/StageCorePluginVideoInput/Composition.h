@@ -1,7 +1,8 @@
-// What this build of the plug-in is composed of, as rows: drivers, containers that can be written.
+// What this build of the plug-in is composed of, as rows: drivers, containers that can be written, what frames are encoded with.
 #pragma once
 
 #include "Core/VideoInterface/VideoWriter.h"
+#include "FileIO/VideoEncoding/EncoderParts.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDevice.h"
 
 #include <memory>
@@ -18,5 +19,8 @@ std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory();
 
 // Those containers, in the order of their values.
 std::vector<KVZ::IVideoContainer::Enum> WritableContainers();
+
+// Converters, compressors and the drawing of text, for all frame encoders.
+VideoEncoding::VEncoderParts EncoderParts();
 
 }

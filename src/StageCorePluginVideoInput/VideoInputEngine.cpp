@@ -77,6 +77,7 @@ VVideoInputEngine::VImpl::VImpl( IStageCoreHost& i_rHost )
     m_pPostalService( std::make_shared<NotificationSystem::VAsioPostalService>( "Video Input Engine" ) ),
     m_pDeviceManager( KVZ::MakeShared<VVideoInputDeviceManager>( Composition::DriverMakers() ) )
 {
+  VideoEncoding::DefaultEncoderParts() = Composition::EncoderParts();
   const std::shared_ptr<IShutdownManager> pShutdown = m_pHost->GetShutdownManager();
   HandOver( *pShutdown, m_pDeviceManager, __FILE__, __LINE__ );
   m_pHost->SetFileFilters( VideoFileKind, { "*.avi", "*.mov", "*.mp4", "*.tvid", "*.mkv" } );
