@@ -1,5 +1,7 @@
 #include "host/Registries.h"
 
+#include "StageCorePluginInterface/FlowNode.h"
+
 #include <boost/thread/lock_guard.hpp>
 
 #include <algorithm>
@@ -58,6 +60,20 @@ void VFlowNodeRegistry::AddFactory( std::shared_ptr<IFlowNodeFactory> i_pFactory
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   m_Factories.push_back( std::move( i_pFactory ) );
+}
+
+std::shared_ptr<IFlowNodeFactory> VFlowNodeRegistry::Find( const std::string& i_rNodeName ) const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  const auto Found = std::find_if( m_Factories.rbegin(), m_Factories.rend(),
+    [&i_rNodeName]( const std::shared_ptr<IFlowNodeFactory>& i_pFactory ) { return i_pFactory->NodeInfo().m_Name == i_rNodeName; } );
+  return Found == m_Factories.rend() ? nullptr : *Found;
+}
+
+size_t VFlowNodeRegistry::Count() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Factories.size();
 }
 
 void VFlowNodeRegistry::Clear()

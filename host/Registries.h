@@ -50,10 +50,13 @@ class VFlowNodeRegistry : public StageCorePluginInterface::IFlowNodeRegistry
 public:
   void RegisterFactory( std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory> i_pFactory ) override { AddFactory( std::move( i_pFactory ) ); }
   void AddFactory( std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory> i_pFactory ) override;
+  // Of the nodes with this name, the newest; an empty pointer where there is none.
+  std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory> Find( const std::string& i_rNodeName ) const;
+  size_t Count() const;
   void Clear();
 
 private:
-  boost::mutex m_Mutex;
+  mutable boost::mutex m_Mutex;
   std::vector<std::shared_ptr<StageCorePluginInterface::IFlowNodeFactory>> m_Factories GUARDED_BY( m_Mutex );
 };
 

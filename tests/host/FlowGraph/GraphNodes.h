@@ -1,0 +1,189 @@
+// Nodes for graphs under test. Their states carry a number.
+#pragma once
+
+#include "Flow2/Flow2Utils/FlowException.h"
+#include "Flow2/Flow2Utils/FlowNode.h"
+#include "StageCoreRuntime/ThreadAnnotations.h"
+#include "host/FlowGraph.h"
+
+#include <boost/thread/condition_variable.hpp>
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/mutex.hpp>
+
+#include <functional>
+#include <memory>
+#include <vector>
+
+using KVZ::EFlowResult;
+using KVZ::VFlowLimit;
+using StageHost::EFlowNodeState;
+using StageHost::VFlowNodeId;
+using StageHost::VFlowNodeStatus;
+
+// Runs the test's function round after round. Two inputs, two outputs.
+class VFunctionNode : public Flow2Utils::VFlowNode<VFunctionNode>
+{
+public:
+  using VFunction = std::function<void( VFunctionNode& )>;
+
+  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Function", "Runs a function", { "Left", "Right" }, { "Upper", "Lower" } }; }
+
+  explicit VFunctionNode( VFunction i_Process, uint32_t i_Start = EFlowResult::Ok ) : m_Process( std::move( i_Process ) ), m_Start( i_Start ) {}
+
+  KVZ::VFlowStatePtr MakeNumber( double i_Number )
+  {
+    const auto pItem = CreateItemOf<KVZ::VFlowGenericData>( "number" );
+    pItem->m_Values["Number"] = { i_Number };
+    KVZ::VFlowStatePtr pState = CreateState();
+    pState->AddItem( pItem );
+    return pState;
+  }
+  double NumberOf( const KVZ::IFlowState& i_rState )
+  {
+    double Number = -1.0;
+    ItemOf<KVZ::VFlowGenericData>( i_rState )->GetNumber( "Number", Number );
+    return Number;
+  }
+
+protected:
+  uint32_t PreProcess() override { return m_Start; }
+  void Process() override { m_Process( *this ); }
+
+private:
+  const VFunction m_Process;
+  const uint32_t m_Start;
+};
+
+// Writes 0, 1, 2 and so on to its first output, as many as it has been allowed to, and sleeps in between.
+class VCountingNode : public Flow2Utils::VFlowNode<VCountingNode>
+{
+public:
+  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Counting", "Writes numbers", {}, { "Output" } }; }
+
+  // Any thread.
+  void Allow( int i_Count )
+  {
+    std::shared_ptr<KVZ::IFlowNodeServices> pServices;
+    uint64_t Token = 0;
+    {
+      boost::lock_guard<boost::mutex> Lock( m_Mutex );
+      m_Allowed += i_Count;
+      std::swap( Token, m_Token );
+      pServices = m_pWake;
+    }
+    if( pServices )
+    {
+      pServices->Wake( Token );
+    }
+  }
+  // The last state; it is held by nobody else once it has been read and let go.
+  std::weak_ptr<KVZ::IFlowState> Last() const
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    return m_pLast;
+  }
+
+protected:
+  uint32_t PreProcess() override
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_pWake = Services();
+    return EFlowResult::Ok;
+  }
+  void Process() override
+  {
+    WaitOutputConnected( 0, VFlowLimit::None() );
+    if( !DoBlockingCall( [this]( uint64_t i_Token ) { return TakeTurn( i_Token ); }, VFlowLimit::None(), KVZ::EFlowFlags::Rewirable ) )
+    {
+      return;
+    }
+    const KVZ::VFlowStatePtr pState = CreateState();
+    const auto pItem = CreateItemOf<KVZ::VFlowGenericData>( "number" );
+    pItem->m_Values["Number"] = { static_cast<double>( m_Next++ ) };
+    pState->AddItem( pItem );
+    {
+      boost::lock_guard<boost::mutex> Lock( m_Mutex );
+      m_pLast = pState;
+    }
+    Write( 0, pState, VFlowLimit::None(), KVZ::EFlowFlags::Rewirable );
+  }
+  void PostProcess() override
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_pWake.reset();
+    m_Token = 0;
+  }
+
+private:
+  uint32_t TakeTurn( uint64_t i_Token )
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    if( m_Allowed == 0 )
+    {
+      m_Token = i_Token;
+      return EFlowResult::Asleep;
+    }
+    --m_Allowed;
+    return EFlowResult::Ok;
+  }
+
+  int m_Next = 0;   // the node's thread
+  mutable boost::mutex m_Mutex;
+  std::shared_ptr<KVZ::IFlowNodeServices> m_pWake GUARDED_BY( m_Mutex );
+  uint64_t m_Token GUARDED_BY( m_Mutex ) = 0;
+  int m_Allowed GUARDED_BY( m_Mutex ) = 0;
+  std::weak_ptr<KVZ::IFlowState> m_pLast GUARDED_BY( m_Mutex );
+};
+
+// Collects the numbers of its input's states. While it is held back it finishes what it has read and reads no more.
+class VCollectingNode : public Flow2Utils::VFlowNode<VCollectingNode>
+{
+public:
+  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Collecting", "Reads numbers", { "Input" }, {} }; }
+
+  // Any thread.
+  void Hold( bool i_bHold )
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_bHold = i_bHold;
+    m_Changed.notify_all();
+  }
+  std::vector<double> Numbers() const
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    return m_Numbers;
+  }
+  // Waits until so many have come, in all.
+  std::vector<double> WaitFor( size_t i_Count ) const
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    while( m_Numbers.size() < i_Count )
+    {
+      m_Changed.wait( m_Mutex );
+    }
+    return m_Numbers;
+  }
+
+protected:
+  void Process() override
+  {
+    KVZ::VFlowStatePtr pState;
+    Read( 0, VFlowLimit::None(), pState );
+    double Number = -1.0;
+    ItemOf<KVZ::VFlowGenericData>( *pState )->GetNumber( "Number", Number );
+    pState.reset();
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_Numbers.push_back( Number );
+    m_Changed.notify_all();
+    while( m_bHold )
+    {
+      m_Changed.wait( m_Mutex );
+    }
+  }
+
+private:
+  mutable boost::mutex m_Mutex;
+  mutable boost::condition_variable_any m_Changed;
+  std::vector<double> m_Numbers GUARDED_BY( m_Mutex );
+  bool m_bHold GUARDED_BY( m_Mutex ) = false;
+};
