@@ -14,7 +14,7 @@
 # stagecore_system_test( NAME [DEPENDS target...] )
 #   A GoogleTest program that runs whole programs: built after them all, run alone, label "system". The environment variable
 #   STAGECORE_BIN names the folder of programs, module and cards.
-# stagecore_fuzzer( NAME SOURCE file [DEPENDS target...] )
+# stagecore_fuzzer( NAME SOURCE file... [DEPENDS target...] )
 #   A libFuzzer program with its corpus in the folder corpus/NAME; built in the preset `fuzz` alone.
 #
 # The target stagecore_programs is all of bin/, stagecore_fuzzers all fuzzers.
@@ -129,8 +129,8 @@ function( stagecore_fuzzer name )
   if( NOT STAGECORE_SANITIZE STREQUAL "fuzzer" )
     return()
   endif()
-  cmake_parse_arguments( ARG "" "SOURCE" "DEPENDS" ${ARGN} )
-  add_executable( ${name} "${ARG_SOURCE}" )
+  cmake_parse_arguments( ARG "" "" "SOURCE;DEPENDS" ${ARGN} )
+  add_executable( ${name} ${ARG_SOURCE} )
   target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} )
   target_link_options( ${name} PRIVATE -fsanitize=fuzzer )
   stagecore_precompile( ${name} )

@@ -47,7 +47,7 @@ inline VSlowJPEGResult ParseSlowly( const std::vector<uint8_t>& i_rImage )
       bInScan = bInScan || Second == 0xDA;
       if( Byte( Position + 3 ) < 0 )
       {
-        Length = i_rImage.size();
+        Length = i_rImage.size() + 1;
       }
     }
     if( Length > i_rImage.size() - Position )
