@@ -1,0 +1,395 @@
+#include "CoreVideoUtils/PixelConversions.h"
+#include "CoreVideoUtils/PixelFormatConverter.h"
+#include "CoreVideoUtils/ReferencePixels.h"
+#include "tests/CoreVideoUtils/GuardedBytes.h"
+#include "tests/support/AssertionCapture.h"
+#include "tests/support/LogCapture.h"
+
+#include <gtest/gtest.h>
+
+#include <map>
+#include <random>
+#include <set>
+#include <sstream>
+#include <thread>
+#include <vector>
+
+using namespace CoreVideoUtils;
+using KVZ::IPixelFormat;
+
+namespace
+{
+
+using VBytes = std::vector<uint8_t>;
+
+struct VSize
+{
+  uint32_t m_Width;
+  uint32_t m_Height;
+};
+
+KVZ::VideoFrameInfo MakeInfo( IPixelFormat::Enum i_Format, VSize i_Size )
+{
+  KVZ::VideoFrameInfo Info;
+  Info.m_PixelFormat = i_Format;
+  Info.m_ImageWidth = i_Size.m_Width;
+  Info.m_ImageHeight = i_Size.m_Height;
+  return Info;
+}
+
+size_t SizeOf( IPixelFormat::Enum i_Format, VSize i_Size )
+{
+  return static_cast<size_t>( KVZ::GetImageSize( i_Format, i_Size.m_Width, i_Size.m_Height ) );
+}
+
+// The target's bytes; empty where the conversion was refused.
+VBytes Convert( VPixelFormatConverter& io_rConverter, IPixelFormat::Enum i_Source, const VBytes& i_rSource, IPixelFormat::Enum i_Target,
+  VSize i_Size )
+{
+  VBytes Target( SizeOf( i_Target, i_Size ), 0xA5 );
+  const bool bDone = io_rConverter.Convert( MakeInfo( i_Source, i_Size ), i_rSource.data(), i_rSource.size(), i_Target, Target.data(),
+    Target.size() );
+  return bDone ? Target : VBytes();
+}
+
+VBytes Convert( IPixelFormat::Enum i_Source, const VBytes& i_rSource, IPixelFormat::Enum i_Target, VSize i_Size )
+{
+  VPixelFormatConverter Converter;
+  return Convert( Converter, i_Source, i_rSource, i_Target, i_Size );
+}
+
+VBytes Noise( size_t i_Size, unsigned i_Seed )
+{
+  std::mt19937 Random( i_Seed );
+  VBytes Bytes( i_Size );
+  for( uint8_t& rByte : Bytes )
+  {
+    rByte = static_cast<uint8_t>( Random() >> 8 );
+  }
+  return Bytes;
+}
+
+std::set<std::string> Names( const std::string& i_rNames )
+{
+  std::istringstream Stream( i_rNames );
+  return { std::istream_iterator<std::string>( Stream ), std::istream_iterator<std::string>() };
+}
+
+const std::string Rgb = "R8G8B8 B8G8R8 R8G8B8u8 B8G8R8u8 ";
+const std::string All = Rgb +
+  "R5G6B5 U8Y8V8Y8 Y8U8Y8V8 U10Y10V10Y10 BayerRG8 BayerGB8 BayerGR8 BayerBG8 BayerGB7 BayerGB6 Luminance8 Luminance7 Luminance6 ";
+
+// What each format can be made of
+const std::map<std::string, std::set<std::string>> SourcesOf = {
+  { "Luminance8", Names( All ) },
+  { "BayerGB8", Names( "BayerGB8 BayerGB7 BayerGB6" ) },
+  { "R8G8B8", Names( All ) },
+  { "B8G8R8", Names( All ) },
+  { "R8G8B8u8", Names( All ) },
+  { "B8G8R8u8", Names( All ) },
+  { "U8Y8V8Y8", Names( All ) },
+  { "Y8U8Y8V8", Names( "Y8U8Y8V8 R8G8B8 U8Y8V8Y8" ) },
+  { "U10Y10V10Y10", Names( "U10Y10V10Y10 U8Y8V8Y8 Y8U8Y8V8" ) },
+  { "BayerGB7", Names( "BayerGB7 BayerGB8" ) },
+  { "BayerGB6", Names( "BayerGB6 BayerGB8" ) },
+  { "Luminance7", Names( "Luminance7 Luminance8" ) },
+  { "Luminance6", Names( "Luminance6 Luminance8" ) },
+};
+
+bool IsPossible( IPixelFormat::Enum i_Source, IPixelFormat::Enum i_Target )
+{
+  const auto Found = SourcesOf.find( KVZ::ToName( i_Target ) );
+  return i_Source == i_Target || ( Found != SourcesOf.end() && Found->second.count( KVZ::ToName( i_Source ) ) != 0 );
+}
+
+// With nothing readable after either image, and one byte less of each.
+void CheckPair( IPixelFormat::Enum i_Source, IPixelFormat::Enum i_Target, VSize i_Size )
+{
+  SCOPED_TRACE( KVZ::ToName( i_Source ) + " to " + KVZ::ToName( i_Target ) + ", " + std::to_string( i_Size.m_Width ) + " by " +
+    std::to_string( i_Size.m_Height ) );
+  VPixelFormatConverter Converter;
+  const KVZ::VideoFrameInfo Info = MakeInfo( i_Source, i_Size );
+  VGuardedBytes Source( SizeOf( i_Source, i_Size ) );
+  VGuardedBytes Target( SizeOf( i_Target, i_Size ) );
+  const auto Run = [&]( size_t i_SourceSize, size_t i_TargetSize )
+  { return Converter.Convert( Info, Source.Data(), i_SourceSize, i_Target, Target.Data(), i_TargetSize ); };
+  EXPECT_EQ( IsPossible( i_Source, i_Target ), Run( Source.Size(), Target.Size() ) );
+  EXPECT_TRUE( Source.IsFrontWhole() && Target.IsFrontWhole() );
+  if( Source.Size() > 0 )
+  {
+    EXPECT_FALSE( Run( Source.Size() - 1, Target.Size() ) );
+  }
+  if( Target.Size() > 0 )
+  {
+    EXPECT_FALSE( Run( Source.Size(), Target.Size() - 1 ) );
+  }
+}
+
+TEST( PixelFormatConverter, ConvertsWhatTheTableHasAndRefusesTheRest )
+{
+  const TestSupport::VAssertionCapture Assertions;
+  for( const VSize Size : { VSize{ 1, 1 }, VSize{ 2, 1 }, VSize{ 1, 3 }, VSize{ 5, 3 }, VSize{ 49, 5 }, VSize{ 96, 2 }, VSize{ 131, 7 } } )
+  {
+    for( int32_t Source = 0; Source < KVZ::PixelFormatCount; ++Source )
+    {
+      for( int32_t Target = 0; Target < KVZ::PixelFormatCount; ++Target )
+      {
+        CheckPair( static_cast<IPixelFormat::Enum>( Source ), static_cast<IPixelFormat::Enum>( Target ), Size );
+      }
+    }
+  }
+}
+
+TEST( PixelFormatConverter, TakesEmptyImagesAndUnknownFormats )
+{
+  VPixelFormatConverter Converter;
+  for( const VSize Size : { VSize{ 0, 0 }, VSize{ 0, 4 }, VSize{ 4, 0 } } )
+  {
+    for( const IPixelFormat::Enum Source : { IPixelFormat::EBayerRG8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::ELuminance7 } )
+    {
+      EXPECT_TRUE( Converter.Convert( MakeInfo( Source, Size ), nullptr, 0, IPixelFormat::ER8G8B8, nullptr, 0 ) );
+    }
+  }
+  uint8_t Byte = 0;
+  EXPECT_FALSE( Converter.Convert( MakeInfo( static_cast<IPixelFormat::Enum>( 77 ), { 1, 1 } ), &Byte, 1, IPixelFormat::ELuminance8, &Byte, 1 ) );
+  EXPECT_FALSE( Converter.Convert( MakeInfo( IPixelFormat::ELuminance8, { 1, 1 } ), &Byte, 1, static_cast<IPixelFormat::Enum>( -1 ), &Byte, 1 ) );
+}
+
+TEST( PixelFormatConverter, CopiesEqualFormatsFromLongerBuffers )
+{
+  VPixelFormatConverter Converter;
+  const VBytes Source = Noise( 40, 1 );
+  VBytes Target( 50, 0xA5 );
+  ASSERT_TRUE( Converter.Convert( MakeInfo( IPixelFormat::EBayerGB7, { 5, 7 } ), Source.data(), Source.size(), IPixelFormat::EBayerGB7, Target.data(),
+    Target.size() ) );
+  EXPECT_TRUE( std::equal( Source.begin(), Source.begin() + 31, Target.begin() ) );   // 35 pixels, 245 bits
+  EXPECT_EQ( 19, std::count( Target.begin() + 31, Target.end(), 0xA5 ) );
+}
+
+// Rows of odd widths stand for themselves; others are converted all at once.
+TEST( PixelFormatConverter, ConvertsEachRowAsTheReferenceDoes )
+{
+  const TestSupport::VAssertionCapture Assertions;
+  for( const uint32_t Width : { 7U, 8U, 48U, 50U, 51U } )
+  {
+    const VSize Size = { Width, 3 };
+    for( const VRowFormats Formats : { VRowFormats{ IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 },
+           VRowFormats{ IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10 }, VRowFormats{ IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8 },
+           VRowFormats{ IPixelFormat::EB8G8R8, IPixelFormat::EU8Y8V8Y8 }, VRowFormats{ IPixelFormat::ER5G6B5, IPixelFormat::ELuminance8 } } )
+    {
+      const VBytes Source = Noise( SizeOf( Formats.m_Source, Size ), Width );
+      VBytes Expected( SizeOf( Formats.m_Target, Size ) );
+      for( uint32_t Row = 0; Row < Size.m_Height; ++Row )
+      {
+        Reference::ConvertRow( Formats, Source.data() + Row * SizeOf( Formats.m_Source, { Width, 1 } ),
+          Expected.data() + Row * SizeOf( Formats.m_Target, { Width, 1 } ), Width );
+      }
+      EXPECT_EQ( Expected, Convert( Formats.m_Source, Source, Formats.m_Target, Size ) ) << Width << ", format " << Formats.m_Source;
+    }
+  }
+}
+
+TEST( PixelFormatConverter, MakesYuvOfColours )
+{
+  const VBytes Colours = {
+    255, 255, 255,   // Y 65535 * 255 / 65536, U and V in the middle
+    255, 255, 255,   //
+    255, 0, 0,       // U: (8388608 - 9642 * 255) / 65536
+    255, 0, 0,       // V: 284, limited
+    0, 255, 0,       // U: (8388608 - 18930 * 255) / 65536
+    0, 255, 0,       // V: -4, limited
+    0, 0, 255,       // U: (8388608 + 28573 * 255) / 65536
+    0, 0, 255,       // V: (8388608 - 6554 * 255) / 65536
+  };
+  const VBytes Expected = { 128, 254, 128, 254, 90, 76, 255, 76, 54, 149, 0, 149, 239, 29, 102, 29 };
+  EXPECT_EQ( Expected, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EU8Y8V8Y8, { 8, 1 } ) );
+  const VBytes Swapped = { 254, 128, 254, 128, 76, 90, 76, 255, 149, 54, 149, 0, 29, 239, 29, 102 };
+  EXPECT_EQ( Swapped, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
+  EXPECT_EQ( Swapped, Convert( IPixelFormat::EU8Y8V8Y8, Expected, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
+}
+
+TEST( PixelFormatConverter, MakesColoursOfYuv )
+{
+  const VBytes Pairs = {
+    128, 128, 255, 255,   // R: 128 + 91947 * 127 / 65536, limited; G: 2446024 / 65536; and with Y 255: 10769032 / 65536
+    0, 16, 0, 235,        // R and B limited; G: 9923584 / 65536; then R: 3631744 / 65536, G limited, B: 553216 / 65536
+  };
+  const VBytes Expected = { 255, 37, 128, 255, 164, 255, 0, 151, 0, 55, 255, 8 };
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::ER8G8B8, { 4, 1 } ) );
+  const VBytes BlueFirst = { 128, 37, 255, 255, 255, 164, 255, 255, 0, 151, 0, 255, 8, 255, 55, 255 };
+  EXPECT_EQ( BlueFirst, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EB8G8R8u8, { 4, 1 } ) );
+}
+
+// A row of three: the last pixel has its own U, and the V of the pair before.
+TEST( PixelFormatConverter, GivesALonePixelTheVBeforeIt )
+{
+  const VBytes Three = Convert( IPixelFormat::EU8Y8V8Y8, { 128, 100, 200, 100, 90, 100 }, IPixelFormat::ER8G8B8, { 3, 1 } );
+  const VBytes Four = Convert( IPixelFormat::EU8Y8V8Y8, { 128, 100, 200, 100, 90, 100, 200, 100 }, IPixelFormat::ER8G8B8, { 4, 1 } );
+  EXPECT_EQ( VBytes( Four.begin(), Four.begin() + 9 ), Three );
+  const VBytes One = Convert( IPixelFormat::EY8U8Y8V8, { 100, 90 }, IPixelFormat::ER8G8B8, { 1, 1 } );
+  EXPECT_EQ( Convert( IPixelFormat::EY8U8Y8V8, { 100, 90, 100, 128 }, IPixelFormat::ER8G8B8, { 2, 1 } )[0], One[0] );
+}
+
+TEST( PixelFormatConverter, MakesGrey )
+{
+  EXPECT_EQ( ( VBytes{ 84, 255 } ), Convert( IPixelFormat::ER8G8B8u8, { 1, 2, 251, 9, 255, 255, 255, 0 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 7, 9 } ), Convert( IPixelFormat::EU8Y8V8Y8, { 1, 7, 2, 9 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 7, 9 } ), Convert( IPixelFormat::EY8U8Y8V8, { 7, 1, 9, 2 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 128, 7, 128, 9 } ), Convert( IPixelFormat::ELuminance8, { 7, 9 }, IPixelFormat::EU8Y8V8Y8, { 2, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 7, 7, 7, 255 } ), Convert( IPixelFormat::ELuminance8, { 7 }, IPixelFormat::ER8G8B8u8, { 1, 1 } ) );
+  // 11001 101010 00111
+  EXPECT_EQ( ( VBytes{ 0xC8, 0xA8, 0x38 } ), Convert( IPixelFormat::ER5G6B5, { 0x47, 0xCD }, IPixelFormat::ER8G8B8, { 1, 1 } ) );
+}
+
+// Seven pixels: a group of six, one of one, and zeros up to 48.
+TEST( PixelFormatConverter, PacksTenBits )
+{
+  const VBytes Pairs = { 0xFF, 0x01, 0xFF, 0x02, 0x03, 0xFE, 0x04, 0x05, 0x87, 0x06, 0x08, 0xFF, 0x10, 0x20 };
+  VBytes Expected = {
+    0xFC, 0x13, 0x00, 0x3F,   // U 0xFF, Y 0x01, V 0xFF less two bits
+    0x08, 0x30, 0x00, 0x3F,   // Y 0x02, U 0x03, Y 0xFE less two bits
+    0x10, 0x50, 0x00, 0x21,   // V 0x04, Y 0x05, U 0x87 less two bits
+    0x18, 0x80, 0x00, 0x3F,   // Y 0x06, V 0x08, Y 0xFF less two bits
+    0x40, 0x00, 0x02, 0x00,   // U 0x10, Y 0x20
+  };
+  Expected.resize( 128 );
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
+
+  VBytes Swapped = Pairs;
+  for( size_t Byte = 0; Byte < Swapped.size(); Byte += 2 )
+  {
+    std::swap( Swapped[Byte], Swapped[Byte + 1] );
+  }
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EY8U8Y8V8, Swapped, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
+
+  VBytes Kept = Pairs;
+  Kept[2] = Kept[11] = 0xFC;
+  Kept[5] = 0xFC;
+  Kept[8] = 0x84;
+  EXPECT_EQ( Kept, Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::EU8Y8V8Y8, { 7, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 1, 2, 0xFC, 5, 6, 0xFC, 0x20 } ), Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::ELuminance8, { 7, 1 } ) );
+}
+
+TEST( PixelFormatConverter, MakesColoursOfTenBits )
+{
+  VBytes Row( 128 );
+  // U 1023, Y 512, V 0; Y 1023
+  Row[0] = 0xFF;
+  Row[1] = 0x03;
+  Row[2] = 0x08;
+  Row[4] = 0xFF;
+  Row[5] = 0x03;
+  const VBytes Expected = {
+    0, 175, 255,    // R: (8388608 - 22986 * 512) / 65536; G: 11497988 / 65536; B: 128 + 28999 * 511 / 65536
+    76, 255, 255,   // R: (16760832 - 22986 * 512) / 65536
+  };
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EU10Y10V10Y10, Row, IPixelFormat::ER8G8B8, { 2, 1 } ) );
+}
+
+TEST( PixelFormatConverter, AssertsPairsOfTenBitPixels )
+{
+  const TestSupport::VAssertionCapture Assertions;
+  EXPECT_FALSE( Convert( IPixelFormat::EU10Y10V10Y10, VBytes( 3 * 128 ), IPixelFormat::ER8G8B8, { 3, 2 } ).empty() );
+  EXPECT_TRUE( Assertions.Expressions().empty() );
+  EXPECT_FALSE( Convert( IPixelFormat::EU10Y10V10Y10, VBytes( 3 * 128 ), IPixelFormat::ER8G8B8, { 3, 3 } ).empty() );
+  EXPECT_EQ( std::vector<std::string>{ "( ( i_Width * i_Height ) % 2 ) == 0" }, Assertions.Expressions() );
+}
+
+TEST( PixelFormatConverter, PacksHighBitsWithoutGaps )
+{
+  const VBytes Nine = { 0xFF, 0x01, 0xFF, 0x80, 0x02, 0xAB, 0xFE, 0x7E, 0xC3 };
+  // 1111111 0000000 1111111 1000000 0000001 1010101 1111111 0111111, 1100001
+  const VBytes Seven = { 0xFE, 0x03, 0xFC, 0x00, 0x35, 0x7F, 0xBF, 0xC2 };
+  // 111111 000000 111111 100000, 000000 101010 111111 011111, 110000
+  const VBytes Six = { 0xFC, 0x0F, 0xE0, 0x02, 0xAF, 0xDF, 0xC0 };
+  EXPECT_EQ( Seven, Convert( IPixelFormat::ELuminance8, Nine, IPixelFormat::ELuminance7, { 9, 1 } ) );
+  EXPECT_EQ( Six, Convert( IPixelFormat::EBayerGB8, Nine, IPixelFormat::EBayerGB6, { 3, 3 } ) );
+  EXPECT_EQ( ( VBytes{ 0xFE, 0x00, 0xFE, 0x80, 0x02, 0xAA, 0xFE, 0x7E, 0xC2 } ),
+    Convert( IPixelFormat::ELuminance7, Seven, IPixelFormat::ELuminance8, { 9, 1 } ) );
+  EXPECT_EQ( ( VBytes{ 0xFC, 0x00, 0xFC, 0x80, 0x00, 0xA8, 0xFC, 0x7C, 0xC0 } ),
+    Convert( IPixelFormat::EBayerGB6, Six, IPixelFormat::EBayerGB8, { 3, 3 } ) );
+}
+
+// A packed image is the unpacked one.
+TEST( PixelFormatConverter, ConvertsPackedImages )
+{
+  const VSize Size = { 13, 5 };
+  for( const IPixelFormat::Enum Packed : { IPixelFormat::EBayerGB7, IPixelFormat::EBayerGB6, IPixelFormat::ELuminance7, IPixelFormat::ELuminance6 } )
+  {
+    const bool bBayer = Packed == IPixelFormat::EBayerGB7 || Packed == IPixelFormat::EBayerGB6;
+    const IPixelFormat::Enum Bytes = bBayer ? IPixelFormat::EBayerGB8 : IPixelFormat::ELuminance8;
+    const VBytes Source = Noise( SizeOf( Packed, Size ), 3 );
+    const VBytes Unpacked = Convert( Packed, Source, Bytes, Size );
+    for( const IPixelFormat::Enum Target : { IPixelFormat::EB8G8R8, IPixelFormat::EU8Y8V8Y8, IPixelFormat::ELuminance8 } )
+    {
+      EXPECT_EQ( Convert( Bytes, Unpacked, Target, Size ), Convert( Packed, Source, Target, Size ) ) << Packed << " to " << Target;
+    }
+  }
+}
+
+TEST( PixelFormatConverter, LogsLensCorrectionAndChangesNothing )
+{
+  const TestSupport::VLogCapture Log( "CoreVideoUtils" );
+  VPixelFormatConverter Converter;
+  Converter.SetLensCorrection( {} );
+  Converter.SetLensCorrectionEnabled( true );
+  EXPECT_EQ( 2U, Log.Count( "Lens distortion correction not supported in software converter." ) );
+  EXPECT_EQ( ( VBytes{ 3, 2, 1 } ), Convert( Converter, IPixelFormat::ER8G8B8, { 1, 2, 3 }, IPixelFormat::EB8G8R8, { 1, 1 } ) );
+}
+
+TEST( PixelFormatConverter, LogsFormatsThatAreNotAConversionsOwn )
+{
+  uint8_t Bytes[128] = {};
+  VConversion Conversion;
+  Conversion.m_Width = Conversion.m_Height = 1;
+  Conversion.m_pSource = Conversion.m_pTarget = Bytes;
+  Conversion.m_Source = IPixelFormat::EBayerRG8;
+  Conversion.m_Target = IPixelFormat::ER8G8B8;
+  const TestSupport::VLogCapture Log( "CoreVideoUtils" );
+  for( bool ( *const pConvert )( const VConversion& ) : { &ConvertFromYuv, &ConvertToPairs, &ConvertToTenBits, &SwapPairs } )
+  {
+    EXPECT_FALSE( pConvert( Conversion ) );
+  }
+  EXPECT_EQ( 4U, Log.Count( "Unsupported video format [BayerRG8]" ) );
+}
+
+// Setters change beside conversions; each conversion has one setting or the other throughout.
+TEST( PixelFormatConverter, ConvertsOnSeveralThreads )
+{
+  const VSize Size = { 62, 40 };
+  const VBytes Source = Noise( SizeOf( IPixelFormat::EBayerRG8, Size ), 4 );
+  const KVZ::VColourRecord Plain;
+  const KVZ::VColourRecord Strong = { 0.25f, 2.2f };
+  const auto ConvertWith = [&]( const KVZ::VColourRecord& i_rColour )
+  {
+    VPixelFormatConverter Converter;
+    Converter.SetColourCorrection( i_rColour );
+    return Convert( Converter, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
+  };
+  const VBytes Expected[] = { ConvertWith( Plain ), ConvertWith( Strong ) };
+  ASSERT_NE( Expected[0], Expected[1] );
+
+  VPixelFormatConverter Shared;
+  std::vector<std::thread> Threads;
+  std::array<int, 3> Wrong{};
+  for( int& rWrong : Wrong )
+  {
+    Threads.emplace_back(
+      [&]
+      {
+        for( int Round = 0; Round < 50; ++Round )
+        {
+          Shared.SetColourCorrection( Round % 2 == 0 ? Plain : Strong );
+          const VBytes Result = Convert( Shared, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
+          rWrong += Result != Expected[0] && Result != Expected[1] ? 1 : 0;
+        }
+      } );
+  }
+  for( std::thread& rThread : Threads )
+  {
+    rThread.join();
+  }
+  EXPECT_EQ( ( std::array<int, 3>{} ), Wrong );
+}
+
+}
