@@ -147,7 +147,7 @@ public:
         pAudio->Release();
       } );
   }
-  bool DeliverFormat( uint32_t i_Mode, uint32_t i_DetectedSignal, bool i_bEvenStopped = false )
+  bool DeliverFormat( uint32_t i_Mode, uint32_t i_DetectedSignal )
   {
     return CallBack(
       [&]( IDeckLinkInputCallback& i_rCallback )
@@ -155,8 +155,7 @@ public:
         auto* const pMode = new VDisplayMode( i_Mode );
         i_rCallback.VideoInputFormatChanged( FormatChange::DisplayMode, pMode, i_DetectedSignal );
         pMode->Release();
-      },
-      i_bEvenStopped );
+      } );
   }
 
   HRESULT DoesSupportVideoMode( uint32_t, uint32_t, uint32_t, uint32_t*, IDeckLinkDisplayMode** ) override { return E_NOTIMPL; }
@@ -274,12 +273,12 @@ private:
     }
   }
 
-  bool CallBack( const std::function<void( IDeckLinkInputCallback& )>& i_rCall, bool i_bEvenStopped = false )
+  bool CallBack( const std::function<void( IDeckLinkInputCallback& )>& i_rCall )
   {
     IDeckLinkInputCallback* pCallback = nullptr;
     {
       boost::lock_guard<boost::mutex> Lock( m_Mutex );
-      if( !m_pCallback || ( m_State != EState::Running && !i_bEvenStopped ) )
+      if( !m_pCallback || m_State != EState::Running )
       {
         return false;
       }
