@@ -26,3 +26,6 @@ struct VBenchOptions
 std::vector<VFigure> MeasureFramePath( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureFileWriting( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureRecording( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasurePixelConversion( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasureMovies( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasureImageCompression( const VBenchOptions& i_rOptions );
