@@ -1,15 +1,19 @@
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputBufferClient.h"
 
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/FrameWorkers.h"
 #include "HardwareSupport/VideoInput/VideoInputDataSource/SimpleBufferWrapper.h"
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputFileRecord.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/WorkerThreads.h"
 #include "NotificationSystem/AsioPostalService.h"
 #include "StageCoreRuntime/GlobalLog.h"
 
 #include <boost/thread/lock_guard.hpp>
+#include <boost/thread/thread.hpp>
 
 #include <algorithm>
 #include <exception>
+#include <limits>
 #include <utility>
 
 namespace VideoInputHAL
@@ -21,13 +25,16 @@ using SyncSystem::VRefCountedToken;
 namespace
 {
 
-std::shared_ptr<VideoEncoding::VVideoFrameEncoder> MakeEncoder( const VVideoEncoderSettings& i_rSettings )
+std::shared_ptr<VideoEncoding::VVideoFrameEncoder> MakeEncoder( const VVideoEncoderSettings& i_rSettings, int i_JPEGQuality )
 {
   auto pEncoder = std::make_shared<VideoEncoding::VVideoFrameEncoder>( i_rSettings.m_Converter );
-  pEncoder->SetJPEGQuality( i_rSettings.m_JPEGQuality );
+  pEncoder->SetJPEGQuality( i_JPEGQuality != 0 ? i_JPEGQuality : i_rSettings.m_JPEGQuality );
   pEncoder->SetBurnIn( i_rSettings.m_BurnIn );
   return pEncoder;
 }
+
+// As many as there are cores; beyond a limit the disk has long been what is waited for, and each holds a frame in memory.
+size_t CountWorkers() { return std::clamp( boost::thread::hardware_concurrency(), 2u, 16u ); }
 
 std::shared_ptr<const KVZ::IBufferConst> Wrap( const VRefCountedToken& i_rFrame, const uint8_t* i_pData, size_t i_Size )
 {
@@ -59,30 +66,46 @@ void VVideoInputBufferClient::AddDevice( VDeviceRecord i_Device ) { m_Device = s
 void VVideoInputBufferClient::AddFile( const StageCorePluginInterface::VCaptureTarget& i_rTarget )
 {
   // An encoder for each file: writers may use theirs on threads of their own.
-  auto pFile = std::make_unique<VFileRecord>( i_rTarget,
-    m_Settings.m_pWriterFactory->Make( static_cast<KVZ::IVideoContainer::Enum>( i_rTarget.m_Container ), MakeEncoder( m_Settings.m_Encoder ) ) );
+  auto pFile = std::make_unique<VFileRecord>( i_rTarget, m_Settings.m_Encoder,
+    m_Settings.m_pWriterFactory->Make( static_cast<KVZ::IVideoContainer::Enum>( i_rTarget.m_Container ),
+      MakeEncoder( m_Settings.m_Encoder, i_rTarget.m_JPEGQuality ) ) );
   pFile->Report().m_CaptureSessionId = m_Settings.m_Header.m_CaptureSessionId;
   pFile->Report().m_DeviceURN = m_Device.m_URN;
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  if( pFile->IsParallel() && !m_pWorkers )
+  {
+    MakeWorkers();
+  }
   m_Files.push_back( std::move( pFile ) );
 }
 
-void VVideoInputBufferClient::Start()
+// Twice as many frames as threads, so that none waits for the client's thread.
+size_t VVideoInputBufferClient::FramesAtOnce() { return 2 * CountWorkers(); }
+
+void VVideoInputBufferClient::MakeWorkers()
 {
-  // Called with the buffer's lock held. It must not be what ends the client, so it holds the client weakly even while it posts.
-  m_ClientId = m_Settings.m_pBuffer->RegisterClient(
-    [pService = m_pPostalService, pWeak = weak_from_this()]
-    {
-      pService->Post(
-        [pWeak]
-        {
-          if( const auto pThis = pWeak.lock() )
-          {
-            pThis->WriteFrames();
-          }
-        } );
-    } );
+  m_pFrameService = m_Settings.m_pFrameService ? m_Settings.m_pFrameService : std::make_shared<VWorkerThreads>( "Image Writer", CountWorkers() );
+  m_pWorkers = std::make_unique<VFrameWorkers>( m_pFrameService, FramesAtOnce(), MakeWake() );
 }
+
+// Posts a turn of the client's thread. What calls it must not be what ends the client, so it holds the client weakly even while it posts.
+std::function<void()> VVideoInputBufferClient::MakeWake()
+{
+  return [pService = m_pPostalService, pWeak = weak_from_this()]
+  {
+    pService->Post(
+      [pWeak]
+      {
+        if( const auto pThis = pWeak.lock() )
+        {
+          pThis->WriteFrames();
+        }
+      } );
+  };
+}
+
+// The buffer wakes the client with its own lock held.
+void VVideoInputBufferClient::Start() { m_ClientId = m_Settings.m_pBuffer->RegisterClient( MakeWake() ); }
 
 void VVideoInputBufferClient::Stop()
 {
@@ -91,6 +114,7 @@ void VVideoInputBufferClient::Stop()
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     m_bEnded = true;
+    DropJobs();
     CloseFiles( News );
   }
   Tell( News );
@@ -108,65 +132,120 @@ void VVideoInputBufferClient::WriteFrames()
       {
         return;
       }
-      TakeFrame( News );
+      TakeTurn( News );
     }
     Tell( News );
     bGoOn = News.m_bGoOn;
   }
 }
 
+void VVideoInputBufferClient::TakeTurn( VNews& o_rNews )
+{
+  if( !CountDone() )
+  {
+    m_Ending = EEnding::Failed;
+    DropJobs();
+  }
+  if( m_Ending == EEnding::None )
+  {
+    TakeFrame( o_rNews );
+  }
+  if( m_Ending != EEnding::None && ( !m_pWorkers || m_pWorkers->IsIdle() ) )
+  {
+    End( o_rNews );
+  }
+}
+
 void VVideoInputBufferClient::TakeFrame( VNews& o_rNews )
 {
+  if( m_pWorkers && !m_pWorkers->HasRoom() )
+  {
+    return;   // the worker that makes room comes back here
+  }
   VRefCountedToken Frame;
   SyncSystem::VClientRead Read;
   if( !m_Settings.m_pBuffer->ClientNextFrame( m_ClientId, Frame, Read ) )
   {
     return;
   }
-  if( Frame && !TryWriteFrame( Frame, o_rNews ) )
+  if( Frame && !TryWriteFrame( Frame ) )
   {
-    CloseFiles( o_rNews );
-    m_bEnded = true;
+    m_Ending = EEnding::Failed;
     return;
   }
   o_rNews.m_bGoOn = Read.m_Result == EClientResult::MoreToCome;
   if( Read.m_Result == EClientResult::Finished )
   {
-    CloseFiles( o_rNews );
-    o_rNews.m_bFinished = true;
-    LogEnd( "Client %1% finished writing %2% seconds of data." );
-    m_bEnded = true;
+    m_Ending = EEnding::Finished;
   }
   else if( Read.m_Result == EClientResult::Cancelled )
   {
-    CloseFiles( o_rNews );
-    LogEnd( "Client %1% cancelled after writing %2% seconds of data." );
-    m_bEnded = true;
+    m_Ending = EEnding::Cancelled;
+    DropJobs();
   }
 }
 
+// Takes note of what the workers have written. False once a file has failed there.
+bool VVideoInputBufferClient::CountDone()
+{
+  bool bGood = true;
+  for( const VFrameWorkers::VDone& rDone : m_pWorkers ? m_pWorkers->TakeDone() : std::vector<VFrameWorkers::VDone>() )
+  {
+    bGood = m_Files[rDone.m_File]->Count( rDone.m_Outcome ) && bGood;
+  }
+  return bGood;
+}
+
+// Jobs begin in order, so that what is left of the sequence has no gap.
+void VVideoInputBufferClient::DropJobs()
+{
+  if( m_pWorkers )
+  {
+    m_pWorkers->DropAndWait();
+    CountDone();
+  }
+}
+
+// The client's last turn.
+void VVideoInputBufferClient::End( VNews& o_rNews )
+{
+  o_rNews.m_bGoOn = false;
+  o_rNews.m_Failure = m_Failure;
+  CloseFiles( o_rNews );
+  if( m_Ending == EEnding::Finished )
+  {
+    o_rNews.m_bFinished = true;
+    LogEnd( "Client %1% finished writing %2% seconds of data." );
+  }
+  else if( m_Ending == EEnding::Cancelled )
+  {
+    LogEnd( "Client %1% cancelled after writing %2% seconds of data." );
+  }
+  m_bEnded = true;
+}
+
 // Memory that runs out outside of a writer ends the capture as any other failure does.
-bool VVideoInputBufferClient::TryWriteFrame( const VRefCountedToken& i_rFrame, VNews& o_rNews )
+bool VVideoInputBufferClient::TryWriteFrame( const VRefCountedToken& i_rFrame )
 {
   try
   {
-    return WriteFrame( i_rFrame, o_rNews );
+    return WriteFrame( i_rFrame );
   }
   catch( const std::exception& i_rException )
   {
-    o_rNews.m_Failure = std::string( "A frame could not be prepared for its files: " ) + i_rException.what();
+    m_Failure = std::string( "A frame could not be prepared for its files: " ) + i_rException.what();
     return false;
   }
 }
 
-// The pin of the token is the client's until this returns; writers that keep a buffer keep a pin with it.
-bool VVideoInputBufferClient::WriteFrame( const VRefCountedToken& i_rFrame, VNews& o_rNews )
+// The pin of the token is the client's until this returns; whoever keeps a buffer of it keeps a pin with it.
+bool VVideoInputBufferClient::WriteFrame( const VRefCountedToken& i_rFrame )
 {
   VFrameView View;
   View.m_pFrame = VVideoInputDataSource::FrameOf( i_rFrame.Frame() );
   m_Settings.m_pSession->TickAt( i_rFrame.Token(), View.m_Tick );
   View.m_Period = m_Settings.m_pSession->m_Session.m_Period;
-  if( !Begin( View, o_rNews ) )
+  if( !Begin( View ) )
   {
     return false;
   }
@@ -175,20 +254,35 @@ bool VVideoInputBufferClient::WriteFrame( const VRefCountedToken& i_rFrame, VNew
     View.m_pVideo = Wrap( i_rFrame, View.m_pFrame->Image(), View.m_pFrame->m_ImageBytes );
     View.m_pAudio = View.m_pFrame->m_AudioBytes != 0 ? Wrap( i_rFrame, View.m_pFrame->Audio(), View.m_pFrame->m_AudioBytes ) : nullptr;
   }
-  for( const auto& pFile : m_Files )
+  for( size_t File = 0; File < m_Files.size(); ++File )
   {
-    if( !pFile->Write( View, m_Settings, m_Device ) )
+    if( !WriteToFile( File, View ) )
     {
-      o_rNews.m_Failure = pFile->Error();
+      m_Failure = m_Files[File]->Error();
       return false;
     }
   }
-  ++m_Frames;
+  return true;
+}
+
+bool VVideoInputBufferClient::WriteToFile( size_t i_File, const VFrameView& i_rFrame )
+{
+  VFileRecord& rFile = *m_Files[i_File];
+  uint64_t Key = 0;
+  if( !rFile.Prepare( i_rFrame, m_Settings, m_Device, Key ) )
+  {
+    return false;
+  }
+  if( !rFile.IsParallel() )
+  {
+    return rFile.Count( rFile.WriteFrame( i_rFrame, Key ) );
+  }
+  m_pWorkers->Add( i_File, [&rFile, View = i_rFrame, Key] { return rFile.WriteFrame( View, Key ); } );
   return true;
 }
 
 // Makes the files when the first frame comes.
-bool VVideoInputBufferClient::Begin( const VFrameView& i_rFrame, VNews& o_rNews )
+bool VVideoInputBufferClient::Begin( const VFrameView& i_rFrame )
 {
   if( m_bStarted )
   {
@@ -200,26 +294,28 @@ bool VVideoInputBufferClient::Begin( const VFrameView& i_rFrame, VNews& o_rNews 
   {
     LogStartTimecode( i_rFrame.m_pFrame->m_Timecode );
   }
-  return CreateFiles( o_rNews );
+  return CreateFiles();
 }
 
-bool VVideoInputBufferClient::CreateFiles( VNews& o_rNews )
+bool VVideoInputBufferClient::CreateFiles()
 {
   const auto Failed = std::find_if( m_Files.begin(), m_Files.end(), []( const auto& i_rpFile ) { return !i_rpFile->Create(); } );
   if( Failed == m_Files.end() )
   {
     return true;
   }
-  o_rNews.m_Failure = ( *Failed )->Error();
+  m_Failure = ( *Failed )->Error();
   return false;
 }
 
 // Files that never began are not spoken of.
 void VVideoInputBufferClient::CloseFiles( VNews& o_rNews )
 {
+  m_Frames = m_Files.empty() ? m_Frames : std::numeric_limits<uint64_t>::max();
   for( const auto& pFile : m_Files )
   {
     pFile->Close();
+    m_Frames = std::min( m_Frames, pFile->Report().m_FramesWritten );
     if( pFile->HasFailed() && o_rNews.m_Failure.empty() )
     {
       o_rNews.m_Failure = pFile->Error();

@@ -48,6 +48,7 @@ SyncSystem::VDataSourceSettings MakeSettings( const IVideoInputDevice& i_rDevice
   Settings.m_pPostalService = io_rOptions.m_pPostalService;
   Settings.m_pAllocator = i_pAllocator->BufferAllocator();
   Settings.m_NoticeSeconds = io_rOptions.m_NoticeSeconds;
+  Settings.m_pAnalysis = io_rOptions.m_pAnalysis;
   // Frames name their allocator, so it lives as long as the buffer does.
   Settings.m_DeleteFrame = [i_pAllocator]( SyncSystem::VFrameEntry* i_pEntry )
   {
@@ -111,6 +112,7 @@ bool VVideoInputDataSource::OnVideoInputData( uint32_t i_FrameIndex, VVideoInput
     return false;
   }
   i_pFrame->m_FrameScale = m_FrameScale;
+  i_pFrame->m_DeliveryTime = Frame.m_Now;
   i_pFrame->m_VideoInfo.m_PixelAspectRatio = m_PixelAspectRatio.load( std::memory_order_relaxed );
   Frame.m_Period = VTick( *i_pPeriod );
   Frame.m_BeatPeriod = Frame.m_Period;
@@ -208,6 +210,7 @@ void VVideoInputDataSource::StartClient( const KVZ::ICaptureHeader& i_rHeader,
   Settings.m_pWriterFactory = m_Options.m_pWriterFactory;
   Settings.m_Encoder = m_Options.m_Encoder;
   Settings.m_pPostalService = m_Options.m_MakeWriterService ? m_Options.m_MakeWriterService() : nullptr;
+  Settings.m_pFrameService = m_Options.m_MakeFrameService ? m_Options.m_MakeFrameService() : nullptr;
   const auto pClient = std::make_shared<VVideoInputBufferClient>( std::move( Settings ) );
   pClient->AddDevice( { m_pDevice->GetDeviceURN(), m_pDevice->GetManufacturerName(), m_pDevice->GetDriverName(), m_pDevice->GetDeviceName() } );
   for( const VCaptureTarget& rTarget : i_rTargets )

@@ -42,9 +42,12 @@ struct VVideoInputDataSourceOptions
   std::shared_ptr<const KVZ::VVideoWriterFactory> m_pWriterFactory{};
   VVideoEncoderSettings m_Encoder{};
   double m_NoticeSeconds = 0.0;
+  std::shared_ptr<SyncSystem::VDriftMonitorAnalysis> m_pAnalysis{};
   // Empty: the source makes a service with one thread of its own, and one more for each capture.
   std::shared_ptr<KVZ::IPostalService> m_pPostalService{};
   std::function<std::shared_ptr<KVZ::IPostalService>()> m_MakeWriterService{};
+  // For files that take several frames at once. Empty: threads of the capture's own, as many as the machine has cores.
+  std::function<std::shared_ptr<KVZ::IPostalService>()> m_MakeFrameService{};
   std::function<std::unique_ptr<IDeadlineTimer>()> m_MakeTimer{};   // of a triggered source; empty: on the source's service
 };
 
@@ -75,6 +78,8 @@ public:
   // For a flow node: the newest frames, of which at most ten are not marked as dropped. Asleep: the next frame fires the callback with the token.
   virtual SyncSystem::EReadResult::Enum GetFrames( uint64_t i_WakeToken, SyncSystem::VReadFrames& o_rRead );
   virtual NotificationSystem::VCallbackPostal<void( uint64_t )>& OnNewFramesCallback() { return OnNewFrames(); }
+  // Where the device of a frame is looked up.
+  const std::shared_ptr<VVideoInputDeviceManager>& DeviceManager() const { return m_pDeviceManager; }
 
   // The frame of an entry of the source's buffer.
   static const VVideoInputDataSourceFrame* FrameOf( const SyncSystem::VFrameEntry* i_pEntry );
@@ -103,7 +108,7 @@ private:
 
   // Fixed after construction
   const VVideoInputDataSourceOptions m_Options;
-  const std::shared_ptr<VVideoInputDeviceManager> m_pDeviceManager;   // where flow states look up the device of a frame
+  const std::shared_ptr<VVideoInputDeviceManager> m_pDeviceManager;
   const std::shared_ptr<IVideoInputDevice> m_pDevice;
   const std::shared_ptr<StageCorePluginInterface::ICaptureTargets> m_pCaptureTargets;
   const std::shared_ptr<StageCorePluginInterface::ITimeService> m_pTime;

@@ -2,6 +2,7 @@
 
 #include "Core/VideoInterface/EnumTable.h"
 #include "Core/VideoInterface/VideoAttributes.h"
+#include "FileIO/AudioEncoding/AudioEncoding.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
 #include "StageCoreRuntime/GlobalLog.h"
 #include "Utils/UtilsMemory/PooledBufferAllocator.h"
@@ -10,7 +11,7 @@
 #include <boost/filesystem/path.hpp>
 
 #include <algorithm>
-#include <cstring>
+#include <exception>
 #include <utility>
 
 namespace VideoInputHAL
@@ -24,7 +25,11 @@ namespace
 std::string MakePath( const VCaptureTarget& i_rTarget )
 {
   std::string Name = i_rTarget.m_BaseName + "_" + i_rTarget.m_DeviceLabel;
-  if( !i_rTarget.m_Extension.empty() )
+  if( i_rTarget.m_Container == KVZ::IVideoContainer::EIMAGES )
+  {
+    Name += "_%FRAME%";
+  }
+  else if( !i_rTarget.m_Extension.empty() )
   {
     Name += "." + i_rTarget.m_Extension;
   }
@@ -90,10 +95,12 @@ KVZ::VConversionRecord RecordingStep( const VCaptureTarget& i_rTarget, KVZ::IPix
 
 }
 
-VVideoInputBufferClient::VFileRecord::VFileRecord( const VCaptureTarget& i_rTarget, std::shared_ptr<KVZ::IVideoWriter> i_pWriter )
+VVideoInputBufferClient::VFileRecord::VFileRecord( const VCaptureTarget& i_rTarget, const VVideoEncoderSettings& i_rSettings,
+  std::shared_ptr<KVZ::IVideoWriter> i_pWriter )
   : m_Target( i_rTarget ),
     m_pWriter( std::move( i_pWriter ) ),
-    m_pAudioAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Capture audio" ) )
+    m_pAudioAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Capture audio" ) ),
+    m_pConversion( std::make_unique<VFrameConversion>( i_rTarget, i_rSettings ) )
 {
   m_Report.m_Path = MakePath( m_Target );
   m_Report.m_Container = m_Target.m_Container;
@@ -113,28 +120,59 @@ bool VVideoInputBufferClient::VFileRecord::Create()
   return m_bCreated || Fail( "Could not create capture file: \"" + m_Report.m_Path + "\"" );
 }
 
-bool VVideoInputBufferClient::VFileRecord::Write( const VFrameView& i_rFrame, const VSettings& i_rSettings, const VDeviceRecord& i_rDevice )
+bool VVideoInputBufferClient::VFileRecord::Prepare( const VFrameView& i_rFrame, const VSettings& i_rSettings, const VDeviceRecord& i_rDevice,
+  uint64_t& o_rKey )
 {
+  o_rKey = m_NextKey++;
   if( !HasVideo( i_rFrame.m_pFrame ) )
   {
     return Fail( WriteFailureText() );
   }
-  const VVideoInputDataSourceFrame& rFrame = *i_rFrame.m_pFrame;
-  if( !( m_bHeaderWritten ? HasHeaderFormat( rFrame ) : WriteHeader( i_rFrame, i_rSettings, i_rDevice ) ) )
+  return m_bHeaderWritten ? HasHeaderFormat( *i_rFrame.m_pFrame ) : WriteHeader( i_rFrame, i_rSettings, i_rDevice );
+}
+
+VFrameOutcome VVideoInputBufferClient::VFileRecord::WriteFrame( const VFrameView& i_rFrame, uint64_t i_Key ) const noexcept
+try
+{
+  return TryWriteFrame( i_rFrame, i_Key );
+}
+catch( const std::exception& i_rException )
+{
+  return { i_Key, false, 0, std::string( "A frame could not be prepared for its files: " ) + i_rException.what() };
+}
+
+VFrameOutcome VVideoInputBufferClient::VFileRecord::TryWriteFrame( const VFrameView& i_rFrame, uint64_t i_Key ) const
+{
+  VFrameOutcome Outcome{ i_Key };
+  // The frame's own description, but for what the file does not keep as it was captured.
+  KVZ::VideoFrameInfo Info = i_rFrame.m_pFrame->m_VideoInfo;
+  KVZ::VBufferList Video( 1, i_rFrame.m_pVideo );
+  KVZ::VBufferList Audio;
+  if( m_Kept.HasAudio() && i_rFrame.m_pAudio )
   {
-    return false;
+    Audio.push_back( i_rFrame.m_pAudio );
   }
-  CollectBuffers( i_rFrame );
-  // The frame's own description, but for the channels that the file does not keep.
-  const bool bWritten = m_pWriter->WriteFrame( m_VideoBuffers, rFrame.m_VideoInfo, m_AudioBuffers, m_Kept, m_Report.m_FramesWritten );
-  for( const auto& pBuffer : m_VideoBuffers )
+  Outcome.m_bWritten = m_pConversion->Apply( i_rFrame.m_pFrame->m_Timecode, Video, Info ) && KeepChannels( Audio ) &&
+    m_pWriter->WriteFrame( Video, Info, Audio, m_Kept, i_Key );
+  Outcome.m_Bytes = Outcome.m_bWritten ? KVZ::GetTotalSize( Video ) : 0;
+  return Outcome;
+}
+
+// Frames of a parallel file come in any order: of several that have failed the first one of the file is told.
+bool VVideoInputBufferClient::VFileRecord::Count( const VFrameOutcome& i_rOutcome )
+{
+  if( i_rOutcome.m_bWritten )
   {
-    m_PayloadBytes += bWritten ? pBuffer->Size() : 0;
+    ++m_Report.m_FramesWritten;
+    m_PayloadBytes += i_rOutcome.m_Bytes;
+    return !m_Report.m_bFailed;
   }
-  m_VideoBuffers.clear();
-  m_AudioBuffers.clear();
-  m_Report.m_FramesWritten += bWritten ? 1 : 0;
-  return bWritten || FailWriter();
+  m_FailedKey = std::min( m_FailedKey, i_rOutcome.m_Key );
+  if( !m_Report.m_bFailed )
+  {
+    i_rOutcome.m_Error.empty() ? FailWriter() : Fail( i_rOutcome.m_Error );
+  }
+  return false;
 }
 
 bool VVideoInputBufferClient::VFileRecord::WriteHeader( const VFrameView& i_rFrame, const VSettings& i_rSettings, const VDeviceRecord& i_rDevice )
@@ -149,7 +187,9 @@ bool VVideoInputBufferClient::VFileRecord::WriteHeader( const VFrameView& i_rFra
   KVZ::VTimingRecord Timing;
   Timing.m_FramePeriodInTicks = static_cast<uint32_t>( i_rFrame.m_Period.Count() );
   Timing.m_StartOffsetInTicks = i_rFrame.m_Tick.Count();
-  m_bHeaderWritten = m_pWriter->WriteHeader( m_Video, m_Kept, Timing, rFrame.m_Timecode, KVZ::VColourRecord(),
+  KVZ::VideoFrameInfo Written = m_Video;
+  Written.m_PixelFormat = m_pConversion->FormatFor( m_Video.m_PixelFormat );
+  m_bHeaderWritten = m_pWriter->WriteHeader( Written, m_Kept, Timing, rFrame.m_Timecode, KVZ::VColourRecord(),
     MakeAttributes( i_rFrame, i_rSettings, i_rDevice ), VideoPayloadOf( m_Target ),
     m_Kept.HasAudio() ? AudioPayloadOf( m_Target ) : KVZ::IAudioPayload::ENone );
   if( m_bHeaderWritten )
@@ -172,7 +212,7 @@ KVZ::IVideoAttributes VVideoInputBufferClient::VFileRecord::MakeAttributes( cons
   Camera.m_SensorHeightInPixels = m_Video.m_ImageHeight;
   Camera.m_PixelAspectRatio = m_Video.m_PixelAspectRatio;
   Camera.WriteAttributes( Attributes );
-  KVZ::WriteAttributes( { RecordingStep( m_Target, m_Video.m_PixelFormat ) }, Attributes );
+  KVZ::WriteAttributes( { RecordingStep( m_Target, m_pConversion->FormatFor( m_Video.m_PixelFormat ) ) }, Attributes );
   Attributes.Set( "Capture.Name", i_rSettings.m_Header.m_Name );
   Attributes.Set( "Capture.Id", i_rSettings.m_Header.m_CaptureSessionId.Value() );
   Attributes.Set( "Capture.GlobalSyncSessionId", i_rSettings.m_Header.m_GlobalSyncSessionId.Value() );
@@ -202,29 +242,12 @@ bool VVideoInputBufferClient::VFileRecord::HasHeaderFormat( const VVideoInputDat
     FormatText( i_rFrame.m_VideoInfo, i_rFrame.m_AudioInfo ) );
 }
 
-void VVideoInputBufferClient::VFileRecord::CollectBuffers( const VFrameView& i_rFrame )
-{
-  m_VideoBuffers.assign( 1, i_rFrame.m_pVideo );
-  m_AudioBuffers.clear();
-  if( m_Kept.HasAudio() && i_rFrame.m_pAudio )
-  {
-    m_AudioBuffers.push_back( m_Kept.m_Channels == m_Captured.m_Channels ? i_rFrame.m_pAudio : KeepChannels( *i_rFrame.m_pAudio ) );
-  }
-}
-
 // The first channels of every sample.
-std::shared_ptr<const KVZ::IBufferConst> VVideoInputBufferClient::VFileRecord::KeepChannels( const KVZ::IBufferConst& i_rAudio )
+bool VVideoInputBufferClient::VFileRecord::KeepChannels( KVZ::VBufferList& io_rAudio ) const
 {
-  const size_t SampleBytes = KVZ::GetBytesPerSample( m_Captured.m_SampleFormat );
-  const size_t From = SampleBytes * m_Captured.m_Channels;
-  const size_t To = SampleBytes * m_Kept.m_Channels;
-  const size_t Samples = From == 0 ? 0 : i_rAudio.Size() / From;
-  const auto pKept = m_pAudioAllocator->AllocateBuffer( Samples * To );
-  for( size_t Sample = 0; Sample < Samples; ++Sample )
-  {
-    std::memcpy( pKept->Data() + Sample * To, i_rAudio.Data() + Sample * From, To );
-  }
-  return pKept;
+  return io_rAudio.empty() || m_Kept.m_Channels == m_Captured.m_Channels ||
+    AudioEncoding::EncodeIfRequired( *m_pAudioAllocator, io_rAudio, m_Captured, KVZ::IAudioPayload::EUncompressed, m_Captured.m_SampleFormat,
+      m_Kept.m_Channels );
 }
 
 void VVideoInputBufferClient::VFileRecord::Close()
@@ -234,13 +257,31 @@ void VVideoInputBufferClient::VFileRecord::Close()
     return;
   }
   const bool bClosed = !m_pWriter->IsOpen() || m_pWriter->Close();
+  // Frames behind one that has failed are no part of an unbroken sequence.
+  m_Report.m_FramesWritten = std::min( m_Report.m_FramesWritten, m_FailedKey ) - m_pWriter->CountIncompleteFrames();
   if( !bClosed && m_bHeaderWritten && !m_Report.m_bFailed )
   {
     FailWriter();
   }
+  m_Report.m_Bytes = CountBytes();
+}
+
+// As they lie on the disk, where they do.
+uint64_t VVideoInputBufferClient::VFileRecord::CountBytes() const
+{
   boost::system::error_code Error;
+  if( m_Target.m_Container == KVZ::IVideoContainer::EIMAGES )
+  {
+    uint64_t Sum = 0;
+    for( boost::filesystem::directory_iterator File( m_Target.m_Folder, Error ), End; !Error && File != End; File.increment( Error ) )
+    {
+      boost::system::error_code Gone;
+      Sum += boost::filesystem::is_regular_file( File->path(), Gone ) ? boost::filesystem::file_size( File->path(), Gone ) : 0;
+    }
+    return Sum;
+  }
   const uint64_t Size = boost::filesystem::is_regular_file( m_Report.m_Path, Error ) ? boost::filesystem::file_size( m_Report.m_Path, Error ) : 0;
-  m_Report.m_Bytes = Size != 0 && !Error ? Size : m_PayloadBytes;
+  return Size != 0 && !Error ? Size : m_PayloadBytes;
 }
 
 bool VVideoInputBufferClient::VFileRecord::FailWriter()

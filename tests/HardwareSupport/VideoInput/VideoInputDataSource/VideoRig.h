@@ -53,6 +53,8 @@ public:
   {
     o_rTarget = { m_Folder, i_rHeader.m_Name, KVZ::GetFileExtension( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) ), "Label", i_Container,
       KVZ::IVideoPayload::EUncompressed, KVZ::IAudioPayload::EUncompressed, m_Channels };
+    o_rTarget.m_PixelFormat = m_PixelFormat;
+    o_rTarget.m_bBurnInTimecode = m_bBurnInTimecode;
     return i_Container != m_RefusedContainer;
   }
   void OnFileFinished( const StageCorePluginInterface::VCaptureFileReport& i_rReport ) override
@@ -73,6 +75,8 @@ public:
   int32_t m_RefusedContainer = -1;
   std::string m_Folder;
   uint32_t m_Channels = 0xFFFFFFFFu;
+  KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EUnspecified;
+  bool m_bBurnInTimecode = false;
 
 private:
   mutable boost::mutex m_Mutex;
@@ -115,7 +119,8 @@ public:
     }
     i_Options.m_pWriterFactory = i_Options.m_pWriterFactory ? i_Options.m_pWriterFactory : pFactory;
     i_Options.m_pPostalService = m_pStrand;
-    i_Options.m_MakeWriterService = [pService = m_pWriterService] { return pService; };
+    i_Options.m_MakeWriterService = i_Options.m_MakeWriterService ? i_Options.m_MakeWriterService
+                                                                  : [pService = m_pWriterService] { return pService; };
     const auto pSource = KVZ::MakeShared<TSource>( nullptr, m_pDevice, m_pFrames, m_pService, m_pService, m_pTargets, m_pTime, i_Options );
     m_pSource = pSource;
     return pSource;
