@@ -28,10 +28,50 @@ T ReadOr( const VDataReader& i_rReader, const VDataPath& i_rPath, T i_Default )
   return i_Default;
 }
 
-std::string FilePath( const VCaptureTarget& i_rTarget )
+std::string Stem( const VCaptureTarget& i_rTarget ) { return i_rTarget.m_BaseName + "_" + i_rTarget.m_DeviceLabel; }
+
+bool IsSequence( const VCaptureTarget& i_rTarget ) { return i_rTarget.m_Container == KVZ::IVideoContainer::EIMAGES; }
+
+// What must not be there yet: the file, or the folder of an image sequence with anything in it.
+std::string TakenPath( const VCaptureTarget& i_rTarget )
 {
-  const std::string Stem = i_rTarget.m_BaseName + "_" + i_rTarget.m_DeviceLabel;
-  return ( boost::filesystem::path( i_rTarget.m_Folder ) / ( i_rTarget.m_Extension.empty() ? Stem : Stem + "." + i_rTarget.m_Extension ) ).string();
+  const std::string Name = i_rTarget.m_Extension.empty() ? Stem( i_rTarget ) : Stem( i_rTarget ) + "." + i_rTarget.m_Extension;
+  return IsSequence( i_rTarget ) ? i_rTarget.m_Folder : ( boost::filesystem::path( i_rTarget.m_Folder ) / Name ).string();
+}
+
+// A frame of this sequence or its side file, from an earlier capture of the same name.
+bool IsOfSequence( const boost::filesystem::path& i_rFile, const VCaptureTarget& i_rTarget )
+{
+  static const std::string Extensions[] = { ".jpg", ".png", ".tiff" };
+  const std::string Start = Stem( i_rTarget ) + "_";
+  const std::string Name = i_rFile.stem().string();
+  if( Name.compare( 0, Start.size(), Start ) != 0 )
+  {
+    return false;
+  }
+  const std::string Rest = Name.substr( Start.size() );
+  const bool bNumber = std::all_of( Rest.begin(), Rest.end(), []( char i_Digit ) { return i_Digit >= '0' && i_Digit <= '9'; } );
+  const std::string Extension = i_rFile.extension().string();
+  return Rest.empty() ? Extension == ".tarvovideoattributes"
+                      : bNumber && std::count( std::begin( Extensions ), std::end( Extensions ), Extension ) > 0;
+}
+
+// A sequence is replaced as a whole: frames of a longer one before it must not stay behind its end.
+void RemoveSequence( const VCaptureTarget& i_rTarget )
+{
+  boost::system::error_code Error;
+  std::vector<boost::filesystem::path> Old;
+  for( boost::filesystem::directory_iterator File( i_rTarget.m_Folder, Error ), End; !Error && File != End; File.increment( Error ) )
+  {
+    if( IsOfSequence( File->path(), i_rTarget ) )
+    {
+      Old.push_back( File->path() );
+    }
+  }
+  for( const boost::filesystem::path& rPath : Old )
+  {
+    boost::filesystem::remove( rPath, Error );
+  }
 }
 
 // A name as one component of a path.
@@ -86,28 +126,45 @@ VCaptureTarget VCaptureTargets::MakeTarget( const std::string& i_rName, const st
   Target.m_Extension = KVZ::GetFileExtension( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) );
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   Target.m_Folder = m_Options.m_Folder;
+  if( IsSequence( Target ) && !Target.m_Folder.empty() )
+  {
+    Target.m_Folder = ( boost::filesystem::path( Target.m_Folder ) / Stem( Target ) ).string();
+  }
   Target.m_AudioChannels = m_Options.m_AudioChannels;
+  Target.m_PixelFormat = m_Options.m_PixelFormat;
+  Target.m_JPEGQuality = m_Options.m_JPEGQuality;
+  Target.m_bBurnInTimecode = m_Options.m_bBurnInTimecode;
   return Target;
+}
+
+bool VCaptureTargets::MayOverwrite() const
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  return m_Options.m_bOverwrite;
 }
 
 std::string VCaptureTargets::WhyRefused( const VCaptureTarget& i_rTarget ) const
 {
-  bool bOverwrite = false;
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    bOverwrite = m_Options.m_bOverwrite;
-  }
   if( i_rTarget.m_Folder.empty() )
   {
     return "There is no folder for captures.";
   }
   boost::system::error_code Error;
-  const std::string Path = FilePath( i_rTarget );
-  if( !bOverwrite && boost::filesystem::exists( Path, Error ) )
+  const std::string Path = TakenPath( i_rTarget );
+  if( !boost::filesystem::exists( Path, Error ) )
   {
-    return "The file \"" + Path + "\" is there already; --overwrite replaces it.";
+    return {};
   }
-  return {};
+  if( !IsSequence( i_rTarget ) )
+  {
+    return MayOverwrite() ? "" : "The file \"" + Path + "\" is there already; --overwrite replaces it.";
+  }
+  if( !boost::filesystem::is_directory( Path, Error ) )
+  {
+    return "The images need the folder \"" + Path + "\", and a file of that name is there.";
+  }
+  const bool bFree = MayOverwrite() || boost::filesystem::is_empty( Path, Error );
+  return bFree ? "" : "The folder \"" + Path + "\" is not empty; --overwrite replaces the images in it.";
 }
 
 bool VCaptureTargets::GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std::string& i_rDeviceURN, int32_t i_Container,
@@ -119,6 +176,10 @@ bool VCaptureTargets::GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std
   {
     KVZ_LOG_ERROR( "Capture", "%1%", Refusal );
     return false;
+  }
+  if( IsSequence( Target ) )
+  {
+    RemoveSequence( Target );
   }
   o_rTarget = std::move( Target );
   return true;

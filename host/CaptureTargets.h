@@ -1,6 +1,8 @@
-// Builds the paths of captures, hands over the formats that each device's parameters hold, and keeps what became of the files.
+// Builds the paths of captures, hands over the formats that each device's parameters hold, and keeps what became of the files. An image sequence
+// has a folder of its own, named as the file of another container would be.
 #pragma once
 
+#include "Core/VideoInterface/PixelFormat.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
 
@@ -18,8 +20,11 @@ namespace StageHost
 struct VCaptureTargetOptions
 {
   std::string m_Folder;                     // where the alias "Default" leads
-  bool m_bOverwrite = false;                // an existing file is never replaced otherwise
+  bool m_bOverwrite = false;                // an existing file, or the images in a folder, are never replaced otherwise
   uint32_t m_AudioChannels = 0xFFFFFFFFu;   // to keep; all ones keeps what was captured
+  KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EUnspecified;   // of uncompressed video; "Unspecified" keeps what was captured
+  int m_JPEGQuality = 0;                                                     // 1 to 100; 0 leaves the choice to the module
+  bool m_bBurnInTimecode = false;
 };
 
 // What a device is called in file names: the user's name for it, or its URN without the colon.
@@ -49,6 +54,7 @@ public:
 private:
   StageCorePluginInterface::VCaptureTarget MakeTarget( const std::string& i_rName, const std::string& i_rDeviceURN, int32_t i_Container ) const;
   std::string WhyRefused( const StageCorePluginInterface::VCaptureTarget& i_rTarget ) const;
+  bool MayOverwrite() const;
 
   const std::shared_ptr<IDataStore> m_pDataStore;
   NotificationSystem::VMultiCallbackPostal<void()> m_AliasesChanged;

@@ -5,6 +5,7 @@
 #include "apps/stagehost/HostSession.h"
 #include "apps/stagehost/Interrupt.h"
 #include "apps/stagehost/NumberCheck.h"
+#include "apps/stagehost/RecordFormat.h"
 #include "apps/stagehost/RecordReport.h"
 #include "host/Recording.h"
 
@@ -39,45 +40,11 @@ struct VOptions
   double m_Seconds = 0.0;
   uint64_t m_Frames = 0;
   double m_PreRoll = 0.0;
-  std::string m_Container = "tvid";
-  std::string m_Video = "uncompressed";
-  std::string m_Audio = "uncompressed";
-  uint32_t m_AudioChannels = 0;
-  bool m_bAudioChannels = false;
-  std::string m_AudioFormat;
-  std::string m_PixelFormat;
+  VFormatOptions m_Format;
   std::string m_Output;
   std::string m_Name = "take";
   bool m_bOverwrite = false;
 };
-
-// The words of the command line and the enumerators that the settings hold.
-struct VWord
-{
-  const char* m_pWord;
-  const char* m_pName;
-};
-constexpr VWord Containers[] = { { "tvid", "TVID" }, { "mov", "MOV" }, { "mp4", "MP4" }, { "avi", "AVI" }, { "mkv", "MKV" }, { "images", "IMAGES" } };
-constexpr VWord VideoPayloads[] = { { "uncompressed", "Uncompressed" }, { "jpeg", "ImageJPEG" }, { "png", "ImagePNG" }, { "tiff", "ImageTIFF" } };
-constexpr VWord AudioPayloads[] = { { "uncompressed", "Uncompressed" }, { "none", "None" } };
-
-template<size_t Count>
-std::string NameFor( const VWord ( &i_rWords )[Count], const std::string& i_rWord )
-{
-  const auto Found = std::find_if( std::begin( i_rWords ), std::end( i_rWords ), [&]( const VWord& i_rRow ) { return i_rWord == i_rRow.m_pWord; } );
-  return Found == std::end( i_rWords ) ? i_rWord : Found->m_pName;
-}
-
-template<size_t Count>
-std::vector<std::string> WordsOf( const VWord ( &i_rWords )[Count] )
-{
-  std::vector<std::string> Words;
-  for( const VWord& rRow : i_rWords )
-  {
-    Words.push_back( rRow.m_pWord );
-  }
-  return Words;
-}
 
 // Before anything is started: what can be seen to be wrong from the command line and the file system.
 int CheckOutput( const VOptions& i_rOptions )
@@ -106,52 +73,6 @@ bool WaitUntil( VHostSession& i_rSession, double i_Seconds, const std::function<
   return true;
 }
 
-// The smallest number of channels that the device offers and that holds those asked for.
-std::string DeviceChannels( const VDeviceInfo& i_rDevice, uint32_t i_Channels )
-{
-  uint32_t Best = 0;
-  bool bFound = false;
-  for( const std::string& rCount : i_rDevice.m_AudioChannelCounts )
-  {
-    const uint32_t Count = static_cast<uint32_t>( std::strtoul( rCount.c_str(), nullptr, 10 ) );
-    if( Count >= i_Channels && ( !bFound || Count < Best ) )
-    {
-      Best = Count;
-      bFound = true;
-    }
-  }
-  return bFound ? std::to_string( Best ) : std::to_string( i_Channels );
-}
-
-struct VWantedSetting
-{
-  const char* m_pKey;
-  std::string m_Value;
-  std::string m_Option;   // of the command line, as it was given
-};
-
-std::vector<VWantedSetting> WantedSettings( const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
-{
-  std::vector<VWantedSetting> Wanted = { { "VideoContainer", NameFor( Containers, i_rOptions.m_Container ),
-    "--container " + i_rOptions.m_Container } };
-  if( !i_rOptions.m_PixelFormat.empty() )
-  {
-    Wanted.push_back( { "PixelFormat", i_rOptions.m_PixelFormat, "--pixel-format " + i_rOptions.m_PixelFormat } );
-  }
-  if( i_rOptions.m_bAudioChannels )
-  {
-    Wanted.push_back( { "AudioChannelCount", DeviceChannels( i_rDevice, i_rOptions.m_AudioChannels ),
-      "--audio-channels " + std::to_string( i_rOptions.m_AudioChannels ) } );
-  }
-  if( !i_rOptions.m_AudioFormat.empty() )
-  {
-    Wanted.push_back( { "AudioSampleFormat", i_rOptions.m_AudioFormat, "--audio-format " + i_rOptions.m_AudioFormat } );
-  }
-  Wanted.push_back( { "VideoPayload", NameFor( VideoPayloads, i_rOptions.m_Video ), "--video " + i_rOptions.m_Video } );
-  Wanted.push_back( { "AudioPayload", NameFor( AudioPayloads, i_rOptions.m_Audio ), "--audio " + i_rOptions.m_Audio } );
-  return Wanted;
-}
-
 bool SetEnabled( VHostSession& i_rSession, const std::string& i_rURN, bool i_bEnabled )
 {
   const std::string Path = VDeviceSettings::SettingPath( i_rURN, "Enabled" );
@@ -165,22 +86,56 @@ bool SetEnabled( VHostSession& i_rSession, const std::string& i_rURN, bool i_bEn
       } );
 }
 
-// While the device is stopped, so that the next buffer session holds frames of these settings alone.
-int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+bool Set( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, const VWantedSetting& i_rSetting )
 {
+  std::string Error;
+  if( i_rSession.Settings().Set( VDeviceSettings::SettingPath( i_rDevice.m_URN, i_rSetting.m_pKey ), i_rSetting.m_Value, Error ) )
+  {
+    return true;
+  }
+  Complain( i_rSetting.m_Option + ": " + Error );
+  return false;
+}
+
+// The device offers other payloads with another container, and changes one that it no longer offers: both have happened when this is true.
+bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, const VRecordFormat& i_rFormat )
+{
+  return WaitUntil( i_rSession, SettleSeconds,
+    [&]
+    {
+      const auto Payload = i_rSession.Settings().Find( VDeviceSettings::SettingPath( i_rDevice.m_URN, "VideoPayload" ) );
+      return Payload && Payload->m_Allowed == i_rFormat.OfferedVideoPayloads() &&
+        std::count( Payload->m_Allowed.begin(), Payload->m_Allowed.end(), Payload->m_Value ) > 0;
+    } );
+}
+
+// While the device is stopped, so that the next buffer session holds frames of these settings alone.
+int ApplySettings( VHostSession& i_rSession, const VRecordFormat& i_rFormat, const VDeviceInfo& i_rDevice )
+{
+  const std::string Refusal = i_rFormat.WhyRefused( i_rDevice );
+  if( !Refusal.empty() )
+  {
+    Complain( Refusal );
+    return ExitUsage;
+  }
   if( !SetEnabled( i_rSession, i_rDevice.m_URN, false ) )
   {
     Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
     return ExitFailed;
   }
-  for( const VWantedSetting& rSetting : WantedSettings( i_rOptions, i_rDevice ) )
+  if( !Set( i_rSession, i_rDevice, i_rFormat.Container() ) )
   {
-    std::string Error;
-    if( !i_rSession.Settings().Set( VDeviceSettings::SettingPath( i_rDevice.m_URN, rSetting.m_pKey ), rSetting.m_Value, Error ) )
-    {
-      Complain( rSetting.m_Option + ": " + Error );
-      return ExitUsage;
-    }
+    return ExitUsage;
+  }
+  if( !AwaitPayloads( i_rSession, i_rDevice, i_rFormat ) )
+  {
+    Complain( "Device " + i_rDevice.m_URN + " does not take its container." );
+    return ExitFailed;
+  }
+  const std::vector<VWantedSetting> Settings = i_rFormat.Settings( i_rDevice );
+  if( !std::all_of( Settings.begin(), Settings.end(), [&]( const VWantedSetting& i_rSetting ) { return Set( i_rSession, i_rDevice, i_rSetting ); } ) )
+  {
+    return ExitUsage;
   }
   if( !SetEnabled( i_rSession, i_rDevice.m_URN, true ) )
   {
@@ -190,15 +145,12 @@ int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const V
   return ExitComplete;
 }
 
-int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const VRecordFormat& i_rFormat, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VCaptureTargetOptions Targets;
   Targets.m_Folder = i_rOptions.m_Output;
   Targets.m_bOverwrite = i_rOptions.m_bOverwrite;
-  if( i_rOptions.m_bAudioChannels )
-  {
-    Targets.m_AudioChannels = i_rOptions.m_AudioChannels;
-  }
+  i_rFormat.Apply( Targets );
   i_rSession.Host().Targets().Configure( Targets );
   for( const VDeviceInfo& rDevice : i_rDevices )
   {
@@ -288,6 +240,13 @@ int Run( const VOptions& i_rOptions )
     Complain( "record needs one of --seconds S (above 0) and --frames N (2 or more)." );
     return ExitUsage;
   }
+  const VRecordFormat Format( i_rOptions.m_Format );
+  const std::string Refusal = Format.WhyRefused();
+  if( !Refusal.empty() )
+  {
+    Complain( Refusal );
+    return ExitUsage;
+  }
   if( const int Result = CheckOutput( i_rOptions ) )
   {
     return Result;
@@ -304,34 +263,16 @@ int Run( const VOptions& i_rOptions )
   }
   for( const VDeviceInfo& rDevice : Devices )
   {
-    if( const int Result = ApplySettings( Session, i_rOptions, rDevice ) )
+    if( const int Result = ApplySettings( Session, Format, rDevice ) )
     {
       return Result;
     }
   }
-  if( const int Result = CheckTargets( Session, i_rOptions, Devices ) )
+  if( const int Result = CheckTargets( Session, i_rOptions, Format, Devices ) )
   {
     return Result;
   }
   return RunRecording( Session, i_rOptions, Devices );
-}
-
-void AddFormatOptions( CLI::App& io_rCommand, VOptions& io_rOptions )
-{
-  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format" )
-    ->check( CLI::IsMember( WordsOf( Containers ) ) )
-    ->capture_default_str();
-  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload" )
-    ->check( CLI::IsMember( WordsOf( VideoPayloads ) ) )
-    ->capture_default_str();
-  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload" )
-    ->check( CLI::IsMember( WordsOf( AudioPayloads ) ) )
-    ->capture_default_str();
-  io_rCommand.add_option( "--audio-channels", io_rOptions.m_AudioChannels, "Channels to keep" )
-    ->check( WholeNumberCheck( 0.0, 16.0, "a whole number from 0 to 16" ) )
-    ->each( [&io_rOptions]( const std::string& ) { io_rOptions.m_bAudioChannels = true; } );
-  io_rCommand.add_option( "--audio-format", io_rOptions.m_AudioFormat, "Sample format, for example Int16" );
-  io_rCommand.add_option( "--pixel-format", io_rOptions.m_PixelFormat, "Pixel format of the capture buffer, for example U10Y10V10Y10" );
 }
 
 }
@@ -353,7 +294,7 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
   rCommand.add_option( "--pre-roll", pOptions->m_PreRoll, "Begin so many seconds before the request" )
     ->type_name( "S" )
     ->check( NumberCheck( 0.0, LongestPreRoll, "seconds from 0 to 3600" ) );
-  AddFormatOptions( rCommand, *pOptions );
+  AddFormatOptions( rCommand, pOptions->m_Format );
   rCommand.add_option( "--memory", pOptions->m_Session.m_MemoryMiB, "Memory for frames of all devices, in MiB" )
     ->type_name( "MIB" )
     ->check( WholeNumberCheck( static_cast<double>( StageHost::MinimumMemoryMiB ), MostMemoryMiB,

@@ -6,6 +6,7 @@
 #include "apps/stagehost/TextTable.h"
 
 #include <boost/algorithm/string/case_conv.hpp>
+#include <boost/filesystem/path.hpp>
 #include <nlohmann/json.hpp>
 
 #include <cmath>
@@ -40,6 +41,14 @@ const char* StateName( uint32_t i_State )
 std::string ContainerWord( const VCaptureFileReport& i_rFile )
 {
   return boost::to_lower_copy( KVZ::ToName( static_cast<KVZ::IVideoContainer::Enum>( i_rFile.m_Container ) ) );
+}
+
+bool IsSequence( const VCaptureFileReport& i_rFile ) { return i_rFile.m_Container == KVZ::IVideoContainer::EIMAGES; }
+
+// The file, or the folder of an image sequence.
+std::string ShownPath( const VCaptureFileReport& i_rFile )
+{
+  return IsSequence( i_rFile ) ? boost::filesystem::path( i_rFile.m_Path ).parent_path().string() : i_rFile.m_Path;
 }
 
 std::vector<std::string> ErrorsOf( const VDeviceOutcome& i_rOutcome )
@@ -106,7 +115,7 @@ nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::stri
   const VCaptureFileReport* const pFile = i_rOutcome.m_Files.empty() ? nullptr : &i_rOutcome.m_Files.front();
   nlohmann::ordered_json Json = { { "urn", i_rOutcome.m_DeviceURN }, { "name", i_rName } };
   Json["container"] = pFile ? nlohmann::ordered_json( ContainerWord( *pFile ) ) : nullptr;
-  Json["path"] = pFile ? nlohmann::ordered_json( pFile->m_Path ) : nullptr;
+  Json["path"] = pFile ? nlohmann::ordered_json( ShownPath( *pFile ) ) : nullptr;
   Json["frames_requested"] = i_rOutcome.m_FramesRequested;
   Json["frames_captured"] = i_rOutcome.m_FramesCaptured;
   Json["frames_written"] = i_rOutcome.m_FramesWritten;
@@ -208,7 +217,7 @@ void VRecordReport::PrintText( const VDeviceOutcome& i_rOutcome ) const
   std::cout << i_rOutcome.m_DeviceURN << "  " << NameOf( i_rOutcome.m_DeviceURN ) << "\n";
   for( const VCaptureFileReport& rFile : i_rOutcome.m_Files )
   {
-    std::cout << "  file      " << rFile.m_Path << "  (" << BytesToText( rFile.m_Bytes ) << ")\n";
+    std::cout << ( IsSequence( rFile ) ? "  images    " : "  file      " ) << ShownPath( rFile ) << "  (" << BytesToText( rFile.m_Bytes ) << ")\n";
     if( KVZ::IsValid( rFile.m_StartTimecode ) )
     {
       std::cout << "  start     " << KVZ::ToText( rFile.m_StartTimecode ) << "\n";
