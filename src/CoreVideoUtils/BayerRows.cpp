@@ -7,7 +7,7 @@
 #define HWY_TARGET_INCLUDE "CoreVideoUtils/BayerRows.cpp"
 #include <hwy/foreach_target.h>
 
-#include "CoreVideoUtils/PixelVectors-inl.h"
+#include "CoreVideoUtils/PixelWriters-inl.h"
 
 HWY_BEFORE_NAMESPACE();
 namespace CoreVideoUtils

@@ -1,5 +1,7 @@
 #include "CoreVideoUtils/ColourCorrector.h"
 
+#include "CoreVideoUtils/ColourRows.h"
+
 #include <algorithm>
 #include <cmath>
 
@@ -8,6 +10,9 @@ namespace CoreVideoUtils
 
 namespace
 {
+
+// Where every channel that is not the mean is at an end of its range already; what is no number counts as grey.
+constexpr float FurthestFromMean = -65536.0f;
 
 // Limited before it is rounded: a gamma of 0 or below gives infinities and, at 0, no number at all.
 uint8_t ToByte( float i_Value ) { return i_Value > 0.0f ? static_cast<uint8_t>( std::min( i_Value, 255.0f ) + 0.5f ) : uint8_t{ 0 }; }
@@ -42,20 +47,7 @@ void VColourCorrector::Apply( uint8_t* io_pPixels, size_t i_Pixels, size_t i_Byt
   }
   if( m_SaturationOffset != 0.0f )
   {
-    Desaturate( io_pPixels, i_Pixels, i_BytesPerPixel );
-  }
-}
-
-void VColourCorrector::Desaturate( uint8_t* io_pPixels, size_t i_Pixels, size_t i_BytesPerPixel ) const
-{
-  const float Amount = std::min( -m_SaturationOffset, 1.0f );
-  for( uint8_t* pPixel = io_pPixels; pPixel != io_pPixels + i_Pixels * i_BytesPerPixel; pPixel += i_BytesPerPixel )
-  {
-    const float Grey = Amount * static_cast<float>( pPixel[0] + pPixel[1] + pPixel[2] ) * 0.33333334f;
-    for( size_t Channel = 0; Channel < 3; ++Channel )
-    {
-      pPixel[Channel] = ToByte( ( 1.0f - Amount ) * static_cast<float>( pPixel[Channel] ) + Grey );
-    }
+    MoveToMean( std::max( std::min( 1.0f, -m_SaturationOffset ), FurthestFromMean ), io_pPixels, i_Pixels, i_BytesPerPixel );
   }
 }
 

@@ -23,8 +23,6 @@ public:
   void Apply( uint8_t* io_pPixels, size_t i_Pixels, size_t i_BytesPerPixel ) const;
 
 private:
-  void Desaturate( uint8_t* io_pPixels, size_t i_Pixels, size_t i_BytesPerPixel ) const;
-
   float m_Gamma = 1.0f;
   float m_SaturationOffset = 0.0f;   // the record's saturation less 1
   std::array<uint8_t, 256> m_Table{};

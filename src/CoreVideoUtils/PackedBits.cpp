@@ -70,6 +70,11 @@ void Pack( const uint8_t* i_pSource, uint8_t* o_pTarget, size_t i_Pixels )
 template<size_t TBits>
 void Unpack( const uint8_t* i_pSource, uint8_t* o_pTarget, size_t i_Pixels )
 {
+  // Whole words are faster to read than parts of them, and where sixteen pixels are left there are eight bytes.
+  for( ; i_Pixels >= 16; i_Pixels -= 8, i_pSource += TBits, o_pTarget += 8 )
+  {
+    Store( VPacker<TBits>::Spread( Load( i_pSource, 8 ) ), o_pTarget, 8 );
+  }
   for( ; i_Pixels >= 8; i_Pixels -= 8, i_pSource += TBits, o_pTarget += 8 )
   {
     Store( VPacker<TBits>::Spread( Load( i_pSource, TBits ) ), o_pTarget, 8 );

@@ -7,7 +7,8 @@
 #define HWY_TARGET_INCLUDE "CoreVideoUtils/PixelRows.cpp"
 #include <hwy/foreach_target.h>
 
-#include "CoreVideoUtils/PixelVectors-inl.h"
+#include "CoreVideoUtils/PixelReaders-inl.h"
+#include "CoreVideoUtils/PixelWriters-inl.h"
 
 HWY_BEFORE_NAMESPACE();
 namespace CoreVideoUtils

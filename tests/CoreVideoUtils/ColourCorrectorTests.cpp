@@ -76,7 +76,8 @@ TEST( ColourCorrector, SenselessSettingsStayInRange )
   EXPECT_EQ( ( VBytes{ 255, 255, 255 } ), Apply( { 1.0f, -1.0f }, { 0, 100, 255 } ) );   // above 255, held there
   EXPECT_EQ( ( VBytes{ 0, 0, 255 } ), Apply( { 1.0f, 0.0f }, { 0, 100, 255 } ) );
   const float NoNumber = std::numeric_limits<float>::quiet_NaN();
-  EXPECT_EQ( 3U, Apply( { NoNumber, NoNumber }, { 0, 100, 255 } ).size() );
+  EXPECT_EQ( ( VBytes{ 0, 0, 0 } ), Apply( { NoNumber, NoNumber }, { 0, 100, 200 } ) );
+  EXPECT_EQ( ( VBytes{ 0, 0, 255 } ), Apply( { std::numeric_limits<float>::infinity(), 1.0f }, { 0, 100, 255 } ) );
 }
 
 }

@@ -1,3 +1,4 @@
+#include "CoreVideoUtils/ColourRows.h"
 #include "CoreVideoUtils/PixelRows.h"
 #include "CoreVideoUtils/ReferencePixels.h"
 #include "CoreVideoUtils/VectorTargets.h"
@@ -253,6 +254,27 @@ TEST_P( PixelRows, EqualTheReferenceForBayerRows )
       if( HasFatalFailure() )
       {
         return;
+      }
+    }
+  }
+}
+
+TEST_P( PixelRows, EqualTheReferenceInSaturation )
+{
+  std::mt19937 Random( 3 );
+  for( const size_t Width : Widths() )
+  {
+    for( const size_t BytesPerPixel : { 3U, 4U } )
+    {
+      for( const float Amount : { 1.0f, 0.3f, -0.7f, -65536.0f } )
+      {
+        VGuardedBytes Pixels( Width * BytesPerPixel );
+        VGuardedBytes Expected( Pixels.Size() );
+        Fill( Pixels.Data(), Pixels.Size(), Random, false );
+        std::copy_n( Pixels.Data(), Pixels.Size(), Expected.Data() );
+        MoveToMean( Amount, Pixels.Data(), Width, BytesPerPixel );
+        Reference::MoveToMean( Amount, Expected.Data(), Width, BytesPerPixel );
+        ASSERT_TRUE( Pixels == Expected && Pixels.IsFrontWhole() ) << Width << " by " << Amount;
       }
     }
   }
