@@ -1,6 +1,6 @@
 // A data source for devices that deliver frames only when triggered. Its frames have no clock but the counter; a global session begins once
-// the frames of the time before have stopped. The host arms it for the session before that one: it arms the source anew whenever it does, also
-// for the session that the source has asked for itself.
+// the frames of the time before have stopped. Every arming makes it wait again: a host does not arm it for the session that it asks for
+// itself, once it runs.
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
