@@ -13,11 +13,11 @@ namespace
 {
 
 // Its standard output.
-std::string Ask( const std::vector<std::string>& i_rArguments )
+std::string Ask( const std::vector<std::string>& i_rArguments, const std::string& i_rErrorText = {} )
 {
   const VRunResult Run = RunProgram( i_rArguments );
   EXPECT_EQ( Run.m_ExitCode, 0 ) << i_rArguments.front() << ": " << Run.m_Error << Run.m_Output;
-  EXPECT_EQ( Run.m_Error, "" ) << i_rArguments.front();
+  EXPECT_EQ( Run.m_Error, i_rErrorText ) << i_rArguments.front();
   return Run.m_Output;
 }
 
@@ -37,9 +37,10 @@ std::string WithoutQuotes( const std::string& i_rText )
 
 }
 
-std::map<std::string, std::string> AskFFprobe( const std::string& i_rPath )
+std::map<std::string, std::string> AskFFprobe( const std::string& i_rPath, const std::string& i_rErrorText )
 {
-  std::istringstream Lines( Ask( { "ffprobe", "-v", "warning", "-show_format", "-show_streams", "-count_frames", "-of", "flat", i_rPath } ) );
+  std::istringstream Lines(
+    Ask( { "ffprobe", "-v", "warning", "-show_format", "-show_streams", "-count_frames", "-of", "flat", i_rPath }, i_rErrorText ) );
   std::map<std::string, std::string> Answers;
   for( std::string Line; std::getline( Lines, Line ); )
   {

@@ -9,9 +9,9 @@
 namespace TestSupport
 {
 
-// All that ffprobe tells of format and streams, frames counted: "streams.stream.0.width" and so on, texts without quotes. A line on its
-// standard error, a warning included, is a failed check.
-std::map<std::string, std::string> AskFFprobe( const std::string& i_rPath );
+// All that ffprobe tells of format and streams, frames counted: "streams.stream.0.width" and so on, texts without quotes. Anything on its
+// standard error but the text given here, a warning included, is a failed check.
+std::map<std::string, std::string> AskFFprobe( const std::string& i_rPath, const std::string& i_rErrorText = {} );
 
 // The frames of the first video stream as ffmpeg decodes them, in one of its pixel formats, and the samples of the first audio stream, in one
 // of its raw formats ("s16le").

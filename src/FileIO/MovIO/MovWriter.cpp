@@ -329,12 +329,13 @@ bool VMovWriter::DoClose()
 }
 
 // They begin behind the last frame that is whole, over what a failed write has left there.
-bool VMovWriter::WriteTables( VMovPrimitiveWriter& io_rOut, uint64_t i_FileEnd ) const
+bool VMovWriter::WriteTables( VMovPrimitiveWriter& io_rOut, uint64_t i_FileEnd )
 {
   const bool bMdat = PatchMdatSize( io_rOut, m_Movie, m_End );
-  const bool bMoov = WriteMoov( io_rOut, m_Movie );
+  const bool bMoov = WriteMoov( io_rOut, m_Movie ) && bMdat && io_rOut.Flush();
+  m_IncompleteFrames = bMoov ? 0 : m_Movie.m_Frames.size();
   const bool bTmsl = WriteTmsl( io_rOut, m_Movie );
-  return bMdat && bMoov && bTmsl && WriteFree( io_rOut, i_FileEnd );
+  return bMoov && bTmsl && WriteFree( io_rOut, i_FileEnd );
 }
 
 }

@@ -29,6 +29,8 @@ public:
 
   const KVZ::IVideoWriterCapabilities& GetCapabilities() const override { return m_Capabilities; }
   bool IsOpen() const override { return m_pStream != nullptr; }
+  // All, if the tables could not be written: nothing finds a frame without them.
+  uint64_t CountIncompleteFrames() const override { return m_IncompleteFrames; }
 
   // For a stream that is H.264 already. The parameter sets come without start code or length, 65535 bytes at most. The first must stay the same
   // once it is set. The second belongs behind the header of such a file, and is stored before every frame that follows.
@@ -54,7 +56,7 @@ private:
   uint64_t CollectAudio( const VSpans& i_rAudio );
   bool HasSizeOfFirst( uint64_t i_Size ) const;
   bool HasRoom( uint64_t i_AudioSamples ) const;
-  bool WriteTables( VMovPrimitiveWriter& io_rOut, uint64_t i_FileEnd ) const;
+  bool WriteTables( VMovPrimitiveWriter& io_rOut, uint64_t i_FileEnd );
 
   const VWriterCapabilities m_Capabilities;
   const KVZ::IVideoContainer::Enum m_Container;
@@ -65,6 +67,7 @@ private:
   std::unique_ptr<VMovPrimitiveWriter> m_pOut;   // on it
   VMovie m_Movie;
   uint64_t m_End = 0;   // of the media data: behind the last frame that is whole
+  uint64_t m_IncompleteFrames = 0;
   std::vector<uint8_t> m_FramePrefix;
   VSpans m_Spans;   // of one frame; both kept for their memory
 };

@@ -276,6 +276,33 @@ TEST_F( MovWriter, FramesThatAreNotWhatTheFileSaysAreRefused )
   EXPECT_EQ( Movie.Parse().Track( "vide" ).m_Samples.size(), 1u );
 }
 
+TEST_F( MovWriter, ImagesThatDoNotBeginAsTheyShouldAreRefused )
+{
+  const std::pair<IVideoPayload::Enum, std::string> Beginnings[] = { { IVideoPayload::EImageJPEG, "\xFF\xD8\xFF" },
+    { IVideoPayload::EImagePNG, "\x89PNG\r\n\x1A\n" }, { IVideoPayload::EImageTIFF, std::string( "II\x2A\x00", 4 ) } };
+  for( const auto& [Payload, Beginning] : Beginnings )
+  {
+    SCOPED_TRACE( ToName( Payload ) );
+    VMovieSettings Settings = VMovieSettings::Silent();
+    Settings.m_VideoPayload = Payload;
+    VSmallMovie Movie( Settings );
+    ASSERT_TRUE( Movie.Start() );
+    const auto Write = [&]( const std::string& i_rImage ) {
+      return Movie.m_Writer.WriteStoredFrame( { { i_rImage.data(), i_rImage.size() } }, {}, 'I' );
+    };
+    EXPECT_TRUE( Write( Beginning ) );
+    EXPECT_TRUE( Write( Beginning + "more" ) );
+    std::string Wrong = Beginning;
+    Wrong.back() ^= 1;
+    EXPECT_FALSE( Write( Wrong ) );
+    EXPECT_TRUE( Write( Wrong.substr( 0, Wrong.size() - 1 ) ) );   // too short to tell
+    EXPECT_TRUE( Movie.m_Writer.Close() );
+    const auto Parser = Movie.Parse();
+    ASSERT_EQ( Parser.Track( "vide" ).m_Samples.size(), 3u );
+    EXPECT_EQ( Parser.Bytes( Parser.Track( "vide" ).m_Samples[1] ), Bytes( Beginning + "more" ) );
+  }
+}
+
 // The limit of 32 bits is reached after hours with usual frame rates; here each frame lasts almost three seconds of a fine timescale.
 TEST_F( MovWriter, AFileThatIsFullSaysWhichLimitItHasReached )
 {
