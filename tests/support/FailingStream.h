@@ -16,14 +16,15 @@ struct VFault
   static constexpr uint64_t Never = std::numeric_limits<uint64_t>::max();
 
   uint64_t m_Offset = Never;      // nothing can be stored at this offset and behind it: the disk is full
-  uint64_t m_Operation = Never;   // this operation (write, seek, tell or close, counted from 0) fails, later ones work again
+  uint64_t m_Operation = Never;   // this operation (write, seek, tell or close, counted from 0) fails, later ones work again; streams that
+                                  // are given the same count of operations count together
 };
 
 class VFailingStream : public UtilsIO::IClosableStream
 {
 public:
-  VFailingStream( std::unique_ptr<UtilsIO::IClosableStream> i_pStream, const VFault& i_rFault, uint64_t* o_pOperations = nullptr )
-    : m_pStream( std::move( i_pStream ) ), m_Fault( i_rFault ), m_pOperations( o_pOperations )
+  VFailingStream( std::unique_ptr<UtilsIO::IClosableStream> i_pStream, const VFault& i_rFault, uint64_t* io_pOperations = nullptr )
+    : m_pStream( std::move( i_pStream ) ), m_Fault( i_rFault ), m_pOperations( io_pOperations ? io_pOperations : &m_Operations )
   {
   }
 
@@ -53,20 +54,12 @@ public:
   bool Close() override { return !IsFault() && m_pStream->Close(); }
 
 private:
-  bool IsFault()
-  {
-    const bool bFault = m_Operation++ == m_Fault.m_Operation;
-    if( m_pOperations )
-    {
-      *m_pOperations = m_Operation;
-    }
-    return bFault;
-  }
+  bool IsFault() { return ( *m_pOperations )++ == m_Fault.m_Operation; }
 
   const std::unique_ptr<UtilsIO::IClosableStream> m_pStream;
   const VFault m_Fault;
+  uint64_t m_Operations = 0;
   uint64_t* const m_pOperations;
-  uint64_t m_Operation = 0;
   bool m_bGood = true;
 };
 

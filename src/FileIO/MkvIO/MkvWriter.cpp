@@ -121,7 +121,7 @@ bool VMkvWriter::EncodeAttributes( const WriterSupport::VHeader& i_rHeader, KVZ:
 
 bool VMkvWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
 {
-  if( io_rFrame.m_Key != AnyKey && io_rFrame.m_Key != m_pSegment->GetFrameCount() )
+  if( io_rFrame.m_Key != AppendKey && io_rFrame.m_Key != m_pSegment->GetFrameCount() )
   {
     KVZ_LOG_ERROR( Category(), "Frame %1% cannot be written: the next one is %2%.", io_rFrame.m_Key, m_pSegment->GetFrameCount() );
     return false;

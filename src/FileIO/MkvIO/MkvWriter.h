@@ -18,12 +18,12 @@ class VSegment;
 using VWriterCapabilities = KVZ::VContainerCapabilities<KVZ::IVideoContainer::EMKV>;
 
 // A frame is in the file when its call returns; a file that was never closed is read up to its last whole frame. A frame key is the number of
-// the frames before it, or AnyKey. A failed write refuses all further frames and makes Close give false; Close still writes the tables over
+// the frames before it, or AppendKey. A failed write refuses all further frames and makes Close give false; Close still writes the tables over
 // the frames that are whole, if it can.
 class VMkvWriter : public WriterSupport::VWriterBase
 {
 public:
-  static constexpr uint64_t AnyKey = ~uint64_t{ 0 };
+  static constexpr uint64_t AppendKey = ~uint64_t{ 0 };
 
   // Without an encoder the writer makes its own, with the software converter.
   explicit VMkvWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder = {},

@@ -176,7 +176,7 @@ TEST( MkvWriterFailures, AKilledProcessLosesNoFrameThatItHasWritten )
       {
         VBufferList Video = Image;
         VBufferList Audio = Sound;
-        bGood = Writer.WriteFrame( Video, Description.m_Video, Audio, SmallAudio, VMkvWriter::AnyKey ) && write( Ends[1], "", 1 ) == 1;
+        bGood = Writer.WriteFrame( Video, Description.m_Video, Audio, SmallAudio, VMkvWriter::AppendKey ) && write( Ends[1], "", 1 ) == 1;
       }
       _exit( 1 );
     }

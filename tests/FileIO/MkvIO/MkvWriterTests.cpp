@@ -227,7 +227,7 @@ TEST_F( MkvWriter, FramesInPiecesAreJoinedAndWrongOnesRefused )
       Video.push_back( Buffer( Text( rPiece ) ) );
     }
     VBufferList Audio = { Buffer( Text( "ab" ) ), Buffer( Text( "" ) ), Buffer( Text( "cd" ) ) };
-    return m_Movie.m_Writer.WriteFrame( Video, i_rInfo, Audio, SmallAudio, VMkvWriter::AnyKey );
+    return m_Movie.m_Writer.WriteFrame( Video, i_rInfo, Audio, SmallAudio, VMkvWriter::AppendKey );
   };
   EXPECT_TRUE( Write( { "AB", "C", "", "D" } ) );
   EXPECT_FALSE( Write( { "AB", "CDE" } ) );

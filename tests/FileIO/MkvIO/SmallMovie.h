@@ -69,7 +69,7 @@ struct VSmallMovie
 
   bool Begin( const VDescription& i_rDescription = {} ) { return m_Writer.Open( "memory" ) && i_rDescription.WriteHeader( m_Writer ); }
 
-  bool WriteFrame( const std::string& i_rVideo, const std::string& i_rAudio, uint64_t i_Key = VMkvWriter::AnyKey )
+  bool WriteFrame( const std::string& i_rVideo, const std::string& i_rAudio, uint64_t i_Key = VMkvWriter::AppendKey )
   {
     return m_Writer.WriteFrame( KVZ::VFrameSet{ Buffer( Text( i_rVideo ) ), VideoInfo(), { Buffer( Text( i_rAudio ) ) }, SmallAudio }, i_Key );
   }

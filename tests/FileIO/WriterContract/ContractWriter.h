@@ -1,0 +1,107 @@
+// The writers of all containers, one row each, and what their common tests need: a writer into memory and frames that suit it.
+#pragma once
+
+#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "FileIO/WriterSupport/WatchedStream.h"
+#include "tests/support/FailingStream.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include "Core/VideoInterface/VideoWriter.h"
+
+#include <gtest/gtest.h>
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace WriterContract
+{
+
+using VBytes = std::vector<uint8_t>;
+
+constexpr uint64_t AppendKey = ~uint64_t{ 0 };
+
+enum class EKeys
+{
+  Any,        // every number is a key
+  Counting,   // the number of the frames before it, or AppendKey
+  Set         // every number but AppendKey
+};
+
+struct VWriterRow
+{
+  using VMaker = std::shared_ptr<KVZ::IVideoWriter> ( * )( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder,
+    WriterSupport::VStreamMaker i_StreamMaker );
+
+  const char* m_pName;
+  const char* m_pCategory;
+  VMaker m_Make;
+  EKeys m_Keys = EKeys::Counting;
+  bool m_bTellsFailedOpen = true;
+  // What the recordings of the tests are
+  KVZ::IVideoPayload::Enum m_Payload = KVZ::IVideoPayload::EUncompressed;
+  KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EU8Y8V8Y8;
+  bool m_bAudio = true;
+  bool m_bOneFile = true;   // otherwise a file a frame, none of which stays open
+};
+
+extern const std::vector<VWriterRow> Writers;
+
+void PrintTo( const VWriterRow& i_rRow, std::ostream* o_pText );
+
+// What WriteHeader is given.
+struct VHeaderArguments
+{
+  explicit VHeaderArguments( const VWriterRow& i_rRow );
+
+  bool WriteTo( KVZ::IVideoWriter& io_rWriter ) const;
+
+  KVZ::VideoFrameInfo m_Video;
+  KVZ::AudioFrameInfo m_Audio;
+  KVZ::IVideoPayload::Enum m_VideoPayload;
+  KVZ::IAudioPayload::Enum m_AudioPayload;
+};
+
+// A writer of a row. All its files are in memory, each with its name, and all fail together where the fault is.
+class VContractWriter
+{
+public:
+  explicit VContractWriter( const VWriterRow& i_rRow, const TestSupport::VFault& i_rFault = {} );
+
+  KVZ::IVideoWriter& Writer() { return *m_pWriter; }
+  const std::map<std::string, std::shared_ptr<VBytes>>& Files() const { return m_Files; }
+  uint64_t Operations() const { return m_Operations; }
+  const VHeaderArguments& Header() const { return m_Header; }
+
+  bool Open() { return m_pWriter->Open( m_Folder.File( m_pFileName ) ); }
+  bool Begin() { return Open() && m_Header.WriteTo( *m_pWriter ); }
+
+  // Picture and sound of a frame's number, alike in every run.
+  VBytes Picture( uint64_t i_Frame ) const;
+  VBytes Sound( uint64_t i_Frame ) const;
+  bool WriteFrame( uint64_t i_Frame, uint64_t i_Key );
+  bool WriteFrame( uint64_t i_Frame ) { return WriteFrame( i_Frame, i_Frame ); }
+
+  // Whether these bytes lie somewhere in a file, one after another.
+  bool Holds( const VBytes& i_rBytes ) const;
+
+private:
+  const char* const m_pFileName = "movie%FRAME%";
+  const TestSupport::VTemporaryFolder m_Folder;
+  const VHeaderArguments m_Header;
+  std::map<std::string, std::shared_ptr<VBytes>> m_Files;
+  uint64_t m_Operations = 0;
+  std::shared_ptr<KVZ::IVideoWriter> m_pWriter;
+};
+
+std::shared_ptr<const KVZ::IBufferConst> Buffer( const VBytes& i_rBytes );
+
+class WriterContract : public testing::TestWithParam<VWriterRow>
+{
+protected:
+  const TestSupport::VLogCapture m_Log{ GetParam().m_pCategory };
+};
+
+}

@@ -1,0 +1,166 @@
+// Frames: their keys, their pieces, their sound, and what becomes of them when the stream fails.
+#include "tests/FileIO/WriterContract/ContractWriter.h"
+
+using namespace KVZ;
+
+namespace WriterContract
+{
+
+namespace
+{
+
+constexpr uint64_t Frames = 3;
+
+// In pieces of different sizes, one of them empty.
+VBufferList Pieces( const VBytes& i_rBytes )
+{
+  const auto Middle = i_rBytes.begin() + static_cast<std::ptrdiff_t>( i_rBytes.size() / 3 );
+  return { Buffer( { i_rBytes.begin(), Middle } ), Buffer( {} ), Buffer( { Middle, i_rBytes.end() } ) };
+}
+
+}
+
+TEST_P( WriterContract, KeysAreWhatTheContainerTakes )
+{
+  VContractWriter Contract( GetParam() );
+  ASSERT_TRUE( Contract.Begin() );
+  const bool bCounting = GetParam().m_Keys == EKeys::Counting;
+  EXPECT_EQ( Contract.WriteFrame( 0, 5 ), !bCounting );
+  EXPECT_TRUE( Contract.WriteFrame( 0, 0 ) );
+  EXPECT_EQ( Contract.WriteFrame( 1, AppendKey ), GetParam().m_Keys != EKeys::Set );
+  EXPECT_EQ( Contract.WriteFrame( 2, 3 ), !bCounting );
+  EXPECT_TRUE( Contract.WriteFrame( 2, 2 ) );
+  EXPECT_EQ( Contract.WriteFrame( 2, 1 ), !bCounting );
+  EXPECT_TRUE( Contract.Writer().Close() );
+}
+
+TEST_P( WriterContract, PiecesMakeTheSameFrame )
+{
+  VContractWriter Contract( GetParam() );
+  VContractWriter InOne( GetParam() );
+  ASSERT_TRUE( Contract.Begin() && InOne.Begin() );
+  const VHeaderArguments& rHeader = Contract.Header();
+  for( uint64_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    VBufferList Video = Pieces( Contract.Picture( Frame ) );
+    // A buffer of sound never ends within a sample
+    VBufferList Audio = { Buffer( Contract.Sound( Frame ) ), Buffer( {} ), Buffer( Contract.Sound( Frame + 50 ) ) };
+    ASSERT_TRUE( Contract.Writer().WriteFrame( Video, rHeader.m_Video, Audio, rHeader.m_Audio, Frame ) );
+    ASSERT_TRUE( InOne.WriteFrame( Frame ) );
+  }
+  EXPECT_TRUE( Contract.Writer().Close() && InOne.Writer().Close() );
+  for( uint64_t Frame = 0; Frame < Frames && GetParam().m_bOneFile; ++Frame )
+  {
+    EXPECT_TRUE( Contract.Holds( Contract.Picture( Frame ) ) );
+    EXPECT_TRUE( Contract.Holds( Contract.Sound( Frame ) ) );
+    EXPECT_TRUE( Contract.Holds( Contract.Sound( Frame + 50 ) ) );
+  }
+  EXPECT_EQ( Contract.Files().size(), InOne.Files().size() );
+  for( const auto& rFile : InOne.Files() )
+  {
+    EXPECT_TRUE( GetParam().m_bOneFile || Contract.Holds( *rFile.second ) );
+  }
+}
+
+TEST_P( WriterContract, FramesOfAnotherSizeAreRefused )
+{
+  VContractWriter Contract( GetParam() );
+  ASSERT_TRUE( Contract.Begin() );
+  const auto Write = [&]( const VBytes& i_rPicture, const VideoFrameInfo& i_rInfo )
+  {
+    VBufferList Video = { Buffer( i_rPicture ) };
+    VBufferList Audio;
+    return Contract.Writer().WriteFrame( Video, i_rInfo, Audio, Contract.Header().m_Audio, 0 );
+  };
+  const VideoFrameInfo& rInfo = Contract.Header().m_Video;
+  const VBytes Picture = Contract.Picture( 0 );
+  EXPECT_FALSE( Write( VBytes( Picture.begin(), Picture.end() - 1 ), rInfo ) );
+  if( GetParam().m_bOneFile )
+  {
+    VideoFrameInfo Turned = rInfo;
+    std::swap( Turned.m_ImageWidth, Turned.m_ImageHeight );
+    EXPECT_FALSE( Write( Picture, Turned ) );
+  }
+  VBufferList Nothing;
+  VBufferList Silence;
+  EXPECT_FALSE( Contract.Writer().WriteFrame( Nothing, rInfo, Silence, {}, 0 ) );
+  EXPECT_TRUE( Contract.WriteFrame( 0 ) ) << "what was refused has spoilt nothing";
+  EXPECT_TRUE( Contract.Writer().Close() );
+}
+
+TEST_P( WriterContract, SoundHasTheHeadersChannels )
+{
+  if( !GetParam().m_bAudio )
+  {
+    return;
+  }
+  VContractWriter Contract( GetParam() );
+  ASSERT_TRUE( Contract.Begin() );
+  const auto Write = [&]( uint32_t i_Channels, const VBytes& i_rSound )
+  {
+    VBufferList Video = { Buffer( Contract.Picture( 0 ) ) };
+    VBufferList Audio = { Buffer( i_rSound ) };
+    return Contract.Writer().WriteFrame( Video, Contract.Header().m_Video, Audio, { IAudioSampleFormat::EInt16, 48000, i_Channels }, 0 );
+  };
+  EXPECT_FALSE( Write( 1, { 1, 2, 3, 4 } ) );
+  EXPECT_TRUE( Write( 4, { 0xA1, 0xA2, 0xB1, 0xB2, 9, 9, 9, 9, 0xA3, 0xA4, 0xB3, 0xB4, 9, 9, 9, 9 } ) );
+  EXPECT_TRUE( Contract.Writer().Close() );
+  EXPECT_TRUE( Contract.Holds( { 0xA1, 0xA2, 0xB1, 0xB2, 0xA3, 0xA4, 0xB3, 0xB4 } ) );
+}
+
+TEST_P( WriterContract, NoFailureOfTheStreamIsForgotten )
+{
+  struct VResult
+  {
+    bool m_bFailed = false;
+    bool m_bWrittenLater = false;
+    bool m_bClosed = false;
+  };
+  const auto Run = []( VContractWriter& io_rContract )
+  {
+    VResult Result;
+    Result.m_bFailed = !io_rContract.Begin();
+    for( uint64_t Frame = 0; Frame < Frames; ++Frame )
+    {
+      const bool bWritten = io_rContract.WriteFrame( Frame );
+      Result.m_bWrittenLater = Result.m_bWrittenLater || ( Result.m_bFailed && bWritten );
+      Result.m_bFailed = Result.m_bFailed || !bWritten;
+    }
+    Result.m_bClosed = io_rContract.Writer().Close();
+    return Result;
+  };
+  VContractWriter Whole( GetParam() );
+  ASSERT_TRUE( Run( Whole ).m_bClosed );
+  for( uint64_t Operation = 0; Operation < Whole.Operations(); ++Operation )
+  {
+    SCOPED_TRACE( Operation );
+    VContractWriter Contract( GetParam(), { .m_Operation = Operation } );
+    const VResult Result = Run( Contract );
+    EXPECT_TRUE( Result.m_bFailed || !Result.m_bClosed );
+    EXPECT_FALSE( Contract.Writer().IsOpen() );
+    EXPECT_TRUE( !GetParam().m_bOneFile || ( !Result.m_bWrittenLater && !Result.m_bClosed ) );
+  }
+}
+
+TEST_P( WriterContract, AFullDiskIsReported )
+{
+  VContractWriter Whole( GetParam() );
+  ASSERT_TRUE( Whole.Begin() && Whole.WriteFrame( 0 ) && Whole.WriteFrame( 1 ) && Whole.Writer().Close() );
+  size_t Longest = 0;
+  for( const auto& rFile : Whole.Files() )
+  {
+    Longest = std::max( Longest, rFile.second->size() );
+  }
+  constexpr size_t Places = 200;
+  for( uint64_t Offset = 0; Offset < Longest; Offset += Longest / Places + 1 )
+  {
+    SCOPED_TRACE( Offset );
+    VContractWriter Contract( GetParam(), { .m_Offset = Offset } );
+    const bool bWritten = Contract.Begin() && Contract.WriteFrame( 0 ) && Contract.WriteFrame( 1 );
+    const bool bClosed = Contract.Writer().Close();
+    EXPECT_FALSE( bWritten && bClosed );
+    EXPECT_TRUE( !GetParam().m_bOneFile || !bClosed );
+  }
+}
+
+}
