@@ -34,13 +34,10 @@ using KVZ::IPixelFormat;
 
 // Our time over theirs. Both sides move bytes as fast as the memory gives them where there is nothing to compute: those are as fast as one
 // another within what disturbs them.
-struct VBound
-{
-  static constexpr double AsFast = 1.0;
-  static constexpr double AsFastAsMemory = 1.1;
-  static constexpr double TwiceAsFast = 1 / 2.0;
-  static constexpr double FiveTimesAsFast = 1 / 5.0;
-};
+[[maybe_unused]] constexpr double AsFast = 1.0;
+[[maybe_unused]] constexpr double AsFastAsMemory = 1.1;
+[[maybe_unused]] constexpr double TwiceAsFast = 1 / 2.0;
+[[maybe_unused]] constexpr double FiveTimesAsFast = 1 / 5.0;
 
 constexpr int Width = 1920;
 constexpr int Height = 1080;
@@ -140,12 +137,12 @@ std::vector<VComparison> LibyuvComparisons()
     { i_pFunction( io_rFrames.m_Source.data(), Width * i_SourceBytes, io_rFrames.m_Target.data(), Width * i_TargetBytes, Width, Height ); };
   };
   return {
-    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EB8G8R8u8, "libyuv", VBound::AsFast, Call( &libyuv::UYVYToARGB, 2, 4 ) },
-    { IPixelFormat::EY8U8Y8V8, IPixelFormat::EB8G8R8u8, "libyuv", VBound::AsFast, Call( &libyuv::YUY2ToARGB, 2, 4 ) },
-    { IPixelFormat::EB8G8R8u8, IPixelFormat::EU8Y8V8Y8, "libyuv", VBound::AsFast, Call( &libyuv::ARGBToUYVY, 4, 2 ) },
-    { IPixelFormat::EB8G8R8, IPixelFormat::EB8G8R8u8, "libyuv", VBound::AsFastAsMemory, Call( &libyuv::RGB24ToARGB, 3, 4 ) },
-    { IPixelFormat::EB8G8R8u8, IPixelFormat::EB8G8R8, "libyuv", VBound::AsFastAsMemory, Call( &libyuv::ARGBToRGB24, 4, 3 ) },
-    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ELuminance8, "libyuv", VBound::AsFastAsMemory, Call( &libyuv::UYVYToY, 2, 1 ) },
+    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EB8G8R8u8, "libyuv", AsFast, Call( &libyuv::UYVYToARGB, 2, 4 ) },
+    { IPixelFormat::EY8U8Y8V8, IPixelFormat::EB8G8R8u8, "libyuv", AsFast, Call( &libyuv::YUY2ToARGB, 2, 4 ) },
+    { IPixelFormat::EB8G8R8u8, IPixelFormat::EU8Y8V8Y8, "libyuv", AsFast, Call( &libyuv::ARGBToUYVY, 4, 2 ) },
+    { IPixelFormat::EB8G8R8, IPixelFormat::EB8G8R8u8, "libyuv", AsFastAsMemory, Call( &libyuv::RGB24ToARGB, 3, 4 ) },
+    { IPixelFormat::EB8G8R8u8, IPixelFormat::EB8G8R8, "libyuv", AsFastAsMemory, Call( &libyuv::ARGBToRGB24, 4, 3 ) },
+    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ELuminance8, "libyuv", AsFastAsMemory, Call( &libyuv::UYVYToY, 2, 1 ) },
   };
 }
 #endif
@@ -176,14 +173,13 @@ std::function<void( VFrames& )> Scaler( AVPixelFormat i_Source, AVPixelFormat i_
 std::vector<VComparison> ScalerComparisons()
 {
   return {
-    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8, "libswscale", VBound::FiveTimesAsFast, Scaler( AV_PIX_FMT_UYVY422, AV_PIX_FMT_RGB24 ) },
-    { IPixelFormat::EY8U8Y8V8, IPixelFormat::EB8G8R8, "libswscale", VBound::FiveTimesAsFast, Scaler( AV_PIX_FMT_YUYV422, AV_PIX_FMT_BGR24 ) },
-    { IPixelFormat::ER8G8B8, IPixelFormat::EU8Y8V8Y8, "libswscale", VBound::FiveTimesAsFast, Scaler( AV_PIX_FMT_RGB24, AV_PIX_FMT_UYVY422 ) },
-    { IPixelFormat::ER8G8B8, IPixelFormat::EY8U8Y8V8, "libswscale", VBound::FiveTimesAsFast, Scaler( AV_PIX_FMT_RGB24, AV_PIX_FMT_YUYV422 ) },
+    { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8, "libswscale", FiveTimesAsFast, Scaler( AV_PIX_FMT_UYVY422, AV_PIX_FMT_RGB24 ) },
+    { IPixelFormat::EY8U8Y8V8, IPixelFormat::EB8G8R8, "libswscale", FiveTimesAsFast, Scaler( AV_PIX_FMT_YUYV422, AV_PIX_FMT_BGR24 ) },
+    { IPixelFormat::ER8G8B8, IPixelFormat::EU8Y8V8Y8, "libswscale", FiveTimesAsFast, Scaler( AV_PIX_FMT_RGB24, AV_PIX_FMT_UYVY422 ) },
+    { IPixelFormat::ER8G8B8, IPixelFormat::EY8U8Y8V8, "libswscale", FiveTimesAsFast, Scaler( AV_PIX_FMT_RGB24, AV_PIX_FMT_YUYV422 ) },
     // It reads the same samples from planes, so its side has no unpacking to do.
-    { IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8, "libswscale from planes", VBound::TwiceAsFast,
-      Scaler( AV_PIX_FMT_YUV422P10LE, AV_PIX_FMT_RGB24 ) },
-    { IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8, "libswscale from planes", VBound::TwiceAsFast,
+    { IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8, "libswscale from planes", TwiceAsFast, Scaler( AV_PIX_FMT_YUV422P10LE, AV_PIX_FMT_RGB24 ) },
+    { IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8, "libswscale from planes", TwiceAsFast,
       Scaler( AV_PIX_FMT_YUV422P10LE, AV_PIX_FMT_BGRA ) },
   };
 }
@@ -199,7 +195,7 @@ std::vector<VComparison> OpenCVComparisons()
     cv::Mat Target( Height, Width, CV_8UC3, io_rFrames.m_Target.data() );
     cv::cvtColor( Source, Target, cv::COLOR_BayerBG2RGB_EA );
   };
-  return { { IPixelFormat::EBayerRG8, IPixelFormat::ER8G8B8, "OpenCV, edge-aware", VBound::AsFast, EdgeAware } };
+  return { { IPixelFormat::EBayerRG8, IPixelFormat::ER8G8B8, "OpenCV, edge-aware", AsFast, EdgeAware } };
 }
 #endif
 
