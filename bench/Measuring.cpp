@@ -1,5 +1,6 @@
 #include "bench/Measuring.h"
 
+#include <malloc.h>
 #include <time.h>
 
 #include <algorithm>
@@ -14,6 +15,8 @@ namespace
 constexpr int64_t NanosecondsPerSecond = 1000000000;
 
 std::atomic<uint64_t> s_Allocations{ 0 };
+std::atomic<uint64_t> s_HeapBytes{ 0 };
+std::atomic<uint64_t> s_PeakHeapBytes{ 0 };
 
 void* CountedAllocation( void* i_pMemory )
 {
@@ -22,7 +25,19 @@ void* CountedAllocation( void* i_pMemory )
   {
     throw std::bad_alloc();
   }
+  const uint64_t Size = malloc_usable_size( i_pMemory );
+  const uint64_t Now = s_HeapBytes.fetch_add( Size, std::memory_order_relaxed ) + Size;
+  uint64_t Peak = s_PeakHeapBytes.load( std::memory_order_relaxed );
+  while( Now > Peak && !s_PeakHeapBytes.compare_exchange_weak( Peak, Now, std::memory_order_relaxed ) )
+  {
+  }
   return i_pMemory;
+}
+
+void Free( void* i_pMemory )
+{
+  s_HeapBytes.fetch_sub( malloc_usable_size( i_pMemory ), std::memory_order_relaxed );
+  std::free( i_pMemory );
 }
 
 int64_t ReadNanoseconds( clockid_t i_Clock )
@@ -43,13 +58,13 @@ void* operator new( size_t i_Size, std::align_val_t i_Alignment )
   return CountedAllocation( std::aligned_alloc( Alignment, ( i_Size + Alignment - 1 ) / Alignment * Alignment ) );
 }
 
-void operator delete( void* i_pMemory ) noexcept { std::free( i_pMemory ); }
+void operator delete( void* i_pMemory ) noexcept { Free( i_pMemory ); }
 
-void operator delete( void* i_pMemory, size_t ) noexcept { std::free( i_pMemory ); }
+void operator delete( void* i_pMemory, size_t ) noexcept { Free( i_pMemory ); }
 
-void operator delete( void* i_pMemory, std::align_val_t ) noexcept { std::free( i_pMemory ); }
+void operator delete( void* i_pMemory, std::align_val_t ) noexcept { Free( i_pMemory ); }
 
-void operator delete( void* i_pMemory, size_t, std::align_val_t ) noexcept { std::free( i_pMemory ); }
+void operator delete( void* i_pMemory, size_t, std::align_val_t ) noexcept { Free( i_pMemory ); }
 
 double Median( std::vector<double> i_Values )
 {
@@ -71,6 +86,12 @@ double ProcessorSeconds() { return static_cast<double>( ReadNanoseconds( CLOCK_P
 double ThreadSeconds() { return static_cast<double>( ReadNanoseconds( CLOCK_THREAD_CPUTIME_ID ) ) * 1e-9; }
 
 uint64_t CountAllocations() { return s_Allocations.load( std::memory_order_relaxed ); }
+
+uint64_t CountHeapBytes() { return s_HeapBytes.load( std::memory_order_relaxed ); }
+
+uint64_t CountPeakHeapBytes() { return s_PeakHeapBytes.load( std::memory_order_relaxed ); }
+
+void ResetPeakHeapBytes() { s_PeakHeapBytes.store( CountHeapBytes(), std::memory_order_relaxed ); }
 
 int64_t NowNanoseconds() { return ReadNanoseconds( CLOCK_MONOTONIC ); }
 

@@ -1,4 +1,4 @@
-// Medians, processor time and counted allocations.
+// Medians, processor time, counted allocations and their bytes.
 #pragma once
 
 #include <cstdint>
@@ -15,6 +15,12 @@ double ThreadSeconds();
 
 // Calls of operator new in this process so far, all threads.
 uint64_t CountAllocations();
+
+// Bytes that operator new has given out and that are not freed, with what the allocator adds to round them up; and the most there were at
+// once since the last reset.
+uint64_t CountHeapBytes();
+uint64_t CountPeakHeapBytes();
+void ResetPeakHeapBytes();
 
 // Nanoseconds of the monotonic clock.
 int64_t NowNanoseconds();
