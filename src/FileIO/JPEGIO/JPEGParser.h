@@ -21,6 +21,7 @@ constexpr uint8_t StartOfScan = 0xDA;
 constexpr uint8_t Application0 = 0xE0;
 }
 
+// Packed: copy its fields, take no reference to them.
 #pragma pack( push, 1 )
 struct VJPEGSegment
 {

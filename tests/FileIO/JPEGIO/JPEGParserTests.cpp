@@ -47,6 +47,10 @@ VBytes MakeJPEG( int i_Width, int i_Height, int i_Subsampling, int i_Flags )
   return Image;
 }
 
+// The records are packed, so their fields cannot be referred to, which the checks below would do.
+uint64_t PositionOf( const VJPEGSegment& i_rSegment ) { return i_rSegment.m_Position; }
+uint64_t LengthOf( const VJPEGSegment& i_rSegment ) { return i_rSegment.m_Length; }
+
 std::string Markers( const std::vector<VJPEGSegment>& i_rSegments )
 {
   std::string Text;
@@ -74,7 +78,7 @@ protected:
     uint64_t End = 0;
     for( const VJPEGSegment& rSegment : m_Segments )
     {
-      EXPECT_GE( rSegment.m_Position, End );
+      EXPECT_GE( PositionOf( rSegment ), End );
       End = rSegment.m_Position + rSegment.m_Length;
       ASSERT_LE( End, i_rImage.size() );
       EXPECT_EQ( i_rImage[rSegment.m_Position], 0xFF );
@@ -95,9 +99,9 @@ TEST_F( JPEGParser, ListsWhatTurboJPEGWrites )
   ASSERT_TRUE( Parse( Colour ) );
   EXPECT_EQ( Markers( m_Segments ), "D8 E0 DB DB C0 C4 C4 C4 C4 DA D9 " );
   ExpectInside( Colour );
-  EXPECT_EQ( m_Segments[1].m_Position, 2u );
-  EXPECT_EQ( m_Segments[1].m_Length, 18u );   // JFIF, without a thumbnail
-  EXPECT_EQ( m_Segments.back().m_Position, Colour.size() - 2 );
+  EXPECT_EQ( PositionOf( m_Segments[1] ), 2u );
+  EXPECT_EQ( LengthOf( m_Segments[1] ), 18u );   // JFIF, without a thumbnail
+  EXPECT_EQ( PositionOf( m_Segments.back() ), Colour.size() - 2 );
 
   ASSERT_TRUE( Parse( MakeJPEG( 61, 33, TJSAMP_GRAY, 0 ) ) );
   EXPECT_EQ( Markers( m_Segments ), "D8 E0 DB C0 C4 C4 DA D9 " );
@@ -118,9 +122,9 @@ TEST_F( JPEGParser, EntropyCodedDataIsSkipped )
   const VBytes Image = SOI + Table + Scan + Data + EOI + VBytes{ 0x00, 0xD9, 0x01 };
   ASSERT_TRUE( Parse( Image ) );
   EXPECT_EQ( Markers( m_Segments ), "D8 DB DA D0 D1 D9 " );
-  EXPECT_EQ( m_Segments[2].m_Length, 5u );
-  EXPECT_EQ( m_Segments[3].m_Position, 17u );
-  EXPECT_EQ( m_Segments[3].m_Length, 2u );
+  EXPECT_EQ( LengthOf( m_Segments[2] ), 5u );
+  EXPECT_EQ( PositionOf( m_Segments[3] ), 17u );
+  EXPECT_EQ( LengthOf( m_Segments[3] ), 2u );
   // A marker that is cut by the parser's window, at each of its bytes
   for( size_t Filling = 4060; Filling < 4100; ++Filling )
   {
