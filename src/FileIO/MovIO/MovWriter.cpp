@@ -236,8 +236,7 @@ bool VMovWriter::WriteSample( const VSpans& i_rVideo, const VSpans& i_rAudio, ch
   const uint64_t Size = CollectVideo( i_rVideo );
   if( Size > FieldLimit )
   {
-    m_pOut->Write( m_Spans );
-    m_End = m_pOut->Tell();
+    m_End = m_pOut->Write( m_Spans ) ? m_pOut->Tell() : m_End;
     KVZ_LOG_ERROR( Category(), "Video frames of more than 2^32 bytes are not permitted." );
     return false;
   }
