@@ -43,6 +43,8 @@ constexpr std::array Fields = {
   VField{ "co64", 4, &VTrack::m_ChunkCount },
 };
 
+constexpr int LargestDepth = 16;   // of atoms in atoms; files have six
+
 struct VHandlerName
 {
   std::string_view m_Subtype;
@@ -111,17 +113,21 @@ private:
     return Atom;
   }
 
-  void ReadAtoms( uint64_t i_Position, uint64_t i_End )
+  void ReadAtoms( uint64_t i_Position, uint64_t i_End, int i_Depth = 0 )
   {
+    if( i_Depth > LargestDepth )
+    {
+      throw std::runtime_error( "The atoms at " + std::to_string( i_Position ) + " lie too deep in each other." );
+    }
     while( i_Position < i_End )
     {
       const VAtom Atom = ReadHeader( i_Position, i_End );
-      ReadAtom( Atom );
+      ReadAtom( Atom, i_Depth );
       i_Position = Atom.m_End;
     }
   }
 
-  void ReadAtom( const VAtom& i_rAtom )
+  void ReadAtom( const VAtom& i_rAtom, int i_Depth )
   {
     if( i_rAtom.m_Type == "trak" )
     {
@@ -129,7 +135,7 @@ private:
     }
     if( std::find( Containers.begin(), Containers.end(), i_rAtom.m_Type ) != Containers.end() )
     {
-      ReadAtoms( i_rAtom.m_Body, i_rAtom.m_End );
+      ReadAtoms( i_rAtom.m_Body, i_rAtom.m_End, i_Depth + 1 );
     }
     else if( i_rAtom.m_Type == "mvhd" )
     {

@@ -127,6 +127,15 @@ TEST( MovFileCheck, FilesThatAreNotFinishedOrDamagedAreTold )
   {
     ASSERT_FALSE( CheckBytes( VBytes( Whole.begin(), Whole.begin() + static_cast<std::ptrdiff_t>( Size ) ) ).empty() ) << Size;
   }
+  // Atoms in atoms without an end.
+  VBytes Deep;
+  for( uint32_t Size = 800000; Size != 0; Size -= 8 )
+  {
+    const VBytes Header = { 0, static_cast<uint8_t>( Size >> 16 ), static_cast<uint8_t>( Size >> 8 ), static_cast<uint8_t>( Size ), 'm', 'o', 'o',
+      'v' };
+    Deep.insert( Deep.end(), Header.begin(), Header.end() );
+  }
+  EXPECT_EQ( CheckBytes( Deep ), VTexts{ "The atoms at 136 lie too deep in each other." } );
   const TestSupport::VTemporaryFolder Folder;
   EXPECT_EQ( CheckMovFile( Folder.File( "missing.mov" ) ), VTexts{ "The file could not be opened." } );
 }
