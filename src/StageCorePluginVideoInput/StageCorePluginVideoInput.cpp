@@ -2,6 +2,7 @@
 
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "StageCorePluginInterface/HardwareRegistry.h"
+#include "StageCorePluginInterface/StageCoreHost.h"
 #include "StageCorePluginVideoInput/VideoInputEngine.h"
 #include "StageCoreRuntime/DebugServices.h"
 
@@ -37,7 +38,15 @@ bool VStageCorePluginVideoInput::Initialise( IStageCoreHost& i_rHost )
   return true;
 }
 
-bool VStageCorePluginVideoInput::RegisterFlowNodeFactories( IFlowNodeRegistry& ) { return KVZ_ASSERT( m_pEngine != nullptr ); }
+bool VStageCorePluginVideoInput::RegisterFlowNodeFactories( IFlowNodeRegistry& i_rRegistry )
+{
+  if( !KVZ_ASSERT( m_pEngine != nullptr ) )
+  {
+    return false;
+  }
+  i_rRegistry.RegisterFactory( m_pEngine->GetFlowNodeFactory() );
+  return true;
+}
 
 bool VStageCorePluginVideoInput::RegisterHardware( void*, IHardwareHost& i_rHardware )
 {

@@ -1,6 +1,8 @@
 #include "StageCorePluginVideoInput/VideoInputEngine.h"
 
+#include "Flow2/Flow2Utils/FlowNodeFactory.h"
 #include "HardwareSupport/VideoInput/VideoInputDataSource/DeviceUrnMap.h"
+#include "HardwareSupport/VideoInput/VideoInputDataSource/FlowNodeVideoInputDataSource.h"
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSourceTriggered.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
@@ -10,6 +12,7 @@
 #include "StageCorePluginVideoInput/Composition.h"
 #include "StageCorePluginVideoInput/VideoInputDeviceParameterHandler.h"
 #include "StageCorePluginVideoInput/VideoInputSystemParameterHandler.h"
+#include "StageCoreRuntime/DebugServices.h"
 #include "StageCoreRuntime/Shared.h"
 #include "StageCoreRuntime/ShutdownObject.h"
 #include "SyncSystem/CaptureBufferAllocator.h"
@@ -18,8 +21,10 @@
 using namespace StageCorePluginInterface;
 using VideoInputHAL::IVideoInputDevice;
 using VideoInputHAL::VDeviceUrnMap;
+using VideoInputHAL::VFlowNodeVideoInputDataSource;
 using VideoInputHAL::VVideoInputDataSource;
 using VideoInputHAL::VVideoInputDataSourceAllocator;
+using VideoInputHAL::VVideoInputDataSourceMap;
 using VideoInputHAL::VVideoInputDeviceManager;
 
 namespace
@@ -45,7 +50,7 @@ void HandOver( IShutdownManager& i_rManager, const std::shared_ptr<T>& i_pObject
 
 }
 
-// The maps have no lock: they change on the engine's thread, and in the destructor once the device manager has been shut down.
+// The maps change on the engine's thread, and in the destructor once the device manager has been shut down. Flow nodes look sources up on their own.
 class VVideoInputEngine::VImpl : public KVZ::VShared
 {
 public:
@@ -57,6 +62,7 @@ public:
   void StopThread() { m_pPostalService->Stop(); }
   bool StartCapture( const std::string& i_rDeviceURN ) const;
   bool StopCapture( const std::string& i_rDeviceURN ) const;
+  std::shared_ptr<KVZ::IFlowNodeFactory> GetFlowNodeFactory() const;
 
 private:
   void StartDrivers() { m_pDeviceManager->StartDiscovery(); }
@@ -68,7 +74,7 @@ private:
   const std::shared_ptr<NotificationSystem::VAsioPostalService> m_pPostalService;
   std::shared_ptr<VVideoInputDeviceManager> m_pDeviceManager;
   VDeviceUrnMap<std::shared_ptr<VVideoInputDeviceParameterHandler>> m_ParameterHandlers;
-  std::shared_ptr<VDeviceUrnMap<std::shared_ptr<VVideoInputDataSource>>> m_pVideoInputDataSources;   // shared with flow node factories
+  std::shared_ptr<VVideoInputDataSourceMap> m_pVideoInputDataSources;   // shared with flow node factories
   std::shared_ptr<VVideoInputSystemParameterHandler> m_pSystemParameterHandler;
 };
 
@@ -84,7 +90,8 @@ VVideoInputEngine::VImpl::VImpl( IStageCoreHost& i_rHost )
   m_pSystemParameterHandler = KVZ::MakeShared<VVideoInputSystemParameterHandler>( m_pPostalService, m_pHost->GetDataStore(),
     m_pHost->GetParameterRegistry() );
   HandOver( *pShutdown, m_pSystemParameterHandler, __FILE__, __LINE__ );
-  m_pVideoInputDataSources = std::make_shared<VDeviceUrnMap<std::shared_ptr<VVideoInputDataSource>>>();
+  m_pVideoInputDataSources = std::make_shared<VVideoInputDataSourceMap>();
+  m_pHost->GetFlowNodeRegistry()->AddFactory( GetFlowNodeFactory() );
 }
 
 VVideoInputEngine::VImpl::~VImpl()
@@ -100,9 +107,10 @@ VVideoInputEngine::VImpl::~VImpl()
   }
   m_ParameterHandlers.Clear();
   const std::shared_ptr<ISourceRegistry> pSources = m_pHost->GetSourceRegistry();
-  for( const auto& rEntry : *m_pVideoInputDataSources )
+  const auto All = m_pVideoInputDataSources->GetAll();
+  for( const auto& pSource : All )
   {
-    pSources->RemoveSource( rEntry.second );
+    pSources->RemoveSource( pSource );
   }
   m_pVideoInputDataSources->Clear();
   m_pSystemParameterHandler.reset();
@@ -147,6 +155,13 @@ std::shared_ptr<VVideoInputDataSource> VVideoInputEngine::VImpl::MakeDataSource(
     m_pHost->GetSecondSourceService(), m_pHost->GetCaptureTargetService(), m_pHost->GetTimeService(), Options );
 }
 
+std::shared_ptr<KVZ::IFlowNodeFactory> VVideoInputEngine::VImpl::GetFlowNodeFactory() const
+{
+  KVZ_ASSERT( m_pVideoInputDataSources != nullptr );
+  return std::make_shared<Flow2Utils::VFlowNodeFactory1<VFlowNodeVideoInputDataSource, std::shared_ptr<VVideoInputDataSourceMap>>>(
+    m_pVideoInputDataSources );
+}
+
 bool VVideoInputEngine::VImpl::StartCapture( const std::string& i_rDeviceURN ) const
 {
   const auto* pHandler = m_ParameterHandlers.Find( i_rDeviceURN );
@@ -168,6 +183,8 @@ VVideoInputEngine::VVideoInputEngine( IStageCoreHost& i_rHost ) : m_pImpl( KVZ::
 VVideoInputEngine::~VVideoInputEngine() { m_pImpl->StopThread(); }
 
 void VVideoInputEngine::Start() { m_pImpl->Start(); }
+
+std::shared_ptr<KVZ::IFlowNodeFactory> VVideoInputEngine::GetFlowNodeFactory() const { return m_pImpl->GetFlowNodeFactory(); }
 
 bool VVideoInputEngine::StartCapture( const std::string& i_rDeviceURN ) { return m_pImpl->StartCapture( i_rDeviceURN ); }
 

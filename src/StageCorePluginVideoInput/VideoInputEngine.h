@@ -7,6 +7,11 @@
 #include <memory>
 #include <string>
 
+namespace KVZ
+{
+class IFlowNodeFactory;
+}
+
 namespace StageCorePluginInterface
 {
 class IStageCoreHost;
@@ -26,6 +31,9 @@ public:
 
   // Subscribes to device arrival and to the host's start of hardware. Nothing looks for hardware before the host fires that event.
   void Start();
+
+  // A new factory of the node "VideoInputDataSource", over the sources of all devices, also of those that come later.
+  std::shared_ptr<KVZ::IFlowNodeFactory> GetFlowNodeFactory() const;
 
   // Capture of one device from its card. False for an unknown URN, which is not reported, and where the device refuses. Not while devices
   // are arriving: the table of devices changes on the engine's thread and has no lock.

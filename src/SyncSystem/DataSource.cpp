@@ -49,6 +49,7 @@ VDataSource::VDataSource( const VDataSourceSettings& i_rSettings )
     m_pStrand( MakeStrand( i_rSettings.m_pPostalService ) ),
     m_pBuffer( MakeBuffer( i_rSettings, m_pStrand ) ),
     m_pDrift( std::make_shared<VTimingMonitor>( Drift::VDriftMonitorConfiguration(), Drift::VDriftMonitorFilteredConfiguration() ) ),
+    m_pAnalysis( i_rSettings.m_pAnalysis ),
     m_Reader( m_pBuffer, m_rLog ),
     m_OnRequestNewGlobal( m_pStrand ),
     m_OnNewFrames( m_pStrand )
@@ -123,10 +124,19 @@ void VDataSource::Store( VFrameEntry* i_pEntry, const VIncomingFrame& i_rFrame, 
   }
   if( i_rFrame.m_Now != 0.0 )
   {
-    const int64_t Period = i_rFrame.m_Period.Count();
-    const int64_t Counter = Timing.m_Clocks.Find( m_CounterClock ).Count();
-    m_pDrift->Update( SessionId, VTick::TicksPerSecond, static_cast<uint32_t>( Period ), 0, static_cast<uint64_t>( Counter / Period ),
-      i_rFrame.m_Now );
+    TimeFrame( i_rFrame, SessionId, Timing.m_Clocks.Find( m_CounterClock ) );
+  }
+}
+
+void VDataSource::TimeFrame( const VIncomingFrame& i_rFrame, uint32_t i_SessionId, VTick i_Counter )
+{
+  const int64_t Period = i_rFrame.m_Period.Count();
+  const auto Frame = static_cast<uint64_t>( i_Counter.Count() / Period );
+  m_pDrift->Update( i_SessionId, VTick::TicksPerSecond, static_cast<uint32_t>( Period ), 0, Frame, i_rFrame.m_Now );
+  VDeliveryOffsets Offsets;
+  if( m_pAnalysis && m_pDrift->GetOffsets( i_SessionId, Frame, i_rFrame.m_Now, Offsets ) )
+  {
+    m_pAnalysis->Publish( Offsets );
   }
 }
 

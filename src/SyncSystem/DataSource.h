@@ -40,6 +40,7 @@ struct VDataSourceSettings
   std::function<void( VFrameEntry* )> m_DeleteFrame{};
   std::shared_ptr<KVZ::IPostalService> m_pPostalService{};   // the strand's thread; empty: on the caller's
   double m_NoticeSeconds = 0.0;                              // how far ahead the source must hear of a new global session
+  std::shared_ptr<VDriftMonitorAnalysis> m_pAnalysis{};      // empty: delivery offsets are not published
 };
 
 // How a triggered source wants to be driven.
@@ -102,6 +103,12 @@ public:
   // The same, but a reader that finds nothing leaves its token (not 0), and the next frame fires OnNewFrames with it.
   EReadResult::Enum ReadFramesOrSleep( uint64_t i_MaxFrames, uint64_t i_WakeToken, VReadFrames& o_rRead );
   NotificationSystem::VCallbackPostal<void( uint64_t )>& OnNewFrames() { return m_OnNewFrames; }
+
+  // Of a frame of the session by its number there. False where the session is not the one that is being timed.
+  bool GetDeliveryOffsets( uint32_t i_SessionId, uint64_t i_Frame, double i_Time, VDeliveryOffsets& o_rOffsets ) const
+  {
+    return m_pDrift->GetOffsets( i_SessionId, i_Frame, i_Time, o_rOffsets );
+  }
 
   const std::shared_ptr<VTimeBasedCaptureBuffer>& Buffer() const { return m_pBuffer; }
 
@@ -185,6 +192,7 @@ private:
 
   // Frames
   void Store( VFrameEntry* i_pEntry, const VIncomingFrame& i_rFrame, uint32_t i_SessionBefore );
+  void TimeFrame( const VIncomingFrame& i_rFrame, uint32_t i_SessionId, KVZ::VTick i_Counter );
   bool IsDrainingAfterExhaustion();
   VToken NewestPosition() const;
   void OnMemoryExhausted();
@@ -227,6 +235,7 @@ private:
   const std::shared_ptr<VStrand> m_pStrand;   // empty: calls run on the caller's thread
   const std::shared_ptr<VTimeBasedCaptureBuffer> m_pBuffer;
   const std::shared_ptr<VTimingMonitor> m_pDrift;
+  const std::shared_ptr<VDriftMonitorAnalysis> m_pAnalysis;   // may be empty
   VDataSourceReader m_Reader;
   NotificationSystem::VCallbackPostal<void( KVZ::VGlobalSyncSessionId )> m_OnRequestNewGlobal;
   NotificationSystem::VCallbackPostal<void( uint64_t )> m_OnNewFrames;

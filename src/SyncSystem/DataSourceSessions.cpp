@@ -168,6 +168,7 @@ KVZ::ISourceTemporal::ISourceSyncStatus VDataSource::MakeSyncStatus() const
     Status.m_LastDeclared = m_LastDeclared;
   }
   Status.m_RefusedFrames = m_RefusedFrames.load( std::memory_order_relaxed );
+  Status.m_BufferFill = BufferFill();
   VSyncSessionRecord Record;
   int64_t Frames = 0;
   if( m_pBuffer->FindRecord( Status.m_Session.m_Id, Record ) && VCaptureBuffer::Distance( Record.m_First, Record.m_Last, Frames ) )

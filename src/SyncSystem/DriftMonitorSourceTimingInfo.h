@@ -1,10 +1,12 @@
 // A drift monitor that also keeps how late the recent samples were delivered against the fit.
 #pragma once
 
+#include "SyncSystem/DriftMonitorAnalysis.h"
 #include "SyncSystem/DriftMonitorFiltered.h"
 #include "SyncSystem/ISource.h"
 
 #include <algorithm>
+#include <numeric>
 #include <vector>
 
 namespace SyncSystem
@@ -52,6 +54,19 @@ public:
     o_rInfo.m_MeanOffset = Statistics.m_Mean;
     o_rInfo.m_OffsetVariance = Statistics.m_Variance;
     o_rInfo.m_RecentMaximum = Statistics.m_RecentMaximum;
+    return true;
+  }
+
+  // How late a sample came that was delivered at this time. False for another session than that of the fit.
+  bool GetOffsets( uint32_t i_Session, uint64_t i_Sample, double i_Time, VDeliveryOffsets& o_rOffsets ) const
+  {
+    boost::lock_guard<boost::mutex> Lock( this->m_Mutex );
+    if( i_Session == 0 || i_Session != this->m_SessionId || m_Offsets.empty() )
+    {
+      return false;
+    }
+    o_rOffsets.m_Delivery = i_Time - this->FittedTime( i_Sample );
+    o_rOffsets.m_Predicted = std::accumulate( m_Offsets.begin(), m_Offsets.end(), 0.0 ) / static_cast<double>( m_Offsets.size() );
     return true;
   }
 

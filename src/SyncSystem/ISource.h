@@ -69,6 +69,7 @@ public:
     uint64_t m_LatestCounterFrames = 0;   // frames of m_Session so far less one: the newest frame's number in it
     uint64_t m_DroppedFrames = 0;         // missed by the card since the source was made; the first count after a start is no loss
     uint64_t m_RefusedFrames = 0;         // delivered and not stored: memory had run out
+    double m_BufferFill = 0.0;            // used over total memory; near 1 as soon as old frames are given up for new ones
   };
 
   struct ISourceTimingInfo

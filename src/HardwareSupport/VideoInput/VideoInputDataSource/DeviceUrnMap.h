@@ -1,6 +1,6 @@
 // A map from device URN to something a device has, in the order of arrival. A second entry under one URN does not replace the first.
 //
-// No lock: changed on the engine's thread and in the engine's destructor alone.
+// No lock.
 #pragma once
 
 #include <cstddef>

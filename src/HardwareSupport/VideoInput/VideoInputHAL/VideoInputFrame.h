@@ -31,7 +31,8 @@ struct VVideoInputDataSourceFrame
   uint32_t m_ImageCapacity = 0;   // m_ImageBytes rounded up to ImageAlignment
   uint32_t m_AudioBytes = 0;
   uint32_t m_AudioCapacity = 0;
-  double m_FrameScale = 1.0;   // written by the data source
+  double m_FrameScale = 1.0;     // written by the data source
+  double m_DeliveryTime = 0.0;   // host seconds, written by the data source; 0 for a frame that is not timed
 
   uint8_t* Image() { return reinterpret_cast<uint8_t*>( this ) + HeaderSize; }
   const uint8_t* Image() const { return reinterpret_cast<const uint8_t*>( this ) + HeaderSize; }

@@ -1,0 +1,416 @@
+// The node that supplies a device's frames to the graph, round by round: frames are delivered by hand and services answer at once.
+#include "HardwareSupport/VideoInput/VideoInputDataSource/FlowNodeVideoInputDataSource.h"
+
+#include "Flow2/Flow2Utils/FlowException.h"
+#include "Flow2/Flow2Utils/FlowNodeFactory.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
+#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
+#include "tests/support/FakeFlowServices.h"
+#include "tests/support/LogCapture.h"
+
+#include <cmath>
+
+namespace
+{
+
+using KVZ::EFlowResult;
+using KVZ::VFlowStatePtr;
+using VideoInputHAL::VFlowNodeVideoInputDataSource;
+using VideoInputHAL::VVideoInputDeviceManager;
+
+constexpr int FiveSeconds = 125;   // frames
+
+class VOneDeviceDriver : public VideoInputHAL::IVideoInputDriver
+{
+public:
+  explicit VOneDeviceDriver( std::shared_ptr<VideoInputHAL::IVideoInputDevice> i_pDevice ) : m_pDevice( std::move( i_pDevice ) ) {}
+  VDeviceCallback& GetDeviceArrivedCallback() override { return m_Arrived; }
+  void StartDiscovery() override { m_Arrived( m_pDevice ); }
+
+private:
+  const std::shared_ptr<VideoInputHAL::IVideoInputDevice> m_pDevice;
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<VideoInputHAL::IVideoInputDevice> )> m_Arrived;
+};
+
+// A rig whose device is known to a manager.
+class VFlowRig : public VVideoRig
+{
+public:
+  using VVideoRig::VVideoRig;
+
+  std::shared_ptr<VTestVideoSource> MakeManaged()
+  {
+    std::vector<VideoInputHAL::VDriverMaker> Makers = { [pDevice = m_pDevice] { return std::make_shared<VOneDeviceDriver>( pDevice ); } };
+    m_pManager = KVZ::MakeShared<VVideoInputDeviceManager>( std::move( Makers ) );
+    m_pManager->StartDiscovery();
+    m_pFrames = std::make_shared<VideoInputHAL::VVideoInputDataSourceAllocator>( m_Memory.m_pAllocator );
+    VideoInputHAL::VVideoInputDataSourceOptions Options;
+    auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
+    pFactory->Register( KVZ::IVideoContainer::ETVID, [pDisk = m_pDisk]( auto, auto ) { return std::make_shared<VFakeWriter>( pDisk ); } );
+    Options.m_pWriterFactory = pFactory;
+    Options.m_pPostalService = m_pStrand;
+    Options.m_MakeWriterService = [pService = m_pWriterService] { return pService; };
+    const auto pSource = KVZ::MakeShared<VTestVideoSource>( m_pManager, m_pDevice, m_pFrames, nullptr, nullptr, m_pTargets, m_pTime, Options );
+    m_pSource = pSource;
+    return pSource;
+  }
+
+  std::shared_ptr<VVideoInputDeviceManager> m_pManager;
+};
+
+class FlowNodeVideoInput : public ::testing::Test
+{
+protected:
+  void SetUp() override { m_pSources->Insert( "vi:0", m_pSource ); }
+
+  std::shared_ptr<KVZ::IFlowNode> MakeNode( const std::string& i_rURN = "vi:0" )
+  {
+    Flow2Utils::VFlowNodeFactory1<VFlowNodeVideoInputDataSource, std::shared_ptr<VideoInputHAL::VVideoInputDataSourceMap>> Factory( m_pSources );
+    const auto pNode = Factory.CreateNode();
+    pNode->ParameterTexts() = { { "DeviceURN", i_rURN } };
+    return pNode;
+  }
+  // The first frame, a session over it, and a node that has started.
+  void Begin()
+  {
+    m_Rig.DeliverMany( 1 );
+    m_Rig.Join( *m_pSource, 1 );
+    m_pNode = MakeNode();
+    ASSERT_EQ( m_pNode->PreProcessChecked( m_pServices ), EFlowResult::Ok );
+  }
+  // One round of the node; the states that it wrote.
+  std::vector<VFlowStatePtr> Round()
+  {
+    m_pServices->m_Written.clear();
+    EXPECT_EQ( m_pNode->ProcessChecked(), EFlowResult::Ok );
+    return std::exchange( m_pServices->m_Written, {} );
+  }
+  // All that waits, and the node asleep after it.
+  std::vector<VFlowStatePtr> Drain()
+  {
+    std::vector<VFlowStatePtr> All;
+    for( std::vector<VFlowStatePtr> States = Round(); !States.empty(); States = Round() )
+    {
+      All.insert( All.end(), States.begin(), States.end() );
+    }
+    return All;
+  }
+  template<class TItem>
+  static const TItem& Item( const VFlowStatePtr& i_pState )
+  {
+    for( const KVZ::VFlowItemPtr& pItem : i_pState->Items() )
+    {
+      if( &pItem->Type() == &TItem::ItemType )
+      {
+        return static_cast<const TItem&>( *pItem );
+      }
+    }
+    throw std::logic_error( TItem::ItemType.m_pName );
+  }
+  static std::vector<int64_t> Indices( const std::vector<VFlowStatePtr>& i_rStates )
+  {
+    std::vector<int64_t> Indices;
+    for( const VFlowStatePtr& pState : i_rStates )
+    {
+      Indices.push_back( ( Item<KVZ::VFlowCameraHardware>( pState ).m_Tick - CounterStart ).Count() / Period.Count() );
+    }
+    return Indices;
+  }
+  static double Number( const VFlowStatePtr& i_pState, const char* i_pName )
+  {
+    double Number = NAN;
+    Item<KVZ::VFlowGenericData>( i_pState ).GetNumber( i_pName, Number );
+    return Number;
+  }
+  double UsedMemory()
+  {
+    double Total = 0.0;
+    double Used = 0.0;
+    m_Rig.m_Memory.m_pAllocator->GetMemoryStats( Total, Used );
+    return Used;
+  }
+
+  VFlowRig m_Rig{ 160 };
+  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.MakeManaged();
+  const std::shared_ptr<VideoInputHAL::VVideoInputDataSourceMap> m_pSources = std::make_shared<VideoInputHAL::VVideoInputDataSourceMap>();
+  const std::shared_ptr<TestSupport::VFakeFlowServices> m_pServices = std::make_shared<TestSupport::VFakeFlowServices>();
+  std::shared_ptr<KVZ::IFlowNode> m_pNode;
+};
+
+TEST_F( FlowNodeVideoInput, IsKnownByItsName )
+{
+  const auto pNode = MakeNode();
+  EXPECT_EQ( pNode->NodeInfo().m_Name, "VideoInputDataSource" );
+  EXPECT_EQ( pNode->NodeInfo().m_Description, "Flow node that supplies states from a VideoInputDataSource" );
+  EXPECT_TRUE( pNode->NodeInfo().m_Inputs.empty() );
+  EXPECT_EQ( pNode->NodeInfo().m_Outputs, ( std::vector<std::string>{ "Output" } ) );
+  EXPECT_EQ( VFlowNodeVideoInputDataSource::VParameters().Describe().at( "DeviceURN" ).at( "<Description>" ),
+    "The video capture device URN to use." );
+}
+
+TEST_F( FlowNodeVideoInput, AnUnknownDeviceKeepsItFromStarting )
+{
+  const TestSupport::VLogCapture Log( "", 2 );
+  const auto pNode = MakeNode( "vi:7" );
+  EXPECT_TRUE( KVZ::IsFlowFailure( pNode->PreProcessChecked( m_pServices ) ) );
+  EXPECT_TRUE( Log.Has( "Failed to find VideoInput data source with DeviceURN 'vi:7'." ) );
+  EXPECT_EQ( pNode->PostProcessChecked(), EFlowResult::Ok );
+  EXPECT_FALSE( m_pSource->OnNewFramesCallback().IsSet() );
+
+  pNode->ParameterTexts() = { { "DeviceURN", "vi:0" }, { "Colour", "red" } };
+  EXPECT_THROW( pNode->PreProcessChecked( m_pServices ), Flow2Utils::VFlowException ) << "no such parameter";
+  pNode->PostProcessChecked();
+}
+
+TEST_F( FlowNodeVideoInput, StatesHoldTheFrameWithoutACopy )
+{
+  m_Rig.m_pTime->m_Now = 50.0;
+  m_Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
+  Begin();
+  const auto States = Round();
+  ASSERT_EQ( States.size(), 1u );
+  EXPECT_EQ( States[0]->Category(), "VideoInput" );
+  std::vector<std::string> Labels;
+  for( const KVZ::VFlowItemPtr& pItem : States[0]->Items() )
+  {
+    Labels.push_back( pItem->Type().m_pName + std::string( ": " ) + pItem->Label() );
+  }
+  EXPECT_EQ( Labels,
+    ( std::vector<std::string>{ "FlowVideoFrame: VideoFrame Item", "FlowAudioFrame: AudioFrame Item", "FlowCameraHardware: CameraHardware Item",
+      "FlowGenericData: GenericData Item" } ) );
+
+  SyncSystem::VToken Token;
+  SyncSystem::VRefCountedToken Pinned;
+  ASSERT_TRUE( m_pSource->Buffer()->GetNewestToken( Token ) && m_pSource->Buffer()->Read( Token, Pinned ) );
+  const VVideoInputDataSourceFrame& rFrame = *VVideoInputDataSource::FrameOf( Pinned.Frame() );
+  const auto& rVideo = Item<KVZ::VFlowVideoFrame>( States[0] );
+  EXPECT_EQ( rVideo.m_pBuffer->Data(), rFrame.Image() );
+  EXPECT_EQ( rVideo.m_pBuffer->Size(), rFrame.m_ImageBytes );
+  EXPECT_EQ( rVideo.m_Info, rFrame.m_VideoInfo );
+  EXPECT_EQ( KVZ::ToText( rVideo.m_Timecode ), "00:00:00:00" );
+  const auto& rAudio = Item<KVZ::VFlowAudioFrame>( States[0] );
+  EXPECT_EQ( rAudio.m_pBuffer->Data(), rFrame.Audio() );
+  EXPECT_EQ( rAudio.m_pBuffer->Size(), 160u );
+  EXPECT_EQ( rAudio.m_Info, rFrame.m_AudioInfo );
+  const auto& rCamera = Item<KVZ::VFlowCameraHardware>( States[0] );
+  EXPECT_EQ( rCamera.m_DeviceURN, "vi:0" );
+  EXPECT_EQ( rCamera.m_DeviceName, "Test Card (1)" );
+  EXPECT_EQ( rCamera.m_Tick, CounterStart );
+  EXPECT_EQ( rCamera.m_Period, Period );
+  EXPECT_EQ( rCamera.m_GlobalSession, KVZ::VGlobalSyncSessionId( 1 ) );
+  EXPECT_EQ( Number( States[0], "DeliveryTime" ), 50.0 );
+
+  m_Rig.m_Format.m_Audio = {};
+  m_Rig.DeliverMany( 1 );
+  EXPECT_EQ( Round().front()->Items().size(), 3u ) << "no sound, no item for it";
+}
+
+TEST_F( FlowNodeVideoInput, TellsHowLateFramesCame )
+{
+  Begin();
+  for( int Count = 1; Count < 50; ++Count )
+  {
+    m_Rig.m_pTime->m_Now = 100.0 + 0.04 * Count;
+    m_Rig.DeliverMany( 1 );
+    Round();
+  }
+  m_Rig.m_pTime->m_Now = 100.0 + 0.04 * 50 + 0.003;
+  m_Rig.DeliverMany( 1 );
+  const auto States = Round();
+  EXPECT_NEAR( Number( States[0], "DeliveryOffset" ), 0.003, 0.0005 );
+  EXPECT_NEAR( Number( States[0], "PredictedOffset" ), 0.0, 0.0005 );
+}
+
+TEST_F( FlowNodeVideoInput, SleepsUntilTheNextFrame )
+{
+  Begin();
+  EXPECT_EQ( Round().size(), 1u );
+  EXPECT_TRUE( Round().empty() );
+  EXPECT_EQ( m_pServices->m_LastCall, EFlowResult::Asleep );
+  EXPECT_EQ( m_Rig.m_pStrand->RunAll(), 0u ) << "somebody has work although nothing came";
+  EXPECT_TRUE( m_pServices->m_Woken.empty() );
+  const uint64_t Token = m_pServices->m_NextToken - 1;
+  m_Rig.DeliverMany( 3 );
+  m_Rig.m_pStrand->RunAll();
+  EXPECT_EQ( m_pServices->m_Woken, ( std::vector<uint64_t>{ Token } ) ) << "the first of them wakes, the others find it awake";
+  EXPECT_EQ( Indices( Round() ), ( std::vector<int64_t>{ 1, 2, 3 } ) );
+  EXPECT_EQ( m_pServices->m_WriteFlags.back(), 2u );
+
+  m_pNode->PostProcessChecked();
+  m_Rig.DeliverMany( 1 );
+  m_Rig.m_pStrand->RunAll();
+  EXPECT_EQ( m_pServices->m_Woken.size(), 1u );
+  EXPECT_EQ( m_pServices.use_count(), 1 ) << "the source still has the services";
+}
+
+// Frames are thinned by the position of the lowest bit in their number, so that what is left lies on a grid of a power of two: of a part of the
+// backlog every second frame of that grid, where ten would be too many.
+TEST_F( FlowNodeVideoInput, AStallCostsAllButTenFramesEvenlySpread )
+{
+  Begin();
+  Round();
+  m_Rig.DeliverMany( FiveSeconds );
+  const auto States = Round();
+  const std::vector<int64_t> Kept = Indices( States );
+  ASSERT_EQ( Kept.size(), 10u );
+  std::vector<int64_t> Gaps;
+  double Dropped = 0.0;
+  for( size_t Index = 0; Index < Kept.size(); ++Index )
+  {
+    Gaps.push_back( Kept[Index] - ( Index == 0 ? 0 : Kept[Index - 1] ) );
+    EXPECT_EQ( Number( States[Index], "DroppedBefore" ), static_cast<double>( Gaps.back() - 1 ) );
+    Dropped += Number( States[Index], "DroppedBefore" );
+  }
+  const int64_t Grid = *std::min_element( Gaps.begin() + 1, Gaps.end() );
+  EXPECT_EQ( Grid & ( Grid - 1 ), 0 );
+  for( size_t Index = 1; Index < Gaps.size(); ++Index )
+  {
+    EXPECT_TRUE( Gaps[Index] == Grid || Gaps[Index] == 2 * Grid ) << Gaps[Index];
+  }
+  EXPECT_LE( FiveSeconds - Kept.back(), Grid );
+  EXPECT_LE( Gaps.front(), 2 * Grid );
+
+  // Nothing of the backlog is left: the next frame is the next state, and it tells of those behind the last kept one.
+  EXPECT_TRUE( Round().empty() );
+  m_Rig.DeliverMany( 1 );
+  const auto Next = Round();
+  ASSERT_EQ( Indices( Next ), ( std::vector<int64_t>{ FiveSeconds + 1 } ) );
+  EXPECT_EQ( Dropped + Number( Next[0], "DroppedBefore" ) + 11.0, FiveSeconds + 1.0 );
+}
+
+TEST_F( FlowNodeVideoInput, ARecordingLosesNothingWhileTheGraphIsHeldBack )
+{
+  Begin();
+  m_Rig.OnStrand( *m_pSource,
+    [&] {
+      m_pSource->StartCapture( { KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) }, At( 0 ), At( FiveSeconds ), false, 0 );
+    } );
+  std::vector<VFlowStatePtr> Held = Round();
+  for( int Count = 1; Count < FiveSeconds; ++Count )
+  {
+    m_Rig.DeliverMany( 1 );
+    m_Rig.m_pStrand->RunAll();
+    m_Rig.m_pWriterService->RunAll();
+  }
+  m_Rig.DeliverMany( 5 );
+  m_Rig.m_pStrand->RunAll();
+  m_Rig.m_pWriterService->RunAll();
+  ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+  const auto Report = m_Rig.m_pTargets->Reports().front();
+  EXPECT_EQ( Report.m_FramesWritten, static_cast<uint64_t>( FiveSeconds ) ) << Report.m_Error;
+  EXPECT_FALSE( Report.m_bFailed );
+  EXPECT_LE( Round().size(), 10u );
+}
+
+TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
+{
+  Begin();
+  Drain();
+  m_Rig.DeliverMany( 8 );
+  std::vector<VFlowStatePtr> Held = Round();
+  ASSERT_EQ( Held.size(), 8u );
+  Round();   // the node lets its own references go
+  m_Rig.DeliverMany( 1000 );
+  SyncSystem::VToken Oldest;
+  ASSERT_TRUE( m_pSource->Buffer()->GetFirstToken( m_pSource->Buffer()->GetCurrentBufferSession(), Oldest ) );
+  EXPECT_GT( Oldest.m_FrameNumber, 100 ) << "all frames around the held ones are gone";
+  for( size_t Index = 0; Index < Held.size(); ++Index )
+  {
+    const auto& rVideo = Item<KVZ::VFlowVideoFrame>( Held[Index] );
+    for( size_t Byte = 0; Byte < rVideo.m_pBuffer->Size(); ++Byte )
+    {
+      ASSERT_EQ( rVideo.m_pBuffer->Data()[Byte], static_cast<uint8_t>( 1 + Index ) );
+    }
+  }
+
+  // One buffer alone keeps its frame as well, also when node and source have gone.
+  const std::shared_ptr<const KVZ::IBufferConst> pSound = Item<KVZ::VFlowAudioFrame>( Held[3] ).m_pBuffer;
+  Held.clear();
+  m_pNode->PostProcessChecked();
+  m_pNode.reset();
+  m_pSources->Clear();
+  m_Rig.m_pSource.reset();
+  m_pSource.reset();
+  m_Rig.m_pStrand->RunAll();
+  EXPECT_GT( UsedMemory(), 0.0 );
+  EXPECT_EQ( pSound->Data()[0], 4 );
+}
+
+TEST_F( FlowNodeVideoInput, LettingTheLastStateGoGivesTheMemoryBack )
+{
+  Begin();
+  std::vector<VFlowStatePtr> Held = Round();
+  m_pNode->PostProcessChecked();
+  m_pNode.reset();
+  m_pSources->Clear();
+  m_Rig.m_pSource.reset();
+  m_pSource.reset();
+  m_Rig.m_pStrand->RunAll();
+  EXPECT_GT( UsedMemory(), 0.0 );
+  Held.clear();
+  EXPECT_EQ( UsedMemory(), 0.0 );
+}
+
+TEST_F( FlowNodeVideoInput, GoesOnInTheNextSession )
+{
+  Begin();
+  Drain();
+  m_Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
+  m_Rig.m_Timecode.m_Hours = 10;   // a clock appears: a new session
+  m_Rig.DeliverMany( 5 );
+  EXPECT_TRUE( Drain().empty() ) << "not of the session that it is in";
+  m_Rig.Join( *m_pSource, 2 );
+  auto States = Drain();
+  ASSERT_EQ( States.size(), 5u );
+  EXPECT_EQ( Item<KVZ::VFlowCameraHardware>( States[0] ).m_GlobalSession, KVZ::VGlobalSyncSessionId( 2 ) );
+  EXPECT_EQ( KVZ::ToText( Item<KVZ::VFlowVideoFrame>( States[4] ).m_Timecode ), "10:00:00:04" );
+
+  m_Rig.m_Timecode.m_Hours = 12;   // a jump
+  m_Rig.m_Format.m_Width = 16;     // and another format with it
+  m_Rig.DeliverMany( 3 );
+  m_Rig.Join( *m_pSource, 3 );
+  States = Drain();
+  ASSERT_EQ( States.size(), 3u );
+  EXPECT_EQ( Item<KVZ::VFlowCameraHardware>( States[0] ).m_GlobalSession, KVZ::VGlobalSyncSessionId( 3 ) );
+  EXPECT_EQ( Item<KVZ::VFlowVideoFrame>( States[0] ).m_Info.m_ImageWidth, 16u );
+}
+
+TEST_F( FlowNodeVideoInput, TakesItsDeviceFromGlobalItemsToo )
+{
+  const TestSupport::VLogCapture Log( "", 2 );
+  VFlowRig Other;
+  const auto pOther = Other.MakeManaged();
+  m_pSources->Insert( "vi:1", pOther );
+  Begin();
+  Drain();
+  Other.DeliverMany( 1 );
+  Other.Join( *pOther, 1 );
+
+  auto pItem = std::make_shared<KVZ::VFlowParameters>( "test" );
+  pItem->m_Texts = { { "DeviceURN", "vi:9" } };
+  m_pServices->m_Global = { pItem };
+  m_Rig.DeliverMany( 1 );
+  EXPECT_EQ( Round().size(), 1u ) << "an unknown device changes nothing";
+  EXPECT_TRUE( Log.Has( "Failed to find VideoInput data source with DeviceURN 'vi:9'." ) );
+  EXPECT_EQ( m_pServices->m_GlobalLimits.back().m_Milliseconds, 0u );
+  pItem->m_Texts = { { "DeviceURN", "vi:1" } };
+  m_pServices->m_Global = { pItem };
+  EXPECT_EQ( Round().size(), 1u );
+  EXPECT_FALSE( m_pSource->OnNewFramesCallback().IsSet() );
+  EXPECT_TRUE( pOther->OnNewFramesCallback().IsSet() );
+  m_pNode->PostProcessChecked();
+  EXPECT_FALSE( pOther->OnNewFramesCallback().IsSet() );
+}
+
+TEST_F( FlowNodeVideoInput, EndsWithTheGraph )
+{
+  Begin();
+  m_pServices->m_Answer = EFlowResult::Stopping;
+  EXPECT_EQ( m_pNode->ProcessChecked(), EFlowResult::Stopping );
+  m_pServices->m_Answer = EFlowResult::Ok;
+  m_Rig.m_pManager->Shutdown();
+  EXPECT_THROW( m_pNode->ProcessChecked(), Flow2Utils::VFlowException ) << "no device any more that the frame could come from";
+  m_pNode->PostProcessChecked();
+}
+
+}
