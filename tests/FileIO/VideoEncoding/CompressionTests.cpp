@@ -1,5 +1,7 @@
 // The encoder with its real compressors.
+#include "CoreVideoUtils/BurnInText.h"
 #include "CoreVideoUtils/FrameSize.h"
+#include "CoreVideoUtils/PixelFormatConverter.h"
 #include "FileIO/PNGIO/PNGIO.h"
 #include "FileIO/TIFFIO/TIFFIO.h"
 #include "FileIO/VideoEncoding/ImageCompressors.h"
@@ -56,6 +58,17 @@ VEncoderParts Parts( std::map<IVideoPayload::Enum, VCompressor> i_Compressors )
 {
   VEncoderParts Result;
   Result.m_Compressors = std::move( i_Compressors );
+  return Result;
+}
+
+// As the plug-in composes them.
+VEncoderParts AllParts()
+{
+  VEncoderParts Result = Parts( ImageCompressors() );
+  Result.m_ConverterMakers[EConverter::Software] = [] { return std::make_shared<CoreVideoUtils::VPixelFormatConverter>(); };
+  Result.m_DrawText =
+    []( IPixelFormatConverter& i_rConverter, const VideoFrameInfo& i_rInfo, const VBurnInSettings& i_rText, uint8_t* io_pPixels, size_t i_Size )
+  { return CoreVideoUtils::BurnInText( i_rConverter, i_rInfo, i_rText.m_SizeIndex, i_rText.m_X, i_rText.m_Y, i_rText.m_Text, io_pPixels, i_Size ); };
   return Result;
 }
 
@@ -120,24 +133,57 @@ TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
       "Error encoding data in 'R8G8B8' pixel format to 'ImageTIFF'.", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'." } ) );
 }
 
+// What the frame's own steps give, one after another: converted, text drawn, compressed.
+TEST_F( Compression, AFrameGoesThroughAllSteps )
+{
+  VVideoFrameEncoder Encoder( EConverter::Software, AllParts() );
+  Encoder.SetBurnIn( { "01:02", 5, 3, 0 } );
+  for( const IPixelFormat::Enum Format : { IPixelFormat::EBayerGB8, IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 } )
+  {
+    SCOPED_TRACE( ToName( Format ) );
+    const VBufferList Pixels = Noise( Info( Format ) );
+    VBufferList Expected = Pixels;
+    ASSERT_TRUE( Encoder.Encode( m_Allocator, Expected, Info( Format ), IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
+    const std::vector<uint8_t> Drawn = BytesOf( Expected );
+    EXPECT_EQ( std::vector<uint8_t>( Drawn.begin() + 3 * ( 3 * 64 + 5 ), Drawn.begin() + 3 * ( 3 * 64 + 5 ) + 3 ), std::vector<uint8_t>( 3 ) );
+    VBufferList Video = Pixels;
+    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
+    EXPECT_EQ( BytesOf( Video ), TurboJPEG( Expected, 90 ) );
+  }
+}
+
 TEST_F( Compression, OneEncoderServesSeveralThreads )
 {
-  const VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors() ) );
-  std::atomic<int> Good{ 0 };
+  VVideoFrameEncoder Encoder( EConverter::Software, AllParts() );
+  Encoder.SetBurnIn( { "00:00", 1, 1, 0 } );
+  Encoder.SetColour( { 0.5f, 2.0f } );
+  const auto Compressed = [&]( uint32_t i_Seed )
+  {
+    const IPixelFormat::Enum Format = i_Seed % 2 ? IPixelFormat::EBayerGB8 : IPixelFormat::EU8Y8V8Y8;
+    VBufferList Video = Noise( Info( Format ), i_Seed );
+    EXPECT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
+    return BytesOf( Video );
+  };
+  constexpr uint32_t Frames = 40;
+  std::vector<std::vector<uint8_t>> Alone;
+  for( uint32_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    Alone.push_back( Compressed( Frame ) );
+  }
+  std::atomic<uint32_t> Next{ 0 };
+  std::atomic<uint32_t> Equal{ 0 };
   boost::thread_group Threads;
-  for( uint32_t Number = 0; Number < 4; ++Number )
+  for( int Number = 0; Number < 4; ++Number )
   {
     Threads.create_thread(
-      [this, &Encoder, &Good, Number]
+      [&]
       {
-        for( uint32_t Frame = 0; Frame < 20; ++Frame )
+        for( uint32_t Frame = Next++; Frame < Frames; Frame = Next++ )
         {
-          const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ), Number * 100 + Frame );
-          VBufferList Video = Pixels;
-          Good += Encode( Encoder, Video, IVideoPayload::EImageJPEG ) && BytesOf( Video ) == TurboJPEG( Pixels, 90 );
+          Equal += Compressed( Frame ) == Alone[Frame];
         }
       } );
   }
   Threads.join_all();
-  EXPECT_EQ( Good, 80 );
+  EXPECT_EQ( Equal, Frames );
 }
