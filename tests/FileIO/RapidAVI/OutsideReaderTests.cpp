@@ -2,6 +2,7 @@
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "Utils/UtilsMemory/PooledBufferAllocator.h"
 #include "tests/FileIO/RapidAVI/AviFile.h"
+#include "tests/support/LogCapture.h"
 #include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
@@ -199,6 +200,22 @@ TEST( AviOutside, FramesOfLaterRiffsAreFoundAndSeekedTo )
   }
 }
 
+TEST( AviOutside, AFileWithoutARateOrWithoutFramesIsStillOpened )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  const std::string Path = Folder.File( "file.avi" );
+  VSettings Settings{ .m_Timing = {} };
+  WriteFile( Path, Settings, 2 );
+  const TestSupport::VRunResult Rate = TestSupport::RunProgram(
+    { "ffprobe", "-v", "error", "-show_entries", "stream=r_frame_rate", "-select_streams", "v", "-of", "csv=p=0", Path } );
+  EXPECT_EQ( Rate.m_Output, "25/1\n" );
+  WriteFile( Path, VSettings(), 0 );
+  EXPECT_EQ( TestSupport::AskMediaInfo( Path, "Video;%Width% %Height% %CodecID%" ), "4 1 UYVY" );
+  const TestSupport::VRunResult Frames = TestSupport::RunProgram(
+    { "ffprobe", "-v", "error", "-show_entries", "stream=width,codec_name", "-select_streams", "v", "-of", "csv=p=0", Path } );
+  EXPECT_EQ( Frames.m_Output, "rawvideo,4\n" ) << Frames.m_Error;
+}
+
 TEST( AviOutside, MotionJPEGIsDecodedAsTheSameImagesInFilesOfTheirOwn )
 {
   const TestSupport::VTemporaryFolder Folder;
@@ -229,6 +246,15 @@ TEST( AviOutside, MotionJPEGIsDecodedAsTheSameImagesInFilesOfTheirOwn )
   EXPECT_EQ( Answers["streams.stream.0.codec_tag_string"], "MJPG" );
   EXPECT_EQ( Answers["streams.stream.0.nb_read_frames"], std::to_string( Frames ) );
   EXPECT_EQ( TestSupport::DecodeVideo( Folder.File( "file.avi" ), "yuvj444p" ), Expected );
+
+  // A grey image has fewer segments.
+  Settings.m_Video.m_PixelFormat = IPixelFormat::ELuminance8;
+  ASSERT_TRUE( Writer.Open( Folder.File( "grey.avi" ) ) );
+  ASSERT_TRUE( Settings.WriteHeader( Writer ) );
+  const TestSupport::VLogCapture Log( "RapidAVI" );
+  EXPECT_FALSE( Settings.WriteFrame( Writer, 0, Noise( 64 * 48, 0 ), {} ) );
+  EXPECT_TRUE( Log.Has( "Generate JPEG not in expected format." ) );
+  EXPECT_TRUE( Writer.Close() );
 }
 
 // The process is killed while it writes as fast as it can. What it had reported as written must be readable.
