@@ -116,12 +116,23 @@ void Join( VFlowGraphNode& io_rNode )
 
 VFlowGraph::VFlowGraph() : m_pWiring( std::make_shared<VFlowWiring>() ) {}
 
-VFlowGraph::~VFlowGraph()
+VFlowGraph::~VFlowGraph() { Clear(); }
+
+void VFlowGraph::Clear()
 {
+  std::vector<VFlowNodeId> Nodes;
   Stop();
-  VFlowWiring::VNodes Nodes;   // ends without the lock
-  VLock Lock( m_pWiring->m_Mutex );
-  Nodes.swap( m_pWiring->m_Nodes );
+  {
+    VLock Lock( m_pWiring->m_Mutex );
+    for( const auto& rEntry : m_pWiring->m_Nodes )
+    {
+      Nodes.push_back( rEntry.first );
+    }
+  }
+  for( const VFlowNodeId Node : Nodes )
+  {
+    RemoveNode( Node );
+  }
 }
 
 VFlowNodeId VFlowGraph::AddNode( std::shared_ptr<KVZ::IFlowNode> i_pNode, const VFlowNodeOptions& i_rOptions )

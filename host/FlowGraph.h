@@ -74,6 +74,9 @@ public:
   // Stops and disconnects the node, and lets go of it. False for an unknown node.
   bool RemoveNode( VFlowNodeId i_Node );
 
+  // All nodes.
+  void Clear();
+
   // False for an unknown node, input or output, and for an input that has a source already.
   bool Connect( VFlowPort i_Output, VFlowPort i_Input );
   // States that wait at the input are let go. False where there is no connection.

@@ -85,9 +85,10 @@ bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rE
   return true;
 }
 
-// The shutdown objects go first: what nobody owns any more ends there. Then every owner of the module's engine lets go.
+// Nodes use the module's sources until they have ended. Then the shutdown objects go: what nobody owns any more ends there. Then every owner of the module's engine lets go.
 void VStandAloneHost::StopModule()
 {
+  m_Flow.Clear();
   m_pShutdown->Shutdown();
   m_pHardware->ReleaseManagers();
   m_pFlowNodes->Clear();

@@ -5,6 +5,7 @@
 
 #include "StageCorePluginInterface/StageCoreHost.h"
 #include "host/CaptureTargets.h"
+#include "host/FlowGraph.h"
 #include "host/ModuleLoader.h"
 #include "host/Registries.h"
 #include "host/SyncEngine.h"
@@ -47,6 +48,9 @@ public:
   VSyncEngine& Engine() { return *m_pEngine; }
   VCaptureTargets& Targets() { return *m_pTargets; }
   VParameterRegistry& Parameters() { return *m_pParameters; }
+  // Emptied when the module ends.
+  VFlowGraph& Flow() { return m_Flow; }
+  const VFlowNodeRegistry& FlowNodes() const { return *m_pFlowNodes; }
   StageCorePluginInterface::ITimeService& Time() { return *m_pTime; }
 
   std::shared_ptr<StageCorePluginInterface::IShutdownManager> GetShutdownManager() override { return m_pShutdown; }
@@ -85,6 +89,7 @@ private:
   const std::shared_ptr<VSyncEngine> m_pEngine;
   std::map<int, std::vector<std::string>> m_FileFilters;
   std::unique_ptr<VLoadedModule> m_pModule;
+  VFlowGraph m_Flow;   // ends before the module whose nodes it runs
 };
 
 }

@@ -15,3 +15,4 @@ VCommand AddDevicesCommand( CLI::App& io_rApp );
 VCommand AddRecordCommand( CLI::App& io_rApp );
 VCommand AddInspectCommand( CLI::App& io_rApp );
 VCommand AddParamsCommand( CLI::App& io_rApp );
+VCommand AddWatchCommand( CLI::App& io_rApp );

@@ -24,7 +24,7 @@ int main( int i_ArgumentCount, char** i_ppArguments )
   CLI::App App( "Runs the video input module without the closed host: finds capture cards, records them, and reads the files.", "stagehost" );
   App.require_subcommand( 0, 1 );
   std::vector<std::pair<CLI::App*, VCommand>> Commands;
-  for( const auto& pAdd : { &AddDevicesCommand, &AddRecordCommand, &AddInspectCommand, &AddParamsCommand } )
+  for( const auto& pAdd : { &AddDevicesCommand, &AddRecordCommand, &AddInspectCommand, &AddParamsCommand, &AddWatchCommand } )
   {
     VCommand Command = pAdd( App );
     Commands.emplace_back( App.get_subcommands( nullptr ).back(), std::move( Command ) );
@@ -60,6 +60,6 @@ int main( int i_ArgumentCount, char** i_ppArguments )
     std::fprintf( stderr, "stagehost: %s\n", rError.what() );
     return ExitFailed;
   }
-  std::fputs( "stagehost: a command is needed: devices, record, inspect or params; --help tells more.\n", stderr );
+  std::fputs( "stagehost: a command is needed: devices, record, watch, inspect or params; --help tells more.\n", stderr );
   return ExitUsage;
 }
