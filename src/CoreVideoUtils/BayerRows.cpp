@@ -72,8 +72,8 @@ struct VReadMosaic
     const V16 RowAtGreen = hn::Add( AtGreen, hn::Add( Thrice( ColumnFar ), hn::ShiftLeft<3>( RowNear ) ) );
     const V16 ColumnAtGreen = hn::Add( AtGreen, hn::Add( Thrice( RowFar ), hn::ShiftLeft<3>( ColumnNear ) ) );
 
-    const V16 First = Finish( hn::IfThenElse( m_ColourLanes, GreenAtColour, RowAtGreen ) );
-    const V16 Other = Split( Finish( hn::IfThenElse( m_ColourLanes, OtherAtColour, ColumnAtGreen ) ) );
+    const V16 First = hn::ShiftRight<4>( hn::IfThenElse( m_ColourLanes, GreenAtColour, RowAtGreen ) );
+    const V16 Other = Split( hn::ShiftRight<4>( hn::IfThenElse( m_ColourLanes, OtherAtColour, ColumnAtGreen ) ) );
     const V16 Green = Split( hn::IfThenElse( m_ColourLanes, First, Centre ) );
     const V16 RowColour = Split( hn::IfThenElse( m_ColourLanes, Centre, First ) );
     return m_bRed ? MergeChannels( RowColour, Green, Other ) : MergeChannels( Other, Green, RowColour );
@@ -90,7 +90,6 @@ struct VReadMosaic
 
 private:
   static HWY_INLINE V16 Thrice( V16 i_Sum ) { return hn::Add( i_Sum, hn::ShiftLeft<1>( i_Sum ) ); }
-  static HWY_INLINE V16 Finish( V16 i_Sixteenths ) { return Limit( hn::ShiftRight<4>( i_Sixteenths ) ); }
   static HWY_INLINE V16 Split( V16 i_Channel ) { return Permute( i_Channel, SplitHalves ); }
 };
 
@@ -101,8 +100,8 @@ bool DemosaicRowVectors( const VFiveRows& i_rRows, VBayerRow i_Row, IPixelFormat
   {
     case IPixelFormat::ER8G8B8:
     case IPixelFormat::EB8G8R8: ConvertPixels( Reader, WriteThreeBytes( i_Target == IPixelFormat::ER8G8B8 ), o_pTarget, i_Pixels ); return true;
-    case IPixelFormat::ER8G8B8u8:
-    case IPixelFormat::EB8G8R8u8: ConvertPixels( Reader, WriteFourBytes( i_Target == IPixelFormat::ER8G8B8u8 ), o_pTarget, i_Pixels ); return true;
+    case IPixelFormat::ER8G8B8u8: ConvertPixels( Reader, WriteFourBytes<true, true>(), o_pTarget, i_Pixels ); return true;
+    case IPixelFormat::EB8G8R8u8: ConvertPixels( Reader, WriteFourBytes<false, true>(), o_pTarget, i_Pixels ); return true;
     case IPixelFormat::EU8Y8V8Y8:
     case IPixelFormat::EY8U8Y8V8: ConvertPixels( Reader, WritePairs( i_Target == IPixelFormat::EY8U8Y8V8 ), o_pTarget, i_Pixels ); return true;
     default: return false;

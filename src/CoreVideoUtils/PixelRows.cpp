@@ -36,14 +36,19 @@ struct VLumaOfPairs
 {
   static constexpr size_t SourceBytes = 2;
   static constexpr size_t TargetBytes = 1;
-  static constexpr size_t Units = Step;
+  static constexpr size_t Units = VectorBytes;
   static constexpr size_t MarginUnits = 0;
 
   HWY_INLINE void operator()( const uint8_t* i_pSource, uint8_t* o_pTarget ) const
   {
-    const auto Pairs = hn::BitCast( VTagUnsigned16(), hn::LoadU( VTag8(), i_pSource ) );
-    const auto Luma = bLumaFirst ? hn::And( Pairs, hn::Set( VTagUnsigned16(), 0xFF ) ) : hn::ShiftRight<8>( Pairs );
-    hn::StoreU( hn::DemoteTo( VTagHalf8(), hn::BitCast( VTag16(), Luma ) ), VTagHalf8(), o_pTarget );
+    hn::StoreU( Permute( PackBlocks( Luma( i_pSource ), Luma( i_pSource + VectorBytes ) ), JoinHalves ), VTag8(), o_pTarget );
+  }
+
+private:
+  static HWY_INLINE V16 Luma( const uint8_t* i_pPairs )
+  {
+    const auto Pairs = hn::BitCast( VTagUnsigned16(), hn::LoadU( VTag8(), i_pPairs ) );
+    return hn::BitCast( VTag16(), bLumaFirst ? hn::And( Pairs, hn::Set( VTagUnsigned16(), 0xFF ) ) : hn::ShiftRight<8>( Pairs ) );
   }
 };
 
@@ -221,13 +226,12 @@ private:
 template<class TReader>
 bool WriteRgb( const TReader& i_rReader, IPixelFormat::Enum i_Target, uint8_t* o_pTarget, size_t i_Pixels )
 {
-  const bool bRedFirst = i_Target == IPixelFormat::ER8G8B8 || i_Target == IPixelFormat::ER8G8B8u8;
   switch( i_Target )
   {
     case IPixelFormat::ER8G8B8:
-    case IPixelFormat::EB8G8R8: ConvertPixels( i_rReader, WriteThreeBytes( bRedFirst ), o_pTarget, i_Pixels ); return true;
-    case IPixelFormat::ER8G8B8u8:
-    case IPixelFormat::EB8G8R8u8: ConvertPixels( i_rReader, WriteFourBytes( bRedFirst ), o_pTarget, i_Pixels ); return true;
+    case IPixelFormat::EB8G8R8: ConvertPixels( i_rReader, WriteThreeBytes( i_Target == IPixelFormat::ER8G8B8 ), o_pTarget, i_Pixels ); return true;
+    case IPixelFormat::ER8G8B8u8: ConvertPixels( i_rReader, WriteFourBytes<true, TReader::bOpaque>(), o_pTarget, i_Pixels ); return true;
+    case IPixelFormat::EB8G8R8u8: ConvertPixels( i_rReader, WriteFourBytes<false, TReader::bOpaque>(), o_pTarget, i_Pixels ); return true;
     default: return false;
   }
 }
@@ -316,8 +320,8 @@ bool ConvertRowVectors( VRowFormats i_Formats, const uint8_t* i_pSource, uint8_t
   {
     case IPixelFormat::ER8G8B8: return WriteAny( ReadThreeBytes( i_pSource, true ), Target, o_pTarget, i_Pixels );
     case IPixelFormat::EB8G8R8: return WriteAny( ReadThreeBytes( i_pSource, false ), Target, o_pTarget, i_Pixels );
-    case IPixelFormat::ER8G8B8u8: return WriteAny( ReadFourBytes( i_pSource, true ), Target, o_pTarget, i_Pixels );
-    case IPixelFormat::EB8G8R8u8: return WriteAny( ReadFourBytes( i_pSource, false ), Target, o_pTarget, i_Pixels );
+    case IPixelFormat::ER8G8B8u8: return WriteAny( ReadFourBytes<true>( i_pSource ), Target, o_pTarget, i_Pixels );
+    case IPixelFormat::EB8G8R8u8: return WriteAny( ReadFourBytes<false>( i_pSource ), Target, o_pTarget, i_Pixels );
     case IPixelFormat::ER5G6B5: return WriteAny( VReadTwoBytes{ { i_pSource } }, Target, o_pTarget, i_Pixels );
     case IPixelFormat::ELuminance8: return ConvertGrey( i_pSource, Target, o_pTarget, i_Pixels );
     case IPixelFormat::EU8Y8V8Y8: return ConvertPairs<false>( i_pSource, Target, o_pTarget, i_Pixels );

@@ -77,7 +77,6 @@ constexpr VBytePattern BlueFirst = { 0, 1, 2, 0x80, 3, 4, 5, 0x80, 6, 7, 8, 0x80
 constexpr VBytePattern RedFirst = { 2, 1, 0, 0x80, 5, 4, 3, 0x80, 8, 7, 6, 0x80, 11, 10, 9, 0x80 };
 constexpr VBytePattern JoinBlueFirst = { 0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 0x80, 0x80, 0x80, 0x80 };
 constexpr VBytePattern JoinRedFirst = { 2, 1, 0, 6, 5, 4, 10, 9, 8, 14, 13, 12, 0x80, 0x80, 0x80, 0x80 };
-constexpr VBytePattern SameOrder = { 0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15 };
 constexpr VBytePattern SwapRedAndBlue = { 2, 1, 0, 3, 6, 5, 4, 7, 10, 9, 8, 11, 14, 13, 12, 15 };
 constexpr VBytePattern GreenTwice = { 1, 0x80, 1, 0x80, 5, 0x80, 5, 0x80, 9, 0x80, 9, 0x80, 13, 0x80, 13, 0x80 };
 constexpr VBytePattern GreyThrice = { 0, 0, 0, 0x80, 4, 4, 4, 0x80, 8, 8, 8, 0x80, 12, 12, 12, 0x80 };
@@ -122,15 +121,49 @@ HWY_INLINE V32 MultiplyAddPairs( V16 i_Left, V16 i_Right )
   return hn::RearrangeToOddPlusEven( Sum, Odd );
 }
 
+// The same of bytes: factors of 0 to 255 and signed values, with sums of no more than 16 bits
+HWY_INLINE V16 MultiplyAddBytes( V8 i_Factors, V8 i_Signed )
+{
+#if HWY_TARGET == HWY_AVX3
+  return V16{ _mm512_maddubs_epi16( i_Factors.raw, i_Signed.raw ) };
+#elif HWY_TARGET == HWY_AVX2
+  return V16{ _mm256_maddubs_epi16( i_Factors.raw, i_Signed.raw ) };
+#elif HWY_TARGET == HWY_SSE4
+  return V16{ _mm_maddubs_epi16( i_Factors.raw, i_Signed.raw ) };
+#else
+  const V16 Factors = hn::BitCast( VTag16(), i_Factors );
+  const V16 Signed = hn::BitCast( VTag16(), i_Signed );
+  const V16 Low = hn::Mul( hn::And( Factors, hn::Set( VTag16(), 0xFF ) ), hn::ShiftRight<8>( hn::ShiftLeft<8>( Signed ) ) );
+  const V16 HighFactors = hn::And( hn::ShiftRight<8>( Factors ), hn::Set( VTag16(), 0xFF ) );
+  return hn::Add( Low, hn::Mul( HighFactors, hn::ShiftRight<8>( Signed ) ) );
+#endif
+}
+
 HWY_INLINE V16 Limit( V16 i_Vector ) { return hn::Min( hn::Max( i_Vector, hn::Zero( VTag16() ) ), hn::Set( VTag16(), 255 ) ); }
+
+// Limited to 0 to 255, block by block: eight bytes of the first, then eight of the second.
+HWY_INLINE V8 PackBlocks( V16 i_First, V16 i_Second )
+{
+#if HWY_TARGET == HWY_AVX3
+  return V8{ _mm512_packus_epi16( i_First.raw, i_Second.raw ) };
+#elif HWY_TARGET == HWY_AVX2
+  return V8{ _mm256_packus_epi16( i_First.raw, i_Second.raw ) };
+#else
+  static_assert( Blocks == 1 );
+  const hn::Half<VTag8> Tag;
+  return hn::Combine( VTag8(), hn::DemoteTo( Tag, i_Second ), hn::DemoteTo( Tag, i_First ) );
+#endif
+}
 
 HWY_INLINE VPixel Opaque( VPixel i_Pixels ) { return hn::Or( i_Pixels, hn::Set( VTagPixel(), 0xFF000000U ) ); }
 
-// Channels of 0 to 255 whose halves lie as SplitHalves leaves them
+// Channels, limited to 0 to 255, whose halves lie as SplitHalves leaves them; to opaque pixels
 HWY_INLINE VPixels MergeChannels( V16 i_Red, V16 i_Green, V16 i_Blue )
 {
-  const V16 BlueGreen = hn::Or( i_Blue, hn::ShiftLeft<8>( i_Green ) );
-  const V16 RedUnused = hn::Or( i_Red, hn::Set( VTag16(), static_cast<int16_t>( 0xFF00 ) ) );
+  const V8 BlueThenRed = PackBlocks( i_Blue, i_Red );
+  const V8 GreenThenUnused = PackBlocks( i_Green, hn::Set( VTag16(), 255 ) );
+  const V16 BlueGreen = hn::BitCast( VTag16(), hn::InterleaveLower( VTag8(), BlueThenRed, GreenThenUnused ) );
+  const V16 RedUnused = hn::BitCast( VTag16(), hn::InterleaveUpper( VTag8(), BlueThenRed, GreenThenUnused ) );
   return { hn::BitCast( VTagPixel(), hn::InterleaveLower( VTag16(), BlueGreen, RedUnused ) ),
     hn::BitCast( VTagPixel(), hn::InterleaveUpper( VTag16(), BlueGreen, RedUnused ) ) };
 }

@@ -39,6 +39,7 @@ private:
 
 HWY_INLINE VWriteThreeBytes WriteThreeBytes( bool i_bRedFirst ) { return { Repeat( i_bRedFirst ? JoinRedFirst : JoinBlueFirst ) }; }
 
+template<bool bRedFirst, bool bOpaque>
 struct VWriteFourBytes
 {
   static constexpr size_t BytesPerPixel = 4;
@@ -47,11 +48,23 @@ struct VWriteFourBytes
 
   HWY_INLINE void operator()( const VPixels& i_rPixels, uint8_t* o_pPixel ) const
   {
-    hn::StoreU( hn::TableLookupBytes( hn::BitCast( VTag8(), i_rPixels.m_First ), m_Order ), VTag8(), o_pPixel );
-    hn::StoreU( hn::TableLookupBytes( hn::BitCast( VTag8(), i_rPixels.m_Second ), m_Order ), VTag8(), o_pPixel + VectorBytes );
+    hn::StoreU( Order( i_rPixels.m_First ), VTag8(), o_pPixel );
+    hn::StoreU( Order( i_rPixels.m_Second ), VTag8(), o_pPixel + VectorBytes );
+  }
+
+private:
+  HWY_INLINE V8 Order( VPixel i_Pixels ) const
+  {
+    const V8 Bytes = hn::BitCast( VTag8(), bOpaque ? i_Pixels : Opaque( i_Pixels ) );
+    return bRedFirst ? hn::TableLookupBytes( Bytes, m_Order ) : Bytes;
   }
 };
-HWY_INLINE VWriteFourBytes WriteFourBytes( bool i_bRedFirst ) { return { Repeat( i_bRedFirst ? SwapRedAndBlue : SameOrder ) }; }
+// For what is opaque already, and for what is not
+template<bool bRedFirst, bool bOpaque>
+HWY_INLINE VWriteFourBytes<bRedFirst, bOpaque> WriteFourBytes()
+{
+  return { Repeat( SwapRedAndBlue ) };
+}
 
 // Each pixel's own Y, and its own U in even pixels, V in odd ones. The factors of Y add up to 65535, those of U to 1, those of V to 0: with blue
 // and red less green, and green for itself, all fit 16 bits. V's are halved.
