@@ -141,21 +141,10 @@ bool VMkvWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
 
 bool VMkvWriter::DoClose()
 {
-  const bool bFinished = IsHeaded() && Finish();
+  const bool bFinished = IsHeaded() && Guarded( "Close", [&] { return m_pSegment->Finish(); } );
   m_pSegment.reset();
   const std::unique_ptr<VMkvIOCallback> pFile = std::move( m_pFile );
   return pFile->Stream().Close() && bFinished;
-}
-
-bool VMkvWriter::Finish() const
-try
-{
-  return m_pSegment->Finish();
-}
-catch( const std::exception& rError )
-{
-  KVZ_LOG_ERROR( Category(), "The tables of the file could not be written: %1%.", rError.what() );
-  return false;
 }
 
 }

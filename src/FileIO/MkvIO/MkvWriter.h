@@ -40,7 +40,6 @@ private:
   bool DoClose() override;
 
   bool EncodeAttributes( const WriterSupport::VHeader& i_rHeader, KVZ::IVideoAttributes& o_rInternal, KVZ::IVideoAttributes& o_rExternal ) const;
-  bool Finish() const;
 
   const VWriterCapabilities m_Capabilities;
   const WriterSupport::VStreamMaker m_StreamMaker;

@@ -203,19 +203,6 @@ TEST_F( MkvWriter, BothAttributeMapsAreFoundAgainAsTags )
   EXPECT_EQ( Ids( Targets[0]->m_Children ), std::vector<uint32_t>{ Ebml::TagAttachmentUID } );
 }
 
-TEST_F( MkvWriter, FrameKeysCountTheFrames )
-{
-  ASSERT_TRUE( m_Movie.Begin() );
-  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 1 ) );
-  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "", 0 ) );
-  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "" ) );
-  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 3 ) );
-  EXPECT_FALSE( m_Movie.WriteFrame( "ABCD", "", 1 ) );
-  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "", 2 ) );
-  EXPECT_TRUE( m_Movie.m_Writer.Close() );
-  EXPECT_EQ( ReadBlocks( Parse() ).size(), 3u );
-}
-
 TEST_F( MkvWriter, FramesInPiecesAreJoinedAndWrongOnesRefused )
 {
   ASSERT_TRUE( m_Movie.Begin() );
@@ -243,16 +230,6 @@ TEST_F( MkvWriter, FramesInPiecesAreJoinedAndWrongOnesRefused )
   EXPECT_EQ( Blocks[0].m_Data, Text( "ABCD" ) );
   EXPECT_EQ( Blocks[1].m_Data, Text( "abcd" ) );
   EXPECT_EQ( Blocks[2].m_Data, Text( "EFGH" ) );
-}
-
-TEST_F( MkvWriter, SoundKeepsTheHeadersChannels )
-{
-  VDescription Description;
-  Description.m_Audio = { IAudioSampleFormat::EInt16, 48000, 1 };
-  ASSERT_TRUE( m_Movie.Begin( Description ) );
-  EXPECT_TRUE( m_Movie.WriteFrame( "ABCD", "aabbccdd" ) );
-  ASSERT_TRUE( m_Movie.m_Writer.Close() );
-  EXPECT_EQ( ReadBlocks( Parse() ).at( 1 ).m_Data, Text( "aacc" ) );
 }
 
 TEST_F( MkvWriter, WithoutSoundThereIsOneTrack )

@@ -3,6 +3,8 @@
 
 #include "Core/VideoInterface/EnumTable.h"
 
+#include <boost/optional.hpp>
+
 using namespace KVZ;
 
 namespace WriterContract
