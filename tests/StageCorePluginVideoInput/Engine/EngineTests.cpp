@@ -5,6 +5,7 @@
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "cards/common/VirtualCardControl.h"
+#include "tests/support/FakeFlowServices.h"
 #include "tests/support/FakeHost.h"
 #include "tests/support/LogCapture.h"
 
@@ -209,6 +210,29 @@ TEST_F( VideoInputEngine, FramesReachTheSourceOnceTheSignalIsThere )
   EXPECT_TRUE( m_pEngine->StartCapture( "vi:0" ) );
   Control().Step( Card, 2 );
   EXPECT_FALSE( m_pEngine->StartCapture( "vi:1" ) );
+}
+
+// Nodes may be made before their device is there and outlive the engine.
+TEST_F( VideoInputEngine, FlowNodesFindTheSourcesOfTheMoment )
+{
+  AddCard();
+  MakeAndStart();
+  const auto pFactory = m_pHost->m_pFlowNodes->Find( "VideoInputDataSource" );
+  const auto pNode = pFactory->CreateNode();
+  pNode->ParameterTexts() = { { "DeviceURN", "vi:0" } };
+  const auto pServices = std::make_shared<TestSupport::VFakeFlowServices>();
+  const auto Starts = [&]
+  {
+    const bool bStarts = !KVZ::IsFlowFailure( pNode->PreProcessChecked( pServices ) );
+    pNode->PostProcessChecked();
+    return bStarts;
+  };
+  EXPECT_FALSE( Starts() );
+  m_pHost->m_pHardwareStart->Fire();
+  WaitForStatus( "vi:0", EStatus::ECapturing );
+  EXPECT_TRUE( Starts() );
+  m_pEngine.reset();
+  EXPECT_FALSE( Starts() );
 }
 
 TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )

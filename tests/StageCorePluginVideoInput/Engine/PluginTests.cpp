@@ -1,6 +1,7 @@
 #include "StageCorePluginVideoInput/StageCorePluginVideoInput.h"
 
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
+#include "StageCorePluginInterface/FlowNode.h"
 #include "StageCorePluginInterface/HardwareRegistry.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/FakeHost.h"
@@ -92,6 +93,21 @@ TEST( Plugin, RegistersItsHardwareInOrder )
   EXPECT_FALSE( rIsOurs( Reader, VDataPath() ) );
   EXPECT_FALSE( rIsOurs( Reader, VDataPath{ "VideoInputs" } ) );
   EXPECT_FALSE( rIsOurs( Reader, VDataPath{ "Attributes", "VideoInput" } ) );
+}
+
+TEST( Plugin, GivesTheHostItsFlowNodesTwice )
+{
+  VFakeHost Host;
+  VStageCorePluginVideoInput Plugin;
+  Plugin.Initialise( Host );
+  EXPECT_EQ( Host.m_pFlowNodes->Count(), 1u ) << "the engine's own";
+  EXPECT_TRUE( Plugin.RegisterFlowNodeFactories( *Host.m_pFlowNodes ) );
+  EXPECT_EQ( Host.m_pFlowNodes->Count(), 2u );
+  const auto pFactory = Host.m_pFlowNodes->Find( "VideoInputDataSource" );
+  ASSERT_NE( pFactory, nullptr );
+  EXPECT_EQ( pFactory->DescribeParameters().count( "DeviceURN" ), 1u );
+  EXPECT_EQ( pFactory->CreateNode()->NodeInfo().m_Outputs.size(), 1u );
+  EXPECT_EQ( Host.m_pFlowNodes->Find( "AudioInputDataSource" ), nullptr );
 }
 
 TEST( Plugin, ItsEngineLivesAsLongAsTheHostHoldsTheManager )
