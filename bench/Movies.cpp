@@ -226,7 +226,7 @@ std::vector<VFigure> MeasureMovies( const VBenchOptions& i_rOptions )
   std::array<std::vector<double>, Cases.size()> Plain;
   std::array<std::vector<double>, Cases.size()> Own;
   std::array<std::vector<double>, Cases.size()> FFmpeg;
-  for( int Round = 0; Round < ( i_rOptions.m_bQuick ? 5 : 7 ); ++Round )
+  for( int Round = 0; Round < 5; ++Round )
   {
     for( size_t Case = 0; Case < Cases.size(); ++Case )
     {
