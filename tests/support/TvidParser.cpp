@@ -31,6 +31,10 @@ uint64_t ImageSize( const std::string& i_rFormat, uint64_t i_Width, uint64_t i_H
   {
     return 4 * i_Width * i_Height;
   }
+  if( i_rFormat == "R8G8B8" )
+  {
+    return 3 * i_Width * i_Height;
+  }
   throw std::runtime_error( "tvid: no size known for pixel format " + i_rFormat );
 }
 
