@@ -102,10 +102,9 @@ VideoEncoding::VBurnInSettings BurnInPlaceFor( const std::string& i_rText, const
   }
   const CoreVideoUtils::VFontCell& rCell = CoreVideoUtils::FontCells[Settings.m_SizeIndex];
   const uint32_t Width = rCell.m_Width * static_cast<uint32_t>( i_rText.size() );
-  const uint32_t Height = 2 * rCell.m_Height;
   // Even, so that text and picture share no chroma in 4:2:2 at its left edge.
   Settings.m_X = i_rInfo.m_ImageWidth > Width ? ( i_rInfo.m_ImageWidth - Width ) / 2 & ~1u : 0;
-  Settings.m_Y = i_rInfo.m_ImageHeight > Height ? i_rInfo.m_ImageHeight - Height : 0;
+  Settings.m_Y = i_rInfo.m_ImageHeight > 2 * rCell.m_Height ? rCell.m_Height : 0;
   return Settings;
 }
 

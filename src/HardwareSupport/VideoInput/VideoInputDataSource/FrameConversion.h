@@ -53,7 +53,7 @@ private:
 // of a timecode that is not valid.
 std::string BurnInTextOf( const KVZ::ITimecode& i_rTimecode );
 
-// At the lower edge, in the middle, one line above it; as large as a fifteenth of the picture's height allows.
+// At the upper edge, in the middle, one line below it; as large as a fifteenth of the picture's height allows.
 VideoEncoding::VBurnInSettings BurnInPlaceFor( const std::string& i_rText, const KVZ::VideoFrameInfo& i_rInfo );
 
 }

@@ -344,7 +344,7 @@ protected:
 
 }
 
-// 11 characters of 12 x 20 pixels, in the middle of 140 x 60, one line above the lower edge.
+// 11 characters of 12 x 20 pixels, in the middle of 140 x 60, one line below the upper edge.
 TEST_F( ConvertedCapture, EachFrameCarriesItsOwnTimecode )
 {
   UsePicture( 140, 60, KVZ::IPixelFormat::ELuminance8 );
