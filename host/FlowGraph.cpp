@@ -78,6 +78,7 @@ void RunNode( const VWiringPtr& i_pWiring, const VNodePtr& i_pNode )
 {
   const DebugServices::VCrashHandlerForThread CrashHandler;
   DebugServices::SetThreadName( i_pNode->m_Name );
+  KVZ_LOG( "FlowGraph", 6, "Node %1% runs.", i_pNode->m_Name );
   const VOutcome Outcome = RunToEnd( i_pWiring, i_pNode );
   if( Outcome.m_bFailed )
   {

@@ -37,6 +37,7 @@ struct VWatch
 {
   VDeviceInfo m_Device;
   VFlowNodeId m_Source = 0;
+  uint64_t m_CardDroppedBefore = 0;   // when the watching began
   std::shared_ptr<VFlowWatcher> m_pWatcher;
 };
 
@@ -75,7 +76,7 @@ VWatchedDevice Look( VHostSession& i_rSession, const VWatch& i_rWatch, const std
   {
     const auto Status = ( *Source )->Temporal().GetSourceSyncStatus();
     Device.m_BufferFill = Status.m_BufferFill;
-    Device.m_CardDropped = Status.m_DroppedFrames;
+    Device.m_CardDropped = Status.m_DroppedFrames - i_rWatch.m_CardDroppedBefore;
     Device.m_Timing = ( *Source )->Temporal().GetSourceTimingInfo();
   }
   return Device;
@@ -130,7 +131,7 @@ int ExitCodeOf( const std::vector<VWatchedDevice>& i_rWatched )
   {
     return ExitFailed;
   }
-  if( Has( []( const VWatchedDevice& i_rDevice ) { return i_rDevice.m_Figures.m_MissedFrames != 0; } ) )
+  if( Has( []( const VWatchedDevice& i_rDevice ) { return i_rDevice.m_CardDropped + i_rDevice.m_Figures.m_MissedFrames != 0; } ) )
   {
     return ExitLostFrames;
   }
@@ -160,13 +161,17 @@ bool WatchUntilDone( VHostSession& i_rSession, const std::vector<VWatch>& i_rWat
 
 int Watch( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
-  const std::vector<VWatch> Watches = MakeGraph( i_rSession.Host(), i_rDevices, !i_rOptions.m_Snapshots.empty() );
+  std::vector<VWatch> Watches = MakeGraph( i_rSession.Host(), i_rDevices, !i_rOptions.m_Snapshots.empty() );
   if( Watches.empty() )
   {
     Complain( std::string( "The module has no flow node \"" ) + SupplyingNode + "\"." );
     return ExitFailed;
   }
   VWatchReport Report( i_rOptions.m_bJson );
+  for( VWatch& rWatch : Watches )
+  {
+    rWatch.m_CardDroppedBefore = Look( i_rSession, rWatch, {}, i_rSession.Host().Engine().GetSources() ).m_CardDropped;
+  }
   i_rSession.Host().Flow().Start();
   const bool bHealthy = WatchUntilDone( i_rSession, Watches, i_rOptions.m_Seconds, Report );
   const std::vector<VWatchedDevice> Watched = LookAtAll( i_rSession, Watches );

@@ -30,7 +30,7 @@ std::string Pair( const char* i_pFormat, double i_First, double i_Second )
 
 std::string TableText( const std::vector<VWatchedDevice>& i_rDevices )
 {
-  VTextTable Table( { "URN", "NAME", "STANDARD", "TIMECODE", "STATES", "FPS", "LATENCY ms (p99)", "DROPPED", "MISSED", "BUFFER", "DRIFT ms" } );
+  VTextTable Table( { "URN", "NAME", "STANDARD", "TIMECODE", "STATES", "FPS", "LATENCY ms (p99)", "DROPPED", "LOST", "BUFFER", "DRIFT ms" } );
   for( const VWatchedDevice& rDevice : i_rDevices )
   {
     const StageHost::VWatchFigures& rFigures = rDevice.m_Figures;
@@ -40,7 +40,7 @@ std::string TableText( const std::vector<VWatchedDevice>& i_rDevices )
       bStates ? KVZ::ToText( rFigures.m_Timecode ) : "-", std::to_string( rFigures.m_States ),
       bStates ? Text( "%.2f", rFigures.m_StatesPerSecond ) : "-",
       bStates ? Pair( "%.2f (%.2f)", rFigures.m_MedianLatency * 1e3, rFigures.m_Latency99 * 1e3 ) : "-", std::to_string( rFigures.m_DroppedFrames ),
-      std::to_string( rFigures.m_MissedFrames ), Text( "%.0f %%", rDevice.m_BufferFill * 100.0 ),
+      std::to_string( rDevice.m_CardDropped + rFigures.m_MissedFrames ), Text( "%.0f %%", rDevice.m_BufferFill * 100.0 ),
       rTiming ? Pair( "%.2f +- %.2f", rTiming->m_MeanOffset * 1e3, std::sqrt( rTiming->m_OffsetVariance ) * 1e3 ) : "-" } );
   }
   return Table.ToText();

@@ -17,8 +17,8 @@ struct VWatchedDevice
   std::string m_Name;
   std::string m_Standard;   // of the signal; "Unspecified" for none
   StageHost::VWatchFigures m_Figures;
-  double m_BufferFill = 0.0;   // 0 to 1
-  uint64_t m_CardDropped = 0;
+  double m_BufferFill = 0.0;    // 0 to 1
+  uint64_t m_CardDropped = 0;   // frames that the card has missed since the watching began
   boost::optional<KVZ::ISourceTemporal::ISourceTimingInfo> m_Timing;
   StageHost::VFlowNodeStatus m_Source;   // of the node that supplies the states
 };

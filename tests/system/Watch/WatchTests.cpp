@@ -1,0 +1,181 @@
+// `stagehost watch`: every frame of a card becomes a state, whatever happens to its signal, and nothing runs while none comes.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/system/Rates.h"
+#include "tests/support/system/StageHost.h"
+
+#include <boost/filesystem/operations.hpp>
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <fstream>
+#include <iterator>
+
+using namespace SystemTests;
+
+namespace
+{
+
+struct VWatchResult
+{
+  VRunResult m_Run;
+  nlohmann::json m_Devices = nlohmann::json::array();
+
+  nlohmann::json Device( size_t i_Index = 0 ) const { return i_Index < m_Devices.size() ? m_Devices[i_Index] : nlohmann::json::object(); }
+};
+
+VWatchResult Watch( const VArguments& i_rArguments, const VRunOptions& i_rOptions = {} )
+{
+  VWatchResult Result;
+  Result.m_Run = TestSupport::RunStageHost( VArguments{ "watch", "--json" } + i_rArguments, i_rOptions );
+  const nlohmann::json Devices = nlohmann::json::parse( Result.m_Run.m_Output, nullptr, false );
+  Result.m_Devices = Devices.is_array() ? Devices : Result.m_Devices;
+  return Result;
+}
+
+std::string CardText( const std::string& i_rMore = {} )
+{
+  return std::string( "decklink:pattern=counter,timecode=01:00:00:00,standard=" ) + Rate25.m_pStandard + ( i_rMore.empty() ? "" : "," + i_rMore );
+}
+
+// Frames that a second of watching brings at this speed, at least: the machine may be slow to start.
+constexpr double LeastShare = 0.5;
+
+}
+
+class WatchTest : public testing::Test
+{
+protected:
+  // No fault, and every frame accounted for.
+  static void ExpectWhole( const VWatchResult& i_rResult, size_t i_Device = 0 )
+  {
+    const nlohmann::json Device = i_rResult.Device( i_Device );
+    EXPECT_EQ( 0, Device.value( "faults", -1 ) ) << Device;
+    EXPECT_EQ( 0, Device.value( "missed", -1 ) ) << Device;
+  }
+  VWatchResult WatchEvents( const nlohmann::json& i_rEvents, const std::string& i_rSeconds = "2" )
+  {
+    const std::string Script = WriteScript( m_Folder.File( "script.json" ), i_rEvents );
+    return Watch( { "--card", CardText( "speed=4,script=" + Script ), "--seconds", i_rSeconds } );
+  }
+
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_F( WatchTest, EveryFrameOfEveryCardIsAState )
+{
+  const VWatchResult Result = Watch(
+    { "--card", CardText(), "--card", "decklink:pattern=counter,timecode=none,standard=SD_720_486P_5994", "--seconds", "2" } );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ASSERT_EQ( 2u, Result.m_Devices.size() ) << Describe( Result.m_Run );
+  const double Rates[] = { 25.0, 59.94 };
+  for( size_t Card = 0; Card < 2; ++Card )
+  {
+    const nlohmann::json Device = Result.Device( Card );
+    ExpectWhole( Result, Card );
+    EXPECT_GE( Device.value( "states", 0.0 ) + Device.value( "dropped", 0.0 ), 2.0 * Rates[Card] * LeastShare ) << Device;
+    EXPECT_GT( Device.value( "latency_p99_ms", -1.0 ), 0.0 );
+    EXPECT_GE( Device.value( "latency_p99_ms", -1.0 ), Device.value( "latency_median_ms", 0.0 ) );
+    EXPECT_GT( Device.value( "buffer_fill", 0.0 ), 0.0 );
+    EXPECT_TRUE( Device["drift"].is_object() ) << Device;
+  }
+  EXPECT_EQ( Rate25.m_pStandard, Result.Device().value( "standard", "" ) );
+  EXPECT_EQ( "01:00:0", Result.Device().value( "timecode", "" ).substr( 0, 7 ) );
+  EXPECT_TRUE( Result.Device( 1 )["timecode"].is_null() );
+  EXPECT_EQ( 720, Result.Device().value( "width", 0 ) );
+}
+
+TEST_F( WatchTest, GoesOnWhenTheTimecodeJumps )
+{
+  nlohmann::json Events = nlohmann::json::array();
+  for( int Jump = 1; Jump < 10; ++Jump )
+  {
+    Events.push_back( { { "frame", Jump * 40 }, { "do", "timecode-jump" }, { "to", "1" + std::to_string( Jump ) + ":00:00:00" } } );
+  }
+  const VWatchResult Result = WatchEvents( Events );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ExpectWhole( Result );
+  EXPECT_GE( Result.Device().value( "sessions", 0 ), 2 ) << Result.Device();
+  EXPECT_GE( Result.Device().value( "states", 0 ), 50 );
+}
+
+TEST_F( WatchTest, GoesOnWhenTheFormatChanges )
+{
+  const VWatchResult Result = WatchEvents( { { { "frame", 100 }, { "do", "format" }, { "standard", "SD_720_486I_5994" } } }, "3" );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ExpectWhole( Result );
+  EXPECT_EQ( "SD_720_486I_5994", Result.Device().value( "standard", "" ) );
+  EXPECT_EQ( 486, Result.Device().value( "height", 0 ) );
+  EXPECT_EQ( 4504500, Result.Device().value( "period", 0 ) );
+}
+
+// The frames in between are the card's loss where it has counted them: its device may have been stopped by then.
+TEST_F( WatchTest, GoesOnWhenTheSignalComesBack )
+{
+  const VWatchResult Result = WatchEvents( { { { "frame", 100 }, { "do", "signal-loss" }, { "frames", 50 } } }, "3" );
+  EXPECT_EQ( Result.Device().value( "card_dropped", 0 ) == 0 ? 0 : 3, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_LE( Result.Device().value( "card_dropped", 1000 ), 50 );
+  EXPECT_EQ( 0, Result.Device().value( "faults", -1 ) );
+  EXPECT_GE( Result.Device().value( "states", 0 ), 150 ) << Result.Device();
+}
+
+TEST_F( WatchTest, TellsFramesThatTheCardHasLost )
+{
+  const VWatchResult Result = WatchEvents( EveryFrames( 50, { { "do", "drop" }, { "frames", 3 } } ) );
+  EXPECT_EQ( 3, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_GT( Result.Device().value( "card_dropped", 0 ), 0 );
+  EXPECT_EQ( 0, Result.Device().value( "card_dropped", 0 ) % 3 ) << Result.Device();
+  EXPECT_EQ( 0, Result.Device().value( "faults", -1 ) ) << Result.Device();
+}
+
+// The node sleeps in its wait for the next frame: it never wakes up more often than frames come.
+TEST_F( WatchTest, NothingRunsWhileNoFrameComes )
+{
+  const VWatchResult Silent = WatchEvents( { { { "frame", 60 }, { "do", "signal-loss" }, { "frames", 1000000 } } }, "2" );
+  const nlohmann::json Device = Silent.Device();
+  EXPECT_EQ( 0, Device.value( "faults", -1 ) );
+  EXPECT_FALSE( Device.value( "signal", true ) );
+  // Each frame wakes it once at most, and so does each change of what it is connected with, of which there is one at the start.
+  EXPECT_LE( Device.value( "wake_ups", 1000 ), 60 + 2 ) << Device;
+}
+
+TEST_F( WatchTest, KeepsAPictureOfEachDevice )
+{
+  const VWatchResult Result = Watch( { "--card", CardText( "speed=4" ), "--seconds", "1", "--snapshot", m_Folder.File( "pictures" ) } );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  std::ifstream File( m_Folder.File( "pictures/vi0.png" ), std::ios::binary );
+  const std::string Bytes{ std::istreambuf_iterator<char>( File ), {} };
+  ASSERT_GT( Bytes.size(), 24u );
+  EXPECT_EQ( std::string( "\x89PNG\r\n\x1a\n", 8 ), Bytes.substr( 0, 8 ) );
+  EXPECT_EQ( std::string( "\0\0\x02\xd0\0\0\x02\x40", 8 ), Bytes.substr( 16, 8 ) ) << "720 by 576";
+
+  std::ofstream( m_Folder.File( "occupied" ) ) << "a file";
+  const VWatchResult Refused = Watch( { "--card", CardText(), "--seconds", "1", "--snapshot", m_Folder.File( "occupied" ) } );
+  EXPECT_EQ( 1, Refused.m_Run.m_ExitCode );
+  EXPECT_NE( std::string::npos, Refused.m_Run.m_Error.find( "occupied" ) );
+}
+
+TEST_F( WatchTest, AnInterruptEndsItWithTheFigures )
+{
+  VRunOptions Options;
+  bool bSent = false;
+  Options.m_OnErrorText = [&bSent]( pid_t i_Child, const std::string& i_rText )
+  {
+    if( !bSent && i_rText.find( "Node Watch vi:0 runs." ) != std::string::npos )
+    {
+      bSent = true;
+      kill( i_Child, SIGINT );
+    }
+  };
+  const VWatchResult Result = Watch( { "--card", CardText( "speed=4" ), "--verbose" }, Options );
+  EXPECT_TRUE( bSent );
+  EXPECT_FALSE( Result.m_Run.m_bTimedOut );
+  EXPECT_EQ( 1u, Result.m_Devices.size() ) << Describe( Result.m_Run );
+}
+
+TEST_F( WatchTest, RefusesWhatItCannotWatch )
+{
+  const VWatchResult Unknown = Watch( { "--card", CardText(), "--device", "vi:5", "--seconds", "1" } );
+  EXPECT_EQ( 4, Unknown.m_Run.m_ExitCode );
+  EXPECT_NE( std::string::npos, Unknown.m_Run.m_Error.find( "There is no device \"vi:5\"" ) );
+  EXPECT_EQ( 2, Watch( { "--card", CardText(), "--seconds", "0" } ).m_Run.m_ExitCode );
+}
