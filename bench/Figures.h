@@ -29,3 +29,5 @@ std::vector<VFigure> MeasureRecording( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasurePixelConversion( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureMovies( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureImageCompression( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasureImageSequence( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasureFlow( const VBenchOptions& i_rOptions );
