@@ -2,6 +2,7 @@
 #include "Core/VideoInterface/Timecode.h"
 #include "apps/stagehost/Commands.h"
 #include "apps/stagehost/ExitCode.h"
+#include "apps/stagehost/FileValidation.h"
 #include "apps/stagehost/HostSession.h"
 #include "apps/stagehost/Interrupt.h"
 #include "apps/stagehost/NumberCheck.h"
@@ -228,7 +229,8 @@ int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const st
       bStopped = true;
     }
   }
-  const auto Outcomes = Recording.GetOutcomes();
+  auto Outcomes = Recording.GetOutcomes();
+  ValidateMovies( Outcomes );
   Report.EndProgress();
   return Report.Print( Outcomes ) ? ExitCodeOf( Outcomes ) : ExitFailed;
 }
