@@ -52,7 +52,7 @@ const VRefusalCase RefusalCases[] = {
   // What the device does not offer
   { "UnknownPixelFormat", Ready + VArguments{ "--pixel-format", "XYZ" }, 2, { "--pixel-format XYZ", "U8Y8V8Y8" } },
   { "UnknownAudioFormat", Ready + VArguments{ "--audio-format", "Float" }, 2, { "--audio-format Float", "Int16", "Int32" } },
-  { "PayloadOfAnotherContainer", Ready + VArguments{ "--video", "jpeg" }, 2, { "--video jpeg", "Uncompressed" } },
+  { "PayloadOfAnotherContainer", Ready + VArguments{ "--video", "jpeg" }, 2, { "--video jpeg", "tvid takes uncompressed" } },
   { "UnknownDevice", Ready + VArguments{ "--device", "vi:7" }, 4, { "vi:7", "vi:0" } },
   { "NoDevice", Five, 4, { "--card" } },
   // The card's text
