@@ -101,7 +101,7 @@ void VVideoInputDeviceParameterHandler::OnEnabledChanged()
   }
   Variant Wish;
   bool bEnabled = false;
-  if( pEnabled->GetProposedValue( Wish ) )
+  if( pEnabled->GetProposedValue( Wish ) || pEnabled->GetValue( Wish ) )   // what was brought back may be the verified form alone
   {
     Wish.Get( bEnabled );
   }
@@ -169,10 +169,11 @@ void VVideoInputDeviceParameterHandler::UpdateTimecodeSources()
 {
   std::set<KVZ::ITimecodeSource::Enum> Sources;
   m_pDevice->GetSupportedTimecodeSources( Sources );
-  if( !OfferChoices( Keys::TimecodeSourceKey(), ChoicesOf( Sources ) ) )
+  if( Sources.empty() )
   {
     return;
   }
+  OfferChoices( Keys::TimecodeSourceKey(), ChoicesOf( Sources ) );
   KVZ::ITimecodeSource::Enum Default = *Sources.begin();
   for( const KVZ::ITimecodeSource::Enum Better : { KVZ::ITimecodeSource::ERP188_Any, KVZ::ITimecodeSource::EAny } )
   {

@@ -77,6 +77,8 @@ struct VVideoInputDeviceParameterHandler::VControlRow
   VDeviceControl ( IVideoInputDevice::*m_pGet )() const;
   void ( IVideoInputDevice::*m_pSet )( int32_t );
   bool m_bUnitDefault;   // 1.0 in place of the device's own default
+
+  double Default( const VDeviceControl& i_rControl ) const { return m_bUnitDefault ? 1.0 : static_cast<double>( i_rControl.m_Default ); }
 };
 
 const VVideoInputDeviceParameterHandler::VControlRow VVideoInputDeviceParameterHandler::ControlRows[] = {
@@ -269,7 +271,7 @@ void VVideoInputDeviceParameterHandler::CreateDeviceControls()
     rParameter.SetPresentationHint( Parameter::PresentationHint::ESlider );
     rParameter.SetRange( Variant::Make( static_cast<double>( Control.m_Minimum ) ), Variant::Make( static_cast<double>( Control.m_Maximum ) ) );
     const bool bSaved = rParameter.HasValue();
-    rParameter.SetValueDefault( Variant::Make( rRow.m_bUnitDefault ? 1.0 : static_cast<double>( Control.m_Default ) ) );
+    rParameter.SetValueDefault( Variant::Make( rRow.Default( Control ) ) );
     rParameter.SubscribeValueChanged( BindWeak( pThis, Apply ), PostalService() );
     if( bSaved )
     {
@@ -285,13 +287,10 @@ void VVideoInputDeviceParameterHandler::CreateDeviceControls()
 
 void VVideoInputDeviceParameterHandler::ApplyControl( const VControlRow& i_rRow )
 {
-  double Value = 0.0;
-  if( Read( i_rRow.m_pKey(), Value ) )
-  {
-    const double Lowest = std::numeric_limits<int32_t>::min();
-    const double Highest = std::numeric_limits<int32_t>::max();
-    ( *m_pDevice.*i_rRow.m_pSet )( static_cast<int32_t>( std::lround( std::clamp( Value, Lowest, Highest ) ) ) );
-  }
+  const double Value = ReadOr( i_rRow.m_pKey(), i_rRow.Default( ( *m_pDevice.*i_rRow.m_pGet )() ) );
+  const double Lowest = std::numeric_limits<int32_t>::min();
+  const double Highest = std::numeric_limits<int32_t>::max();
+  ( *m_pDevice.*i_rRow.m_pSet )( static_cast<int32_t>( std::lround( std::clamp( Value, Lowest, Highest ) ) ) );
 }
 
 // A device reads these at its start, so that neither a saved value nor what has been written until now needs a reaction.

@@ -2,6 +2,7 @@
 #include "tests/StageCorePluginVideoInput/Parameters/HandlerFixture.h"
 
 #include "Core/VideoInterface/Schemas.h"
+#include "StageCoreDataStore/DataVerifyWriter.h"
 #include "StageCoreDataStoreTypes/MaskGrid.h"
 
 namespace
@@ -112,6 +113,14 @@ TEST_F( VParameters, ASavedValueOfAnotherTypeCountsAsAbsent )
   EXPECT_TRUE( m_pDevice->m_Starts.empty() );
 }
 
+TEST_F( VParameters, ASavedEnabledThatIsOnlyVerifiedIsTheWishToo )
+{
+  VDataVerifyWriter( *m_pStore ).SetVerifiedValue( DeviceSchemas::Enabled( m_Device ), Variant::Make( true ) );
+  Create();
+  EXPECT_TRUE( Value<bool>( "Enabled" ) );
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
+}
+
 TEST_F( VParameters, UserIdIsTheSmallestThatNoOtherVideoInputHas )
 {
   Save( DeviceSchemas::UserId( Keys::Path( "vi:5" ) ), uint32_t{ 1 } );
@@ -179,4 +188,9 @@ TEST_F( VParameters, DeviceControlsExistWhereTheDeviceHasThem )
   EXPECT_TRUE( Set( "Exposure", 19999.6 ) );
   EXPECT_TRUE( Set( "AutoWhiteBalance", false ) );
   EXPECT_EQ( m_pDevice->m_ControlWrites, ( std::vector<std::pair<std::string, int32_t>>{ { "Exposure", 20000 }, { "AutoWhiteBalance", 0 } } ) );
+
+  m_pDevice->m_ControlWrites.clear();
+  Save( Keys::Exposure( m_Device ), std::string( "long" ) );
+  Save( Keys::Gamma( m_Device ), std::string( "soft" ) );
+  EXPECT_EQ( m_pDevice->m_ControlWrites, ( std::vector<std::pair<std::string, int32_t>>{ { "Exposure", 500 }, { "Gamma", 1 } } ) );
 }

@@ -185,7 +185,8 @@ TEST_F( VReactions, TheTimecodeSourceDefaultsToTheWidestThatThereIs )
     E::Enum m_Default;
   };
   for( const VCase& rCase : { VCase{ { E::ERP188_LTC, E::ERP188_Any, E::EAny }, E::EAny }, VCase{ { E::ERP188_LTC, E::ERP188_Any }, E::ERP188_Any },
-         VCase{ { E::EVITC_Field2, E::ESerial }, E::EVITC_Field2 } } )
+         VCase{ { E::EVITC_Field2, E::ESerial }, E::EVITC_Field2 },
+         VCase{ { E::EUnspecified, E::EAny, static_cast<E::Enum>( 9000 ) }, E::EAny } } )   // two of the same label: no list
   {
     VDataWriter( *m_pStore ).RemoveValue( Keys::TimecodeSource( m_Device ) );
     m_pDevice->m_TimecodeSources = rCase.m_Sources;
