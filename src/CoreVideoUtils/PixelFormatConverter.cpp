@@ -37,7 +37,7 @@ constexpr VFormatSet PackedFormats = PackedBayerFormats | PackedLuminanceFormats
 
 // All that can be converted, but for equal formats.
 constexpr std::array Rows = {
-  VRow{ Luminance8, RgbFormats | Colour16, &ConvertColour },
+  VRow{ Luminance8, RgbFormats, &ConvertColour },
   VRow{ Luminance8, YuvFormats, &ConvertFromYuv },
   VRow{ Luminance8, BayerFormats, &FilterBayer },
   VRow{ Luminance8, PackedLuminanceFormats, &UnpackPixels },

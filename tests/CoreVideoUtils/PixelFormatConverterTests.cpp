@@ -76,12 +76,13 @@ std::set<std::string> Names( const std::string& i_rNames )
 }
 
 const std::string Rgb = "R8G8B8 B8G8R8 R8G8B8u8 B8G8R8u8 ";
-const std::string All = Rgb +
-  "R5G6B5 U8Y8V8Y8 Y8U8Y8V8 U10Y10V10Y10 BayerRG8 BayerGB8 BayerGR8 BayerBG8 BayerGB7 BayerGB6 Luminance8 Luminance7 Luminance6 ";
+const std::string AllButPackedColour = Rgb +
+  "U8Y8V8Y8 Y8U8Y8V8 U10Y10V10Y10 BayerRG8 BayerGB8 BayerGR8 BayerBG8 BayerGB7 BayerGB6 Luminance8 Luminance7 Luminance6 ";
+const std::string All = AllButPackedColour + "R5G6B5 ";
 
 // What each format can be made of
 const std::map<std::string, std::set<std::string>> SourcesOf = {
-  { "Luminance8", Names( All ) },
+  { "Luminance8", Names( AllButPackedColour ) },
   { "BayerGB8", Names( "BayerGB8 BayerGB7 BayerGB6" ) },
   { "R8G8B8", Names( All ) },
   { "B8G8R8", Names( All ) },
@@ -175,7 +176,7 @@ TEST( PixelFormatConverter, ConvertsEachRowAsTheReferenceDoes )
     const VSize Size = { Width, 3 };
     for( const VRowFormats Formats : { VRowFormats{ IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 },
            VRowFormats{ IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10 }, VRowFormats{ IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8 },
-           VRowFormats{ IPixelFormat::EB8G8R8, IPixelFormat::EU8Y8V8Y8 }, VRowFormats{ IPixelFormat::ER5G6B5, IPixelFormat::ELuminance8 } } )
+           VRowFormats{ IPixelFormat::EB8G8R8, IPixelFormat::EU8Y8V8Y8 }, VRowFormats{ IPixelFormat::ER5G6B5, IPixelFormat::ER8G8B8 } } )
     {
       const VBytes Source = Noise( SizeOf( Formats.m_Source, Size ), Width );
       VBytes Expected( SizeOf( Formats.m_Target, Size ) );
@@ -308,6 +309,37 @@ TEST( PixelFormatConverter, PacksHighBitsWithoutGaps )
     Convert( IPixelFormat::ELuminance7, Seven, IPixelFormat::ELuminance8, { 9, 1 } ) );
   EXPECT_EQ( ( VBytes{ 0xFC, 0x00, 0xFC, 0x80, 0x00, 0xA8, 0xFC, 0x7C, 0xC0 } ),
     Convert( IPixelFormat::EBayerGB6, Six, IPixelFormat::EBayerGB8, { 3, 3 } ) );
+}
+
+// The bits of each value from its highest one on, one after another.
+VBytes PackedBitByBit( const VBytes& i_rValues, size_t i_Bits )
+{
+  VBytes Packed( ( i_rValues.size() * i_Bits + 7 ) / 8 );
+  for( size_t Bit = 0; Bit < i_rValues.size() * i_Bits; ++Bit )
+  {
+    const bool bSet = ( i_rValues[Bit / i_Bits] << Bit % i_Bits & 0x80 ) != 0;
+    Packed[Bit / 8] = static_cast<uint8_t>( Packed[Bit / 8] | ( bSet ? 0x80 >> Bit % 8 : 0 ) );
+  }
+  return Packed;
+}
+
+TEST( PixelFormatConverter, PacksAndUnpacksEveryLength )
+{
+  for( uint32_t Width = 1; Width < 70; ++Width )
+  {
+    for( const size_t Bits : { 7U, 6U } )
+    {
+      const IPixelFormat::Enum Packed = Bits == 7 ? IPixelFormat::ELuminance7 : IPixelFormat::ELuminance6;
+      VBytes Values = Noise( Width, Width );
+      const VBytes Expected = PackedBitByBit( Values, Bits );
+      ASSERT_EQ( Expected, Convert( IPixelFormat::ELuminance8, Values, Packed, { Width, 1 } ) ) << Width;
+      for( uint8_t& rValue : Values )
+      {
+        rValue = static_cast<uint8_t>( rValue & 0xFF << ( 8 - Bits ) );
+      }
+      ASSERT_EQ( Values, Convert( Packed, Expected, IPixelFormat::ELuminance8, { Width, 1 } ) ) << Width;
+    }
+  }
 }
 
 // A packed image is the unpacked one.

@@ -65,7 +65,7 @@ VPlaces SystemPlaces()
     "libMagickWand-6.Q8.so.6" } };
 }
 
-VLibrary::VLibrary( const VPlaces& i_rPlaces )
+VLibrary::VLibrary( const VPlaces& i_rPlaces, const char* i_pCategory )
 {
   const char* pFault = nullptr;
   boost::system::error_code Error;
@@ -85,7 +85,7 @@ VLibrary::VLibrary( const VPlaces& i_rPlaces )
   }
   if( pFault )
   {
-    KVZ_LOG_ERROR( "ImageMagickWrapper", pFault );
+    KVZ_LOG_ERROR( std::string( i_pCategory ), pFault );
   }
 }
 
@@ -119,9 +119,9 @@ const char* VLibrary::Open( const std::vector<std::string>& i_rNames )
   return nullptr;
 }
 
-const VLibrary& Instance()
+const VLibrary& Instance( const char* i_pCategory )
 {
-  static const VLibrary s_Library( SystemPlaces() );
+  static const VLibrary s_Library( SystemPlaces(), i_pCategory );
   return s_Library;
 }
 

@@ -1,6 +1,6 @@
 // ImageMagick's MagickWand interface, opened at run time: where it is not installed PNG and TIFF cannot be had, and all else works.
 //
-// Any thread may use the library, each on wands of its own. Faults of opening it go to the log once, category "ImageMagickWrapper".
+// Any thread may use the library, each on wands of its own. Faults of opening it go to the log once, in the category of who was first to want it.
 #pragma once
 
 #include <cstddef>
@@ -60,7 +60,7 @@ class VLibrary
 {
 public:
   // Opens the library and makes it ready; a fault has been reported when this returns.
-  explicit VLibrary( const VPlaces& i_rPlaces );
+  VLibrary( const VPlaces& i_rPlaces, const char* i_pCategory );
   // Ends the library's work, unless it was in the process before. It stays loaded: its helper threads know nothing of us.
   ~VLibrary();
   VLibrary( const VLibrary& ) = delete;
@@ -78,6 +78,6 @@ private:
 };
 
 // The process's one, made by the first call.
-const VLibrary& Instance();
+const VLibrary& Instance( const char* i_pCategory );
 
 }

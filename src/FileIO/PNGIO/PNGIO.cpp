@@ -6,7 +6,7 @@ namespace PNGIO
 namespace
 {
 
-constexpr ImageMagickWrapper::VFileKind Kind{ "png", "PNGIO" };
+constexpr ImageMagickWrapper::VFileKind Kind{ "png", Category };
 
 }
 

@@ -6,7 +6,7 @@ namespace TIFFIO
 namespace
 {
 
-constexpr ImageMagickWrapper::VFileKind Kind{ "tiff", "TIFFIO" };
+constexpr ImageMagickWrapper::VFileKind Kind{ "tiff", Category };
 
 }
 

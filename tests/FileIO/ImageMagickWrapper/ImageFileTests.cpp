@@ -32,7 +32,7 @@ struct VKind
 constexpr VKind Kinds[] = { { "png", "PNGIO", "PNG 61 37 8", &PNGIO::PNGWriter, &PNGIO::PNGReader },
   { "tiff", "TIFFIO", "TIFF 61 37 8", &TIFFIO::TIFFWriter, &TIFFIO::TIFFReader } };
 
-const ImageMagickWrapper::VLibrary& Library() { return ImageMagickWrapper::Instance(); }
+const ImageMagickWrapper::VLibrary& Library() { return ImageMagickWrapper::Instance( PNGIO::Category ); }
 
 struct VImage
 {

@@ -14,6 +14,7 @@ using ImageMagickWrapper::VPlaces;
 namespace
 {
 
+constexpr const char* Category = "PNGIO";
 constexpr const char* CoderPath = "MAGICK_CODER_MODULE_PATH";
 
 class Library : public testing::Test
@@ -22,7 +23,7 @@ protected:
   Library()
   {
     // The process's one comes first, so that none of those made here ends its work.
-    EXPECT_NE( ImageMagickWrapper::Instance().Functions(), nullptr );
+    EXPECT_NE( ImageMagickWrapper::Instance( Category ).Functions(), nullptr );
     m_Log.Clear();
   }
   ~Library() override { unsetenv( CoderPath ); }
@@ -37,7 +38,7 @@ protected:
   }
 
   const TestSupport::VTemporaryFolder m_Folder;
-  TestSupport::VLogCapture m_Log{ "ImageMagickWrapper" };
+  TestSupport::VLogCapture m_Log{ Category };
 };
 
 }
@@ -54,7 +55,7 @@ TEST_F( Library, FaultsOfOpeningAreToldOnce )
   for( const auto& [rPlaces, rText] : Cases )
   {
     m_Log.Clear();
-    const VLibrary Faulty( rPlaces );
+    const VLibrary Faulty( rPlaces, Category );
     EXPECT_EQ( Faulty.Functions(), nullptr );
     EXPECT_EQ( Faulty.Functions(), nullptr );
     EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ rText } );
@@ -66,7 +67,7 @@ TEST_F( Library, TakesTheFirstOfItsNamesThatIsThere )
   const std::vector<std::string> Names = SystemPlaces().m_Libraries;
   VPlaces Places{ { "libNoMagickWand.so.1" } };
   Places.m_Libraries.insert( Places.m_Libraries.end(), Names.begin(), Names.end() );
-  const VLibrary Found( Places );
+  const VLibrary Found( Places, Category );
   ASSERT_NE( Found.Functions(), nullptr );
   EXPECT_NE( Found.Functions()->MagickIdentifyImageType, nullptr );
   EXPECT_TRUE( m_Log.Texts().empty() );
@@ -76,19 +77,19 @@ TEST_F( Library, ItsCodersAreLookedForBesideTheProgramIfTheyAreThere )
 {
   const VPlaces Places{ { "libNoMagickWand.so.1" }, ProgramLink( m_Folder.File( "program" ) ) };
   {
-    const VLibrary WithoutCoders( Places );
+    const VLibrary WithoutCoders( Places, Category );
   }
   EXPECT_EQ( std::getenv( CoderPath ), nullptr );
 
   std::ofstream( m_Folder.File( "png.la" ) ) << "coder";
   {
-    const VLibrary WithCoders( Places );
+    const VLibrary WithCoders( Places, Category );
   }
   EXPECT_EQ( std::string( std::getenv( CoderPath ) ) + "/program", m_Folder.File( "program" ) );
 
   setenv( CoderPath, "/own", 1 );
   {
-    const VLibrary WithOwnSetting( Places );
+    const VLibrary WithOwnSetting( Places, Category );
   }
   EXPECT_STREQ( std::getenv( CoderPath ), "/own" );
 }

@@ -114,7 +114,7 @@ TEST_F( Compression, EachPayloadHasItsCompressor )
 TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
 {
   const TestSupport::VLogCapture Log;
-  const ImageMagickWrapper::VLibrary Missing( { { "libNoMagickWand.so.1" } } );
+  const ImageMagickWrapper::VLibrary Missing( { { "libNoMagickWand.so.1" } }, PNGIO::Category );
   const VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors( Missing ) ) );
   const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ) );
   for( const IVideoPayload::Enum Payload : { IVideoPayload::EImagePNG, IVideoPayload::EImageTIFF, IVideoPayload::EImagePNG } )
