@@ -162,6 +162,8 @@ TEST( BurnInText, ShowsTheSameInEveryFormat )
   ASSERT_TRUE( Draw( IPixelFormat::ELuminance8, Grey, "01:27" ) );
   std::vector<uint8_t> Pairs = ImageOf( IPixelFormat::EU8Y8V8Y8, 77 );
   ASSERT_TRUE( Draw( IPixelFormat::EU8Y8V8Y8, Pairs, "01:27" ) );
+  std::vector<uint8_t> LumaFirst = ImageOf( IPixelFormat::EY8U8Y8V8, 77 );
+  ASSERT_TRUE( Draw( IPixelFormat::EY8U8Y8V8, LumaFirst, "01:27" ) );
   std::vector<uint8_t> TenBit = ImageOf( IPixelFormat::EU10Y10V10Y10, 0 );
   ASSERT_TRUE( Draw( IPixelFormat::EU10Y10V10Y10, TenBit, "01:27" ) );
   for( uint32_t Row = 0; Row < Height; ++Row )
@@ -174,6 +176,8 @@ TEST( BurnInText, ShowsTheSameInEveryFormat )
       const size_t Pixel = ( Row * Width + Column ) * 2;
       EXPECT_NEAR( Pairs[Pixel + 1], Expected, 1 );
       EXPECT_EQ( Pairs[Pixel], bText ? 128 : 77 );
+      EXPECT_NEAR( LumaFirst[Pixel], Expected, 1 );
+      EXPECT_EQ( LumaFirst[Pixel + 1], bText ? 128 : 77 );
       const uint32_t Luma = Column * 2 + 1;
       EXPECT_NEAR( TenBitSample( TenBit, Row, Luma ), bText ? Expected * 4u : 0u, 4u );
       const uint32_t Chroma = Column / 2 * 4;
@@ -235,7 +239,8 @@ TEST( BurnInText, AnUnknownSizeIsTheMiddleOne )
   EXPECT_TRUE( Log.Texts().empty() );
   ASSERT_TRUE( Draw( IPixelFormat::ELuminance8, Image, "3", 5 ) );
   EXPECT_EQ( Image, Middle );
-  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported burn in text size." } );
+  ASSERT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported burn in text size." } );
+  EXPECT_EQ( Log.Lines().front().m_Level, 2 );
 }
 
 TEST( BurnInFont, EveryCharacterHasAShapeOfItsOwn )
