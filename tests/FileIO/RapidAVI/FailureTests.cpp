@@ -4,6 +4,7 @@
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
+#include <string_view>
 
 using namespace KVZ;
 using namespace RapidAVI;
@@ -155,7 +156,8 @@ TEST( AviWriterFailures, OnARealDisk )
 
   // The indexes have taken the place of the frame that was cut off.
   VBytes Bytes = TestSupport::VRiffParser::ReadFile( Folder.File( "cut.avi" ) );
-  const auto Attributes = std::search( Bytes.begin(), Bytes.end(), "TMSL", "TMSL" + 4 );
+  constexpr std::string_view AttributesName = "TMSL";
+  const auto Attributes = std::search( Bytes.begin(), Bytes.end(), AttributesName.begin(), AttributesName.end() );
   ASSERT_NE( Attributes, Bytes.end() );
   Bytes.erase( Attributes - 8, Bytes.end() );
   const TestSupport::VAviParser Parser( Bytes );
