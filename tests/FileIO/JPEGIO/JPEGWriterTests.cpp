@@ -5,6 +5,8 @@
 #include <gtest/gtest.h>
 #include <turbojpeg.h>
 
+#include <dlfcn.h>
+
 #include <random>
 
 using KVZ::IPixelFormat;
@@ -14,6 +16,36 @@ namespace
 {
 
 constexpr int Quality = 83;
+
+int s_Flags = 0;   // of the last compression
+
+template<class TFunction>
+TFunction* Real( const char* i_pName )
+{
+  return reinterpret_cast<TFunction*>( dlsym( RTLD_NEXT, i_pName ) );
+}
+
+}
+
+// TurboJPEG's own functions, looked at on the way. What the library does with the flags leaves no trace in an image.
+extern "C" int tjCompress2( tjhandle i_Handle, const unsigned char* i_pPixels, int i_Width, int i_Pitch, int i_Height, int i_Format,
+  unsigned char** io_ppImage, unsigned long* io_pSize, int i_Subsampling, int i_Quality, int i_Flags )
+{
+  s_Flags = i_Flags;
+  return Real<decltype( tjCompress2 )>(
+    "tjCompress2" )( i_Handle, i_pPixels, i_Width, i_Pitch, i_Height, i_Format, io_ppImage, io_pSize, i_Subsampling, i_Quality, i_Flags );
+}
+
+extern "C" int tjCompressFromYUV( tjhandle i_Handle, const unsigned char* i_pPlanes, int i_Width, int i_Padding, int i_Height, int i_Subsampling,
+  unsigned char** io_ppImage, unsigned long* io_pSize, int i_Quality, int i_Flags )
+{
+  s_Flags = i_Flags;
+  return Real<decltype( tjCompressFromYUV )>(
+    "tjCompressFromYUV" )( i_Handle, i_pPlanes, i_Width, i_Padding, i_Height, i_Subsampling, io_ppImage, io_pSize, i_Quality, i_Flags );
+}
+
+namespace
+{
 
 KVZ::VideoFrameInfo Info( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
 {
@@ -114,6 +146,16 @@ TEST( JPEGWriter, GivesTheBytesOfTurboJPEG )
   const KVZ::VideoFrameInfo YUYV = Info( IPixelFormat::EY8U8Y8V8, 66, 35 );
   EXPECT_EQ( Write( Pixels, UYVY ), VTurboJPEG().Planar( { Plane( Pixels, 1, 2 ), Plane( Pixels, 0, 4 ), Plane( Pixels, 2, 4 ) }, UYVY ) );
   EXPECT_EQ( Write( Pixels, YUYV ), VTurboJPEG().Planar( { Plane( Pixels, 0, 2 ), Plane( Pixels, 1, 4 ), Plane( Pixels, 3, 4 ) }, YUYV ) );
+}
+
+TEST( JPEGWriter, KeepsTurboJPEGFromReallocating )
+{
+  for( const IPixelFormat::Enum Format : { IPixelFormat::ELuminance8, IPixelFormat::ER8G8B8, IPixelFormat::EU8Y8V8Y8 } )
+  {
+    s_Flags = 0;
+    Write( Noise( 8 * 8 * 3 ), Info( Format, 8, 8 ) );
+    EXPECT_EQ( s_Flags, 0x400 ) << Format;
+  }
 }
 
 TEST( JPEGWriter, RefusesWhatItCannotTake )

@@ -133,22 +133,39 @@ TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
       "Error encoding data in 'R8G8B8' pixel format to 'ImageTIFF'.", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'." } ) );
 }
 
-// What the frame's own steps give, one after another: converted, text drawn, compressed.
+// Two buffers, joined; then what each step gives by itself, one after another: converted and colour corrected, text drawn, compressed.
 TEST_F( Compression, AFrameGoesThroughAllSteps )
 {
+  constexpr VColourRecord Colour = { 0.5f, 2.0f };
   VVideoFrameEncoder Encoder( EConverter::Software, AllParts() );
+  Encoder.SetColour( Colour );
   Encoder.SetBurnIn( { "01:02", 5, 3, 0 } );
+  CoreVideoUtils::VPixelFormatConverter Converter;
+  Converter.SetColourCorrection( Colour );
+  const VideoFrameInfo RGB = Info( IPixelFormat::ER8G8B8 );
   for( const IPixelFormat::Enum Format : { IPixelFormat::EBayerGB8, IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 } )
   {
     SCOPED_TRACE( ToName( Format ) );
-    const VBufferList Pixels = Noise( Info( Format ) );
-    VBufferList Expected = Pixels;
-    ASSERT_TRUE( Encoder.Encode( m_Allocator, Expected, Info( Format ), IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
-    const std::vector<uint8_t> Drawn = BytesOf( Expected );
-    EXPECT_EQ( std::vector<uint8_t>( Drawn.begin() + 3 * ( 3 * 64 + 5 ), Drawn.begin() + 3 * ( 3 * 64 + 5 ) + 3 ), std::vector<uint8_t>( 3 ) );
-    VBufferList Video = Pixels;
+    const std::vector<uint8_t> Pixels = BytesOf( Noise( Info( Format ) ) );
+    const auto pDrawn = std::make_shared<IStandardBuffer>( CoreVideoUtils::GetFrameSize( RGB ) );
+    std::vector<uint8_t>& rDrawn = pDrawn->Bytes();
+    ASSERT_TRUE( Converter.Convert( Info( Format ), Pixels.data(), Pixels.size(), RGB.m_PixelFormat, rDrawn.data(), rDrawn.size() ) );
+    ASSERT_TRUE( CoreVideoUtils::BurnInText( Converter, RGB, 0, 5, 3, "01:02", rDrawn.data(), rDrawn.size() ) );
+
+    const auto Halves = [&]() -> VBufferList
+    {
+      const auto pFirst = std::make_shared<IStandardBuffer>( 1000 );
+      const auto pSecond = std::make_shared<IStandardBuffer>( Pixels.size() - 1000 );
+      std::copy_n( Pixels.begin(), 1000, pFirst->Bytes().begin() );
+      std::copy( Pixels.begin() + 1000, Pixels.end(), pSecond->Bytes().begin() );
+      return { pFirst, pSecond };
+    };
+    VBufferList Video = Halves();
+    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
+    EXPECT_EQ( BytesOf( Video ), rDrawn );
+    Video = Halves();
     ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
-    EXPECT_EQ( BytesOf( Video ), TurboJPEG( Expected, 90 ) );
+    EXPECT_EQ( BytesOf( Video ), TurboJPEG( { pDrawn }, 90 ) );
   }
 }
 

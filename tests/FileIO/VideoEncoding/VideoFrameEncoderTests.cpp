@@ -227,17 +227,29 @@ TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
   EXPECT_EQ( Made, "12333" );
 }
 
-TEST( PixelFormatForPayload, JpegKeepsWhatItsCompressorTakes )
+TEST( PixelFormatForPayload, EachKeepsWhatItsCompressorTakes )
 {
-  for( int32_t Value = 0; Value <= 17; ++Value )
+  for( int32_t Value = 0; Value < PixelFormatCount; ++Value )
   {
     const auto Source = static_cast<IPixelFormat::Enum>( Value );
-    IPixelFormat::Enum Stored{};
-    ASSERT_TRUE( PixelFormatForPayloadFormat( IVideoPayload::EImageJPEG, Source, Stored ) );
+    SCOPED_TRACE( ToName( Source ) );
+    const auto Stored = [Source]( IVideoPayload::Enum i_Payload )
+    {
+      auto Result = static_cast<IPixelFormat::Enum>( -1 );
+      EXPECT_TRUE( PixelFormatForPayloadFormat( i_Payload, Source, Result ) );
+      return Result;
+    };
+    const bool bGrey = Value == IPixelFormat::ELuminance8 || Value == IPixelFormat::ELuminance7 || Value == IPixelFormat::ELuminance6;
     const bool bKept = Value == IPixelFormat::ELuminance8 || ( Value >= IPixelFormat::ER8G8B8 && Value <= IPixelFormat::EB8G8R8u8 );
-    EXPECT_EQ( Stored, bKept ? Source : IPixelFormat::ER8G8B8 );
+    EXPECT_EQ( Stored( IVideoPayload::ENone ), IPixelFormat::EUnspecified );
+    EXPECT_EQ( Stored( IVideoPayload::EUncompressed ), Source );
+    EXPECT_EQ( Stored( IVideoPayload::EImageJPEG ), bKept ? Source : IPixelFormat::ER8G8B8 );
+    EXPECT_EQ( Stored( IVideoPayload::EImagePNG ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
+    EXPECT_EQ( Stored( IVideoPayload::EImageTIFF ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
   }
+  const TestSupport::VLogCapture Log( "VideoEncoding" );
   auto Kept = IPixelFormat::ER5G6B5;
   EXPECT_FALSE( PixelFormatForPayloadFormat( IVideoPayload::EVideoH264, IPixelFormat::ER8G8B8, Kept ) );
   EXPECT_EQ( Kept, IPixelFormat::ER5G6B5 );
+  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported video payload format 'VideoH264'." } );
 }
