@@ -4,6 +4,7 @@
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
+
 #include <string_view>
 
 using namespace KVZ;
