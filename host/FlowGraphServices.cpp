@@ -2,8 +2,6 @@
 
 #include "host/FlowGraphState.h"
 
-#include <boost/chrono/duration.hpp>
-#include <boost/chrono/system_clocks.hpp>
 #include <boost/thread/lock_guard.hpp>
 
 #include <algorithm>
@@ -22,15 +20,12 @@ class VFlowGraphServices::VDeadline
 {
 public:
   explicit VDeadline( VFlowLimit i_Limit )
-    : m_Limit( i_Limit ),
-      m_Time( i_Limit.IsNone() || i_Limit.m_Milliseconds == 0
-          ? boost::chrono::steady_clock::time_point()
-          : boost::chrono::steady_clock::now() + boost::chrono::milliseconds( i_Limit.m_Milliseconds ) )
+    : m_Limit( i_Limit ), m_Time( i_Limit.IsNone() || i_Limit.m_Milliseconds == 0 ? timespec() : MonotonicTimeAfter( i_Limit.m_Milliseconds ) )
   {
   }
 
   // False where there is no time left to sleep.
-  bool Sleep( boost::condition_variable_any& io_rCondition, boost::mutex& io_rMutex ) const
+  bool Sleep( VFlowCondition& io_rCondition, boost::mutex& io_rMutex ) const REQUIRES( io_rMutex )
   {
     if( m_Limit.m_Milliseconds == 0 )
     {
@@ -38,15 +33,15 @@ public:
     }
     if( m_Limit.IsNone() )
     {
-      io_rCondition.wait( io_rMutex );
+      io_rCondition.Wait( io_rMutex );
       return true;
     }
-    return io_rCondition.wait_until( io_rMutex, m_Time ) == boost::cv_status::no_timeout;
+    return io_rCondition.WaitUntil( io_rMutex, m_Time );
   }
 
 private:
   const VFlowLimit m_Limit;
-  const boost::chrono::steady_clock::time_point m_Time;
+  const timespec m_Time;
 };
 
 VFlowGraphServices::VFlowGraphServices( std::shared_ptr<VFlowWiring> i_pWiring, std::shared_ptr<VFlowGraphNode> i_pNode )
@@ -96,6 +91,7 @@ uint32_t VFlowGraphServices::ReadOneOf( const std::vector<uint32_t>& i_rInputs, 
 {
   const VDeadline Deadline( i_Limit );
   o_rpState.reset();
+  VNotified Notified;   // without the lock
   VLock Lock( m_rWiring.m_Mutex );
   if( i_rInputs.empty() || !AreInputs( i_rInputs ) )
   {
@@ -119,7 +115,7 @@ uint32_t VFlowGraphServices::ReadOneOf( const std::vector<uint32_t>& i_rInputs, 
     return EFlowResult::EndOfData;
   }
   o_rInput = *Found;
-  o_rpState = m_rWiring.Take( m_rNode.m_Inputs[o_rInput] );
+  o_rpState = m_rWiring.Take( m_rNode.m_Inputs[o_rInput], Notified );
   ++m_rNode.m_Status.m_StatesRead;
   m_rWiring.TellObservers();
   return EFlowResult::Ok;
@@ -128,6 +124,7 @@ uint32_t VFlowGraphServices::ReadOneOf( const std::vector<uint32_t>& i_rInputs, 
 uint32_t VFlowGraphServices::Write( uint32_t i_Output, const VFlowStatePtr& i_pState, VFlowLimit i_Limit, uint32_t i_Flags )
 {
   const VDeadline Deadline( i_Limit );
+  VNotified Notified;   // without the lock
   VLock Lock( m_rWiring.m_Mutex );
   if( i_Output >= m_rNode.m_Outputs.size() )
   {
@@ -149,7 +146,7 @@ uint32_t VFlowGraphServices::Write( uint32_t i_Output, const VFlowStatePtr& i_pS
   {
     return ( i_Flags & KVZ::EFlowFlags::Rewirable ) != 0 ? EFlowResult::Ok : EFlowResult::NotConnected;
   }
-  m_rWiring.Send( rOutput, i_pState );
+  m_rWiring.Send( rOutput, i_pState, Notified );
   ++m_rNode.m_Status.m_StatesWritten;
   m_rWiring.TellObservers();
   return EFlowResult::Ok;
@@ -244,12 +241,15 @@ uint32_t VFlowGraphServices::SleepInCall( const VDeadline& i_rDeadline, bool i_b
 
 void VFlowGraphServices::Wake( uint64_t i_WakeToken )
 {
-  VLock Lock( m_rWiring.m_Mutex );
-  if( i_WakeToken != 0 && i_WakeToken == m_rNode.m_WakeToken )
   {
+    VLock Lock( m_rWiring.m_Mutex );
+    if( i_WakeToken == 0 || i_WakeToken != m_rNode.m_WakeToken )
+    {
+      return;
+    }
     m_rNode.m_bWoken = true;
-    m_rNode.m_Changed.notify_all();
   }
+  m_rNode.m_Changed.Notify();   // a node that does not have to wait for the lock wakes up once
 }
 
 uint32_t VFlowGraphServices::GlobalItems( VFlowLimit i_Limit, KVZ::VFlowItemList& o_rItems )

@@ -78,6 +78,15 @@ VWatchFigures VFlowWatcher::GetFigures() const
   return Figures;
 }
 
+void VFlowWatcher::BeginAnew()
+{
+  boost::lock_guard<boost::mutex> Lock( m_Mutex );
+  m_Figures = {};
+  m_Session = {};
+  m_Latencies.clear();
+  m_Times.clear();
+}
+
 std::shared_ptr<const KVZ::VFlowVideoFrame> VFlowWatcher::GetNewest() const
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );

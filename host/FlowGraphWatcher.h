@@ -46,6 +46,8 @@ public:
 
   // Any thread
   VWatchFigures GetFigures() const;
+  // Forgets what has been seen so far.
+  void BeginAnew();
   // The newest image, if it was to be kept; its frame stays in memory until the next one or until it is let go. Empty pointers otherwise.
   std::shared_ptr<const KVZ::VFlowVideoFrame> GetNewest() const;
 

@@ -65,27 +65,27 @@ bool VFlowWiring::HasRoom( const VFlowOutput& i_rOutput ) const
   return true;
 }
 
-void VFlowWiring::Send( const VFlowOutput& i_rOutput, const KVZ::VFlowStatePtr& i_pState )
+void VFlowWiring::Send( const VFlowOutput& i_rOutput, const KVZ::VFlowStatePtr& i_pState, VNotified& o_rNotified )
 {
   for( const VFlowPort& rTo : i_rOutput.m_To )
   {
-    VFlowGraphNode& rNode = *Find( rTo.m_Node );
-    if( rNode.m_Status.m_State == EFlowNodeState::Running )
+    const auto& pNode = m_Nodes.find( rTo.m_Node )->second;
+    if( pNode->m_Status.m_State == EFlowNodeState::Running )
     {
-      rNode.m_Inputs[rTo.m_Index].m_Queue.push_back( i_pState );
-      rNode.m_Changed.notify_all();
+      pNode->m_Inputs[rTo.m_Index].m_Queue.push_back( i_pState );
+      o_rNotified.Add( pNode );
     }
   }
 }
 
-KVZ::VFlowStatePtr VFlowWiring::Take( VFlowInput& io_rInput )
+KVZ::VFlowStatePtr VFlowWiring::Take( VFlowInput& io_rInput, VNotified& o_rNotified )
 {
   KVZ::VFlowStatePtr pState = std::move( io_rInput.m_Queue.front() );
   io_rInput.m_Queue.pop_front();
-  VFlowGraphNode* const pSource = Find( io_rInput.m_From.m_Node );
-  if( pSource && pSource->m_bWaitsForRoom )
+  const auto Source = m_Nodes.find( io_rInput.m_From.m_Node );
+  if( Source != m_Nodes.end() && Source->second->m_bWaitsForRoom )
   {
-    pSource->m_Changed.notify_all();
+    o_rNotified.Add( Source->second );
   }
   return pState;
 }
@@ -114,7 +114,7 @@ void VFlowWiring::End( VFlowGraphNode& io_rNode, EFlowNodeState i_State, VLeftSt
 void VFlowWiring::RequestStop( VFlowGraphNode& io_rNode )
 {
   io_rNode.m_bStopping = true;
-  io_rNode.m_Changed.notify_all();
+  io_rNode.m_Changed.Notify();
 }
 
 void VFlowWiring::Disconnect( VFlowPort i_Input, VLeftStates& o_rLeft )
@@ -153,14 +153,14 @@ void VFlowWiring::TellNeighbours( VFlowGraphNode& io_rNode )
 void VFlowWiring::TellRewired( VFlowGraphNode& io_rNode )
 {
   io_rNode.m_bRewired = true;
-  io_rNode.m_Changed.notify_all();
+  io_rNode.m_Changed.Notify();
 }
 
 void VFlowWiring::TellObservers()
 {
   if( m_Observers != 0 )
   {
-    m_Observed.notify_all();
+    m_Observed.Notify();
   }
 }
 

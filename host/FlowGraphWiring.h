@@ -6,8 +6,9 @@
 
 #include "StageCoreRuntime/ThreadAnnotations.h"
 #include "host/FlowGraph.h"
+#include "host/FlowGraphCondition.h"
 
-#include <boost/thread/condition_variable.hpp>
+#include <boost/container/small_vector.hpp>
 #include <boost/thread/mutex.hpp>
 #include <boost/thread/thread.hpp>
 
@@ -58,7 +59,27 @@ struct VFlowGraphNode
   bool m_bGlobalChanged = false;   // since the node last took the global items
   uint64_t m_WakeToken = 0;        // of the blocking call that runs; 0: none
   bool m_bWoken = false;
-  boost::condition_variable_any m_Changed;
+  VFlowCondition m_Changed;
+};
+
+// Notifies nodes when it ends.
+class VNotified
+{
+public:
+  VNotified() = default;
+  VNotified( const VNotified& ) = delete;
+  VNotified& operator=( const VNotified& ) = delete;
+  ~VNotified()
+  {
+    for( const auto& pNode : m_Nodes )
+    {
+      pNode->m_Changed.Notify();
+    }
+  }
+  void Add( std::shared_ptr<VFlowGraphNode> i_pNode ) { m_Nodes.push_back( std::move( i_pNode ) ); }
+
+private:
+  boost::container::small_vector<std::shared_ptr<VFlowGraphNode>, 4> m_Nodes;
 };
 
 class VFlowWiring
@@ -84,8 +105,9 @@ public:
   // All running nodes that the output leads to can take a state; also where there is none.
   bool HasRoom( const VFlowOutput& i_rOutput ) const REQUIRES( m_Mutex );
 
-  void Send( const VFlowOutput& i_rOutput, const KVZ::VFlowStatePtr& i_pState ) REQUIRES( m_Mutex );
-  KVZ::VFlowStatePtr Take( VFlowInput& io_rInput ) REQUIRES( m_Mutex );
+  // Both add the nodes that have to be notified, which is done without the lock: they would only wait for it.
+  void Send( const VFlowOutput& i_rOutput, const KVZ::VFlowStatePtr& i_pState, VNotified& o_rNotified ) REQUIRES( m_Mutex );
+  KVZ::VFlowStatePtr Take( VFlowInput& io_rInput, VNotified& o_rNotified ) REQUIRES( m_Mutex );
 
   // Marks the node running, before its thread exists.
   void Begin( VFlowGraphNode& io_rNode ) REQUIRES( m_Mutex );
@@ -105,14 +127,14 @@ public:
     ++m_Observers;
     while( !i_Predicate() )
     {
-      m_Observed.wait( m_Mutex );
+      m_Observed.Wait( m_Mutex );
     }
     --m_Observers;
   }
 
 private:
   unsigned int m_Observers GUARDED_BY( m_Mutex ) = 0;
-  boost::condition_variable_any m_Observed;
+  VFlowCondition m_Observed;
 };
 
 }

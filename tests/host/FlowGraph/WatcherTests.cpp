@@ -101,6 +101,10 @@ TEST_F( FlowWatcher, TellsDroppedFramesFromMissedOnes )
   EXPECT_EQ( Figures.m_Sessions, 2u );
   EXPECT_EQ( Figures.m_MissedFrames, 2u );
   EXPECT_EQ( Figures.m_Faults, 0u ) << Figures.m_FirstFault;
+  m_Watcher.BeginAnew();
+  Figures = Give( { .m_Frame = 9, .m_Session = 2 } );
+  EXPECT_EQ( Figures.m_States, 1u );
+  EXPECT_EQ( Figures.m_DroppedFrames + Figures.m_MissedFrames + Figures.m_Faults, 0u );
 }
 
 TEST_F( FlowWatcher, FindsWhatIsWrongWithAState )
