@@ -1,6 +1,7 @@
 #include "bench/FrameFeed.h"
 
 #include "FileIO/TarvoVideo/Writer.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
 #include "NotificationSystem/AsioPostalService.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 #include "StageCoreRuntime/Shared.h"
@@ -32,6 +33,25 @@ public:
   std::string GetName() const override { return "Benchmark"; }
   KVZ::VTick GetPeriod() const override { return VFrameFeed::Period; }
 };
+
+// Finds the one device.
+class VFeedDriver : public VideoInputHAL::IVideoInputDriver
+{
+public:
+  VDeviceCallback& GetDeviceArrivedCallback() override { return m_Arrived; }
+  void StartDiscovery() override { m_Arrived( std::make_shared<TestSupport::VFakeVideoInputDevice>() ); }
+
+private:
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<VideoInputHAL::IVideoInputDevice> )> m_Arrived;
+};
+
+std::shared_ptr<VideoInputHAL::VVideoInputDeviceManager> MakeManager()
+{
+  std::vector<VideoInputHAL::VDriverMaker> Makers = { [] { return std::make_shared<VFeedDriver>(); } };
+  auto pManager = KVZ::MakeShared<VideoInputHAL::VVideoInputDeviceManager>( std::move( Makers ) );
+  pManager->StartDiscovery();
+  return pManager;
+}
 
 size_t Round16( size_t i_Bytes ) { return ( i_Bytes + 15 ) / 16 * 16; }
 
@@ -70,7 +90,7 @@ VFrameFeed::VFrameFeed( const VFeedSettings& i_rSettings )
     m_pTime( std::make_shared<VTime>() ),
     m_pPostalService( std::make_shared<NotificationSystem::VAsioPostalService>( "Benchmark" ) ),
     m_pAllocator( MakeAllocator( i_rSettings ) ),
-    m_pSource( KVZ::MakeShared<VVideoInputDataSource>( nullptr, std::make_shared<TestSupport::VFakeVideoInputDevice>(), m_pAllocator, nullptr,
+    m_pSource( KVZ::MakeShared<VVideoInputDataSource>( MakeManager(), std::make_shared<TestSupport::VFakeVideoInputDevice>(), m_pAllocator, nullptr,
       nullptr, i_rSettings.m_pCaptureTargets, m_pTime,
       VideoInputHAL::VVideoInputDataSourceOptions{ .m_pWriterFactory = MakeWriters(), .m_pPostalService = m_pPostalService } ) )
 {
