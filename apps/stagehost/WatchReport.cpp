@@ -9,6 +9,7 @@
 #include <cmath>
 #include <cstdio>
 #include <iostream>
+#include <sys/ioctl.h>
 #include <unistd.h>
 
 namespace
@@ -44,6 +45,21 @@ std::string TableText( const std::vector<VWatchedDevice>& i_rDevices )
       rTiming ? Pair( "%.2f +- %.2f", rTiming->m_MeanOffset * 1e3, std::sqrt( rTiming->m_OffsetVariance ) * 1e3 ) : "-" } );
   }
   return Table.ToText();
+}
+
+// Lines that do not fit would wrap, and take more room than they are counted for.
+std::string ClipLines( const std::string& i_rText )
+{
+  winsize Size = {};
+  const size_t Width = ioctl( STDERR_FILENO, TIOCGWINSZ, &Size ) == 0 && Size.ws_col != 0 ? Size.ws_col : std::string::npos;
+  std::string Clipped;
+  for( size_t Begin = 0; Begin < i_rText.size(); )
+  {
+    const size_t End = std::min( i_rText.find( '\n', Begin ), i_rText.size() );
+    Clipped += i_rText.substr( Begin, std::min( End - Begin, Width ) ) + "\n";
+    Begin = End + 1;
+  }
+  return Clipped;
 }
 
 nlohmann::ordered_json ToJson( const VWatchedDevice& i_rDevice )
@@ -90,7 +106,7 @@ void VWatchReport::Refresh( const std::vector<VWatchedDevice>& i_rDevices )
   }
   // Up to the first line of the last one, and clear from there on.
   std::string Drawing = m_Lines != 0 ? "\x1b[" + std::to_string( m_Lines ) + "A\x1b[J" : std::string();
-  const std::string Table = TableText( i_rDevices );
+  const std::string Table = ClipLines( TableText( i_rDevices ) );
   m_Lines = static_cast<size_t>( std::count( Table.begin(), Table.end(), '\n' ) );
   Drawing += Table;
   std::fputs( Drawing.c_str(), stderr );

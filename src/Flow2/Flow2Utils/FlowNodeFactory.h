@@ -22,13 +22,6 @@ public:
   bool NeedsBlockingCalls() const override { return true; }
 };
 
-template<class T>
-class VFlowNodeFactory0 : public VFlowNodeFactoryBase<T>
-{
-public:
-  std::shared_ptr<KVZ::IFlowNode> CreateNode() override { return std::make_shared<T>(); }
-};
-
 // Its nodes get one argument, the same for all.
 template<class T, class TArg>
 class VFlowNodeFactory1 : public VFlowNodeFactoryBase<T>
