@@ -3,14 +3,16 @@
 # stagecore_library( NAME [RUNTIME] [DEPENDS target...] )
 #   RUNTIME puts the code into libStageCoreRuntime.so, of which module and host share one copy; otherwise a static library.
 #   A folder without *.cpp is an interface target.
+# stagecore_without_precompiled_header()
+#   Its folder's *.cpp are compiled without the common header: they have definitions of their own from a library that the header does not know.
 # stagecore_module( NAME VERSION_SCRIPT file [DEPENDS target...] )
 #   bin/NAME.tpm, a module that exports what its version script says.
 # stagecore_virtual_card( NAME SONAME lib....so VERSION_SCRIPT file [DEPENDS target...] )
 #   bin/cards/SONAME, a stand-in for a vendor's run-time library.
 # stagecore_program( NAME [DEPENDS target...] )
 #   bin/NAME.
-# stagecore_test( NAME [DEPENDS target...] )
-#   A GoogleTest program, registered with CTest under NAME.
+# stagecore_test( NAME [LAUNCHER command...] [DEPENDS target...] )
+#   A GoogleTest program, registered with CTest under NAME; run by the launcher, where there is one.
 # stagecore_system_test( NAME [DEPENDS target...] )
 #   A GoogleTest program that runs whole programs: built after them all, run alone, label "system". The environment variable
 #   STAGECORE_BIN names the folder of programs, module and cards.
@@ -66,6 +68,11 @@ function( stagecore_library name )
   endif()
 endfunction()
 
+function( stagecore_without_precompiled_header )
+  file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
+  set_source_files_properties( ${sources} PROPERTIES SKIP_PRECOMPILE_HEADERS ON )
+endfunction()
+
 # Exports what the script names and nothing else, and leaves no name unresolved. Sanitizer run-time libraries are in the program, so there
 # a shared object may lack their names.
 function( stagecore_export_only target script )
@@ -110,13 +117,13 @@ function( stagecore_program name )
 endfunction()
 
 function( stagecore_test name )
-  cmake_parse_arguments( ARG "" "" "DEPENDS" ${ARGN} )
+  cmake_parse_arguments( ARG "" "" "LAUNCHER;DEPENDS" ${ARGN} )
   file( GLOB sources CONFIGURE_DEPENDS "*.cpp" )
   add_executable( ${name} ${sources} )
   target_link_libraries( ${name} PRIVATE ${STAGECORE_COMMON_LIBRARIES} ${ARG_DEPENDS} GTest::gtest GTest::gtest_main )
   stagecore_precompile( ${name} StageCorePrecompiledTest )
   set_target_properties( ${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests" )
-  add_test( NAME ${name} COMMAND ${name} )
+  add_test( NAME ${name} COMMAND ${ARG_LAUNCHER} $<TARGET_FILE:${name}> )
 endfunction()
 
 function( stagecore_system_test name )

@@ -47,3 +47,10 @@ endif()
 find_package( Boost 1.74 REQUIRED COMPONENTS chrono thread filesystem )
 find_package( Threads REQUIRED )
 find_package( GTest REQUIRED )
+
+# Conversion of pixel formats on the graphics card: Qt for its contexts and framebuffers. On where Qt is there.
+find_package( Qt5 5.15 QUIET COMPONENTS Core Gui )
+option( STAGECORE_OPENGL "Convert pixel formats with OpenGL as well as in software" "${Qt5_FOUND}" )
+if( STAGECORE_OPENGL AND NOT Qt5_FOUND )
+  message( FATAL_ERROR "STAGECORE_OPENGL needs Qt 5.15, Core and Gui" )
+endif()

@@ -1,0 +1,14 @@
+// Grey.
+
+varying vec2 v_TextureCoordinate;
+
+uniform sampler2D t_DiffuseTexture;
+
+void main()
+{
+  if( any( lessThan( v_TextureCoordinate, vec2( 0.0 ) ) ) || any( greaterThan( v_TextureCoordinate, vec2( 1.0 ) ) ) )
+  {
+    discard;
+  }
+  gl_FragColor = vec4( texture2D( t_DiffuseTexture, v_TextureCoordinate ).rrr, 0.5 );
+}
