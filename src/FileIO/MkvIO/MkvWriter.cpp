@@ -35,6 +35,10 @@ boost::optional<uint32_t> FramePeriod( const KVZ::VTimingRecord& i_rTiming, cons
     KVZ_LOG_ERROR( i_rCategory, "A frame period of %1% ns is longer than the 4294967295 ns that can be stored.", Period );
     return {};
   }
+  if( Period < TimecodeScale )
+  {
+    KVZ_LOG_WARNING( i_rCategory, "The frame rate is not known: all frames are stored at the same time." );
+  }
   return static_cast<uint32_t>( Period );
 }
 

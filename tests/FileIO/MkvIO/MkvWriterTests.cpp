@@ -259,5 +259,7 @@ TEST_F( MkvWriter, PeriodsThatCannotBeStoredAreRefused )
   EXPECT_FALSE( Begin( { 1, 5, 0 } ) );
   EXPECT_TRUE( m_Log.Has( "A frame period of 5000000000 ns is longer than the 4294967295 ns that can be stored." ) );
   EXPECT_TRUE( Begin( { 1, 4, 0 } ) );
+  const VLogCapture Log( "MkvIO" );
   EXPECT_TRUE( Begin( {} ) );
+  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "The frame rate is not known: all frames are stored at the same time." } );
 }
