@@ -44,7 +44,6 @@ bool FitsHeaders( const VFileDescription& i_rFile )
     VFieldCheck{ "An audio sample frame in bytes", BlockSize, Limit16 },
   };
   return std::all_of( Checks.begin(), Checks.end(), IsHeld ) &&
-    IsHeld( { "A data rate in bytes a second", GetMaxBytesPerSecond( i_rFile ), Limit32 } ) &&
     IsHeld( { "An audio data rate in bytes a second", BlockSize * rAudio.m_SampleRate, Limit32 } );
 }
 

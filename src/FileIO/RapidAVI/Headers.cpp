@@ -22,7 +22,7 @@ bool WriteMainHeader( VChunkWriter& io_rOut, const VFileDescription& i_rFile, VO
 {
   VMainHeader Header;
   Header.m_MicrosecondsPerFrame = static_cast<uint32_t>( GetMicrosecondsPerFrame( i_rFile ) );
-  Header.m_MaxBytesPerSecond = static_cast<uint32_t>( GetMaxBytesPerSecond( i_rFile ) );
+  Header.m_MaxBytesPerSecond = GetMaxBytesPerSecond( i_rFile );
   Header.m_Flags = HasIndexAndTrustedChunkIds;
   Header.m_Streams = i_rFile.m_Audio.HasAudio() ? 2 : 1;
   Header.m_Width = i_rFile.m_Video.m_ImageWidth;

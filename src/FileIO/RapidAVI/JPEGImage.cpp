@@ -11,7 +11,9 @@ namespace RapidAVI
 namespace
 {
 
-constexpr size_t ExpectedSegments = 11;
+// SOI, APP0, SOF, SOS and EOI, then a quantization table and two Huffman tables for luma, and for chroma where there is any.
+constexpr size_t GreySegments = 5 + 3;
+constexpr size_t ColourSegments = GreySegments + 3;
 
 constexpr std::array<uint8_t, 20> AVI1Header = {
   0xFF, 0xD8,           // SOI
@@ -21,7 +23,7 @@ constexpr std::array<uint8_t, 20> AVI1Header = {
 
 }
 
-bool MakeAVI1Image( const KVZ::IBufferConst& i_rImage, std::vector<KVZ::IOutputStream::VSpan>& o_rSpans )
+bool MakeAVI1Image( const KVZ::IBufferConst& i_rImage, KVZ::IPixelFormat::Enum i_Format, std::vector<KVZ::IOutputStream::VSpan>& o_rSpans )
 {
   o_rSpans.clear();
   std::vector<JPEGIO::VJPEGSegment> Segments;
@@ -29,6 +31,7 @@ bool MakeAVI1Image( const KVZ::IBufferConst& i_rImage, std::vector<KVZ::IOutputS
   {
     return false;
   }
+  const size_t ExpectedSegments = i_Format == KVZ::IPixelFormat::ELuminance8 ? GreySegments : ColourSegments;
   if( Segments.size() != ExpectedSegments || Segments[0].m_Marker != JPEGIO::Marker::StartOfImage ||
     Segments[1].m_Marker != JPEGIO::Marker::Application0 )
   {

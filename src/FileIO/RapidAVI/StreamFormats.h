@@ -23,7 +23,8 @@ bool FitsHeaders( const VFileDescription& i_rFile );
 // The numbers that follow. 0 where the frame rate is not known.
 uint64_t GetFrameBytes( const VFileDescription& i_rFile );
 uint64_t GetMicrosecondsPerFrame( const VFileDescription& i_rFile );
-uint64_t GetMaxBytesPerSecond( const VFileDescription& i_rFile );
+// Only tells readers what to expect: a rate that the field cannot hold becomes the largest.
+uint32_t GetMaxBytesPerSecond( const VFileDescription& i_rFile );
 
 VFourCC GetVideoChunkId( const VFileDescription& i_rFile );
 constexpr VFourCC AudioChunkId = FourCC( "01wb" );

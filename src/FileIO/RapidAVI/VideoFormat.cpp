@@ -3,6 +3,7 @@
 #include "StageCoreRuntime/GlobalLog.h"
 
 #include <algorithm>
+#include <limits>
 #include <numeric>
 
 namespace RapidAVI
@@ -63,9 +64,11 @@ uint64_t GetMicrosecondsPerFrame( const VFileDescription& i_rFile )
 }
 
 // Of a frame that fits its own field, so that the product fits 64 bits.
-uint64_t GetMaxBytesPerSecond( const VFileDescription& i_rFile )
+uint32_t GetMaxBytesPerSecond( const VFileDescription& i_rFile )
 {
-  return IsRateKnown( i_rFile ) ? GetFrameBytes( i_rFile ) * i_rFile.m_Timing.m_TicksPerSecond / i_rFile.m_Timing.m_FramePeriodInTicks : 0;
+  const KVZ::VTimingRecord& rTiming = i_rFile.m_Timing;
+  const uint64_t Bytes = IsRateKnown( i_rFile ) ? GetFrameBytes( i_rFile ) * rTiming.m_TicksPerSecond / rTiming.m_FramePeriodInTicks : 0;
+  return static_cast<uint32_t>( std::min<uint64_t>( Bytes, std::numeric_limits<uint32_t>::max() ) );
 }
 
 VFourCC GetVideoChunkId( const VFileDescription& i_rFile )

@@ -106,7 +106,7 @@ bool VRapidAVIWriter::CollectVideo( const WriterSupport::VFrame& i_rFrame )
       KVZ_LOG_ERROR( Category(), "Can't cope with JPEG split across buffers" );
       return false;
     }
-    return MakeAVI1Image( *i_rFrame.m_rVideo.front(), m_Video );
+    return MakeAVI1Image( *i_rFrame.m_rVideo.front(), m_Essence.Video().m_PixelFormat, m_Video );
   }
   const uint64_t Bytes = KVZ::GetTotalSize( i_rFrame.m_rVideo );
   const uint64_t StoredBytes = CoreVideoUtils::GetFrameSize( m_Essence.Video() );

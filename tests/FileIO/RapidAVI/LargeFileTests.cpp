@@ -84,12 +84,15 @@ TEST_F( LargeAvi, NumbersThatAFieldCannotHoldAreRefused )
   EXPECT_FALSE( WritesHeader( Settings ) );
   Settings.m_Video = Video( IPixelFormat::EB8G8R8u8, 7680, 4320 );
   EXPECT_TRUE( WritesHeader( Settings ) );
-  Settings.m_Timing.m_FramePeriodInTicks = 2700000;
-  EXPECT_FALSE( WritesHeader( Settings ) );
   EXPECT_EQ( m_Log.Texts(),
     ( std::vector<std::string>{ "A width in pixels of 65536 cannot be stored: 65535 is the limit.",
-      "An image size in bytes of 4294967296 cannot be stored: 4294967295 is the limit.",
-      "A data rate in bytes a second of 6635520000 cannot be stored: 4294967295 is the limit." } ) );
+      "An image size in bytes of 4294967296 cannot be stored: 4294967295 is the limit." } ) );
+  // The data rate is no more than a hint.
+  Settings.m_Timing.m_FramePeriodInTicks = 2700000;
+  VAviFile File( Settings );
+  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  constexpr size_t RatePosition = 12 + 12 + 8 + 4;   // RIFF, LIST and avih, then the period
+  EXPECT_EQ( VBytes( File.m_pBytes->begin() + RatePosition, File.m_pBytes->begin() + RatePosition + 4 ), VBytes( 4, 0xFF ) );
 }
 
 TEST_F( LargeAvi, PositionsBeyond4GiBAreIndexed )

@@ -231,12 +231,12 @@ TEST_F( AviWriter, ASuperIndexHoldsTheFirst1024Riffs )
 
 TEST_F( AviWriter, JPEGImagesGetAnAVI1Header )
 {
-  VSettings Settings;
-  Settings.m_Video = Video( IPixelFormat::ER8G8B8, 2, 1 );
-  Settings.m_Payload = IVideoPayload::EImageJPEG;
-  Settings.m_Audio = {};
-  const auto WriteImage = [&]( const VBytes& i_rImage )
+  const auto WriteImage = []( const VBytes& i_rImage, IPixelFormat::Enum i_Format = IPixelFormat::ER8G8B8 )
   {
+    VSettings Settings;
+    Settings.m_Video = Video( i_Format, 2, 1 );
+    Settings.m_Payload = IVideoPayload::EImageJPEG;
+    Settings.m_Audio = {};
     VAviFile File( Settings, {}, {}, EncoderTo( i_rImage ) );
     EXPECT_TRUE( File.OpenAndWriteHeader() );
     const bool bWritten = File.WriteFrame( 0, Noise( 6, 0 ), {} );
@@ -252,10 +252,14 @@ TEST_F( AviWriter, JPEGImagesGetAnAVI1Header )
   Expected.insert( Expected.end(), Whole.begin() + 20, Whole.end() );
   EXPECT_EQ( Stored, Expected );
   EXPECT_EQ( WriteImage( Image( 7, "datum" ) ).size(), Expected.size() + 1 );
+  constexpr size_t TableBytes = 6;
+  EXPECT_EQ( WriteImage( Image( 4, "data" ), IPixelFormat::ELuminance8 ).size(), Expected.size() - 3 * TableBytes );
   EXPECT_TRUE( m_Log.Texts().empty() );
   EXPECT_EQ( WriteImage( Image( 6, "data" ) ), VBytes() );
   EXPECT_EQ( WriteImage( Image( 8, "data" ) ), VBytes() );
-  EXPECT_EQ( m_Log.Count( "Generate JPEG not in expected format." ), 2u );
+  EXPECT_EQ( WriteImage( Image( 4, "data" ) ), VBytes() );
+  EXPECT_EQ( WriteImage( Image( 7, "data" ), IPixelFormat::ELuminance8 ), VBytes() );
+  EXPECT_EQ( m_Log.Count( "Generate JPEG not in expected format." ), 4u );
   EXPECT_EQ( WriteImage( Bytes( "no image" ) ), VBytes() );
 }
 
