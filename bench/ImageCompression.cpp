@@ -2,7 +2,7 @@
 // information.
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "bench/Figures.h"
 #include "bench/Measuring.h"
 
@@ -97,7 +97,7 @@ private:
 
   const std::shared_ptr<const KVZ::IBufferConst> m_pImage;
   KVZ::VideoFrameInfo m_Info;
-  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Bench" };
+  KVZ::IStandardBufferAllocator m_Allocator{ "Bench" };
   VideoEncoding::VVideoFrameEncoder m_Encoder{ VideoEncoding::EConverter::Software, Parts() };
 };
 

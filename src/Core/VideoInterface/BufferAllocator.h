@@ -60,8 +60,8 @@ class IBufferAllocator
 {
 public:
   virtual ~IBufferAllocator() = default;
-  // Never an empty pointer; std::bad_alloc where memory has run out.
-  virtual std::shared_ptr<IBuffer> AllocateBuffer( size_t i_Size ) = 0;
+  // Its content is anything. An empty pointer where memory has run out.
+  virtual std::shared_ptr<IStandardBuffer> Allocate( size_t i_Size ) = 0;
 };
 
 }

@@ -13,7 +13,7 @@ namespace
 
 using VConstBuffer = std::shared_ptr<const KVZ::IBufferConst>;
 
-// The first i_Channels of each sample frame.
+// The first i_Channels of each sample frame. Nothing where memory has run out.
 VConstBuffer DropChannels( KVZ::IBufferAllocator& i_rAllocator, const KVZ::IBufferConst& i_rSource, const KVZ::AudioFrameInfo& i_rInfo,
   uint32_t i_Channels )
 {
@@ -22,7 +22,11 @@ VConstBuffer DropChannels( KVZ::IBufferAllocator& i_rAllocator, const KVZ::IBuff
   const size_t TargetStride = SampleBytes * i_Channels;
   const size_t Frames = SourceStride == 0 ? 0 : i_rSource.Size() / SourceStride;
 
-  const std::shared_ptr<KVZ::IBuffer> pTarget = i_rAllocator.AllocateBuffer( Frames * TargetStride );
+  const std::shared_ptr<KVZ::IBuffer> pTarget = i_rAllocator.Allocate( Frames * TargetStride );
+  if( !pTarget )
+  {
+    return nullptr;
+  }
   const uint8_t* pSource = i_rSource.Data();
   uint8_t* pStored = pTarget->Data();
   if( TargetStride != 0 )
@@ -41,8 +45,8 @@ bool ConvertBuffers( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBufferList& io_r
   for( VConstBuffer& rpBuffer : io_rAudio )
   {
     const size_t Size = CoreAudioUtils::GetConvertedSize( i_rInfo.m_SampleFormat, i_Stored, rpBuffer->Size() );
-    const std::shared_ptr<KVZ::IBuffer> pTarget = i_rAllocator.AllocateBuffer( Size );
-    if( !CoreAudioUtils::ConvertSamples( i_rInfo, i_Stored, rpBuffer->Data(), rpBuffer->Size(), pTarget->Data() ) )
+    const std::shared_ptr<KVZ::IBuffer> pTarget = i_rAllocator.Allocate( Size );
+    if( !pTarget || !CoreAudioUtils::ConvertSamples( i_rInfo, i_Stored, rpBuffer->Data(), rpBuffer->Size(), pTarget->Data() ) )
     {
       return false;
     }
@@ -83,7 +87,12 @@ bool EncodeIfRequired( KVZ::IBufferAllocator& i_rAllocator, KVZ::VBufferList& io
   {
     for( VConstBuffer& rpBuffer : io_rAudio )
     {
-      rpBuffer = DropChannels( i_rAllocator, *rpBuffer, i_rInfo, i_StoredChannels );
+      VConstBuffer pStored = DropChannels( i_rAllocator, *rpBuffer, i_rInfo, i_StoredChannels );
+      if( !pStored )
+      {
+        return false;
+      }
+      rpBuffer = std::move( pStored );
     }
     Info.m_Channels = i_StoredChannels;
   }

@@ -4,7 +4,7 @@
 #include "FileIO/ImageSequenceIO/FileNames.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "FileIO/WriterSupport/AttributeMaps.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <boost/filesystem/operations.hpp>
 #include <boost/filesystem/path.hpp>
@@ -17,7 +17,7 @@ namespace ImageSequenceIO
 VImageSequenceWriter::VImageSequenceWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
   : VWriterBase( "ImageSequenceIO" ),
     m_StreamMaker( std::move( i_StreamMaker ) ),
-    m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Unnamed" ) ),
+    m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Unnamed", "ImageSequenceIO" ) ),
     m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
 {
 }

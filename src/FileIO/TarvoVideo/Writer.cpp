@@ -6,7 +6,7 @@
 #include "FileIO/TarvoVideo/Format.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "FileIO/WriterSupport/AttributeMaps.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <limits>
 
@@ -32,7 +32,7 @@ void AppendSpans( std::vector<KVZ::IOutputStream::VSpan>& o_rSpans, const KVZ::V
 VWriter::VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
   : VWriterBase( "TarvoVideo" ),
     m_StreamMaker( std::move( i_StreamMaker ) ),
-    m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Unnamed" ) ),
+    m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Unnamed" ) ),
     m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
 {
 }

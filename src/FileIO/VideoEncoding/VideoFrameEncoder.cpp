@@ -177,7 +177,11 @@ bool VVideoFrameEncoder::Join( VJob& io_rJob ) const
     KVZ_LOG_ERROR( "VideoEncoding", "Unexpected buffer size when copying frame data to make contiguous." );
     return false;
   }
-  std::shared_ptr<KVZ::IBuffer> pWhole = io_rJob.m_rAllocator.AllocateBuffer( Size );
+  std::shared_ptr<KVZ::IBuffer> pWhole = io_rJob.m_rAllocator.Allocate( Size );
+  if( !pWhole )
+  {
+    return false;
+  }
   uint8_t* pTarget = pWhole->Data();
   for( const auto& rpBuffer : io_rJob.m_rVideo )
   {
@@ -196,10 +200,10 @@ bool VVideoFrameEncoder::ConvertPixels( VJob& io_rJob ) const
   bool bConverted = false;
   if( m_pConverter )
   {
-    std::shared_ptr<KVZ::IBuffer> pTarget = io_rJob.m_rAllocator.AllocateBuffer( CoreVideoUtils::GetFrameSize( io_rJob.m_Target ) );
+    std::shared_ptr<KVZ::IBuffer> pTarget = io_rJob.m_rAllocator.Allocate( CoreVideoUtils::GetFrameSize( io_rJob.m_Target ) );
     const KVZ::IBufferConst& rSource = *io_rJob.m_rVideo.front();
-    bConverted = m_pConverter->Convert( io_rJob.m_rSource, rSource.Data(), rSource.Size(), io_rJob.m_Target.m_PixelFormat, pTarget->Data(),
-      pTarget->Size() );
+    bConverted = pTarget &&
+      m_pConverter->Convert( io_rJob.m_rSource, rSource.Data(), rSource.Size(), io_rJob.m_Target.m_PixelFormat, pTarget->Data(), pTarget->Size() );
     if( bConverted )
     {
       io_rJob.Replace( std::move( pTarget ) );
@@ -223,7 +227,11 @@ bool VVideoFrameEncoder::DrawText( VJob& io_rJob ) const
   if( !io_rJob.m_pOwn )
   {
     const KVZ::IBufferConst& rSource = *io_rJob.m_rVideo.front();
-    std::shared_ptr<KVZ::IBuffer> pCopy = io_rJob.m_rAllocator.AllocateBuffer( CoreVideoUtils::GetFrameSize( io_rJob.m_Target ) );
+    std::shared_ptr<KVZ::IBuffer> pCopy = io_rJob.m_rAllocator.Allocate( CoreVideoUtils::GetFrameSize( io_rJob.m_Target ) );
+    if( !pCopy )
+    {
+      return false;
+    }
     if( rSource.Size() < pCopy->Size() )
     {
       KVZ_LOG_ERROR( "VideoEncoding", "Frame of %1% bytes is too short for its description, which needs %2%.", rSource.Size(), pCopy->Size() );

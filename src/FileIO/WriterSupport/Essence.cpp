@@ -2,13 +2,13 @@
 
 #include "Core/VideoInterface/EnumTable.h"
 #include "FileIO/AudioEncoding/AudioEncoding.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 namespace WriterSupport
 {
 
 VEssence::VEssence( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder )
-  : m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Unnamed" ) ),
+  : m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Unnamed" ) ),
     m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
 {
 }

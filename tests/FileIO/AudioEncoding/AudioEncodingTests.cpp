@@ -1,5 +1,6 @@
 #include "FileIO/AudioEncoding/AudioEncoding.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
+#include "tests/support/EndlessBuffer.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -34,7 +35,7 @@ protected:
     return EncodeIfRequired( m_Allocator, m_Audio, i_rInfo, i_Payload, i_Format, i_Channels );
   }
 
-  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+  KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
   VBufferList m_Audio{ Samples( { 1, 2, 3, 4, 5, 6, 7, 8 } ), Samples( {} ), Samples( { 9, 10, 11, 12 } ) };
   const TestSupport::VLogCapture m_Log{ "AudioEncoding" };
 };
@@ -63,6 +64,15 @@ TEST_F( AudioEncoder, DroppingAndConvertingGoTogether )
 {
   EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt32, 3 ) );
   EXPECT_EQ( SamplesOf<int32_t>( *m_Audio[2] ), ( std::vector<int32_t>{ 9 << 16, 10 << 16, 11 << 16 } ) );
+}
+
+TEST_F( AudioEncoder, SoundForWhichThereIsNoMemoryIsRefused )
+{
+  m_Audio = { std::make_shared<TestSupport::VEndlessBuffer>( ~size_t{ 0 } ) };
+  const VBufferList Before = m_Audio;
+  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 3 ) );
+  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EUInt16, 4 ) );
+  EXPECT_EQ( m_Audio, Before );
 }
 
 TEST_F( AudioEncoder, WithoutAPayloadOrAFullDescriptionThereIsNoAudio )

@@ -2,6 +2,7 @@
 #include "FileIO/ImageSequenceIO/ImageSequenceWriter.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "Utils/UtilsIO/StreamAdapters.h"
+#include "tests/support/EndlessBuffer.h"
 #include "tests/support/FailingStream.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
@@ -208,6 +209,21 @@ TEST_F( ImageSequence, AFrameThatCannotBeEncodedLeavesAnEmptyFile )
   EXPECT_EQ( Content( Path( "take_00000001.png" ) ), "" );
   EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Encoding to 'ImagePNG' failed." } );
   EXPECT_TRUE( WriteFrame( m_Writer, 2, "efgh" ) ) << "the others go on";
+}
+
+TEST_F( ImageSequence, AFrameForWhichThereIsNoMemoryLeavesAnEmptyFileToo )
+{
+  VideoFrameInfo Largest = SmallVideo();
+  Largest.m_ImageWidth = 0xFFFFFFFF;
+  Largest.m_ImageHeight = 0xFFFFFFFF;
+  const size_t Size = size_t{ Largest.m_ImageWidth } * Largest.m_ImageHeight;
+  VBufferList Video = { Buffer( "a" ), std::make_shared<TestSupport::VEndlessBuffer>( Size - 1 ) };   // to be joined
+  VBufferList Audio;
+  ASSERT_TRUE( OpenAndWriteHeader( m_Writer ) );
+  EXPECT_FALSE( m_Writer.WriteFrame( Video, Largest, Audio, {}, 1 ) );
+  EXPECT_TRUE( boost::filesystem::exists( Path( "take_00000001.png" ) ) );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "Could not create buffer of size 18446744065119617025 bytes.", "Encoding to 'ImagePNG' failed." } ) );
 }
 
 // Whichever operation of a file fails, its call says so and leaves what fitted; the other frames are whole.

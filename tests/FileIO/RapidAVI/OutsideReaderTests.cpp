@@ -1,6 +1,6 @@
 // What programs of others make of our files.
 #include "FileIO/VideoEncoding/ImageCompressors.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/FileIO/RapidAVI/AviFile.h"
 #include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
@@ -234,7 +234,7 @@ TEST_P( AviImages, AreDecodedAsInFilesOfTheirOwn )
     const VBytes Image = Noise( GetImageSize( rCase.m_Format, 64, 48 ), Frame );
     ASSERT_TRUE( Settings.WriteFrame( Writer, Frame, Image, {} ) );
     VBufferList List{ Buffer( Image ) };
-    UtilsMemory::VPooledBufferAllocator Allocator( "Test" );
+    KVZ::IStandardBufferAllocator Allocator( "Test" );
     ASSERT_TRUE( Encoder.Encode( Allocator, List, Settings.m_Video, IVideoPayload::EImageJPEG, rCase.m_Format ) );
     const std::string Path = Folder.File( "image.jpg" );
     std::ofstream( Path, std::ios::binary )

@@ -6,7 +6,7 @@
 #include "FileIO/TIFFIO/TIFFIO.h"
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
 
 #include <boost/thread/thread.hpp>
@@ -80,7 +80,7 @@ protected:
     return i_rEncoder.Encode( m_Allocator, io_rVideo, Info( IPixelFormat::ER8G8B8 ), i_Payload, IPixelFormat::EUnspecified );
   }
 
-  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+  KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
 };
 
 }

@@ -1,5 +1,5 @@
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -94,7 +94,7 @@ protected:
 
   void MakeEncoder() { m_Encoder.emplace( EConverter::Software, m_Parts ); }
 
-  UtilsMemory::VPooledBufferAllocator m_Allocator{ "Test" };
+  KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
   std::shared_ptr<VFillingConverter> m_pConverter = std::make_shared<VFillingConverter>();
   VEncoderParts m_Parts;
   std::optional<VVideoFrameEncoder> m_Encoder;

@@ -2,7 +2,7 @@
 
 #include "CoreVideoUtils/Fonts/FontCells.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <boost/thread/lock_guard.hpp>
 
@@ -19,7 +19,7 @@ VFrameConversion::VFrameConversion( const StageCorePluginInterface::VCaptureTarg
     m_WantedFormat( static_cast<IPixelFormat::Enum>( i_rTarget.m_PixelFormat ) ),
     m_bTimecode( i_rTarget.m_bBurnInTimecode ),
     m_Converter( i_rSettings.m_Converter ),
-    m_pAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Capture video" ) )
+    m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Capture video" ) )
 {
 }
 

@@ -21,9 +21,9 @@
 #include <string>
 #include <vector>
 
-namespace UtilsMemory
+namespace KVZ
 {
-class VPooledBufferAllocator;
+class IStandardBufferAllocator;
 }
 
 namespace VideoInputHAL

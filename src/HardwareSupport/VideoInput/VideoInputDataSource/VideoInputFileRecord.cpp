@@ -5,7 +5,7 @@
 #include "FileIO/AudioEncoding/AudioEncoding.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
 #include "StageCoreRuntime/GlobalLog.h"
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <boost/filesystem/operations.hpp>
 #include <boost/filesystem/path.hpp>
@@ -99,7 +99,7 @@ VVideoInputBufferClient::VFileRecord::VFileRecord( const VCaptureTarget& i_rTarg
   std::shared_ptr<KVZ::IVideoWriter> i_pWriter )
   : m_Target( i_rTarget ),
     m_pWriter( std::move( i_pWriter ) ),
-    m_pAudioAllocator( std::make_shared<UtilsMemory::VPooledBufferAllocator>( "Capture audio" ) ),
+    m_pAudioAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Capture audio" ) ),
     m_pConversion( std::make_unique<VFrameConversion>( i_rTarget, i_rSettings ) )
 {
   m_Report.m_Path = MakePath( m_Target );

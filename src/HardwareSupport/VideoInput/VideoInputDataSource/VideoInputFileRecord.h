@@ -65,7 +65,7 @@ private:
 
   const StageCorePluginInterface::VCaptureTarget m_Target;
   const std::shared_ptr<KVZ::IVideoWriter> m_pWriter;
-  const std::shared_ptr<UtilsMemory::VPooledBufferAllocator> m_pAudioAllocator;
+  const std::shared_ptr<KVZ::IStandardBufferAllocator> m_pAudioAllocator;
   const std::unique_ptr<VFrameConversion> m_pConversion;
   StageCorePluginInterface::VCaptureFileReport m_Report;
   bool m_bCreated = false;

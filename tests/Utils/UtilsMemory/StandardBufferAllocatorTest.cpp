@@ -1,4 +1,4 @@
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -7,38 +7,37 @@
 
 #include <cstring>
 #include <limits>
-#include <new>
 #include <vector>
 
-using UtilsMemory::VPooledBufferAllocator;
+using KVZ::IStandardBufferAllocator;
 
-TEST( PooledBufferAllocator, AThreadGetsBackWhatItReleasedLast )
+TEST( StandardBufferAllocator, AThreadGetsBackWhatItReleasedLast )
 {
-  VPooledBufferAllocator Allocator( "Test" );
+  IStandardBufferAllocator Allocator( "Test" );
   const uint8_t* pMemory = nullptr;
   {
-    const auto pOther = Allocator.AllocateBuffer( 10 );
-    pMemory = Allocator.AllocateBuffer( 1000 )->Data();
+    const auto pOther = Allocator.Allocate( 10 );
+    pMemory = Allocator.Allocate( 1000 )->Data();
   }
-  const auto pNewest = Allocator.AllocateBuffer( 10 );
-  const auto pBuffer = Allocator.AllocateBuffer( 500 );
+  const auto pNewest = Allocator.Allocate( 10 );
+  const auto pBuffer = Allocator.Allocate( 500 );
   EXPECT_EQ( pBuffer->Data(), pMemory ) << "its memory is kept";
   EXPECT_EQ( pBuffer->Size(), 500u );
 }
 
 // A new buffer is empty, so one that still holds what was put into it is one of those released.
-TEST( PooledBufferAllocator, BuffersThatOneThreadReleasesReachTheOthers )
+TEST( StandardBufferAllocator, BuffersThatOneThreadReleasesReachTheOthers )
 {
   constexpr size_t Count = 64;
   constexpr uint8_t Mark = 0x5A;
-  VPooledBufferAllocator Allocator( "Test" );
+  IStandardBufferAllocator Allocator( "Test" );
   std::vector<std::shared_ptr<KVZ::IBuffer>> Buffers;
   boost::thread Other(
     [&]
     {
       while( Buffers.size() < Count )
       {
-        Buffers.push_back( Allocator.AllocateBuffer( 1 ) );
+        Buffers.push_back( Allocator.Allocate( 1 ) );
         Buffers.back()->Data()[0] = Mark;
       }
       Buffers.clear();
@@ -46,16 +45,16 @@ TEST( PooledBufferAllocator, BuffersThatOneThreadReleasesReachTheOthers )
   Other.join();
   for( size_t Index = 0; Index < 16; ++Index )
   {
-    Buffers.push_back( Allocator.AllocateBuffer( 1 ) );
+    Buffers.push_back( Allocator.Allocate( 1 ) );
     EXPECT_EQ( Buffers.back()->Data()[0], Mark ) << Index;
   }
 }
 
-TEST( PooledBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAnyThread )
+TEST( StandardBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAnyThread )
 {
   std::vector<std::shared_ptr<KVZ::IBuffer>> Buffers;
   {
-    VPooledBufferAllocator Allocator( "Test" );
+    IStandardBufferAllocator Allocator( "Test" );
     boost::thread_group Threads;
     for( uint8_t Thread = 0; Thread < 4; ++Thread )
     {
@@ -65,7 +64,7 @@ TEST( PooledBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAnyTh
           for( size_t Round = 0; Round < 2000; ++Round )
           {
             const size_t Size = 1 + Round % 300;
-            const auto pBuffer = Allocator.AllocateBuffer( Size );
+            const auto pBuffer = Allocator.Allocate( Size );
             std::memset( pBuffer->Data(), Thread, Size );
             EXPECT_EQ( pBuffer->Data()[Size - 1], Thread );
           }
@@ -74,16 +73,16 @@ TEST( PooledBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAnyTh
     Threads.join_all();
     for( size_t Count = 0; Count < 40; ++Count )
     {
-      Buffers.push_back( Allocator.AllocateBuffer( 100 ) );
+      Buffers.push_back( Allocator.Allocate( 100 ) );
     }
   }
   Buffers.clear();
 }
 
-TEST( PooledBufferAllocator, ASizeThatCannotBeHadIsBadAllocWithAMessage )
+TEST( StandardBufferAllocator, ASizeThatCannotBeHadIsAnEmptyPointerAndAMessage )
 {
   const TestSupport::VLogCapture Log( "UtilsMemory" );
-  VPooledBufferAllocator Allocator( "Test" );
-  EXPECT_THROW( Allocator.AllocateBuffer( std::numeric_limits<size_t>::max() ), std::bad_alloc );
+  IStandardBufferAllocator Allocator( "Test" );
+  EXPECT_EQ( Allocator.Allocate( std::numeric_limits<size_t>::max() ), nullptr );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Could not create buffer of size 18446744073709551615 bytes." } );
 }

@@ -1,4 +1,4 @@
-#include "Utils/UtilsMemory/PooledBufferAllocator.h"
+#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include "StageCoreRuntime/GlobalLog.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
@@ -13,14 +13,19 @@
 #include <stdexcept>
 #include <vector>
 
-namespace UtilsMemory
+namespace KVZ
 {
 
-using VOwned = std::unique_ptr<KVZ::IStandardBuffer>;
+namespace
+{
+
+using VOwned = std::unique_ptr<IStandardBuffer>;
+
+}
 
 // A free list for each thread, used without a lock, and a shared one through which threads that only take get the buffers of threads that
 // only give back. The lists own nothing but their buffers, so a list that a thread leaves behind holds no pool.
-class VPooledBufferAllocator::VPool
+class IStandardBufferAllocator::VPool
 {
 public:
   VOwned Take()
@@ -82,7 +87,7 @@ private:
     }
     while( o_rList.size() < MovedAtOnce )
     {
-      o_rList.push_back( std::make_unique<KVZ::IStandardBuffer>() );
+      o_rList.push_back( std::make_unique<IStandardBuffer>() );
     }
   }
 
@@ -104,25 +109,24 @@ private:
   VList m_Shared GUARDED_BY( m_Mutex );
 };
 
-VPooledBufferAllocator::VPooledBufferAllocator( std::string i_Name ) : m_Name( std::move( i_Name ) ), m_pPool( std::make_shared<VPool>() ) {}
+IStandardBufferAllocator::IStandardBufferAllocator( std::string i_Name, std::string i_LogCategory )
+  : m_Name( std::move( i_Name ) ), m_LogCategory( std::move( i_LogCategory ) ), m_pPool( std::make_shared<VPool>() )
+{
+}
 
-std::shared_ptr<KVZ::IBuffer> VPooledBufferAllocator::AllocateBuffer( size_t i_Size )
+// No memory, or a size that no vector can have.
+std::shared_ptr<IStandardBuffer> IStandardBufferAllocator::Allocate( size_t i_Size )
 try
 {
   VOwned pBuffer = m_pPool->Take();
   pBuffer->Bytes().resize( i_Size );
-  return std::shared_ptr<KVZ::IBuffer>( pBuffer.release(),
-    [pPool = m_pPool]( KVZ::IBuffer* i_pBuffer ) { pPool->GiveBack( VOwned( static_cast<KVZ::IStandardBuffer*>( i_pBuffer ) ) ); } );
+  return std::shared_ptr<IStandardBuffer>( pBuffer.release(),
+    [pPool = m_pPool]( IStandardBuffer* i_pBuffer ) { pPool->GiveBack( VOwned( i_pBuffer ) ); } );
 }
-catch( const std::length_error& )
+catch( const std::exception& )
 {
-  KVZ_LOG_ERROR( "UtilsMemory", "Could not create buffer of size %d bytes.", i_Size );
-  throw std::bad_alloc();
-}
-catch( const std::bad_alloc& )
-{
-  KVZ_LOG_ERROR( "UtilsMemory", "Could not create buffer of size %d bytes.", i_Size );
-  throw;
+  KVZ_LOG_ERROR( m_LogCategory, "Could not create buffer of size %d bytes.", i_Size );
+  return nullptr;
 }
 
 }

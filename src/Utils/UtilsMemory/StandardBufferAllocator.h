@@ -9,22 +9,23 @@
 #include <memory>
 #include <string>
 
-namespace UtilsMemory
+namespace KVZ
 {
 
-class VPooledBufferAllocator : public KVZ::IBufferAllocator
+class IStandardBufferAllocator : public IBufferAllocator
 {
 public:
-  explicit VPooledBufferAllocator( std::string i_Name );
+  explicit IStandardBufferAllocator( std::string i_Name, std::string i_LogCategory = "UtilsMemory" );
 
-  // The buffer that this thread released last, or another free one, or a new one. Throws std::bad_alloc, with a line in the log, where memory
-  // has run out.
-  std::shared_ptr<KVZ::IBuffer> AllocateBuffer( size_t i_Size ) override;
+  // The buffer that this thread released last, or another free one, or a new one. An empty pointer, with a line in the log, where memory has
+  // run out.
+  std::shared_ptr<IStandardBuffer> Allocate( size_t i_Size ) override;
 
 private:
   class VPool;
 
   const std::string m_Name;
+  const std::string m_LogCategory;
   const std::shared_ptr<VPool> m_pPool;
 };
 
