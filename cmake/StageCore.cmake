@@ -15,11 +15,11 @@
 #   A GoogleTest program, registered with CTest under NAME; run by the launcher, where there is one.
 # stagecore_system_test( NAME [DEPENDS target...] )
 #   A GoogleTest program that runs whole programs: built after them all, run alone, label "system". The environment variable
-#   STAGECORE_BIN names the folder of programs, module and cards.
+#   STAGECORE_BIN names the folder of programs, module and cards. The user's own settings are out of reach.
 # stagecore_fuzzer( NAME SOURCE file... [DEPENDS target...] )
 #   A libFuzzer program with its corpus in the folder corpus/NAME; built in the preset `fuzz` alone.
 #
-# The target stagecore_programs is all of bin/, stagecore_fuzzers all fuzzers.
+# The target stagecore_programs is all of bin/, stagecore_unit_tests all tests but the system tests, stagecore_fuzzers all fuzzers.
 
 add_library( StageCoreIncludes INTERFACE )
 target_include_directories( StageCoreIncludes INTERFACE "${CMAKE_SOURCE_DIR}/src" "${CMAKE_SOURCE_DIR}" )
@@ -38,6 +38,7 @@ target_link_libraries( StageCorePrecompiledTest PRIVATE ${STAGECORE_COMMON_LIBRA
 target_precompile_headers( StageCorePrecompiledTest PRIVATE "${CMAKE_CURRENT_LIST_DIR}/Precompiled.h" <gtest/gtest.h> )
 
 add_custom_target( stagecore_programs )
+add_custom_target( stagecore_unit_tests )
 add_custom_target( stagecore_fuzzers )
 
 # Gives a target the common precompiled header, or that of the library named as second argument.
@@ -124,12 +125,17 @@ function( stagecore_test name )
   stagecore_precompile( ${name} StageCorePrecompiledTest )
   set_target_properties( ${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests" )
   add_test( NAME ${name} COMMAND ${ARG_LAUNCHER} $<TARGET_FILE:${name}> )
+  if( NOT STAGECORE_SYSTEM_TEST )
+    add_dependencies( stagecore_unit_tests ${name} )
+  endif()
 endfunction()
 
 function( stagecore_system_test name )
+  set( STAGECORE_SYSTEM_TEST ON )
   stagecore_test( ${name} ${ARGN} )
   add_dependencies( ${name} stagecore_programs )
-  set_tests_properties( ${name} PROPERTIES LABELS system RUN_SERIAL ON ENVIRONMENT "STAGECORE_BIN=${CMAKE_RUNTIME_OUTPUT_DIRECTORY}" )
+  set_tests_properties( ${name} PROPERTIES LABELS system RUN_SERIAL ON
+    ENVIRONMENT "STAGECORE_BIN=${CMAKE_RUNTIME_OUTPUT_DIRECTORY};XDG_CONFIG_HOME=${CMAKE_BINARY_DIR}/tests/no-settings" )
 endfunction()
 
 function( stagecore_fuzzer name )
