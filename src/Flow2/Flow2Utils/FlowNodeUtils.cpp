@@ -162,14 +162,20 @@ bool VFlowNodeUtils::WaitOutputConnected( uint32_t i_Output, VFlowLimit i_Limit 
 uint32_t VFlowNodeUtils::InputIndex( const std::string& i_rName )
 {
   uint32_t Index = 0;
-  Check( Services()->InputIndex( i_rName, Index ), InputIndexTexts, "InputIndex: Unknown error", i_rName );
+  if( !Check( Services()->InputIndex( i_rName, Index ), InputIndexTexts, "InputIndex: Unknown error", i_rName ) )
+  {
+    throw VFlowException( "InputIndex: Unknown error" );
+  }
   return Index;
 }
 
 uint32_t VFlowNodeUtils::OutputIndex( const std::string& i_rName )
 {
   uint32_t Index = 0;
-  Check( Services()->OutputIndex( i_rName, Index ), OutputIndexTexts, "OutputIndex: Unknown error", i_rName );
+  if( !Check( Services()->OutputIndex( i_rName, Index ), OutputIndexTexts, "OutputIndex: Unknown error", i_rName ) )
+  {
+    throw VFlowException( "OutputIndex: Unknown error" );
+  }
   return Index;
 }
 

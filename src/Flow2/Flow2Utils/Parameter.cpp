@@ -75,8 +75,10 @@ VParameter::~VParameter() = default;
 void VParameter::MarkChanged()
 {
   m_bChanged = true;
-  m_Stamp = m_pChangeCount ? ++*m_pChangeCount : m_Stamp + 1;
+  StampChange();
 }
+
+void VParameter::StampChange() { m_Stamp = m_pChangeCount ? ++*m_pChangeCount : m_Stamp + 1; }
 
 template<class T>
 VParameterTyped<T>::VParameterTyped( T* i_pMember, VParameterOptions<T> i_Options ) : m_Options( std::move( i_Options ) ), m_pValue( i_pMember )
@@ -208,7 +210,7 @@ uint32_t VParameterTyped<T>::SetTarget( const KVZ::VFlowTarget& i_rTarget )
     return EParameterResult::Unchanged;
   }
   m_Target = i_rTarget;
-  MarkChanged();
+  StampChange();
   return EParameterResult::Changed;
 }
 

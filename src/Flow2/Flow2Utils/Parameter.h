@@ -80,12 +80,15 @@ protected:
   VParameter() = default;
   VParameter( const VParameter& i_rOther ) = default;
 
+  // The value is another.
   void MarkChanged();
+  // Something of the parameter is another: counts as a change of its set.
+  void StampChange();
   // Out of its set.
   void Detach() { m_pChangeCount = nullptr; }
 
   bool m_bTouched = false;   // in this update
-  bool m_bChanged = false;   // in this update
+  bool m_bChanged = false;   // the value, in this update
   KVZ::VFlowTarget m_Target;
 
 private:

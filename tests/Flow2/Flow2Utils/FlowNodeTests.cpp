@@ -187,8 +187,10 @@ TEST_F( FlowNode, WrappersWithResultsOfTheirOwn )
   const auto Output = []( VScriptedNode& i_rNode ) { i_rNode.OutputIndex( "Right" ); };
   EXPECT_EQ( Text( EFlowResult::UnknownName, Input ), "InputIndex: Unknown input name Left" );
   EXPECT_EQ( Text( EFlowResult::Failed, Input ), "InputIndex: Unknown error" );
+  EXPECT_EQ( Text( EFlowResult::WouldBlock, Input ), "InputIndex: Unknown error" ) << "no index came, so there is none to go on with";
   EXPECT_EQ( Text( EFlowResult::UnknownName, Output ), "OutputIndex: Unknown output name Right" );
   EXPECT_EQ( Text( EFlowResult::Failed, Output ), "OutputIndex: Unknown error" );
+  EXPECT_EQ( Text( EFlowResult::WouldBlock, Output ), "OutputIndex: Unknown error" );
   const auto Item = []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowAudioFrame", "Label" ); };
   EXPECT_EQ( Text( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowSmell", "Label" ); } ),
     "CreateItem: Unknown item type FlowSmell" );

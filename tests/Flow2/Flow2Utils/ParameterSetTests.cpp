@@ -177,6 +177,7 @@ TEST_F( FlowParameterSet, AMovedTargetIsAChange )
   m_Set.BeginUpdate();
   m_Set.SetTarget( { 1, "a" } );
   EXPECT_TRUE( m_Set.HasChanged() );
+  EXPECT_FALSE( m_Set.Find( "Name" )->IsChanged() ) << "its value is the same";
   m_Set.BeginUpdate();
   m_Set.SetTarget( { 1, "a" } );
   EXPECT_FALSE( m_Set.HasChanged() );
