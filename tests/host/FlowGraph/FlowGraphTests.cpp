@@ -247,19 +247,22 @@ TEST_F( FlowGraph, TheEndOfDataRunsThroughTheGraph )
 TEST_F( FlowGraph, AnExceptionEndsTheWholeRunWithItsText )
 {
   const VFlowNodeId Other = AddFunction( []( VFunctionNode& i_rNode ) { i_rNode.Sleep( VFlowLimit::None() ); } );
-  const VFlowNodeId Faulty = AddFunction( []( VFunctionNode& i_rNode ) { i_rNode.WaitInputConnected( 17, VFlowLimit::None() ); } );
+  const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& i_rNode ) { i_rNode.WaitInputConnected( 17, VFlowLimit::None() ); } );
+  const VFlowNodeId Faulty = m_Graph.AddNode( pFaulty, { .m_Name = "Faulty" } );
   m_Graph.Start();
   WaitForState( Faulty, EFlowNodeState::Failed );
   WaitForState( Other, EFlowNodeState::Idle );
   WaitForState( m_Source, EFlowNodeState::Idle );
   EXPECT_EQ( m_Graph.GetFailure(), "WaitInputConnected: Unknown input - index = 17" );
   EXPECT_EQ( m_Graph.GetStatus( Faulty ).m_Failure, m_Graph.GetFailure() );
+  EXPECT_EQ( pFaulty->Ends(), 1 ) << "what it has set up stays";
 }
 
 TEST_F( FlowGraph, ANodeThatCannotBeStartedLeavesTheOthersAlone )
 {
   std::atomic<int> Rounds{ 0 };
-  const VFlowNodeId Faulty = AddFunction( [&]( VFunctionNode& ) { ++Rounds; }, EFlowResult::Failed );
+  const auto pFaulty = std::make_shared<VFunctionNode>( [&]( VFunctionNode& ) { ++Rounds; }, EFlowResult::Failed );
+  const VFlowNodeId Faulty = m_Graph.AddNode( pFaulty, { .m_Name = "Faulty" } );
   const auto [pCollector, Collector] = AddCollector();
   m_Graph.Connect( { m_Source, 0 }, { Collector, 0 } );
   m_Graph.Start();
@@ -267,6 +270,7 @@ TEST_F( FlowGraph, ANodeThatCannotBeStartedLeavesTheOthersAlone )
   m_pSource->Allow( 1 );
   pCollector->WaitFor( 1 );
   EXPECT_EQ( Rounds, 0 );
+  EXPECT_EQ( pFaulty->Ends(), 1 ) << "what it has set up stays";
   EXPECT_EQ( m_Graph.GetFailure(), "" );
 }
 

@@ -10,6 +10,7 @@
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
 
+#include <atomic>
 #include <functional>
 #include <memory>
 #include <vector>
@@ -45,13 +46,18 @@ public:
     return Number;
   }
 
+  // How often it has been run to its end. Any thread.
+  int Ends() const { return m_Ends; }
+
 protected:
   uint32_t PreProcess() override { return m_Start; }
   void Process() override { m_Process( *this ); }
+  void PostProcess() override { ++m_Ends; }
 
 private:
   const VFunction m_Process;
   const uint32_t m_Start;
+  std::atomic<int> m_Ends{ 0 };
 };
 
 // Writes 0, 1, 2 and so on to its first output, as many as it has been allowed to, and sleeps in between.
