@@ -8,6 +8,7 @@
 #include "apps/stagehost/NumberCheck.h"
 #include "apps/stagehost/RecordFormat.h"
 #include "apps/stagehost/RecordReport.h"
+#include "apps/stagehost/StoredFormat.h"
 #include "host/Recording.h"
 
 #include <CLI/CLI.hpp>
@@ -199,6 +200,25 @@ int ExitCodeOf( const std::vector<StageHost::VDeviceOutcome>& i_rOutcomes )
   return Code;
 }
 
+// What each file can hold, told where it is little.
+std::vector<VLimitNotice> FindLimits( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+{
+  std::vector<VLimitNotice> Limits;
+  for( const VDeviceInfo& rDevice : i_rDevices )
+  {
+    const VStoredFormat Format = ReadStoredFormat( i_rSession, rDevice, i_rOptions.m_Format );
+    const double FrameSeconds = KVZ::VTick( Format.m_FramePeriod ).Seconds();
+    Limits.emplace_back( rDevice.m_URN, FindRunLimit( Format ) );
+    const std::string Notice = Limits.back().AtStart(
+      i_rOptions.m_Frames != 0 ? static_cast<double>( i_rOptions.m_Frames ) * FrameSeconds : i_rOptions.m_Seconds );
+    if( !Notice.empty() )
+    {
+      Complain( Notice );
+    }
+  }
+  return Limits;
+}
+
 int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VRecording Recording( i_rSession.Host().Engine(), i_rSession.Host().Targets(), i_rSession.Host().Time() );
@@ -214,7 +234,7 @@ int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const st
     Complain( Error );
     return ExitFailed;
   }
-  VRecordReport Report( i_rOptions.m_Report, i_rDevices );
+  VRecordReport Report( i_rOptions.m_Report, i_rDevices, FindLimits( i_rSession, i_rOptions, i_rDevices ) );
   bool bStopped = false;
   for( Recording.Poll(); !Recording.IsFinished(); Recording.Poll() )
   {

@@ -110,7 +110,7 @@ nlohmann::ordered_json DriftToJson( const VDeviceOutcome& i_rOutcome )
     { "delivery_offset_deviation_ms", std::sqrt( i_rOutcome.m_Timing->m_OffsetVariance ) * 1e3 } };
 }
 
-nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::string& i_rName )
+nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::string& i_rName, const VLimitNotice* i_pLimit )
 {
   const VCaptureFileReport* const pFile = i_rOutcome.m_Files.empty() ? nullptr : &i_rOutcome.m_Files.front();
   nlohmann::ordered_json Json = { { "urn", i_rOutcome.m_DeviceURN }, { "name", i_rName } };
@@ -132,6 +132,7 @@ nlohmann::ordered_json ToJson( const VDeviceOutcome& i_rOutcome, const std::stri
   Json["period"] = i_rOutcome.m_Period.Count();
   Json["buffer_peak_fill"] = i_rOutcome.m_PeakFill;
   Json["backlog_peak"] = i_rOutcome.m_PeakBacklog;
+  Json["longest_seconds"] = i_pLimit && i_pLimit->IsNear() ? nlohmann::ordered_json( i_pLimit->Seconds() ) : nullptr;
   Json["drift"] = DriftToJson( i_rOutcome );
   return Json;
 }
@@ -159,8 +160,9 @@ bool WantsPlainOutput()
 
 }
 
-VRecordReport::VRecordReport( const VReportOptions& i_rOptions, const std::vector<StageHost::VDeviceInfo>& i_rDevices )
-  : m_Options( i_rOptions ), m_Devices( i_rDevices ), m_bTerminal( isatty( STDERR_FILENO ) != 0 )
+VRecordReport::VRecordReport( const VReportOptions& i_rOptions, const std::vector<StageHost::VDeviceInfo>& i_rDevices,
+  std::vector<VLimitNotice> i_Limits )
+  : m_Options( i_rOptions ), m_Devices( i_rDevices ), m_Limits( std::move( i_Limits ) ), m_bTerminal( isatty( STDERR_FILENO ) != 0 )
 {
 }
 
@@ -171,8 +173,31 @@ std::string VRecordReport::NameOf( const std::string& i_rURN ) const
   return Found == m_Devices.end() ? std::string() : Found->m_Name;
 }
 
+const VLimitNotice* VRecordReport::LimitOf( const std::string& i_rURN ) const
+{
+  const auto Found = std::find_if( m_Limits.begin(), m_Limits.end(), [&]( const VLimitNotice& i_rLimit ) { return i_rLimit.DeviceURN() == i_rURN; } );
+  return Found == m_Limits.end() ? nullptr : &*Found;
+}
+
+void VRecordReport::WarnOfLimits( const std::vector<VDeviceOutcome>& i_rOutcomes )
+{
+  for( VLimitNotice& rLimit : m_Limits )
+  {
+    const auto Outcome = std::find_if( i_rOutcomes.begin(), i_rOutcomes.end(),
+      [&]( const VDeviceOutcome& i_rOutcome ) { return i_rOutcome.m_DeviceURN == rLimit.DeviceURN(); } );
+    const std::string Warning = Outcome == i_rOutcomes.end()
+      ? std::string()
+      : rLimit.After( static_cast<double>( Outcome->m_FramesCaptured ) * Outcome->m_Period.Seconds() );
+    if( !Warning.empty() )
+    {
+      Complain( Warning );
+    }
+  }
+}
+
 void VRecordReport::ShowProgress( const std::vector<VDeviceOutcome>& i_rOutcomes, double i_Now )
 {
+  WarnOfLimits( i_rOutcomes );
   if( i_Now < m_NextProgress || ( !m_Options.m_bProgressBlocks && !m_bTerminal ) )
   {
     return;
@@ -238,7 +263,7 @@ bool VRecordReport::Print( const std::vector<VDeviceOutcome>& i_rOutcomes ) cons
   {
     if( m_Options.m_bJson )
     {
-      List.push_back( ToJson( rOutcome, NameOf( rOutcome.m_DeviceURN ) ) );
+      List.push_back( ToJson( rOutcome, NameOf( rOutcome.m_DeviceURN ), LimitOf( rOutcome.m_DeviceURN ) ) );
     }
     else
     {
