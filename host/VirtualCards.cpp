@@ -74,6 +74,16 @@ VVirtualCards::~VVirtualCards()
   }
 }
 
+size_t VVirtualCards::CountDevices() const
+{
+  size_t Count = 0;
+  for( const auto& rCard : m_Cards )
+  {
+    Count += rCard.first->CountDevices( rCard.second );
+  }
+  return Count;
+}
+
 bool VVirtualCards::Add( const std::string& i_rText, std::string& o_rError )
 {
   VirtualCards::IVirtualCardControl* const pControl = Load( i_rText.substr( 0, i_rText.find( ':' ) ), o_rError );

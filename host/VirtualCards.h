@@ -28,6 +28,8 @@ public:
   // Takes a card's text (KIND[:KEY=VALUE[,KEY=VALUE]...]); false with one line in o_rError, and no card is added then.
   bool Add( const std::string& i_rText, std::string& o_rError );
   size_t Count() const { return m_Cards.size(); }
+  // Devices that the module finds in the cards when they are all in the machine.
+  size_t CountDevices() const;
 
 private:
   VirtualCards::IVirtualCardControl* Load( const std::string& i_rKind, std::string& o_rError );

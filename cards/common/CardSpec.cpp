@@ -22,9 +22,11 @@ constexpr std::array Patterns = { VChoice<EPattern>{ "bars", EPattern::Bars }, V
   VChoice<EPattern>{ "noise", EPattern::Noise } };
 constexpr std::array Audios = { VChoice<EAudio>{ "tone", EAudio::Tone }, VChoice<EAudio>{ "ramp", EAudio::Ramp },
   VChoice<EAudio>{ "silence", EAudio::Silence }, VChoice<EAudio>{ "none", EAudio::None } };
+constexpr std::array Drivers = { VChoice<bool>{ "new", false }, VChoice<bool>{ "old", true } };
 constexpr std::array Loops = { VChoice<bool>{ "1", true }, VChoice<bool>{ "0", false } };
 
 constexpr uint32_t MostChannels = 16;
+constexpr uint32_t MostInputs = 4;
 constexpr double LeastSpeed = 0.01;
 constexpr double MostSpeed = 100.0;
 
@@ -115,10 +117,32 @@ std::string SetInput( VCardSpec& o_rSpec, const std::string& i_rText )
   return {};
 }
 
+std::string ParseUpToFour( const std::string& i_rText, uint32_t& o_rValue )
+{
+  uint32_t Value = 0;
+  if( !ParseWhole( i_rText, Value ) || Value > MostInputs )
+  {
+    return Refusal( i_rText, "a whole number from 0 to 4" );
+  }
+  o_rValue = Value;
+  return {};
+}
+
+std::string SetInputs( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseUpToFour( i_rText, o_rSpec.m_Inputs ); }
+
+std::string SetOutputs( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseUpToFour( i_rText, o_rSpec.m_Outputs ); }
+
+std::string SetConnectors( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseUpToFour( i_rText, o_rSpec.m_Connectors.emplace() ); }
+
+std::string SetDriver( VCardSpec& o_rSpec, const std::string& i_rText ) { return ParseChoice( Drivers, i_rText, o_rSpec.m_bOldDriver ); }
+
 struct VKey
 {
   const char* m_pName;
   std::string ( *m_pSet )( VCardSpec&, const std::string& );
+  const char* m_pKind = nullptr;   // the kind of card that knows it; null for all
+
+  bool IsKnownTo( const VCardKind& i_rKind ) const { return !m_pKind || &i_rKind == FindCardKind( m_pKind ); }
 };
 
 constexpr std::array Keys = {
@@ -131,14 +155,21 @@ constexpr std::array Keys = {
   VKey{ "speed", SetSpeed },
   VKey{ "loop", SetLoop },
   VKey{ "input", SetInput },
+  VKey{ "inputs", SetInputs, "bluefish444" },
+  VKey{ "outputs", SetOutputs, "bluefish444" },
+  VKey{ "connectors", SetConnectors, "bluefish444" },
+  VKey{ "driver", SetDriver, "bluefish444" },
 };
 
-std::string ListKeys()
+std::string ListKeys( const VCardKind& i_rKind )
 {
   std::string List;
   for( const VKey& rKey : Keys )
   {
-    List += std::string( List.empty() ? "" : ", " ) + rKey.m_pName;
+    if( rKey.IsKnownTo( i_rKind ) )
+    {
+      List += std::string( List.empty() ? "" : ", " ) + rKey.m_pName;
+    }
   }
   return List;
 }
@@ -150,10 +181,12 @@ std::string ParseNext( std::string_view& io_rRest, VCardSpec& o_rSpec, std::set<
   const std::string_view Item = bInput ? io_rRest : io_rRest.substr( 0, io_rRest.find( ',' ) );
   const size_t Equals = Item.find( '=' );
   const std::string Name( Item.substr( 0, Equals ) );
-  const auto Found = std::find_if( Keys.begin(), Keys.end(), [&]( const VKey& i_rKey ) { return Name == i_rKey.m_pName; } );
+  const VCardKind& rKind = *o_rSpec.m_pKind;
+  const auto Found = std::find_if( Keys.begin(), Keys.end(),
+    [&]( const VKey& i_rKey ) { return Name == i_rKey.m_pName && i_rKey.IsKnownTo( rKind ); } );
   if( Found == Keys.end() )
   {
-    return "no key is called \"" + Name + "\"; accepted: " + ListKeys();
+    return "no key is called \"" + Name + "\"; accepted: " + ListKeys( rKind );
   }
   if( Equals == std::string_view::npos || Equals + 1 == Item.size() )
   {

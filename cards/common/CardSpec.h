@@ -12,6 +12,13 @@
 //   loop=1|0          when the input ends: begin again, or lose the signal
 //   input=REST        comes last and takes the rest, commas and all: a file or URL, or FFmpeg input options where it begins with "-"
 //
+// A card of the kind bluefish444 knows these as well:
+//
+//   inputs=N          input channels, 0 to 4, all with this signal; default 1
+//   outputs=N         output channels, 0 to 4; default 0
+//   connectors=N      connectors of the inputs, 0 to 4; default one for each input
+//   driver=new|old    an old driver does not answer queries about the card's features
+//
 // Commas part the keys; a value may hold colons and equals signs.
 #pragma once
 
@@ -52,6 +59,12 @@ struct VCardSpec
   double m_Speed = 1.0;
   bool m_bLoop = true;
   std::string m_Input;
+
+  // bluefish444 alone
+  uint32_t m_Inputs = 1;
+  uint32_t m_Outputs = 0;
+  std::optional<uint32_t> m_Connectors;   // empty: as the default says
+  bool m_bOldDriver = false;
 };
 
 constexpr KVZ::IVideoStandard::Enum DefaultStandard = KVZ::IVideoStandard::EHD_1920_1080P_2500;

@@ -175,6 +175,11 @@ std::vector<std::string> PictureEncoding( KVZ::IPixelFormat::Enum i_Format )
   {
     case KVZ::IPixelFormat::EU10Y10V10Y10: return { "-c:v", "v210" };
     case KVZ::IPixelFormat::EB8G8R8u8: return { "-pix_fmt", "bgra" };
+    case KVZ::IPixelFormat::ER8G8B8u8: return { "-pix_fmt", "rgba" };
+    case KVZ::IPixelFormat::EB8G8R8: return { "-pix_fmt", "bgr24" };
+    case KVZ::IPixelFormat::ER8G8B8: return { "-pix_fmt", "rgb24" };
+    case KVZ::IPixelFormat::EY8U8Y8V8: return { "-pix_fmt", "yuyv422" };
+    case KVZ::IPixelFormat::ELuminance8: return { "-pix_fmt", "gray" };
     default: return { "-pix_fmt", "uyvy422" };
   }
 }

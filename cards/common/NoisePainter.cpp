@@ -37,7 +37,8 @@ uint32_t NoiseWord( KVZ::IPixelFormat::Enum i_Format, uint64_t i_Random )
   {
     Word |= static_cast<uint32_t>( 1 + ( i_Random >> 16 * i & 0xFFFF ) % 254 ) << 8 * i;
   }
-  return i_Format == KVZ::IPixelFormat::EB8G8R8u8 ? Word | 0xFF000000 : Word;
+  const bool bOpaque = i_Format == KVZ::IPixelFormat::EB8G8R8u8 || i_Format == KVZ::IPixelFormat::ER8G8B8u8;
+  return bOpaque ? Word | 0xFF000000 : Word;
 }
 
 // Every row is a piece of one block of noise, taken from a place that depends on frame and row: a copy a row, no more.

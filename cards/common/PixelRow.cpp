@@ -15,23 +15,49 @@ using KVZ::IPixelFormat;
 constexpr uint32_t V210GroupPixels = 6;
 constexpr uint32_t V210GroupBytes = 16;
 
-void EncodeUYVY( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
+enum class EFirst
 {
-  for( size_t i = 0; i < i_Pixels.size(); ++i )
+  Luma,
+  Chroma
+};
+
+void Encode422( std::span<const VColour> i_Pixels, EFirst i_First, uint8_t* o_pBytes )
+{
+  const size_t LumaPlace = i_First == EFirst::Luma ? 0 : 1;
+  for( size_t i = 0; i < i_Pixels.size(); ++i, o_pBytes += 2 )
   {
     const VColour& rPair = i_Pixels[i & ~size_t{ 1 }];
-    *o_pBytes++ = i % 2 == 0 ? rPair.m_Cb : rPair.m_Cr;
-    *o_pBytes++ = i_Pixels[i].m_Y;
+    o_pBytes[1 - LumaPlace] = i % 2 == 0 ? rPair.m_Cb : rPair.m_Cr;
+    o_pBytes[LumaPlace] = i_Pixels[i].m_Y;
   }
 }
 
-void EncodeBGRA( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
+// i_PixelBytes is 3, or 4 with an opaque fourth byte.
+void EncodeRGB( std::span<const VColour> i_Pixels, uint32_t i_PixelBytes, uint8_t* o_pBytes )
+{
+  for( const VColour& rPixel : i_Pixels )
+  {
+    const uint8_t Bytes[4] = { rPixel.m_Red, rPixel.m_Green, rPixel.m_Blue, 255 };
+    std::memcpy( o_pBytes, Bytes, i_PixelBytes );
+    o_pBytes += i_PixelBytes;
+  }
+}
+
+void EncodeBGR( std::span<const VColour> i_Pixels, uint32_t i_PixelBytes, uint8_t* o_pBytes )
 {
   for( const VColour& rPixel : i_Pixels )
   {
     const uint8_t Bytes[4] = { rPixel.m_Blue, rPixel.m_Green, rPixel.m_Red, 255 };
-    std::memcpy( o_pBytes, Bytes, sizeof( Bytes ) );
-    o_pBytes += sizeof( Bytes );
+    std::memcpy( o_pBytes, Bytes, i_PixelBytes );
+    o_pBytes += i_PixelBytes;
+  }
+}
+
+void EncodeLuma( std::span<const VColour> i_Pixels, uint8_t* o_pBytes )
+{
+  for( const VColour& rPixel : i_Pixels )
+  {
+    *o_pBytes++ = rPixel.m_Y;
   }
 }
 
@@ -76,16 +102,18 @@ VColour MakeColour( uint8_t i_Red, uint8_t i_Green, uint8_t i_Blue, uint32_t i_L
   return Colour;
 }
 
-bool CanDraw( IPixelFormat::Enum i_Format )
-{
-  return i_Format == IPixelFormat::EU8Y8V8Y8 || i_Format == IPixelFormat::EU10Y10V10Y10 || i_Format == IPixelFormat::EB8G8R8u8;
-}
+bool CanDraw( IPixelFormat::Enum i_Format ) { return BytesOf( i_Format, 1 ) > 0; }
 
 uint32_t BytesOf( IPixelFormat::Enum i_Format, uint32_t i_Pixels )
 {
   switch( i_Format )
   {
-    case IPixelFormat::EU8Y8V8Y8: return i_Pixels * 2;
+    case IPixelFormat::ELuminance8: return i_Pixels;
+    case IPixelFormat::EU8Y8V8Y8:
+    case IPixelFormat::EY8U8Y8V8: return i_Pixels * 2;
+    case IPixelFormat::ER8G8B8:
+    case IPixelFormat::EB8G8R8: return i_Pixels * 3;
+    case IPixelFormat::ER8G8B8u8:
     case IPixelFormat::EB8G8R8u8: return i_Pixels * 4;
     case IPixelFormat::EU10Y10V10Y10: return ( i_Pixels + V210GroupPixels - 1 ) / V210GroupPixels * V210GroupBytes;
     default: return 0;
@@ -101,7 +129,8 @@ uint32_t PixelGroup( IPixelFormat::Enum i_Format )
 {
   switch( i_Format )
   {
-    case IPixelFormat::EU8Y8V8Y8: return 2;
+    case IPixelFormat::EU8Y8V8Y8:
+    case IPixelFormat::EY8U8Y8V8: return 2;
     case IPixelFormat::EU10Y10V10Y10: return V210GroupPixels;
     default: return 1;
   }
@@ -111,9 +140,14 @@ void EncodePixels( IPixelFormat::Enum i_Format, std::span<const VColour> i_Pixel
 {
   switch( i_Format )
   {
-    case IPixelFormat::EU8Y8V8Y8: EncodeUYVY( i_Pixels, o_pBytes ); break;
+    case IPixelFormat::ELuminance8: EncodeLuma( i_Pixels, o_pBytes ); break;
+    case IPixelFormat::EU8Y8V8Y8: Encode422( i_Pixels, EFirst::Chroma, o_pBytes ); break;
+    case IPixelFormat::EY8U8Y8V8: Encode422( i_Pixels, EFirst::Luma, o_pBytes ); break;
     case IPixelFormat::EU10Y10V10Y10: EncodeV210( i_Pixels, o_pBytes ); break;
-    case IPixelFormat::EB8G8R8u8: EncodeBGRA( i_Pixels, o_pBytes ); break;
+    case IPixelFormat::ER8G8B8: EncodeRGB( i_Pixels, 3, o_pBytes ); break;
+    case IPixelFormat::ER8G8B8u8: EncodeRGB( i_Pixels, 4, o_pBytes ); break;
+    case IPixelFormat::EB8G8R8: EncodeBGR( i_Pixels, 3, o_pBytes ); break;
+    case IPixelFormat::EB8G8R8u8: EncodeBGR( i_Pixels, 4, o_pBytes ); break;
     default: break;
   }
 }

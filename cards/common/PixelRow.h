@@ -26,7 +26,7 @@ VColour MakeColour( uint8_t i_Red, uint8_t i_Green, uint8_t i_Blue, uint32_t i_L
 constexpr VColour Black{ 0, 0, 0, 16, 128, 128 };
 constexpr VColour White{ 255, 255, 255, 235, 128, 128 };
 
-// The layouts that can be drawn: U8Y8V8Y8, U10Y10V10Y10 and B8G8R8u8.
+// The layouts that can be drawn: those that cards deliver, in 4:2:2, RGB and luma alone.
 bool CanDraw( KVZ::IPixelFormat::Enum i_Format );
 
 // Bytes of i_Pixels neighbouring pixels. For a whole row of U10Y10V10Y10 this is without the padding to 128 bytes.

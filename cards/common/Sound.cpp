@@ -38,22 +38,22 @@ int32_t RampAt( uint64_t i_Sample, uint32_t i_Channel )
   return static_cast<int32_t>( static_cast<uint32_t>( ( i_Sample + RampChannelStep * i_Channel ) & 0xFFFF ) << 16 );
 }
 
-template<class TSample, class TAt>
+template<uint32_t Bytes, class TAt>
 void Fill( const VSound& i_rSound, uint32_t i_SignalChannels, uint32_t i_Channels, uint8_t* o_pBytes, TAt i_At )
 {
-  constexpr int Shift = 32 - 8 * static_cast<int>( sizeof( TSample ) );
+  constexpr int Shift = 32 - 8 * static_cast<int>( Bytes );
   const uint32_t Carried = std::min( i_SignalChannels, i_Channels );
   for( uint32_t Sample = 0; Sample < i_rSound.m_Samples; ++Sample )
   {
-    for( uint32_t Channel = 0; Channel < i_Channels; ++Channel, o_pBytes += sizeof( TSample ) )
+    for( uint32_t Channel = 0; Channel < i_Channels; ++Channel, o_pBytes += Bytes )
     {
-      const TSample Value = Channel < Carried ? static_cast<TSample>( i_At( Sample, Channel ) >> Shift ) : TSample{ 0 };
-      std::memcpy( o_pBytes, &Value, sizeof( Value ) );
+      const int32_t Value = Channel < Carried ? i_At( Sample, Channel ) >> Shift : 0;
+      std::memcpy( o_pBytes, &Value, Bytes );   // little-endian
     }
   }
 }
 
-template<class TSample>
+template<uint32_t Bytes>
 void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
 {
   const uint64_t First = i_rSound.m_FirstSample;
@@ -62,7 +62,7 @@ void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
     const int32_t* pClip = i_rSound.m_Clip.data();
     const uint32_t ClipChannels = i_rSound.m_ClipChannels;
     const uint32_t Carried = std::min( i_rSound.m_SignalChannels, ClipChannels );
-    Fill<TSample>( i_rSound, Carried, i_Channels, o_pBytes,
+    Fill<Bytes>( i_rSound, Carried, i_Channels, o_pBytes,
       [=]( uint32_t i_Sample, uint32_t i_Channel ) { return pClip[size_t{ i_Sample } * ClipChannels + i_Channel]; } );
     return;
   }
@@ -70,9 +70,9 @@ void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
   const auto Ramp = [=]( uint32_t i_Sample, uint32_t i_Channel ) { return RampAt( First + i_Sample, i_Channel ); };
   switch( i_rSound.m_Audio )
   {
-    case EAudio::Tone: Fill<TSample>( i_rSound, i_rSound.m_SignalChannels, i_Channels, o_pBytes, Tone ); break;
-    case EAudio::Ramp: Fill<TSample>( i_rSound, i_rSound.m_SignalChannels, i_Channels, o_pBytes, Ramp ); break;
-    default: std::memset( o_pBytes, 0, sizeof( TSample ) * i_Channels * i_rSound.m_Samples ); break;
+    case EAudio::Tone: Fill<Bytes>( i_rSound, i_rSound.m_SignalChannels, i_Channels, o_pBytes, Tone ); break;
+    case EAudio::Ramp: Fill<Bytes>( i_rSound, i_rSound.m_SignalChannels, i_Channels, o_pBytes, Ramp ); break;
+    default: std::memset( o_pBytes, 0, size_t{ Bytes } * i_Channels * i_rSound.m_Samples ); break;
   }
 }
 
@@ -80,13 +80,11 @@ void WriteAs( const VSound& i_rSound, uint32_t i_Channels, uint8_t* o_pBytes )
 
 void VSound::Write( const VSoundLayout& i_rLayout, uint8_t* o_pBytes ) const
 {
-  if( i_rLayout.m_Bits == 16 )
+  switch( i_rLayout.m_Bits )
   {
-    WriteAs<int16_t>( *this, i_rLayout.m_Channels, o_pBytes );
-  }
-  else
-  {
-    WriteAs<int32_t>( *this, i_rLayout.m_Channels, o_pBytes );
+    case 16: WriteAs<2>( *this, i_rLayout.m_Channels, o_pBytes ); break;
+    case 24: WriteAs<3>( *this, i_rLayout.m_Channels, o_pBytes ); break;
+    default: WriteAs<4>( *this, i_rLayout.m_Channels, o_pBytes ); break;
   }
 }
 

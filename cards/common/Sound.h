@@ -12,7 +12,7 @@ namespace VirtualCards
 // How a client wants interleaved samples.
 struct VSoundLayout
 {
-  uint32_t m_Bits = 16;   // 16 or 32, signed
+  uint32_t m_Bits = 16;   // 16, 24 or 32, signed
   uint32_t m_Channels = 2;
 
   size_t BytesPerFrame() const { return size_t{ m_Bits } / 8 * m_Channels; }
@@ -34,7 +34,7 @@ struct VSound
   // Fills i_rLayout.BytesPerFrame() * m_Samples bytes.
   //
   //   tone: 1 kHz at -18 dBFS, each channel a sixteenth of a turn further on
-  //   ramp: sample k of channel c is (k + 257 c) modulo 65536 as a 16-bit number; 32-bit samples hold it in their upper half
+  //   ramp: sample k of channel c is (k + 257 c) modulo 65536 as a 16-bit number; longer samples hold it in their upper bits
   void Write( const VSoundLayout& i_rLayout, uint8_t* o_pBytes ) const;
 };
 

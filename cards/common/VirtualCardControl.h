@@ -26,6 +26,7 @@ struct VCardCounters
   uint64_t m_FramesDropped = 0;         // by the script, or because a client was seconds behind
   uint64_t m_FramesWithoutBuffer = 0;   // a client kept all of the card's buffers
   uint64_t m_FormatChanges = 0;         // told to a client
+  uint32_t m_ClientsWaiting = 0;        // for the next frame, now; of cards that are polled
 };
 
 class IVirtualCardControl
@@ -48,6 +49,9 @@ public:
 
   // The card is in use by another program: it cannot be enabled.
   virtual bool SetBusy( VCardId i_Card, bool i_bBusy ) = 0;
+
+  // Devices that a driver finds in this card while it is in the machine; 0 for an unknown card.
+  virtual uint32_t CountDevices( VCardId i_Card ) const = 0;
 
   // False for an unknown card.
   virtual bool GetCounters( VCardId i_Card, VCardCounters& o_rCounters ) const = 0;

@@ -15,75 +15,9 @@ VRegistry& VRegistry::Instance()
   return *s_pInstance;
 }
 
-VCardId VRegistry::AddCard( const char* i_pText, const VCardOptions& i_rOptions, std::string& o_rError )
+std::shared_ptr<IVirtualCard> VRegistry::MakeCard( VCardId i_Id, const char* i_pText, const VCardOptions& i_rOptions, std::string& o_rError )
 {
-  VCardId Id = 0;
-  {
-    const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    Id = ++m_LastId;
-  }
-  const std::shared_ptr<VVirtualDeckLink> pCard = VVirtualDeckLink::Make( Id, i_pText, i_rOptions, o_rError );
-  if( !pCard )
-  {
-    return 0;
-  }
-  {
-    const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Cards[Id] = pCard;
-  }
-  pCard->Begin();
-  return Id;
-}
-
-bool VRegistry::RemoveCard( VCardId i_Card )
-{
-  const std::shared_ptr<VVirtualDeckLink> pCard = Find( i_Card );
-  if( !pCard || pCard->Runner().IsCardThread() )
-  {
-    return false;
-  }
-  {
-    const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( m_Cards.erase( i_Card ) == 0 )
-    {
-      return false;
-    }
-  }
-  pCard->End();
-  return true;
-}
-
-bool VRegistry::Step( VCardId i_Card, uint64_t i_Frames )
-{
-  const std::shared_ptr<VVirtualDeckLink> pCard = Find( i_Card );
-  return pCard && pCard->Runner().Step( i_Frames );
-}
-
-bool VRegistry::RunEvent( VCardId i_Card, const char* i_pEvent, std::string& o_rError )
-{
-  const std::shared_ptr<VVirtualDeckLink> pCard = Find( i_Card );
-  o_rError = pCard ? std::string() : "no card has the number " + std::to_string( i_Card );
-  return pCard && pCard->RunEvent( i_pEvent, o_rError );
-}
-
-bool VRegistry::SetBusy( VCardId i_Card, bool i_bBusy )
-{
-  const std::shared_ptr<VVirtualDeckLink> pCard = Find( i_Card );
-  if( pCard )
-  {
-    pCard->SetBusy( i_bBusy );
-  }
-  return pCard != nullptr;
-}
-
-bool VRegistry::GetCounters( VCardId i_Card, VCardCounters& o_rCounters ) const
-{
-  const std::shared_ptr<VVirtualDeckLink> pCard = Find( i_Card );
-  if( pCard )
-  {
-    o_rCounters = pCard->Counters();
-  }
-  return pCard != nullptr;
+  return VVirtualDeckLink::Make( i_Id, i_pText, i_rOptions, o_rError );
 }
 
 int64_t VRegistry::ReferencesHeld() const { return VirtualCards::ReferencesHeld(); }
@@ -147,13 +81,6 @@ std::vector<VDeckLinkObject*> VRegistry::PresentCards()
     pCard->AddRef();
   }
   return m_Present;
-}
-
-std::shared_ptr<VVirtualDeckLink> VRegistry::Find( VCardId i_Card ) const
-{
-  const boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  const auto Found = m_Cards.find( i_Card );
-  return Found != m_Cards.end() ? Found->second : nullptr;
 }
 
 std::vector<std::shared_ptr<VNotifier>> VRegistry::PostToAllLocked( VDeckLinkObject& i_rCard, bool i_bArrived )

@@ -6,48 +6,21 @@
 namespace VirtualCards
 {
 
-bool VVirtualDeckLink::Open( const char* i_pText, const VCardOptions& i_rOptions, VParts& o_rParts, std::string& o_rError )
-{
-  const std::optional<VCardSpec> Spec = ParseCardSpec( i_pText, o_rError );
-  if( !Spec )
-  {
-    return false;
-  }
-  const std::string Card = "card \"" + std::string( i_pText ) + "\": ";
-  if( Spec->m_pKind != FindCardKind( "decklink" ) )
-  {
-    o_rError = Card + "this library makes no cards of the kind " + Spec->m_pKind->m_pName + "; accepted: decklink";
-    return false;
-  }
-  std::string Reason;
-  o_rParts.m_Source = OpenSource( *Spec, i_rOptions.m_bManualClock, Reason );
-  if( o_rParts.m_Source.m_pContent && !Spec->m_Script.empty() )
-  {
-    std::optional<std::vector<VCardEvent>> Events = ReadEvents( *Spec->m_pKind, o_rParts.m_Source.m_Standard, Spec->m_Script, Reason );
-    Reason = Events ? Reason : "script: " + Reason;
-    o_rParts.m_Events = Events.value_or( std::vector<VCardEvent>() );
-  }
-  o_rParts.m_Spec = *Spec;
-  o_rError = Reason.empty() ? Reason : Card + Reason;
-  return Reason.empty();
-}
-
 std::shared_ptr<VVirtualDeckLink> VVirtualDeckLink::Make( VCardId i_Id, const char* i_pText, const VCardOptions& i_rOptions, std::string& o_rError )
 {
-  VParts Parts;
-  if( !Open( i_pText, i_rOptions, Parts, o_rError ) )
+  VCardParts Parts;
+  if( !OpenCard( *FindCardKind( "decklink" ), i_pText, i_rOptions, Parts, o_rError ) )
   {
     return nullptr;
   }
-  return std::shared_ptr<VVirtualDeckLink>( new VVirtualDeckLink( i_Id, std::move( Parts ), i_rOptions ) );
+  return std::shared_ptr<VVirtualDeckLink>( new VVirtualDeckLink( i_Id, Parts, i_rOptions ) );
 }
 
-VVirtualDeckLink::VVirtualDeckLink( VCardId i_Id, VParts i_Parts, const VCardOptions& i_rOptions )
+VVirtualDeckLink::VVirtualDeckLink( VCardId i_Id, const VCardParts& i_rParts, const VCardOptions& i_rOptions )
   : m_Id( i_Id ),
-    m_rKind( *i_Parts.m_Spec.m_pKind ),
-    m_Source( i_Parts.m_Source ),
-    m_Runner( VSignalTimeline( m_Source.m_Standard, i_Parts.m_Spec.m_Timecode, i_Parts.m_Events ),
-      { i_Parts.m_Spec.m_Speed, i_rOptions.m_bManualClock, "Virtual DeckLink " + std::to_string( i_Id ) }, *this )
+    m_rKind( *i_rParts.m_Spec.m_pKind ),
+    m_Source( i_rParts.m_Source ),
+    m_Runner( i_rParts.Timeline(), { i_rParts.m_Spec.m_Speed, i_rOptions.m_bManualClock, "Virtual DeckLink " + std::to_string( i_Id ) }, *this )
 {
 }
 

@@ -1,9 +1,9 @@
 // One virtual card: its signal, its clock, and the object by which clients know it while it is in the machine.
 #pragma once
 
+#include "cards/common/CardParts.h"
 #include "cards/common/CardRunner.h"
-#include "cards/common/SignalContent.h"
-#include "cards/common/VirtualCardControl.h"
+#include "cards/common/CardTable.h"
 #include "cards/decklink/DeckLinkObject.h"
 
 #include <atomic>
@@ -13,22 +13,22 @@
 namespace VirtualCards
 {
 
-class VVirtualDeckLink final : public ICardFrames, public std::enable_shared_from_this<VVirtualDeckLink>
+class VVirtualDeckLink final : public IVirtualCard, public ICardFrames, public std::enable_shared_from_this<VVirtualDeckLink>
 {
 public:
   // Null, with one line of reason, if the text cannot be understood or what it names cannot be opened.
   static std::shared_ptr<VVirtualDeckLink> Make( VCardId i_Id, const char* i_pText, const VCardOptions& i_rOptions, std::string& o_rError );
   ~VVirtualDeckLink() override;
 
-  // The card comes into the machine, unless its script says later, and its frames begin to pass.
-  void Begin();
-  // The card's thread ends, and the card goes out of the machine. Not on the card's thread.
-  void End();
-
-  bool RunEvent( const char* i_pEvent, std::string& o_rError );
-  void SetBusy( bool i_bBusy ) { m_bBusy = i_bBusy; }
+  void Begin() override;
+  void End() override;
+  bool IsCardThread() const override { return m_Runner.IsCardThread(); }
+  bool Step( uint64_t i_Frames ) override { return m_Runner.Step( i_Frames ); }
+  bool RunEvent( const char* i_pEvent, std::string& o_rError ) override;
+  void SetBusy( bool i_bBusy ) override { m_bBusy = i_bBusy; }
   bool IsBusy() const { return m_bBusy; }
-  VCardCounters Counters() const;
+  VCardCounters Counters() const override;
+  uint32_t CountDevices() const override { return 1; }
 
   VCardRunner& Runner() { return m_Runner; }
   ISignalContent& Content() { return *m_Source.m_pContent; }
@@ -40,14 +40,7 @@ public:
   void OnFrame( const VSignalFrame& i_rFrame ) override;
 
 private:
-  struct VParts
-  {
-    VCardSpec m_Spec;
-    VSignalSource m_Source;
-    std::vector<VCardEvent> m_Events;
-  };
-  static bool Open( const char* i_pText, const VCardOptions& i_rOptions, VParts& o_rParts, std::string& o_rError );
-  VVirtualDeckLink( VCardId i_Id, VParts i_Parts, const VCardOptions& i_rOptions );
+  VVirtualDeckLink( VCardId i_Id, const VCardParts& i_rParts, const VCardOptions& i_rOptions );
 
   const VCardId m_Id;
   const VCardKind& m_rKind;

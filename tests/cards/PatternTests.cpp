@@ -17,7 +17,8 @@ using TestSupport::VSamples;
 namespace
 {
 
-constexpr IPixelFormat::Enum Formats[] = { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::EB8G8R8u8 };
+constexpr IPixelFormat::Enum Formats[] = { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8,
+  IPixelFormat::EB8G8R8, IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8, IPixelFormat::ELuminance8 };
 constexpr IVideoStandard::Enum Sizes[] = { IVideoStandard::ESD_720_486I_5994, IVideoStandard::EHD_1280_720P_5000,
   IVideoStandard::EHD_1920_1080P_2500 };
 

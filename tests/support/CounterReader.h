@@ -15,7 +15,7 @@ namespace TestSupport
 
 struct VPixels
 {
-  KVZ::IPixelFormat::Enum m_Format = KVZ::IPixelFormat::EUnspecified;   // U8Y8V8Y8, U10Y10V10Y10 or B8G8R8u8
+  KVZ::IPixelFormat::Enum m_Format = KVZ::IPixelFormat::EUnspecified;   // any that a card delivers
   const uint8_t* m_pBytes = nullptr;
   size_t m_RowBytes = 0;
 };
@@ -26,7 +26,12 @@ inline int BrightnessAt( const VPixels& i_rPixels, uint32_t i_X, uint32_t i_Y )
   const uint8_t* pRow = i_rPixels.m_pBytes + i_Y * i_rPixels.m_RowBytes;
   switch( i_rPixels.m_Format )
   {
+    case KVZ::IPixelFormat::ELuminance8: return pRow[i_X];
     case KVZ::IPixelFormat::EU8Y8V8Y8: return pRow[2 * i_X + 1];
+    case KVZ::IPixelFormat::EY8U8Y8V8: return pRow[2 * i_X];
+    case KVZ::IPixelFormat::ER8G8B8:
+    case KVZ::IPixelFormat::EB8G8R8: return pRow[3 * i_X + 1];
+    case KVZ::IPixelFormat::ER8G8B8u8:
     case KVZ::IPixelFormat::EB8G8R8u8: return pRow[4 * i_X + 1];
     case KVZ::IPixelFormat::EU10Y10V10Y10: break;
     default: return -1;

@@ -1,5 +1,5 @@
 // Reads the sample number out of sound with the ramp: sample k of channel c is (k + 257 c) modulo 65536 as a 16-bit number, in the upper
-// half of 32-bit samples.
+// bits of longer samples.
 #pragma once
 
 #include <cstddef>
@@ -15,17 +15,16 @@ struct VSamples
   const uint8_t* m_pBytes = nullptr;   // interleaved
   size_t m_Frames = 0;                 // samples a channel
   uint32_t m_Channels = 0;
-  uint32_t m_Bytes = 2;   // of a sample: 2 or 4
+  uint32_t m_Bytes = 2;   // of a sample: 2, 3 or 4
 };
 
 inline int32_t SampleAt( const VSamples& i_rSamples, size_t i_Frame, uint32_t i_Channel )
 {
   const uint8_t* pSample = i_rSamples.m_pBytes + ( i_Frame * i_rSamples.m_Channels + i_Channel ) * i_rSamples.m_Bytes;
-  int16_t Short = 0;
-  int32_t Long = 0;
-  std::memcpy( &Short, pSample, i_rSamples.m_Bytes == 2 ? 2 : 0 );
-  std::memcpy( &Long, pSample, i_rSamples.m_Bytes == 4 ? 4 : 0 );
-  return i_rSamples.m_Bytes == 2 ? Short : Long;
+  uint32_t Sample = 0;
+  std::memcpy( &Sample, pSample, i_rSamples.m_Bytes );
+  const uint32_t Shift = 32 - 8 * i_rSamples.m_Bytes;
+  return static_cast<int32_t>( Sample << Shift ) >> Shift;   // with its sign
 }
 
 // The number of the first sample, modulo 65536, if every sample of the first i_Carried channels follows the rule and the others are
@@ -36,7 +35,7 @@ inline std::optional<uint16_t> ReadRamp( const VSamples& i_rSamples, uint32_t i_
   {
     return std::nullopt;
   }
-  const int Shift = i_rSamples.m_Bytes == 4 ? 16 : 0;
+  const uint32_t Shift = 8 * ( i_rSamples.m_Bytes - 2 );
   const auto First = static_cast<uint16_t>( SampleAt( i_rSamples, 0, 0 ) >> Shift );
   for( size_t Frame = 0; Frame < i_rSamples.m_Frames; ++Frame )
   {
