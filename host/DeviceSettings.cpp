@@ -1,6 +1,6 @@
 #include "host/DeviceSettings.h"
 
-#include "StageCoreDataStore/DataReader.h"
+#include "StageCoreDataStore/DataStorePersistence.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "StageCoreParameters/ParameterGroup.h"
 #include "host/CaptureTargets.h"
@@ -11,14 +11,8 @@ namespace StageHost
 namespace
 {
 
-std::string ValueText( const IParameter& i_rParameter )
-{
-  KVZ::Variant Value;
-  return i_rParameter.GetValue( Value ) ? Value.ToText() : std::string();
-}
-
 template<class TGet>
-std::string LimitText( const IParameter& i_rParameter, TGet i_Get )
+std::string TextOf( const IParameter& i_rParameter, TGet i_Get )
 {
   KVZ::Variant Value;
   return ( i_rParameter.*i_Get )( Value ) ? Value.ToText() : std::string();
@@ -35,16 +29,22 @@ VSettingInfo Describe( const IParameter& i_rParameter )
 {
   VSettingInfo Info;
   Info.m_Path = i_rParameter.GetHandle().Path().ToString();
-  Info.m_Value = ValueText( i_rParameter );
+  Info.m_Value = TextOf( i_rParameter, &IParameter::GetValue );
+  Info.m_Proposed = TextOf( i_rParameter, &IParameter::GetProposedValue );
+  Info.m_Default = TextOf( i_rParameter, &IParameter::GetValueDefault );
+  Info.m_Type = i_rParameter.GetSchema()->Name();
   Info.m_Display = i_rParameter.GetDisplay();
   Info.m_Description = i_rParameter.GetDescription();
   Info.m_Category = i_rParameter.GetCategory();
-  Info.m_Minimum = LimitText( i_rParameter, &IParameter::GetMin );
-  Info.m_Maximum = LimitText( i_rParameter, &IParameter::GetMax );
+  Info.m_Minimum = TextOf( i_rParameter, &IParameter::GetMin );
+  Info.m_Maximum = TextOf( i_rParameter, &IParameter::GetMax );
   Info.m_Allowed = Labels( i_rParameter );
   Info.m_bReadOnly = i_rParameter.IsReadOnly();
   Info.m_bHidden = i_rParameter.IsHidden();
   Info.m_bAdvanced = i_rParameter.IsAdvanced();
+  Info.m_bVerifyRequired = i_rParameter.IsVerifyRequired();
+  Info.m_bNotSerialized = i_rParameter.IsNotSerialized();
+  Info.m_bInTicks = i_rParameter.GetDataConversionHint() != Parameter::DataConversionHint::ENoConversion;
   return Info;
 }
 
@@ -63,6 +63,19 @@ boost::optional<KVZ::Variant> ValueFor( const IParameter& i_rParameter, const st
   const auto Value = KVZ::Variant::FromText( i_rParameter.GetSchema(), i_rText );
   return Value ? boost::optional<KVZ::Variant>( *Value ) : boost::none;
 }
+
+// As a device that has just appeared takes it: where the default is not allowed now, the first value that is.
+void SetDefault( IParameter& io_rParameter )
+{
+  KVZ::Variant Default;
+  VParameterChoices Choices;
+  if( io_rParameter.GetValueDefault( Default ) && !io_rParameter.SetValue( Default ) && io_rParameter.GetEnum( Choices ) && !Choices.empty() )
+  {
+    io_rParameter.SetValue( Choices.front().m_Value );
+  }
+}
+
+std::string UnknownSetting( const std::string& i_rPath ) { return "There is no setting \"" + i_rPath + "\"; \"params list\" shows them all."; }
 
 std::string JoinAllowed( const std::vector<std::string>& i_rTexts )
 {
@@ -140,7 +153,7 @@ bool VDeviceSettings::Set( const std::string& i_rPath, const std::string& i_rVal
   const std::shared_ptr<IParameter> pParameter = FindParameter( i_rPath );
   if( !pParameter )
   {
-    o_rError = "There is no setting \"" + i_rPath + "\"; \"params list\" shows them all.";
+    o_rError = UnknownSetting( i_rPath );
     return false;
   }
   const VSettingInfo Setting = Describe( *pParameter );
@@ -156,6 +169,34 @@ bool VDeviceSettings::Set( const std::string& i_rPath, const std::string& i_rVal
     return false;
   }
   return true;
+}
+
+std::vector<VDataPath> VDeviceSettings::Reset( const std::string& i_rPath, std::string& o_rError )
+{
+  const VDataPath Branch = VDataPath::FromString( i_rPath );
+  std::vector<VDataPath> Paths;
+  o_rError = UnknownSetting( i_rPath );
+  VDataWriter Writer( *m_pDataStore );   // devices hear of the end alone
+  for( const std::shared_ptr<IParameterGroup>& pGroup : m_rRegistry.GetGroups() )
+  {
+    for( const std::shared_ptr<IParameter>& pParameter : pGroup->GetParameters() )
+    {
+      const VDataPath& rPath = pParameter->GetHandle().Path();
+      if( Branch.IsEmpty() || !rPath.BeginsWith( Branch ) )
+      {
+        continue;
+      }
+      if( pParameter->IsReadOnly() )
+      {
+        o_rError = i_rPath + " is read-only.";
+        continue;
+      }
+      DataStorePersistence::RemoveParameterValues( Writer, rPath );
+      SetDefault( *pParameter );
+      Paths.push_back( rPath );
+    }
+  }
+  return Paths;
 }
 
 bool VDeviceSettings::IsSettled( const std::string& i_rPath ) const
@@ -183,7 +224,7 @@ VDeviceInfo VDeviceSettings::DescribeDevice( const IParameterGroup& i_rGroup, co
   const auto Text = [&]( const char* i_pKey )
   {
     const auto pParameter = i_rGroup.GetParameter( std::string_view( i_pKey ) );
-    return pParameter ? ValueText( *pParameter ) : std::string();
+    return pParameter ? TextOf( *pParameter, &IParameter::GetValue ) : std::string();
   };
   const auto Choices = [&]( const char* i_pKey )
   {
@@ -201,6 +242,10 @@ VDeviceInfo VDeviceSettings::DescribeDevice( const IParameterGroup& i_rGroup, co
   Info.m_PixelFormats = Choices( "PixelFormat" );
   Info.m_AudioFormat = Text( "AudioSampleFormat" );
   Info.m_AudioChannels = Text( "AudioChannelCount" );
+  Info.m_Container = Text( "VideoContainer" );
+  Info.m_VideoPayload = Text( "VideoPayload" );
+  Info.m_AudioPayload = Text( "AudioPayload" );
+  Info.m_bEnabled = Text( "Enabled" ) == "true";
   Info.m_AudioChannelCounts = Choices( "AudioChannelCount" );
   Info.m_Label = MakeDeviceLabel( i_rURN, Text( "Name" ) );
 

@@ -3,6 +3,7 @@
 // Every operation may be called from any thread. Changes act on the module's own threads: WaitUntilSettled tells when.
 #pragma once
 
+#include "StageCoreDataStoreTypes/DataPath.h"
 #include "host/Registries.h"
 
 #include <boost/optional.hpp>
@@ -32,16 +33,23 @@ struct VDeviceInfo
   std::string m_AudioFormat;
   std::string m_AudioChannels;
   std::vector<std::string> m_AudioChannelCounts;
+  std::string m_Container;   // of recordings
+  std::string m_VideoPayload;
+  std::string m_AudioPayload;
   std::string m_Label;   // the user's name for the device, or the URN without its colon
   std::vector<std::string> m_Warnings;
+  bool m_bEnabled = false;
 
   bool HasSignal() const { return m_Standard != "Unspecified"; }
 };
 
 struct VSettingInfo
 {
-  std::string m_Path;    // "VideoInput.vi:0.Settings.Enabled"
-  std::string m_Value;   // empty where it has none
+  std::string m_Path;       // "VideoInput.vi:0.Settings.Enabled"
+  std::string m_Value;      // empty where it has none
+  std::string m_Proposed;   // what was asked for; another one where the owner has not accepted it
+  std::string m_Default;    // empty where there is none
+  std::string m_Type;       // the schema's name
   std::string m_Display;
   std::string m_Description;
   std::string m_Category;
@@ -51,6 +59,9 @@ struct VSettingInfo
   bool m_bReadOnly = false;
   bool m_bHidden = false;
   bool m_bAdvanced = false;
+  bool m_bVerifyRequired = false;
+  bool m_bNotSerialized = false;
+  bool m_bInTicks = false;   // a time in ticks of 1/135000000 s, whatever unit its display text names
 };
 
 class VDeviceSettings
@@ -68,10 +79,14 @@ public:
   // The user's write. False with the reason in o_rError: unknown, read-only, not such a value, not allowed.
   bool Set( const std::string& i_rPath, const std::string& i_rValue, std::string& o_rError );
 
+  // Gives the setting of this path, or all below it, back to their defaults; those without one have no value then. Read-only ones stay. The
+  // paths of those that were reset; empty, with the reason in o_rError, where there are none.
+  std::vector<VDataPath> Reset( const std::string& i_rPath, std::string& o_rError );
+
   // "VideoInput.vi:0.Settings.Enabled" for ( "vi:0", "Enabled" ).
   static std::string SettingPath( const std::string& i_rDeviceURN, const std::string& i_rKey );
 
-  // The proposed value of a setting that its owner verifies is the verified one.
+  // The proposed value of a setting that its owner verifies is the verified one. False where there is no value.
   bool IsSettled( const std::string& i_rPath ) const;
 
 private:

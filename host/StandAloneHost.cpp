@@ -44,6 +44,7 @@ void PublishMasterRate( VSyncEngine& i_rEngine, IDataStore& io_rDataStore )
 
 VStandAloneHost::VStandAloneHost( const VHostOptions& i_rOptions )
   : m_pDataStore( std::make_shared<VDataStore>() ),
+    m_SettingsFile( i_rOptions.m_SettingsPath ),
     m_pTime( std::make_shared<VMonotonicTime>() ),
     m_pAllocator( MakeAllocator( i_rOptions.m_MemoryMiB ) ),
     m_pShutdown( std::make_shared<VShutdownManager>() ),

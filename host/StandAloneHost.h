@@ -8,6 +8,7 @@
 #include "host/FlowGraph.h"
 #include "host/ModuleLoader.h"
 #include "host/Registries.h"
+#include "host/SettingsFile.h"
 #include "host/SyncEngine.h"
 
 #include <cstddef>
@@ -25,7 +26,8 @@ namespace StageHost
 
 struct VHostOptions
 {
-  size_t m_MemoryMiB = 1024;   // for the frames of all devices
+  size_t m_MemoryMiB = 1024;    // for the frames of all devices
+  std::string m_SettingsPath;   // see VSettingsFile
 };
 
 // The budget is counted in blocks of this size: room for the largest frame, 4096 by 2160 in 32 bits with 16 channels of sound.
@@ -39,6 +41,10 @@ class VStandAloneHost : public StageCorePluginInterface::IStageCoreHost
 public:
   explicit VStandAloneHost( const VHostOptions& i_rOptions );
   ~VStandAloneHost() override;
+
+  // Brings the saved settings back; before the module starts, so that its devices find them. What could not be brought back, a line each.
+  std::vector<std::string> RestoreSettings() { return m_SettingsFile.Restore( *m_pDataStore ); }
+  VSettingsFile& SettingsFile() { return m_SettingsFile; }
 
   // Loads a module and takes it through the whole start up to the hardware start event. False with the reason in o_rError.
   bool StartModule( const std::string& i_rPath, std::string& o_rError );
@@ -74,6 +80,7 @@ public:
 
 private:
   const std::shared_ptr<IDataStore> m_pDataStore;
+  VSettingsFile m_SettingsFile;
   const std::shared_ptr<StageCorePluginInterface::ITimeService> m_pTime;
   const std::shared_ptr<UtilsMemory::VBalancingAllocator> m_pAllocator;
   const std::shared_ptr<VShutdownManager> m_pShutdown;

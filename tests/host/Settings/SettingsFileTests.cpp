@@ -1,0 +1,268 @@
+// What a settings file keeps, whatever happens to it.
+#include "host/SettingsFile.h"
+
+#include "Core/VideoInterface/Schemas.h"
+#include "StageCoreDataStore/DataVerifyWriter.h"
+#include "StageCoreDataStoreTypes/MaskGrid.h"
+#include "host/DataStore.h"
+#include "tests/support/FileSizeLimit.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <boost/thread/thread.hpp>
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+
+#include <cmath>
+#include <fstream>
+#include <limits>
+
+using KVZ::Variant;
+using StageHost::VSettingsFile;
+using VJson = nlohmann::json;
+using VTexts = std::vector<std::string>;
+
+namespace
+{
+
+std::string ReadFile( const std::string& i_rPath )
+{
+  std::ifstream File( i_rPath, std::ios::binary );
+  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
+}
+
+class SettingsFile : public testing::Test
+{
+protected:
+  void WriteFile( const std::string& i_rText ) { std::ofstream( m_Path, std::ios::binary ) << i_rText; }
+  VJson ReadJson() const { return VJson::parse( ReadFile( m_Path ), nullptr, false ); }
+
+  template<class T>
+  void Put( const std::string& i_rKey, const T& i_rValue, uint32_t i_Flags = 0 )
+  {
+    VDataWriter Writer( m_Store );
+    Writer.SetValueFlags( m_Device + i_rKey, i_Flags );
+    Writer.SetValue( m_Device + i_rKey, Variant::Make( i_rValue ) );
+  }
+  bool Save( const VTexts& i_rKeys )
+  {
+    std::vector<VDataPath> Paths;
+    for( const std::string& rKey : i_rKeys )
+    {
+      Paths.push_back( m_Device + rKey );
+    }
+    return m_File.Save( m_Store, Paths, m_Error );
+  }
+  // The values of the file in a store of a new run.
+  VTexts Restore() { return m_File.Restore( m_Restored ); }
+  std::string Text( const std::string& i_rKey ) { return VDataReader( m_Restored ).GetValue( m_Device + i_rKey ).ToText(); }
+
+  const TestSupport::VTemporaryFolder m_Folder;
+  const std::string m_Path = m_Folder.File( "new/settings.json" );
+  const VDataPath m_Device{ "VideoInput", "vi:0", "Settings" };
+  StageHost::VDataStore m_Store;
+  StageHost::VDataStore m_Restored;
+  VSettingsFile m_File{ m_Path };
+  std::string m_Error;
+};
+
+}
+
+TEST_F( SettingsFile, ValuesComeBackAsTheyWere )
+{
+  const double Ratio = 12.0 / 11.0;
+  const int64_t Offset = std::numeric_limits<int64_t>::min();
+  Put( "Ratio", Ratio );
+  Put( "Offset", Offset );
+  Put( "Odd", std::numeric_limits<double>::infinity() );
+  Put( "Name", std::string( "C1 \"left\"\n\xc3\xa9.*" ) );
+  Put( "Enabled", false );
+  Put( "Format", KVZ::IPixelFormat::EU10Y10V10Y10 );
+  Put( "Number", std::string( "5" ) );
+  const VTexts Keys = { "Ratio", "Offset", "Odd", "Name", "Enabled", "Format", "Number" };
+  ASSERT_TRUE( Save( Keys ) ) << m_Error;
+  EXPECT_EQ( Restore(), VTexts() );
+  for( const std::string& rKey : Keys )
+  {
+    EXPECT_EQ( VDataReader( m_Restored ).GetValue( m_Device + rKey ), VDataReader( m_Store ).GetValue( m_Device + rKey ) ) << rKey;
+  }
+  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Format"]["value"], "U10Y10V10Y10" ) << "names, not numbers";
+  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Enabled"]["value"], false );
+}
+
+// The device then has its own say about the proposal.
+TEST_F( SettingsFile, AVerifiedValueKeepsBothFormsAndWaits )
+{
+  {
+    VDataVerifyWriter Writer( m_Store );
+    Writer.SetValueFlags( m_Device + "Gain", DataFlags::VerifyRequired );
+    Writer.SetVerifiedValue( m_Device + "Gain", Variant::Make( 1 ) );
+    Writer.SetProposedValue( m_Device + "Gain", Variant::Make( 2 ) );
+  }
+  ASSERT_TRUE( Save( { "Gain" } ) ) << m_Error;
+  EXPECT_EQ( Restore(), VTexts() );
+  Variant Verified;
+  Variant Proposed;
+  const VDataVerifyReader Reader( m_Restored );
+  EXPECT_TRUE( Reader.GetVerifiedValue( m_Device + "Gain", Verified ) && Reader.GetProposedValue( m_Device + "Gain", Proposed ) );
+  EXPECT_EQ( Verified, Variant::Make( 1 ) );
+  EXPECT_EQ( Proposed, Variant::Make( 2 ) );
+  EXPECT_FALSE( Reader.IsSettled( m_Device + "Gain" ) );
+}
+
+TEST_F( SettingsFile, WhatIsNotTheUsersIsNeverKept )
+{
+  Put( "Status", 1, DataFlags::ReadOnly );
+  Put( "Password", std::string( "x" ), DataFlags::NotSerialized );
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Status", "Password", "Name" } ) ) << m_Error;
+  EXPECT_EQ( ReadJson()["settings"].size(), 1u );
+}
+
+TEST_F( SettingsFile, WhatTheFileCannotHoldIsRefusedAndTheFileStays )
+{
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  const std::string Before = ReadFile( m_Path );
+  Put( "Mask", VMaskGrid() );
+  EXPECT_FALSE( Save( { "Mask" } ) );
+  EXPECT_NE( m_Error.find( "VideoInput.vi:0.Settings.Mask" ), std::string::npos ) << m_Error;
+  Put( "Name", std::string( "\xff" ) );
+  EXPECT_FALSE( Save( { "Name" } ) );
+  EXPECT_NE( m_Error.find( "UTF-8" ), std::string::npos ) << m_Error;
+  EXPECT_FALSE( VSettingsFile( "" ).Save( m_Store, { m_Device + "Name" }, m_Error ) );
+  EXPECT_EQ( ReadFile( m_Path ), Before );
+}
+
+TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
+{
+  Put( "Name", std::string( "A" ) );
+  Put( "Gain", 3 );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  WriteFile( R"({ "note": [ 1, null ], "settings": {
+    "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
+    "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "B", "who": "me" },
+    "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
+    "": 5 } })" );
+  EXPECT_EQ( Restore().size(), 3u );
+  EXPECT_EQ( Text( "Name" ), "B" );
+  EXPECT_FALSE( VDataReader( m_Restored ).Exists( m_Device + "Old" ) );
+
+  ASSERT_TRUE( Save( { "Name", "Gain" } ) ) << m_Error;
+  VJson Expected = VJson::parse( R"({ "note": [ 1, null ], "version": 1, "settings": {
+    "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
+    "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "A", "who": "me" },
+    "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
+    "VideoInput.vi:0.Settings.Gain": { "type": "int32", "value": 3 },
+    "": 5 } })" );
+  EXPECT_EQ( ReadJson(), Expected );
+
+  ASSERT_TRUE( m_File.Remove( { m_Device + "Name" }, m_Error ) ) << m_Error;
+  Expected["settings"].erase( "VideoInput.vi:0.Settings.Name" );
+  EXPECT_EQ( ReadJson(), Expected );
+}
+
+TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
+{
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  const std::string Whole = ReadFile( m_Path );
+  const VTexts Damaged = { "", Whole.substr( 0, Whole.size() / 2 ), "[]", R"({ "settings": 5 })", R"({ "version": "x" })", "\xff\xfe",
+    std::string( 100000, '[' ) };
+  for( size_t Index = 0; Index < Damaged.size(); ++Index )
+  {
+    SCOPED_TRACE( Damaged[Index].substr( 0, 20 ) );
+    const std::string Aside = m_Path + ".damaged" + ( Index == 0 ? "" : std::to_string( Index + 1 ) );
+    WriteFile( Damaged[Index] );
+    EXPECT_FALSE( Save( { "Name" } ) ) << "nothing is written over it";
+    EXPECT_NE( m_Error.find( m_Path + "\" is damaged" ), std::string::npos ) << m_Error;
+    const VTexts Messages = Restore();
+    ASSERT_EQ( Messages.size(), 1u );
+    EXPECT_NE( Messages[0].find( m_Path + "\" is damaged" ), std::string::npos ) << Messages[0];
+    EXPECT_NE( Messages[0].find( Aside ), std::string::npos ) << Messages[0];
+    EXPECT_EQ( ReadFile( Aside ), Damaged[Index] );
+    EXPECT_EQ( Restore(), VTexts() ) << "a file that is not there holds nothing";
+    EXPECT_TRUE( Save( { "Name" } ) ) << m_Error;
+  }
+}
+
+TEST_F( SettingsFile, AFileOfALaterVersionIsLeftAlone )
+{
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  const std::string Later = R"({ "version": 2, "settings": {} })";
+  WriteFile( Later );
+  const VTexts Messages = Restore();
+  ASSERT_EQ( Messages.size(), 1u );
+  EXPECT_NE( Messages[0].find( "version 2" ), std::string::npos ) << Messages[0];
+  EXPECT_FALSE( Save( { "Name" } ) );
+  EXPECT_EQ( ReadFile( m_Path ), Later );
+}
+
+// A device, a folder, a link that leads to nothing plain: neither read nor replaced.
+TEST_F( SettingsFile, OnlyAPlainFileIsASettingsFile )
+{
+  VSettingsFile Device( "/dev/null" );
+  EXPECT_EQ( Device.Restore( m_Restored ).size(), 1u );
+  EXPECT_FALSE( Device.Save( m_Store, {}, m_Error ) );
+  EXPECT_TRUE( boost::filesystem::status( "/dev/null" ).type() == boost::filesystem::character_file );
+  EXPECT_FALSE( boost::filesystem::exists( "/dev/null.lock" ) );
+  VSettingsFile Folder( m_Folder.File( "" ) );
+  EXPECT_EQ( Folder.Restore( m_Restored ).size(), 1u );
+}
+
+TEST_F( SettingsFile, ALinkStaysALink )
+{
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  const std::string Link = m_Folder.File( "link.json" );
+  boost::filesystem::create_symlink( m_Path, Link );
+  boost::filesystem::permissions( m_Path, boost::filesystem::owner_read | boost::filesystem::owner_write );
+  Put( "Name", std::string( "B" ) );
+  ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
+  EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
+  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
+  EXPECT_EQ( boost::filesystem::status( m_Path ).permissions(), boost::filesystem::owner_read | boost::filesystem::owner_write );
+}
+
+TEST_F( SettingsFile, AFullDiskLeavesTheOldFile )
+{
+  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( Save( { "Name" } ) );
+  const std::string Before = ReadFile( m_Path );
+  Put( "Name", std::string( 5000, 'x' ) );
+  {
+    const TestSupport::VFileSizeLimit Limit( 1000 );
+    EXPECT_FALSE( Save( { "Name" } ) );
+  }
+  EXPECT_NE( m_Error.find( m_Path + "\" cannot be written: File too large" ), std::string::npos ) << m_Error;
+  EXPECT_EQ( ReadFile( m_Path ), Before );
+  EXPECT_FALSE( boost::filesystem::exists( m_Path + ".new" ) );
+  EXPECT_TRUE( Save( { "Name" } ) ) << m_Error;
+}
+
+// A lock belongs to the open file, so two threads exclude each other as two processes do.
+TEST_F( SettingsFile, WritersLoseNothingOfEachOther )
+{
+  constexpr int SavesEach = 25;
+  const auto SaveMany = [this]( int i_First )
+  {
+    StageHost::VDataStore Store;
+    VSettingsFile File( m_Path );
+    for( int Number = i_First; Number < i_First + SavesEach; ++Number )
+    {
+      const VDataPath Path = m_Device + ( "Key" + std::to_string( Number ) );
+      std::string Error;
+      VDataWriter( Store ).SetValue( Path, Variant::Make( Number ) );
+      EXPECT_TRUE( File.Save( Store, { Path }, Error ) ) << Error;
+      EXPECT_TRUE( File.Remove( { m_Device + "Common" }, Error ) ) << Error;
+    }
+  };
+  boost::thread Other( [&] { SaveMany( SavesEach ); } );
+  SaveMany( 0 );
+  Other.join();
+  EXPECT_EQ( Restore(), VTexts() );
+  for( int Number = 0; Number < 2 * SavesEach; ++Number )
+  {
+    EXPECT_EQ( Text( "Key" + std::to_string( Number ) ), std::to_string( Number ) );
+  }
+}
