@@ -2,6 +2,7 @@
 
 #include "Core/VideoInterface/Schemas.h"
 #include "Core/VideoInterface/VideoContainer.h"
+#include "Core/VideoInterface/VideoWriter.h"
 #include "StageCoreDataStore/DataReader.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "StageCoreRuntime/GlobalLog.h"
@@ -20,6 +21,24 @@ namespace StageHost
 
 namespace
 {
+
+constexpr uint32_t AllChannels = 0xFFFFFFFF;
+constexpr uint32_t MostChannels = 16;
+
+uint32_t ChannelsOf( int32_t i_Container, uint32_t i_Wanted )
+{
+  if( i_Wanted != AllChannels )
+  {
+    return i_Wanted;
+  }
+  const KVZ::IVideoWriterCapabilities& rCapabilities = KVZ::GetVideoWriterCapabilities( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) );
+  uint32_t Channels = MostChannels;
+  while( Channels > 0 && !rCapabilities.IsChannelCountSupported( Channels ) )
+  {
+    --Channels;
+  }
+  return Channels;
+}
 
 template<class T>
 T ReadOr( const VDataReader& i_rReader, const VDataPath& i_rPath, T i_Default )
@@ -130,8 +149,11 @@ VCaptureTarget VCaptureTargets::MakeTarget( const std::string& i_rName, const st
   {
     Target.m_Folder = ( boost::filesystem::path( Target.m_Folder ) / Stem( Target ) ).string();
   }
-  Target.m_AudioChannels = m_Options.m_AudioChannels;
-  Target.m_PixelFormat = m_Options.m_PixelFormat;
+  Target.m_AudioChannels = ChannelsOf( i_Container, m_Options.m_AudioChannels );
+  if( Target.m_VideoPayload == KVZ::IVideoPayload::EUncompressed )
+  {
+    Target.m_PixelFormat = m_Options.m_PixelFormat;
+  }
   Target.m_JPEGQuality = m_Options.m_JPEGQuality;
   Target.m_bBurnInTimecode = m_Options.m_bBurnInTimecode;
   return Target;

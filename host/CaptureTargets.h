@@ -21,7 +21,7 @@ struct VCaptureTargetOptions
 {
   std::string m_Folder;                     // where the alias "Default" leads
   bool m_bOverwrite = false;                // an existing file, or the images in a folder, are never replaced otherwise
-  uint32_t m_AudioChannels = 0xFFFFFFFFu;   // to keep; all ones keeps what was captured
+  uint32_t m_AudioChannels = 0xFFFFFFFFu;   // to keep; all ones: as many as were captured and the container can hold
   KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EUnspecified;   // of uncompressed video; "Unspecified" keeps what was captured
   int m_JPEGQuality = 0;                                                     // 1 to 100; 0 leaves the choice to the module
   bool m_bBurnInTimecode = false;

@@ -65,8 +65,8 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
 // warnings tell nothing.
 void WaitForRate( VHostSession& i_rSession, const std::vector<VDeviceInfo>& i_rDevices )
 {
-  const auto Delivering = static_cast<size_t>(
-    std::count_if( i_rDevices.begin(), i_rDevices.end(), []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal(); } ) );
+  const auto Delivering = static_cast<size_t>( std::count_if( i_rDevices.begin(), i_rDevices.end(),
+    []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal() && i_rDevice.m_bEnabled; } ) );
   const auto IsRateKnown = [&]
   {
     const auto pSession = i_rSession.Host().Engine().GetStarted();

@@ -5,6 +5,7 @@
 #include "apps/stagehost/Interrupt.h"
 
 #include <CLI/CLI.hpp>
+#include <boost/filesystem/operations.hpp>
 
 #include <algorithm>
 #include <cstdio>
@@ -18,6 +19,8 @@ constexpr double PollSeconds = 0.02;
 // Real drivers announce their cards within this time.
 constexpr double ArrivalSeconds = 1.5;
 constexpr double SignalSeconds = 5.0;
+
+constexpr const char* NoSettings = "none";
 
 constexpr const char* pCardKeys = R"(Keys of a virtual card, parted by commas:
   standard=NAME        a video standard; one that is not carried is answered with a list
@@ -50,8 +53,28 @@ void AddSessionOptions( CLI::App& io_rCommand, VSessionOptions& io_rOptions )
     .add_option( "--card", io_rOptions.m_Cards, "A virtual card, KIND[:KEY=VALUE[,KEY=VALUE]...], for example decklink:standard=HD_1920_1080P_2500" )
     ->type_name( "CARD" )
     ->allow_extra_args( false );
+  io_rCommand
+    .add_option( "--settings", io_rOptions.m_SettingsPath,
+      "The file of saved settings, or none (default: stagehost/settings.json in $XDG_CONFIG_HOME or ~/.config)" )
+    ->type_name( "FILE" );
   io_rCommand.add_flag( "--verbose", io_rOptions.m_bVerbose, "Show the log's information on standard error" );
   io_rCommand.footer( pCardKeys );
+}
+
+bool VHostSession::ChooseSettingsFile( std::string& o_rPath ) const
+{
+  boost::system::error_code Error;
+  o_rPath = m_Options.m_SettingsPath == NoSettings ? "" : m_Options.m_SettingsPath;
+  if( m_Options.m_SettingsPath.empty() )
+  {
+    o_rPath = StageHost::DefaultSettingsPath();
+  }
+  else if( !o_rPath.empty() && !m_Options.m_bMayMakeSettings && !boost::filesystem::exists( o_rPath, Error ) )
+  {
+    Complain( "There is no settings file \"" + o_rPath + "\"." );
+    return false;
+  }
+  return true;
 }
 
 int VHostSession::Start( const VSessionOptions& i_rOptions )
@@ -71,9 +94,17 @@ int VHostSession::Start( const VSessionOptions& i_rOptions )
     }
   }
   StageHost::VHostOptions Options;
+  if( !ChooseSettingsFile( Options.m_SettingsPath ) )
+  {
+    return ExitUsage;
+  }
   Options.m_MemoryMiB = i_rOptions.m_MemoryMiB;
   m_pHost = std::make_unique<StageHost::VStandAloneHost>( Options );
   m_pSettings = std::make_unique<StageHost::VDeviceSettings>( m_pHost->GetDataStore(), m_pHost->Parameters() );
+  for( const std::string& rMessage : m_pHost->RestoreSettings() )
+  {
+    Complain( rMessage );
+  }
   if( !m_pHost->StartModule( StageHost::ProgramFolder() + "/StageCorePluginVideoInput.tpm", Error ) )
   {
     Complain( Error );
@@ -84,14 +115,11 @@ int VHostSession::Start( const VSessionOptions& i_rOptions )
 
 std::vector<VDeviceInfo> VHostSession::Choose( const std::vector<VDeviceInfo>& i_rDevices ) const
 {
-  if( m_Options.m_DeviceURNs.empty() )
-  {
-    return i_rDevices;
-  }
+  const std::vector<std::string>& rURNs = m_Options.m_DeviceURNs;
+  const auto IsChosen = [&]( const VDeviceInfo& i_rDevice )
+  { return rURNs.empty() ? i_rDevice.m_bEnabled || !m_Options.m_bLeaveOutDisabled : std::count( rURNs.begin(), rURNs.end(), i_rDevice.m_URN ) != 0; };
   std::vector<VDeviceInfo> Chosen;
-  std::copy_if( i_rDevices.begin(), i_rDevices.end(), std::back_inserter( Chosen ),
-    [&]( const VDeviceInfo& i_rDevice )
-    { return std::count( m_Options.m_DeviceURNs.begin(), m_Options.m_DeviceURNs.end(), i_rDevice.m_URN ) != 0; } );
+  std::copy_if( i_rDevices.begin(), i_rDevices.end(), std::back_inserter( Chosen ), IsChosen );
   return Chosen;
 }
 
@@ -102,8 +130,9 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
   do {
     Devices = m_pSettings->GetDevices();
     const double Waited = m_pHost->Time().Now() - Begin;
-    const bool bAllThere = m_Cards.Count() > 0 ? Devices.size() >= m_Cards.Count() : !Devices.empty() && Waited > ArrivalSeconds;
-    const bool bAllSignals = std::all_of( Devices.begin(), Devices.end(), []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal(); } );
+    const bool bAllThere = m_Cards.Count() > 0 ? Devices.size() >= m_Cards.CountDevices() : !Devices.empty() && Waited > ArrivalSeconds;
+    const std::vector<VDeviceInfo> Chosen = Choose( Devices );
+    const bool bAllSignals = std::all_of( Chosen.begin(), Chosen.end(), []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal(); } );
     if( ( bAllThere && bAllSignals ) || Waited > ( Devices.empty() ? ArrivalSeconds : SignalSeconds ) )
     {
       break;
@@ -129,6 +158,10 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
     }
   }
   Devices = Choose( Devices );
+  if( Devices.empty() )
+  {
+    Complain( "No device is enabled; --device URN takes one all the same." );
+  }
   for( const VDeviceInfo& rDevice : Devices )
   {
     if( i_bNeedSignal && !rDevice.HasSignal() )

@@ -112,9 +112,10 @@ bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, cons
 }
 
 // While the device is stopped, so that the next buffer session holds frames of these settings alone.
-int ApplySettings( VHostSession& i_rSession, const VRecordFormat& i_rFormat, const VDeviceInfo& i_rDevice )
+int ApplySettings( VHostSession& i_rSession, const VFormatOptions& i_rOptions, const VDeviceInfo& i_rDevice )
 {
-  const std::string Refusal = i_rFormat.WhyRefused( i_rDevice );
+  const VRecordFormat Format( i_rOptions, i_rDevice );
+  const std::string Refusal = Format.WhyRefused();
   if( !Refusal.empty() )
   {
     Complain( Refusal );
@@ -125,16 +126,16 @@ int ApplySettings( VHostSession& i_rSession, const VRecordFormat& i_rFormat, con
     Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
     return ExitFailed;
   }
-  if( !Set( i_rSession, i_rDevice, i_rFormat.Container() ) )
+  if( !Set( i_rSession, i_rDevice, Format.Container() ) )
   {
     return ExitUsage;
   }
-  if( !AwaitPayloads( i_rSession, i_rDevice, i_rFormat ) )
+  if( !AwaitPayloads( i_rSession, i_rDevice, Format ) )
   {
     Complain( "Device " + i_rDevice.m_URN + " does not take its container." );
     return ExitFailed;
   }
-  const std::vector<VWantedSetting> Settings = i_rFormat.Settings( i_rDevice );
+  const std::vector<VWantedSetting> Settings = Format.Settings();
   if( !std::all_of( Settings.begin(), Settings.end(), [&]( const VWantedSetting& i_rSetting ) { return Set( i_rSession, i_rDevice, i_rSetting ); } ) )
   {
     return ExitUsage;
@@ -147,12 +148,12 @@ int ApplySettings( VHostSession& i_rSession, const VRecordFormat& i_rFormat, con
   return ExitComplete;
 }
 
-int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const VRecordFormat& i_rFormat, const std::vector<VDeviceInfo>& i_rDevices )
+int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VCaptureTargetOptions Targets;
   Targets.m_Folder = i_rOptions.m_Output;
   Targets.m_bOverwrite = i_rOptions.m_bOverwrite;
-  i_rFormat.Apply( Targets );
+  ApplyFormat( i_rOptions.m_Format, Targets );
   i_rSession.Host().Targets().Configure( Targets );
   for( const VDeviceInfo& rDevice : i_rDevices )
   {
@@ -262,8 +263,7 @@ int Run( const VOptions& i_rOptions )
     Complain( "record needs one of --seconds S (above 0) and --frames N (2 or more)." );
     return ExitUsage;
   }
-  const VRecordFormat Format( i_rOptions.m_Format );
-  const std::string Refusal = Format.WhyRefused();
+  const std::string Refusal = VRecordFormat::WhyRefused( i_rOptions.m_Format );
   if( !Refusal.empty() )
   {
     Complain( Refusal );
@@ -285,12 +285,12 @@ int Run( const VOptions& i_rOptions )
   }
   for( const VDeviceInfo& rDevice : Devices )
   {
-    if( const int Result = ApplySettings( Session, Format, rDevice ) )
+    if( const int Result = ApplySettings( Session, i_rOptions.m_Format, rDevice ) )
     {
       return Result;
     }
   }
-  if( const int Result = CheckTargets( Session, i_rOptions, Format, Devices ) )
+  if( const int Result = CheckTargets( Session, i_rOptions, Devices ) )
   {
     return Result;
   }
@@ -304,7 +304,8 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
   CLI::App& rCommand = *io_rApp.add_subcommand( "record", "Record devices to files" );
   auto pOptions = std::make_shared<VOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
-  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all when absent" )
+  pOptions->m_Session.m_bLeaveOutDisabled = true;
+  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all that are enabled when absent" )
     ->type_name( "URN" )
     ->allow_extra_args( false );
   rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )

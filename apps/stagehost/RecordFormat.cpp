@@ -68,12 +68,32 @@ TEnum ValueOf( const std::array<VWord<TEnum>, Count>& i_rWords, const std::strin
   return std::find_if( i_rWords.begin(), i_rWords.end(), [&]( const VWord<TEnum>& i_rRow ) { return i_rWord == i_rRow.m_pWord; } )->m_Value;
 }
 
-// The word's value, or, where there is no word, the first that the predicate takes.
-template<class TEnum, size_t Count, class TPredicate>
-TEnum ValueOrFirst( const std::array<VWord<TEnum>, Count>& i_rWords, const std::string& i_rWord, const TPredicate& i_rPredicate )
+template<class TEnum, size_t Count>
+std::string WordOf( const std::array<VWord<TEnum>, Count>& i_rWords, TEnum i_Value )
 {
+  return std::find_if( i_rWords.begin(), i_rWords.end(), [&]( const VWord<TEnum>& i_rRow ) { return i_Value == i_rRow.m_Value; } )->m_pWord;
+}
+
+IVideoContainer::Enum ContainerOf( const std::string& i_rWord, const std::string& i_rSetting )
+{
+  auto Container = IVideoContainer::ETVID;
+  KVZ::FromName( i_rSetting, Container );
+  return i_rWord.empty() ? Container : ValueOf( Containers, i_rWord );
+}
+
+// The word's value; where there is no word, the setting, or else the first that the predicate takes.
+template<class TEnum, size_t Count, class TPredicate>
+TEnum PayloadOf( const std::array<VWord<TEnum>, Count>& i_rWords, const std::string& i_rWord, const std::string& i_rSetting,
+  const TPredicate& i_rPredicate )
+{
+  if( !i_rWord.empty() )
+  {
+    return ValueOf( i_rWords, i_rWord );
+  }
+  TEnum Setting = i_rWords.front().m_Value;
+  KVZ::FromName( i_rSetting, Setting );
   const std::vector<std::string> Supported = WordsOf( i_rWords, i_rPredicate );
-  return ValueOf( i_rWords, !i_rWord.empty() || Supported.empty() ? i_rWord : Supported.front() );
+  return i_rPredicate( Setting ) || Supported.empty() ? Setting : ValueOf( i_rWords, Supported.front() );
 }
 
 // The names of an enumeration's values that the predicate takes.
@@ -129,10 +149,9 @@ std::string DeviceChannels( const StageHost::VDeviceInfo& i_rDevice, uint32_t i_
 
 void AddFormatOptions( CLI::App& io_rCommand, VFormatOptions& io_rOptions )
 {
-  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format" )
-    ->check( CLI::IsMember( WordsOf( Containers ) ) )
-    ->capture_default_str();
-  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload (default: uncompressed, where the container takes it)" )
+  io_rCommand.add_option( "--container", io_rOptions.m_Container, "File format (default: the device's VideoContainer, tvid at first)" )
+    ->check( CLI::IsMember( WordsOf( Containers ) ) );
+  io_rCommand.add_option( "--video", io_rOptions.m_Video, "Video payload (default: the device's VideoPayload, where the container takes it)" )
     ->check( CLI::IsMember( WordsOf( VideoPayloads ) ) );
   io_rCommand.add_option( "--quality", io_rOptions.m_Quality, "Quality of jpeg (default: 90)" )
     ->type_name( "1-100" )
@@ -141,7 +160,7 @@ void AddFormatOptions( CLI::App& io_rCommand, VFormatOptions& io_rOptions )
     .add_option( "--pixel-format", io_rOptions.m_PixelFormat, "Pixel format of the capture buffer, or that uncompressed video is stored in" )
     ->type_name( "NAME" );
   io_rCommand.add_option( "--burn-in", io_rOptions.m_BurnIn, "What is drawn into each picture" )->check( CLI::IsMember( { "timecode" } ) );
-  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload (default: uncompressed, where the container takes it)" )
+  io_rCommand.add_option( "--audio", io_rOptions.m_Audio, "Audio payload (default: the device's AudioPayload, where the container takes it)" )
     ->check( CLI::IsMember( WordsOf( AudioPayloads ) ) );
   io_rCommand.add_option( "--audio-channels", io_rOptions.m_AudioChannels, "Channels to keep" )
     ->check( WholeNumberCheck( 0.0, MostChannels, "a whole number from 0 to 16" ) )
@@ -149,12 +168,13 @@ void AddFormatOptions( CLI::App& io_rCommand, VFormatOptions& io_rOptions )
   io_rCommand.add_option( "--audio-format", io_rOptions.m_AudioFormat, "Sample format, for example Int16" );
 }
 
-VRecordFormat::VRecordFormat( const VFormatOptions& i_rOptions )
+VRecordFormat::VRecordFormat( const VFormatOptions& i_rOptions, const StageHost::VDeviceInfo& i_rDevice )
   : m_Options( i_rOptions ),
-    m_Container( ValueOf( Containers, i_rOptions.m_Container ) ),
-    m_Video( ValueOrFirst( VideoPayloads, i_rOptions.m_Video,
+    m_Device( i_rDevice ),
+    m_Container( ContainerOf( i_rOptions.m_Container, i_rDevice.m_Container ) ),
+    m_Video( PayloadOf( VideoPayloads, i_rOptions.m_Video, i_rDevice.m_VideoPayload,
       [this]( IVideoPayload::Enum i_Payload ) { return Capabilities().IsVideoPayloadSupported( i_Payload ); } ) ),
-    m_Audio( ValueOrFirst( AudioPayloads, i_rOptions.m_Audio,
+    m_Audio( PayloadOf( AudioPayloads, i_rOptions.m_Audio, i_rDevice.m_AudioPayload,
       [this]( IAudioPayload::Enum i_Payload ) { return Capabilities().IsAudioPayloadSupported( i_Payload ); } ) )
 {
 }
@@ -162,6 +182,19 @@ VRecordFormat::VRecordFormat( const VFormatOptions& i_rOptions )
 const KVZ::IVideoWriterCapabilities& VRecordFormat::Capabilities() const { return KVZ::GetVideoWriterCapabilities( m_Container ); }
 
 std::string VRecordFormat::WhyRefused() const
+{
+  const std::string Refusal = WhyNotStored();
+  return Refusal.empty() ? WhyNotCaptured() : Refusal;
+}
+
+// With both words nothing of it depends on the device's settings.
+std::string VRecordFormat::WhyRefused( const VFormatOptions& i_rOptions )
+{
+  const bool bSaid = !i_rOptions.m_Container.empty() && !i_rOptions.m_Video.empty();
+  return bSaid ? VRecordFormat( i_rOptions, {} ).WhyNotStored() : "";
+}
+
+std::string VRecordFormat::WhyNotStored() const
 {
   for( const std::string& rText : { WhyVideoRefused(), WhyPixelFormatRefused(), WhyAudioRefused() } )
   {
@@ -177,7 +210,7 @@ std::string VRecordFormat::WhyVideoRefused() const
 {
   if( !Capabilities().IsVideoPayloadSupported( m_Video ) )
   {
-    return Refusal( "--video " + m_Options.m_Video, "the container " + m_Options.m_Container,
+    return Refusal( "--video " + m_Options.m_Video, "the container " + WordOf( Containers, m_Container ),
       WordsOf( VideoPayloads, [this]( IVideoPayload::Enum i_Payload ) { return Capabilities().IsVideoPayloadSupported( i_Payload ); } ) );
   }
   if( m_Options.m_Quality != 0 && m_Video != IVideoPayload::EImageJPEG )
@@ -197,14 +230,15 @@ std::string VRecordFormat::WhyPixelFormatRefused() const
   const auto IsTaken = [&]( IPixelFormat::Enum i_Format ) { return !bUncompressed || Capabilities().IsPixelFormatSupported( i_Format ); };
   auto Format = IPixelFormat::EUnspecified;
   const bool bKnown = KVZ::FromName( m_Options.m_PixelFormat, Format ) && Format != IPixelFormat::EUnspecified;
-  return bKnown && IsTaken( Format ) ? ""
-                                     : Refusal( "--pixel-format " + m_Options.m_PixelFormat,
-                                         "uncompressed video in the container " + m_Options.m_Container, NamesOf<IPixelFormat::Enum>( IsTaken ) );
+  return bKnown && IsTaken( Format )
+    ? ""
+    : Refusal( "--pixel-format " + m_Options.m_PixelFormat, "uncompressed video in the container " + WordOf( Containers, m_Container ),
+        NamesOf<IPixelFormat::Enum>( IsTaken ) );
 }
 
 std::string VRecordFormat::WhyAudioRefused() const
 {
-  const std::string Who = "the container " + m_Options.m_Container;
+  const std::string Who = "the container " + WordOf( Containers, m_Container );
   if( !Capabilities().IsAudioPayloadSupported( m_Audio ) )
   {
     return Refusal( "--audio " + m_Options.m_Audio, Who,
@@ -234,32 +268,35 @@ std::string VRecordFormat::WhyAudioRefused() const
   return {};
 }
 
-bool VRecordFormat::IsCaptured( const StageHost::VDeviceInfo& i_rDevice ) const
+bool VRecordFormat::IsCaptured() const
 {
-  return std::count( i_rDevice.m_PixelFormats.begin(), i_rDevice.m_PixelFormats.end(), m_Options.m_PixelFormat ) > 0;
+  return std::count( m_Device.m_PixelFormats.begin(), m_Device.m_PixelFormats.end(), m_Options.m_PixelFormat ) > 0;
 }
 
 // A format that the device cannot capture is made of the one that it has.
-std::string VRecordFormat::WhyRefused( const StageHost::VDeviceInfo& i_rDevice ) const
+std::string VRecordFormat::WhyNotCaptured() const
 {
-  if( m_Options.m_PixelFormat.empty() || IsCaptured( i_rDevice ) )
+  if( m_Options.m_PixelFormat.empty() || IsCaptured() )
   {
     return {};
   }
   auto Captured = IPixelFormat::EUnspecified;
   auto Wanted = IPixelFormat::EUnspecified;
-  KVZ::FromName( i_rDevice.m_PixelFormat, Captured );
+  KVZ::FromName( m_Device.m_PixelFormat, Captured );
   KVZ::FromName( m_Options.m_PixelFormat, Wanted );
   const auto IsTaken = [&]( IPixelFormat::Enum i_Format )
   {
-    const std::vector<std::string>& rOwn = i_rDevice.m_PixelFormats;
+    const std::vector<std::string>& rOwn = m_Device.m_PixelFormats;
     return std::count( rOwn.begin(), rOwn.end(), KVZ::ToName( i_Format ) ) > 0 ||
       ( m_Video == IVideoPayload::EUncompressed && Capabilities().IsPixelFormatSupported( i_Format ) && CanConvert( Captured, i_Format ) );
   };
-  return IsTaken( Wanted ) ? "" : Refusal( "--pixel-format " + m_Options.m_PixelFormat, i_rDevice.m_URN, NamesOf<IPixelFormat::Enum>( IsTaken ) );
+  return IsTaken( Wanted ) ? "" : Refusal( "--pixel-format " + m_Options.m_PixelFormat, m_Device.m_URN, NamesOf<IPixelFormat::Enum>( IsTaken ) );
 }
 
-VWantedSetting VRecordFormat::Container() const { return { "VideoContainer", KVZ::ToName( m_Container ), "--container " + m_Options.m_Container }; }
+VWantedSetting VRecordFormat::Container() const
+{
+  return { "VideoContainer", KVZ::ToName( m_Container ), "--container " + WordOf( Containers, m_Container ) };
+}
 
 std::vector<std::string> VRecordFormat::OfferedVideoPayloads() const
 {
@@ -274,39 +311,34 @@ std::vector<std::string> VRecordFormat::OfferedVideoPayloads() const
   return Names;
 }
 
-std::vector<VWantedSetting> VRecordFormat::Settings( const StageHost::VDeviceInfo& i_rDevice ) const
+std::vector<VWantedSetting> VRecordFormat::Settings() const
 {
   std::vector<VWantedSetting> Wanted;
-  if( !m_Options.m_PixelFormat.empty() && IsCaptured( i_rDevice ) )
+  if( !m_Options.m_PixelFormat.empty() && IsCaptured() )
   {
     Wanted.push_back( { "PixelFormat", m_Options.m_PixelFormat, "--pixel-format " + m_Options.m_PixelFormat } );
   }
   if( m_Options.m_bAudioChannels )
   {
-    Wanted.push_back( { "AudioChannelCount", DeviceChannels( i_rDevice, m_Options.m_AudioChannels ),
+    Wanted.push_back( { "AudioChannelCount", DeviceChannels( m_Device, m_Options.m_AudioChannels ),
       "--audio-channels " + std::to_string( m_Options.m_AudioChannels ) } );
   }
   if( !m_Options.m_AudioFormat.empty() )
   {
     Wanted.push_back( { "AudioSampleFormat", m_Options.m_AudioFormat, "--audio-format " + m_Options.m_AudioFormat } );
   }
-  Wanted.push_back( { "VideoPayload", KVZ::ToName( m_Video ), "--video " + m_Options.m_Video } );
-  Wanted.push_back( { "AudioPayload", KVZ::ToName( m_Audio ), "--audio " + m_Options.m_Audio } );
+  Wanted.push_back( { "VideoPayload", KVZ::ToName( m_Video ), "--video " + WordOf( VideoPayloads, m_Video ) } );
+  Wanted.push_back( { "AudioPayload", KVZ::ToName( m_Audio ), "--audio " + WordOf( AudioPayloads, m_Audio ) } );
   return Wanted;
 }
 
-void VRecordFormat::Apply( StageHost::VCaptureTargetOptions& o_rTargets ) const
+void ApplyFormat( const VFormatOptions& i_rOptions, StageHost::VCaptureTargetOptions& o_rTargets )
 {
-  // Without a wish as many channels as the container can hold.
-  o_rTargets.m_AudioChannels = m_Options.m_bAudioChannels ? m_Options.m_AudioChannels : MostChannels;
-  while( !m_Options.m_bAudioChannels && o_rTargets.m_AudioChannels > 0 && !Capabilities().IsChannelCountSupported( o_rTargets.m_AudioChannels ) )
+  if( i_rOptions.m_bAudioChannels )
   {
-    --o_rTargets.m_AudioChannels;
+    o_rTargets.m_AudioChannels = i_rOptions.m_AudioChannels;
   }
-  if( m_Video == IVideoPayload::EUncompressed && !m_Options.m_PixelFormat.empty() )
-  {
-    KVZ::FromName( m_Options.m_PixelFormat, o_rTargets.m_PixelFormat );
-  }
-  o_rTargets.m_JPEGQuality = m_Options.m_Quality;
-  o_rTargets.m_bBurnInTimecode = !m_Options.m_BurnIn.empty();
+  KVZ::FromName( i_rOptions.m_PixelFormat, o_rTargets.m_PixelFormat );
+  o_rTargets.m_JPEGQuality = i_rOptions.m_Quality;
+  o_rTargets.m_bBurnInTimecode = !i_rOptions.m_BurnIn.empty();
 }

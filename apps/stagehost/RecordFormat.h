@@ -1,5 +1,5 @@
-// What "record" stores: the words of the command line, checked against what the containers can hold, and the settings of a device that they
-// stand for.
+// What "record" stores of a device: the words of the command line, and for the others the device's own settings, checked against what the
+// containers can hold.
 #pragma once
 
 #include "Core/VideoInterface/VideoWriter.h"
@@ -17,9 +17,11 @@ class App;
 
 struct VFormatOptions
 {
-  std::string m_Container = "tvid";
-  std::string m_Video;   // empty: what the container takes, uncompressed before all else
-  std::string m_Audio;   // likewise
+  // Empty words leave the choice to the device's settings. A payload that the container does not take gives way to the first that it takes,
+  // uncompressed before all else.
+  std::string m_Container;
+  std::string m_Video;
+  std::string m_Audio;
   uint32_t m_AudioChannels = 0;
   bool m_bAudioChannels = false;
   std::string m_AudioFormat;
@@ -38,33 +40,36 @@ struct VWantedSetting
   std::string m_Option;
 };
 
+// What goes beside the settings, for all devices.
+void ApplyFormat( const VFormatOptions& i_rOptions, StageHost::VCaptureTargetOptions& o_rTargets );
+
 class VRecordFormat
 {
 public:
-  explicit VRecordFormat( const VFormatOptions& i_rOptions );
+  VRecordFormat( const VFormatOptions& i_rOptions, const StageHost::VDeviceInfo& i_rDevice );
 
-  // Why this cannot be recorded, whatever the device: one line that names what would be accepted. Empty where nothing is wrong.
+  // Why this cannot be recorded: one line that names what would be accepted. Empty where nothing is wrong.
   std::string WhyRefused() const;
-  // The same for one device.
-  std::string WhyRefused( const StageHost::VDeviceInfo& i_rDevice ) const;
+  // The same as far as it can be said without a device.
+  static std::string WhyRefused( const VFormatOptions& i_rOptions );
 
   // The container comes first: it says which payloads the device offers.
   VWantedSetting Container() const;
-  std::vector<VWantedSetting> Settings( const StageHost::VDeviceInfo& i_rDevice ) const;
+  std::vector<VWantedSetting> Settings() const;
   // What a payload's setting offers once the device has this container.
   std::vector<std::string> OfferedVideoPayloads() const;
 
-  // What goes beside the settings.
-  void Apply( StageHost::VCaptureTargetOptions& o_rTargets ) const;
-
 private:
+  std::string WhyNotStored() const;
+  std::string WhyNotCaptured() const;
   std::string WhyVideoRefused() const;
   std::string WhyPixelFormatRefused() const;
   std::string WhyAudioRefused() const;
-  bool IsCaptured( const StageHost::VDeviceInfo& i_rDevice ) const;
+  bool IsCaptured() const;
   const KVZ::IVideoWriterCapabilities& Capabilities() const;
 
   const VFormatOptions m_Options;
+  const StageHost::VDeviceInfo m_Device;
   const KVZ::IVideoContainer::Enum m_Container;
   const KVZ::IVideoPayload::Enum m_Video;
   const KVZ::IAudioPayload::Enum m_Audio;

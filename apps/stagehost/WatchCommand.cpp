@@ -202,7 +202,8 @@ VCommand AddWatchCommand( CLI::App& io_rApp )
   CLI::App& rCommand = *io_rApp.add_subcommand( "watch", "Follow devices live: frame rate, latency, dropped frames" );
   auto pOptions = std::make_shared<VOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
-  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to watch, such as vi:0; all when absent" )
+  pOptions->m_Session.m_bLeaveOutDisabled = true;
+  rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to watch, such as vi:0; all that are enabled when absent" )
     ->type_name( "URN" )
     ->allow_extra_args( false );
   rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to watch; until interrupted when absent" )

@@ -1,5 +1,7 @@
 #include "tests/support/ProgramRun.h"
 
+#include "tests/support/TemporaryFolder.h"
+
 #include <fcntl.h>
 #include <poll.h>
 #include <sys/resource.h>
@@ -148,7 +150,10 @@ VRunResult RunStageHost( std::vector<std::string> i_Arguments, const VRunOptions
     throw std::runtime_error( "STAGECORE_BIN must name the folder of the programs" );
   }
   i_Arguments.insert( i_Arguments.begin(), std::string( pFolder ) + "/stagehost" );
-  return RunProgram( i_Arguments, i_rOptions );
+  const VTemporaryFolder Settings;
+  VRunOptions Options = i_rOptions;
+  Options.m_Environment.insert( Options.m_Environment.begin(), "XDG_CONFIG_HOME=" + Settings.File( "config" ) );
+  return RunProgram( i_Arguments, Options );
 }
 
 }

@@ -36,7 +36,7 @@ struct VRunResult
 // The first argument is the program: a path, or a name that is looked up.
 VRunResult RunProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions = {} );
 
-// The same with stagehost.
+// The same with stagehost. Unless the environment says where settings are kept, the run keeps its own in a folder that goes with it.
 VRunResult RunStageHost( std::vector<std::string> i_Arguments, const VRunOptions& i_rOptions = {} );
 
 }

@@ -14,6 +14,17 @@
 namespace SystemTests
 {
 
+namespace
+{
+
+std::chrono::steady_clock::time_point DeadlineIn( double i_Seconds )
+{
+  return std::chrono::steady_clock::now() +
+    std::chrono::duration_cast<std::chrono::steady_clock::duration>( std::chrono::duration<double>( i_Seconds ) );
+}
+
+}
+
 VBackgroundProgram::VBackgroundProgram( const std::vector<std::string>& i_rArguments, const std::vector<std::string>& i_rEnvironment )
 {
   int Ends[2] = { -1, -1 };
@@ -56,26 +67,51 @@ VBackgroundProgram::~VBackgroundProgram()
   }
 }
 
+bool VBackgroundProgram::ReadMore( std::chrono::steady_clock::time_point i_Deadline )
+{
+  const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( i_Deadline - std::chrono::steady_clock::now() ).count();
+  pollfd End = { m_Output, POLLIN, 0 };
+  if( Left <= 0 || poll( &End, 1, static_cast<int>( Left ) ) == 0 )
+  {
+    return false;
+  }
+  char Bytes[4096];
+  const ssize_t Count = read( m_Output, Bytes, sizeof( Bytes ) );
+  m_Printed.append( Bytes, static_cast<size_t>( Count > 0 ? Count : 0 ) );
+  return Count > 0 || ( Count < 0 && errno == EINTR );
+}
+
 bool VBackgroundProgram::WaitFor( const std::string& i_rText, double i_Seconds )
 {
-  const auto Deadline = std::chrono::steady_clock::now() + std::chrono::duration<double>( i_Seconds );
+  const auto Deadline = DeadlineIn( i_Seconds );
   while( m_Printed.find( i_rText ) == std::string::npos )
   {
-    const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( Deadline - std::chrono::steady_clock::now() ).count();
-    pollfd End = { m_Output, POLLIN, 0 };
-    if( Left <= 0 || poll( &End, 1, static_cast<int>( Left ) ) == 0 )
+    if( !ReadMore( Deadline ) )
     {
       return false;
     }
-    char Bytes[4096];
-    const ssize_t Count = read( m_Output, Bytes, sizeof( Bytes ) );
-    if( Count == 0 || ( Count < 0 && errno != EINTR ) )
-    {
-      return false;
-    }
-    m_Printed.append( Bytes, static_cast<size_t>( Count > 0 ? Count : 0 ) );
   }
   return true;
+}
+
+void VBackgroundProgram::Interrupt() const { kill( m_Child, SIGINT ); }
+
+int VBackgroundProgram::WaitForEnd( double i_Seconds )
+{
+  const auto Deadline = DeadlineIn( i_Seconds );
+  while( ReadMore( Deadline ) )
+  {
+  }
+  if( std::chrono::steady_clock::now() >= Deadline )
+  {
+    return -1;
+  }
+  int Status = 0;
+  while( waitpid( m_Child, &Status, 0 ) < 0 && errno == EINTR )
+  {
+  }
+  m_Child = -1;
+  return WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
 }
 
 }

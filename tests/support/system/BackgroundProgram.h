@@ -1,6 +1,7 @@
 // A program that runs beside the test, until the test lets go of it.
 #pragma once
 
+#include <chrono>
 #include <string>
 #include <vector>
 
@@ -21,9 +22,16 @@ public:
 
   // Until it has printed this text. False when it ends or so many seconds pass before that.
   bool WaitFor( const std::string& i_rText, double i_Seconds );
+  // Sends INT.
+  void Interrupt() const;
+  // Until it has ended and everything that it printed is here: its exit code. -1 when a signal ended it or so many seconds pass before that.
+  int WaitForEnd( double i_Seconds );
   const std::string& Printed() const { return m_Printed; }
 
 private:
+  // False at the end of its output or at the deadline.
+  bool ReadMore( std::chrono::steady_clock::time_point i_Deadline );
+
   pid_t m_Child = -1;
   int m_Output = -1;
   std::string m_Printed;

@@ -47,7 +47,7 @@ const VRefusalCase RefusalCases[] = {
   { "UnknownContainer", Ready + VArguments{ "--container", "wav" }, 2, { "--container", "wav", "tvid" } },
   { "TooManyChannels", Ready + VArguments{ "--audio-channels", "17" }, 2, { "--audio-channels", "16" } },
   { "NoName", Ready + VArguments{ "--name", "" }, 2, { "--name" } },
-  { "ParamsOfWhat", Params( {} ), 2, { "list", "get", "set" } },
+  { "ParamsOfWhat", Params( {} ), 2, { "list", "get", "set", "reset", "watch" } },
   { "InspectWhat", { "inspect" }, 2, { "FILE" } },
   // What the device does not offer
   { "UnknownPixelFormat", Ready + VArguments{ "--pixel-format", "XYZ" }, 2, { "--pixel-format XYZ", "U8Y8V8Y8" } },
@@ -67,6 +67,11 @@ const VRefusalCase RefusalCases[] = {
   { "RefusedCount", Params( { "set", "VideoInput.vi:0.Settings.AudioChannelCount", "3" } ), 2, { "AudioChannelCount", "0, 2, 8, 16" } },
   { "RefusedType", Params( { "set", "VideoInput.vi:0.Settings.Enabled", "maybe" } ), 2, { "Enabled", "maybe", "bool" } },
   { "ReadOnly", Params( { "set", "VideoInput.vi:0.Hardware.Status", "Ready" } ), 2, { "VideoInput.vi:0.Hardware.Status", "read-only" } },
+  { "ReadOnlyReset", Params( { "reset", "VideoInput.vi:0.Hardware.Status" } ), 2, { "VideoInput.vi:0.Hardware.Status", "read-only" } },
+  { "ResetOfNothing", Params( { "reset", "VideoInput.vi:3" } ), 2, { "VideoInput.vi:3", "params list" } },
+  { "WatchOfNothing", Params( { "watch", "VideoInput.vi:3" } ), 2, { "VideoInput.vi:3", "params list" } },
+  { "SetNowhere", Params( { "--settings", "none", "set", "VideoInput.vi:0.Settings.Name", "A" } ), 1, { "no file" } },
+  { "NoSettings", Ready + VArguments{ "--settings", "FOLDER/none.json" }, 2, { "FOLDER/none.json" } },
   // Files
   { "FolderThatCannotBeMade", { "record", "--output", "/proc/here", "--frames", "5", "--card", "decklink" }, 1, { "\"/proc/here\"" } },
   { "FolderUnderAFile", { "record", "--output", "FOLDER/file/out", "--frames", "5", "--card", "decklink" }, 1,

@@ -109,7 +109,12 @@ TEST_F( ReportTest, SettingsCanBeListedReadAndChanged )
   const VArguments Card = { "params", "--card", "decklink" };
   const VRunResult List = TestSupport::RunStageHost( Card + VArguments{ "list" } );
   EXPECT_EQ( 0, List.m_ExitCode ) << Describe( List );
-  EXPECT_NE( std::string::npos, List.m_Output.find( "VideoInput.vi:0.Settings.PixelFormat" ) );
+  const std::vector<std::string> Tree = Lines( List.m_Output );
+  const auto Group = std::find( Tree.begin(), Tree.end(), "VideoInput.vi:0.Settings" );
+  const auto IsFormat = []( const std::string& i_rLine ) {
+    return HasCells( i_rLine, { "PixelFormat", "U8Y8V8Y8", "U8Y8V8Y8, U10Y10V10Y10", "The chosen pixel format" } );
+  };
+  EXPECT_EQ( 1, std::count_if( Group, Tree.end(), IsFormat ) ) << List.m_Output;
   for( const nlohmann::json& rSetting : RunJson( Card + VArguments{ "--json", "list" } ) )
   {
     EXPECT_FALSE( rSetting.value( "path", "" ).empty() );

@@ -167,6 +167,7 @@ TEST_F( DiskTest, AFileThatCannotBeMadeIsNamed )
 // Standard output is a file too.
 TEST_F( DiskTest, AResultThatCannotBePrintedIsAFailure )
 {
-  const VRunResult Run = TestSupport::RunProgram( { "sh", "-c", "exec \"$STAGECORE_BIN/stagehost\" devices --card decklink > /dev/full" } );
+  const VRunResult Run = TestSupport::RunProgram(
+    { "sh", "-c", "exec \"$STAGECORE_BIN/stagehost\" devices --settings none --card decklink > /dev/full" } );
   EXPECT_EQ( 1, Run.m_ExitCode ) << Describe( Run );
 }

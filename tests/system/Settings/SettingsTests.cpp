@@ -1,0 +1,222 @@
+// What is set in one run acts in the next ones, and nothing else ever touches it.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/system/BackgroundProgram.h"
+#include "tests/support/system/StageHost.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <fstream>
+#include <memory>
+
+using namespace SystemTests;
+
+namespace
+{
+
+const VArguments Card = { "--card", "decklink:standard=SD_720_576I_5000,speed=4" };
+
+std::string Key( const std::string& i_rName ) { return "VideoInput.vi:0.Settings." + i_rName; }
+
+std::string ReadFile( const std::string& i_rPath )
+{
+  std::ifstream File( i_rPath, std::ios::binary );
+  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
+}
+
+class SettingsTest : public testing::Test
+{
+protected:
+  SettingsTest() { m_Options.m_Environment = { "XDG_CONFIG_HOME=" + m_Folder.File( "" ) }; }
+
+  VRunResult Params( const VArguments& i_rMore, const VArguments& i_rCards = Card ) const
+  {
+    return TestSupport::RunStageHost( VArguments{ "params" } + i_rCards + i_rMore, m_Options );
+  }
+  void Set( const std::string& i_rName, const std::string& i_rValue ) const
+  {
+    const VRunResult Run = Params( { "set", Key( i_rName ), i_rValue } );
+    EXPECT_EQ( 0, Run.m_ExitCode ) << Describe( Run );
+    EXPECT_EQ( i_rValue + "\n", Run.m_Output );
+  }
+  std::string Get( const std::string& i_rName ) const { return Params( { "get", Key( i_rName ) } ).m_Output; }
+  nlohmann::json Saved() const
+  {
+    const nlohmann::json Document = nlohmann::json::parse( ReadFile( m_Path ), nullptr, false );
+    return Document.is_object() ? Document.value( "settings", nlohmann::json::object() ) : nlohmann::json();
+  }
+  VRecordResult RecordMore( const std::string& i_rName, const VArguments& i_rMore = {}, const VArguments& i_rCards = Card ) const
+  {
+    return Record( m_Folder.File( "out" ), i_rCards + VArguments{ "--frames", "3", "--name", i_rName } + i_rMore, m_Options );
+  }
+
+  const TestSupport::VTemporaryFolder m_Folder;
+  const std::string m_Path = m_Folder.File( "stagehost/settings.json" );
+  VRunOptions m_Options;
+};
+
+int64_t CountOf( const std::string& i_rExtension, const std::string& i_rFolder )
+{
+  boost::system::error_code Error;
+  return std::count_if( boost::filesystem::directory_iterator( i_rFolder, Error ), boost::filesystem::directory_iterator(),
+    [&]( const boost::filesystem::directory_entry& i_rFile ) { return i_rFile.path().extension() == i_rExtension; } );
+}
+
+bool EndsWith( const std::string& i_rText, const std::string& i_rEnd )
+{
+  return i_rText.size() >= i_rEnd.size() && i_rText.compare( i_rText.size() - i_rEnd.size(), i_rEnd.size(), i_rEnd ) == 0;
+}
+
+}
+
+TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
+{
+  Set( "AudioChannelCount", "2" );
+  Set( "Name", "left" );
+  VRecordResult Result = RecordMore( "a" );
+  EXPECT_TRUE( EndsWith( Result.Path(), "/a_left.tvid" ) ) << Describe( Result.m_Run );
+  EXPECT_EQ( 2, Inspect( Result.Path() )["internal"].value( "AudioFrameInfo.Channels", 0 ) );
+
+  // The payload is one that only the container of an earlier run takes.
+  Set( "VideoContainer", "IMAGES" );
+  Set( "VideoPayload", "ImagePNG" );
+  Result = RecordMore( "b" );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( "images", Result.Device().value( "container", "" ) );
+  EXPECT_EQ( 3, CountOf( ".png", m_Folder.File( "out/b_left" ) ) );
+
+  // The command line has the last word, for its run.
+  EXPECT_TRUE( EndsWith( RecordMore( "c", { "--container", "mkv", "--audio-channels", "0" } ).Path(), "/c_left.mkv" ) );
+  EXPECT_TRUE( EndsWith( RecordMore( "d", { "--settings", "none" } ).Path(), "/d_vi0.tvid" ) );
+  EXPECT_EQ( "IMAGES\n", Get( "VideoContainer" ) );
+
+  const VRunResult Reset = Params( { "reset", "VideoInput.vi:0" } );
+  EXPECT_EQ( 0, Reset.m_ExitCode ) << Describe( Reset );
+  EXPECT_NE( std::string::npos, Reset.m_Output.find( Key( "AudioChannelCount" ) + " = 16\n" ) ) << Reset.m_Output;
+  EXPECT_NE( std::string::npos, Reset.m_Output.find( Key( "VideoPayload" ) + " = Uncompressed\n" ) ) << Reset.m_Output;
+  EXPECT_TRUE( Saved().empty() ) << Saved();
+  EXPECT_TRUE( EndsWith( RecordMore( "e" ).Path(), "/e_vi0.tvid" ) );
+}
+
+TEST_F( SettingsTest, ADisabledDeviceIsLeftOutUnlessItIsNamed )
+{
+  const VArguments Two = Card + Card;
+  EXPECT_EQ( "false\n", Params( { "set", "VideoInput.vi:1.Settings.Enabled", "false" }, Two ).m_Output );
+  VRecordResult Result = RecordMore( "a", {}, Two );
+  ASSERT_EQ( 1u, Result.m_Devices.size() ) << Describe( Result.m_Run );
+  EXPECT_EQ( "vi:0", Result.Device().value( "urn", "" ) );
+  Result = RecordMore( "b", { "--device", "vi:1" }, Two );
+  EXPECT_EQ( "vi:1", Result.Device().value( "urn", "" ) ) << Describe( Result.m_Run );
+
+  EXPECT_EQ( "false\n", Params( { "set", Key( "Enabled" ), "false" }, Two ).m_Output );
+  Result = RecordMore( "c", {}, Two );
+  EXPECT_EQ( 4, Result.m_Run.m_ExitCode );
+  EXPECT_EQ( "stagehost: No device is enabled; --device URN takes one all the same.\n", Result.m_Run.m_Error );
+  const VRunResult Devices = TestSupport::RunStageHost( VArguments{ "devices", "--json" } + Two, m_Options );
+  EXPECT_EQ( 2u, nlohmann::json::parse( Devices.m_Output, nullptr, false ).size() ) << Describe( Devices );
+}
+
+TEST_F( SettingsTest, AFolderThatIsNoMoreGivesWay )
+{
+  Set( "CaptureDirectory", "None" );
+  std::string Text = ReadFile( m_Path );
+  Text.replace( Text.find( "\"None\"" ), 6, "\"Fast Disk\"" );
+  std::ofstream( m_Path ) << Text;
+  const VRunResult Run = Params( { "get", Key( "CaptureDirectory" ) } );
+  EXPECT_EQ( "Default\n", Run.m_Output );
+  EXPECT_NE( std::string::npos,
+    Run.m_Error.find( "Device vi:0 is using an invalid capture folder [ Fast Disk ], reverting to default capture folder." ) )
+    << Run.m_Error;
+  EXPECT_EQ( Text, ReadFile( m_Path ) ) << "the folder may come back";
+}
+
+TEST_F( SettingsTest, WhatIsRefusedLeavesNoTrace )
+{
+  EXPECT_EQ( 2, Params( { "set", "VideoInput.vi:0.Hardware.Status", "Ready" } ).m_ExitCode );
+  EXPECT_EQ( 2, Params( { "set", Key( "Threshold" ), "1.5" } ).m_ExitCode );
+  EXPECT_EQ( 0, Params( { "list" } ).m_ExitCode );
+  EXPECT_EQ( 0, Params( { "reset", Key( "Threshold" ) } ).m_ExitCode );
+  EXPECT_EQ( "", ReadFile( m_Path ) );
+  Set( "Threshold", "0.25" );
+  Set( "TimeOffsetTicks", "-135000" );
+  EXPECT_EQ( "0.25\n", Get( "Threshold" ) );
+  const nlohmann::json All = nlohmann::json::parse( Params( { "list", "--json" } ).m_Output, nullptr, false );
+  EXPECT_EQ( 2, std::count_if( All.begin(), All.end(), []( const nlohmann::json& i_rSetting ) { return i_rSetting.value( "saved", false ); } ) );
+}
+
+TEST_F( SettingsTest, ADamagedFileStopsNobody )
+{
+  Set( "AudioChannelCount", "2" );
+  const std::string Half = ReadFile( m_Path ).substr( 0, 40 );
+  std::ofstream( m_Path ) << Half;
+  const VRecordResult Result = RecordMore( "a" );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( 0u, Result.m_Run.m_Error.find( "stagehost: The settings file \"" + m_Path + "\" is damaged" ) ) << Result.m_Run.m_Error;
+  EXPECT_EQ( 1, std::count( Result.m_Run.m_Error.begin(), Result.m_Run.m_Error.end(), '\n' ) ) << Result.m_Run.m_Error;
+  EXPECT_EQ( Half, ReadFile( m_Path + ".damaged" ) );
+  EXPECT_EQ( "16\n", Get( "AudioChannelCount" ) );
+  EXPECT_EQ( "", RecordMore( "b" ).m_Run.m_Error );
+}
+
+TEST_F( SettingsTest, AFullDiskLeavesTheOldFile )
+{
+  Set( "AudioChannelCount", "2" );
+  const std::string Before = ReadFile( m_Path );
+  VRunOptions Options = m_Options;
+  Options.m_FileSizeLimit = 64;
+  const VRunResult Run = TestSupport::RunStageHost( VArguments{ "params" } + Card + VArguments{ "set", Key( "Name" ), "A" }, Options );
+  EXPECT_EQ( 1, Run.m_ExitCode );
+  EXPECT_EQ( "", Run.m_Output ) << "what is not kept is not confirmed";
+  EXPECT_NE( std::string::npos, Run.m_Error.find( "cannot be written: File too large" ) ) << Run.m_Error;
+  EXPECT_EQ( Before, ReadFile( m_Path ) );
+}
+
+TEST_F( SettingsTest, ProcessesLoseNothingOfEachOther )
+{
+  const std::vector<VArguments> Wishes = { { Key( "Name" ), "A" }, { Key( "AudioChannelCount" ), "8" }, { Key( "Threshold" ), "0.5" },
+    { Key( "MaximumBlobHeight" ), "7" }, { Key( "TimeOffsetTicks" ), "5" }, { Key( "UseTimecodeForSync" ), "false" } };
+  std::vector<std::unique_ptr<VBackgroundProgram>> Programs;
+  for( const VArguments& rWish : Wishes )
+  {
+    const VArguments Command = { std::string( std::getenv( "STAGECORE_BIN" ) ) + "/stagehost", "params", "--settings", m_Path };
+    Programs.push_back( std::make_unique<VBackgroundProgram>( Command + Card + VArguments{ "set" } + rWish ) );
+  }
+  for( size_t Index = 0; Index < Wishes.size(); ++Index )
+  {
+    EXPECT_EQ( 0, Programs[Index]->WaitForEnd( 30.0 ) ) << Programs[Index]->Printed();
+    EXPECT_EQ( Wishes[Index][1] + "\n", Programs[Index]->Printed() );
+  }
+  EXPECT_EQ( Wishes.size(), Saved().size() ) << Saved();
+}
+
+TEST_F( SettingsTest, TheUsersFolderIsWhereTheDesktopSaysItIs )
+{
+  const std::string Home = m_Folder.File( "home" );
+  for( const char* pConfig : { "XDG_CONFIG_HOME=", "XDG_CONFIG_HOME=relative" } )
+  {
+    VRunOptions Options;
+    Options.m_Environment = { pConfig, "HOME=" + Home };
+    const VRunResult Run = TestSupport::RunStageHost( VArguments{ "params" } + Card + VArguments{ "set", Key( "Name" ), pConfig }, Options );
+    EXPECT_EQ( 0, Run.m_ExitCode ) << Describe( Run );
+    EXPECT_NE( std::string::npos, ReadFile( Home + "/.config/stagehost/settings.json" ).find( pConfig ) );
+  }
+}
+
+TEST_F( SettingsTest, ChangesArePrintedUntilInterrupted )
+{
+  nlohmann::json Events = nlohmann::json::array();
+  for( int Number = 1; Number < 40; ++Number )
+  {
+    Events.push_back( { { "frame", 100 * Number }, { "do", "format" }, { "standard", Number % 2 ? "SD_720_486I_5994" : "SD_720_576I_5000" } } );
+  }
+  const std::string Script = WriteScript( m_Folder.File( "script.json" ), Events );
+  const VArguments Command = { std::string( std::getenv( "STAGECORE_BIN" ) ) + "/stagehost", "params", "--settings", "none", "--card",
+    "decklink:standard=SD_720_576I_5000,speed=4,script=" + Script, "watch", "VideoInput.vi:0.Hardware", "--json" };
+  VBackgroundProgram Watch( Command );
+  ASSERT_TRUE( Watch.WaitFor( "watching 6 settings", 20.0 ) ) << Watch.Printed();
+  EXPECT_TRUE( Watch.WaitFor( R"({"path":"VideoInput.vi:0.Hardware.VideoStandard","value":"SD_720_486I_5994"})", 20.0 ) ) << Watch.Printed();
+  Watch.Interrupt();
+  EXPECT_EQ( 0, Watch.WaitForEnd( 20.0 ) ) << Watch.Printed();
+  EXPECT_EQ( std::string::npos, Watch.Printed().find( "Settings" ) ) << Watch.Printed();
+}
