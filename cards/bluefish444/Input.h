@@ -100,7 +100,7 @@ private:
   uint32_t m_LastToldMode GUARDED_BY( m_Mutex );
 
   // The client
-  uint32_t m_Waiting GUARDED_BY( m_Mutex ) = 0;         // for the next sync
+  uint32_t m_Waiting GUARDED_BY( m_Mutex ) = 0;    // for the next sync
   bool m_bInRound GUARDED_BY( m_Mutex ) = false;   // it has had a sync and will wait for the next
   VTargets m_Named GUARDED_BY( m_Mutex );
   VTargets m_Filling GUARDED_BY( m_Mutex );

@@ -9,6 +9,7 @@
 #include "FileIO/TarvoVideo/Writer.h"
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDriver.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Driver.h"
 #include "StageCoreRuntime/Shared.h"
 
 namespace Composition
@@ -16,7 +17,8 @@ namespace Composition
 
 std::vector<VideoInputHAL::VDriverMaker> DriverMakers()
 {
-  return { [] { return KVZ::MakeShared<VideoInputHAL::VBlackmagicDeckLinkDriver>(); } };
+  return { [] { return KVZ::MakeShared<VideoInputHAL::VBluefish444Driver>(); },
+    [] { return KVZ::MakeShared<VideoInputHAL::VBlackmagicDeckLinkDriver>(); } };
 }
 
 std::shared_ptr<const KVZ::VVideoWriterFactory> WriterFactory()

@@ -1,6 +1,7 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceTimecode.h"
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/TimecodeChoice.h"
 #include "SyncSystem/Tick.h"
 
 #include <array>
@@ -13,7 +14,6 @@ namespace
 {
 
 using KVZ::ITimecodeSource;
-using KVZ::ITimecodeStandard;
 
 namespace Format = DeckLinkAPI::TimecodeFormat;
 
@@ -46,34 +46,6 @@ std::span<const uint32_t> FormatsOf( ITimecodeSource::Enum i_Source )
     }
   }
   return {};
-}
-
-struct VPeriodRow
-{
-  int64_t m_Period;   // ticks a timecode frame
-  ITimecodeStandard::Enum m_Standard;
-  ITimecodeStandard::Enum m_DropStandard;   // where the timecode says that it drops labels
-};
-
-// The first row whose period is a whole multiple of the video frame's wins.
-constexpr std::array Periods = {
-  VPeriodRow{ 4500000, ITimecodeStandard::ETimecode30, ITimecodeStandard::ETimecode30 },
-  VPeriodRow{ 4504500, ITimecodeStandard::ETimecode30Drift, ITimecodeStandard::ETimecode30Drop },
-  VPeriodRow{ 5400000, ITimecodeStandard::ETimecode25, ITimecodeStandard::ETimecode25 },
-  VPeriodRow{ 5625000, ITimecodeStandard::ETimecode24, ITimecodeStandard::ETimecode24 },
-  VPeriodRow{ 5630625, ITimecodeStandard::ETimecode24Drift, ITimecodeStandard::ETimecode24Drift },
-};
-
-ITimecodeStandard::Enum ChooseStandard( int64_t i_FramePeriod, bool i_bDropFrame )
-{
-  for( const VPeriodRow& rRow : Periods )
-  {
-    if( i_FramePeriod != 0 && rRow.m_Period % i_FramePeriod == 0 )
-    {
-      return i_bDropFrame ? rRow.m_DropStandard : rRow.m_Standard;
-    }
-  }
-  return ITimecodeStandard::ETimecode30;
 }
 
 VComPointer<DeckLinkAPI::IDeckLinkTimecode> FindTimecode( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rFrame, ITimecodeSource::Enum i_Source )
@@ -111,7 +83,7 @@ VTimecodeReading ReadTimecode( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rFrame, 
   }
   pTimecode->GetTimecodeUserBits( &Timecode.m_UserBits );
   Timecode.m_SubFramePeriod = static_cast<uint32_t>( Duration );
-  Timecode.m_Standard = ChooseStandard( Duration, ( pTimecode->GetFlags() & DeckLinkAPI::TimecodeFlag::DropFrame ) != 0 );
+  Timecode.m_Standard = ChooseTimecodeStandard( Duration, ( pTimecode->GetFlags() & DeckLinkAPI::TimecodeFlag::DropFrame ) != 0 );
   Reading.m_Timecode = Timecode;
   return Reading;
 }

@@ -1,0 +1,147 @@
+// The road of a frame from the card's buffer to the data callback, on the capture thread.
+#include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444DeviceImpl.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Tables.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Timecode.h"
+
+#include "StageCoreRuntime/GlobalLog.h"
+
+#include <boost/thread/lock_guard.hpp>
+
+#include <algorithm>
+#include <new>
+
+namespace VideoInputHAL
+{
+
+namespace
+{
+
+namespace Buffer = BlueVelvet::Buffer;
+
+constexpr const char* LogCategory = "VideoInputDeviceBluefish444";
+
+}
+
+void VBluefish444Device::VImpl::DeliverFrame( uint32_t i_Buffer )
+{
+  std::shared_ptr<IVideoInputAllocator> pAllocator;
+  std::shared_ptr<IVideoInputDataCallback> pReceiver;
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    pAllocator = m_pAllocator;
+  }
+  const uint64_t Samples = SamplesPerFrame( m_Setup.m_pStandard->m_Period );
+  const uint64_t Channels = std::min( m_Command.m_AudioChannels, MostAudioChannels );
+  VVideoInputDataSourceFrame* const pFrame = MakeFrame( pAllocator.get(), Samples * Channels * ToSampleType( m_Command.m_AudioFormat ).m_Bytes );
+  if( !pFrame )
+  {
+    return;
+  }
+  if( !ReadFrame( i_Buffer, *pFrame ) )
+  {
+    pAllocator->Free( pFrame );
+    return;
+  }
+  ResolveRepeats( pFrame->m_Timecode );
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    pReceiver = m_pDataCallback.lock();
+  }
+  const int64_t Period = m_Setup.m_pStandard->m_Period;
+  if( !pReceiver || !pReceiver->OnVideoInputData( m_FrameIndex++, pFrame, &pFrame->m_Timecode, &Period ) )
+  {
+    pAllocator->Free( pFrame );
+  }
+}
+
+// The header filled in, but for what the ancillary data tells. Null, with a line in the log, where the frame is lost.
+VVideoInputDataSourceFrame* VBluefish444Device::VImpl::MakeFrame( IVideoInputAllocator* i_pAllocator, uint64_t i_AudioBytes )
+{
+  void* const pBlock = i_pAllocator ? i_pAllocator->Allocate( VVideoInputDataSourceFrame::BlockSize( m_Setup.m_ImageBytes, i_AudioBytes ) ) : nullptr;
+  if( !pBlock )
+  {
+    KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
+    return nullptr;
+  }
+  auto* const pFrame = new( pBlock ) VVideoInputDataSourceFrame;
+  pFrame->m_pAllocator = i_pAllocator;
+  pFrame->m_DeviceIndex = GetDeviceIndex();
+  pFrame->m_VideoInfo = m_Setup.m_Image;
+  pFrame->m_ImageBytes = static_cast<uint32_t>( m_Setup.m_ImageBytes );
+  pFrame->m_ImageCapacity = static_cast<uint32_t>( VVideoInputDataSourceFrame::RoundUp( m_Setup.m_ImageBytes ) );
+  pFrame->m_AudioCapacity = static_cast<uint32_t>( i_AudioBytes );
+  return pFrame;
+}
+
+// False, with a line in the log, where the card does not give its buffer.
+bool VBluefish444Device::VImpl::ReadFrame( uint32_t i_Buffer, VVideoInputDataSourceFrame& io_rFrame )
+{
+  // The image first: its rounded end reaches over the place of the samples.
+  const uint64_t ReadBytes = std::min<uint64_t>( m_Setup.m_GoldenBytes, io_rFrame.m_ImageCapacity );
+  if( ReadBytes == 0 || ReadBytes < m_Setup.m_ImageBytes ||
+    !m_pCard->ReadBuffer( io_rFrame.Image(), ReadBytes, i_Buffer | Buffer::ImageHanc | Buffer::DataImage ) )
+  {
+    KVZ_LOG( LogCategory, 2, "Could not read a frame of %1% from the card.", m_DisplayName );
+    return false;
+  }
+  Decode( i_Buffer, io_rFrame );
+  return true;
+}
+
+void VBluefish444Device::VImpl::PrepareRecord( uint8_t* o_pSamples )
+{
+  m_Record.m_pSamples = o_pSamples;
+  m_Record.m_ChannelMask = ChannelMask( m_Command.m_AudioChannels );
+  m_Record.m_SampleFlags = ToSampleType( m_Command.m_AudioFormat ).m_Flags;
+  m_Record.m_MostSamples = SamplesPerFrame( m_Setup.m_pStandard->m_Period );
+  m_Record.m_Samples = 0;
+  std::fill( std::begin( m_Record.m_Timecodes ), std::end( m_Record.m_Timecodes ), NoTimecodeWord );
+}
+
+// A frame whose ancillary data cannot be had carries neither sound nor timecode. One with fewer samples than the mode has carries those.
+void VBluefish444Device::VImpl::Decode( uint32_t i_Buffer, VVideoInputDataSourceFrame& io_rFrame )
+{
+  PrepareRecord( io_rFrame.Audio() );
+  if( !m_pCard->ReadBuffer( m_pHanc, BlueVelvet::HancBytes, i_Buffer | Buffer::ImageHanc | Buffer::DataHanc ) ||
+    !m_pCard->DecodeHanc( m_CardType, m_pHanc, m_Record ) )
+  {
+    return;
+  }
+  io_rFrame.m_Timecode = ReadTimecode( m_Record, m_Command.m_TimecodeSource, m_Setup.m_pStandard->m_Period );
+  const uint32_t Channels = std::min( m_Command.m_AudioChannels, MostAudioChannels );
+  const uint32_t SampleBytes = ToSampleType( m_Command.m_AudioFormat ).m_Bytes;
+  const uint32_t Samples = Channels == 0 ? 0 : std::min( m_Record.m_Samples / Channels, m_Record.m_MostSamples );
+  if( Samples > 0 )
+  {
+    io_rFrame.m_AudioInfo = { m_Command.m_AudioFormat, AudioSampleRate, Channels };
+    io_rFrame.m_AudioBytes = Samples * Channels * SampleBytes;
+  }
+  io_rFrame.m_AudioCapacity = io_rFrame.m_AudioBytes;
+}
+
+void VBluefish444Device::VImpl::StoreTimecode( const KVZ::ITimecode& i_rTimecode )
+{
+  boost::lock_guard<boost::mutex> Lock( m_TimecodeMutex );
+  m_LastTimecode = i_rTimecode;
+}
+
+// Video may run faster than its timecode: frames that carry one label lie a frame period apart within it.
+void VBluefish444Device::VImpl::ResolveRepeats( KVZ::ITimecode& io_rTimecode )
+{
+  const KVZ::ITimecode Last = GetTimecode();
+  const bool bRepeated = KVZ::IsSameReading( io_rTimecode, Last );
+  m_Repeats = bRepeated ? m_Repeats + 1 : 0;
+  if( !bRepeated )
+  {
+    StoreTimecode( io_rTimecode );
+    if( io_rTimecode.m_Standard != Last.m_Standard )
+    {
+      m_TimecodeChanged();
+    }
+  }
+  const int64_t Period = m_Setup.m_pStandard->m_Period;
+  KVZ_LOG( LogCategory, 6, "Timecode=%1%, SubFrameCount=%2%, FramePeriod=%3%", KVZ::ToText( io_rTimecode ), m_Repeats, Period );
+  KVZ::AddTicks( io_rTimecode, m_Repeats * Period );
+}
+
+}
