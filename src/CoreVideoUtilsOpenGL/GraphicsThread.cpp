@@ -1,15 +1,11 @@
 #include "CoreVideoUtilsOpenGL/GraphicsThread.h"
 
+#include "CoreVideoUtilsOpenGL/GraphicsApplication.h"
 #include "StageCoreRuntime/DebugServices.h"
-#include "StageCoreRuntime/GlobalLog.h"
-
-#include <QtCore/QCoreApplication>
-#include <QtGui/QGuiApplication>
 
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/lock_types.hpp>
 
-#include <array>
 #include <memory>
 #include <utility>
 
@@ -18,29 +14,6 @@ namespace CoreVideoUtilsOpenGL
 
 namespace
 {
-
-// What Qt has to say is for those who look closely: whether OpenGL can be used is found out and said elsewhere.
-void LogQtMessage( QtMsgType, const QMessageLogContext&, const QString& i_rText )
-{
-  KVZ_LOG_DETAIL( "CoreVideoUtilsOpenGL", "Qt: %1%", i_rText.toStdString() );
-}
-
-// An application object of this thread's own, with what it needs to live.
-class VOwnApplication
-{
-public:
-  VOwnApplication() : m_pFormerHandler( qInstallMessageHandler( &LogQtMessage ) ), m_Application( m_Count, m_Arguments.data() ) {}
-  ~VOwnApplication() { qInstallMessageHandler( m_pFormerHandler ); }
-
-private:
-  const QtMessageHandler m_pFormerHandler;
-  std::string m_Name = "StageCorePluginVideoInput";
-  std::string m_Option = "-platform";
-  std::string m_Platform = "offscreen";
-  std::array<char*, 4> m_Arguments = { m_Name.data(), m_Option.data(), m_Platform.data(), nullptr };
-  int m_Count = 3;
-  QGuiApplication m_Application;
-};
 
 // Guards the count and what it counts; held while the thread begins and ends, so that there are never two.
 struct VShared
@@ -98,11 +71,7 @@ void VGraphicsThread::RunThread()
 {
   const DebugServices::VCrashHandlerForThread CrashHandler;
   DebugServices::SetThreadName( "OpenGL" );
-  std::unique_ptr<VOwnApplication> pApplication;
-  if( !QCoreApplication::instance() )
-  {
-    pApplication = std::make_unique<VOwnApplication>();
-  }
+  const VGraphicsApplication Application;
   RunTasks();
 }
 

@@ -3,8 +3,7 @@
 // A context is current on one thread at a time, and Qt wants its application object and what belongs to windows on one thread. Frames come from
 // threads of captures, several at a time, which come and go: so they wait here for each other.
 //
-// Where the process has no QGuiApplication one is made on this thread, of the platform "offscreen": it opens no window, needs no screen, and
-// where there is no X display to ask for OpenGL it says so, while others end the process. It goes with the thread.
+// Where the process has no QGuiApplication this thread makes one, which goes with it.
 #pragma once
 
 #include "StageCoreRuntime/ThreadAnnotations.h"

@@ -9,7 +9,7 @@ namespace CoreVideoUtilsOpenGL
 namespace
 {
 
-constexpr double SmallestCell = 2.0;
+constexpr double SmallestCell = 1.0;
 
 // The distance from the lens's centre to the image's furthest corner.
 double Reach( const VLens& i_rLens, uint32_t i_Width, uint32_t i_Height )

@@ -33,7 +33,7 @@ struct VMeshCells
 // The most that the mesh's straight lines may miss the true place of a pixel by, in pixels.
 constexpr double MeshTolerance = 0.1;
 
-// So many cells that the mesh keeps to that; but none is made smaller than two pixels, which is fine enough for images that are bent to several
+// So many cells that the mesh keeps to that; but none is made smaller than a pixel, which is fine enough for images that are bent to several
 // times their size. One cell where nothing is corrected.
 VMeshCells CellsFor( const VLens& i_rLens, uint32_t i_Width, uint32_t i_Height );
 

@@ -3,8 +3,6 @@
 #include "StageCoreRuntime/DebugServices.h"
 #include "StageCoreRuntime/GlobalLog.h"
 
-#include <QtGui/QGuiApplication>
-
 #include <algorithm>
 
 #ifndef GL_BGR
@@ -73,7 +71,7 @@ constexpr std::array<VPixelFormatConverterOpenGL::VImpl::VOutput, 5> VPixelForma
   VOutput{ IPixelFormat::EB8G8R8u8, GL_BGRA },
 };
 
-VPixelFormatConverterOpenGL::VImpl::VImpl( const VSettings& i_rSettings ) : m_rSettings( i_rSettings ), m_WhyUnusable( MakeContext() ) {}
+VPixelFormatConverterOpenGL::VImpl::VImpl( const VSettings& i_rSettings ) : m_rSettings( i_rSettings ) { m_WhyUnusable = MakeContext(); }
 
 VPixelFormatConverterOpenGL::VImpl::~VImpl()
 {
@@ -91,14 +89,14 @@ VPixelFormatConverterOpenGL::VImpl::~VImpl()
 
 std::string VPixelFormatConverterOpenGL::VImpl::MakeContext()
 {
-  if( !qobject_cast<QGuiApplication*>( QCoreApplication::instance() ) )
+  if( !m_Check.WhyUnusable().empty() )
   {
-    return "the process has an application object without graphics";
+    return m_Check.WhyUnusable();
   }
   m_Context.setFormat( MakeFormat() );
   if( !m_Context.create() )
   {
-    return "no OpenGL context can be made, which needs an X display";
+    return "no OpenGL context can be made";
   }
   m_Surface.setFormat( m_Context.format() );
   m_Surface.create();

@@ -5,6 +5,7 @@
 #include "CoreGraphics/Shader.h"
 #include "CoreGraphics/VideoTexture.h"
 #include "CoreVideoUtilsOpenGL/FrameUpload.h"
+#include "CoreVideoUtilsOpenGL/GraphicsApplication.h"
 #include "CoreVideoUtilsOpenGL/LensMesh.h"
 #include "CoreVideoUtilsOpenGL/PixelFormatConverterOpenGL.h"
 
@@ -73,6 +74,7 @@ private:
 
   const VSettings& m_rSettings;
   const boost::thread::id m_Thread = boost::this_thread::get_id();
+  const VGraphicsCheck m_Check;
   QOffscreenSurface m_Surface;
   QOpenGLContext m_Context;
   std::string m_WhyUnusable;

@@ -1,0 +1,41 @@
+// Qt's application object, without which it makes no OpenGL context.
+#pragma once
+
+#include "CoreVideoUtilsOpenGL/XDisplay.h"
+
+#include <memory>
+#include <string>
+
+namespace CoreVideoUtilsOpenGL
+{
+
+// One of our own where the process has none, of the platform "offscreen": it opens no window and needs no window manager. Made and destroyed on
+// the thread that makes contexts. While it is there, Qt's messages go to the log, and what the X server refuses ends no program.
+class VGraphicsApplication
+{
+public:
+  VGraphicsApplication();
+  ~VGraphicsApplication();
+  VGraphicsApplication( const VGraphicsApplication& ) = delete;
+  VGraphicsApplication& operator=( const VGraphicsApplication& ) = delete;
+
+private:
+  class VOwn;
+  const std::unique_ptr<VOwn> m_pOwn;   // empty where the process has one
+};
+
+// Whether it is worth asking Qt for a context: where there is no OpenGL at all, it may end the process.
+class VGraphicsCheck
+{
+public:
+  VGraphicsCheck();
+
+  // Why there can be no context; empty where nothing is known to stand against it.
+  const std::string& WhyUnusable() const { return m_WhyUnusable; }
+
+private:
+  const std::unique_ptr<VXDisplay> m_pDisplay;   // kept open beside Qt's own; empty where Qt needs none
+  const std::string m_WhyUnusable;
+};
+
+}

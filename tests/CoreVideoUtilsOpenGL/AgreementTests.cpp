@@ -1,0 +1,246 @@
+// What the graphics card makes of a frame is what the processor makes of it.
+#include "tests/CoreVideoUtilsOpenGL/Images.h"
+#include "tests/support/AssertionCapture.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/ProgramRun.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <QtGui/QGuiApplication>
+#include <QtGui/QSurfaceFormat>
+
+#include <boost/thread/thread.hpp>
+
+#include <algorithm>
+#include <atomic>
+#include <fstream>
+
+using namespace OpenGLTests;
+
+namespace
+{
+
+constexpr std::array Colours = { IPixelFormat::ER8G8B8, IPixelFormat::EB8G8R8, IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8 };
+
+// The shader takes 0.5 for the middle of a colour difference of eight bits, where the integers take 128 / 255: 0.5 levels times 1.77 in blue, and
+// the one rounds where the other cuts off.
+int ToleranceOf( IPixelFormat::Enum i_Source ) { return i_Source == IPixelFormat::EU8Y8V8Y8 || i_Source == IPixelFormat::EY8U8Y8V8 ? 2 : 1; }
+
+void ExpectAgreement( VPixelFormatConverterOpenGL& i_rConverter, const VImage& i_rImage )
+{
+  for( const IPixelFormat::Enum Target : Colours )
+  {
+    EXPECT_LE(
+      LargestDifference( InSoftware( i_rImage, Target ), Convert( i_rConverter, i_rImage, Target ).value_or( VBytes() ), HasFourthByte( Target ) ),
+      ToleranceOf( i_rImage.m_Info.m_PixelFormat ) )
+      << KVZ::ToName( i_rImage.m_Info.m_PixelFormat ) << " to " << KVZ::ToName( Target ) << ", " << i_rImage.m_Info.m_ImageWidth << " by "
+      << i_rImage.m_Info.m_ImageHeight;
+  }
+}
+
+// One picture of the clip, as FFmpeg decodes it.
+VImage ReadPicture()
+{
+  const TestSupport::VTemporaryFolder Folder;
+  const std::string Path = Folder.File( "picture.raw" );
+  const auto Run = TestSupport::RunProgram( { "ffmpeg", "-v", "error", "-ss", "2", "-i", STAGECORE_SOURCE_DIR "/tests/data/bunny.mp4", "-frames:v",
+    "1", "-vf", "scale=640:360", "-pix_fmt", "rgb24", "-f", "rawvideo", Path } );
+  EXPECT_EQ( 0, Run.m_ExitCode ) << Run.m_Error;
+  VImage Image = MakeImage( IPixelFormat::ER8G8B8, 640, 360 );
+  std::ifstream File( Path, std::ios::binary );
+  File.read( reinterpret_cast<char*>( Image.m_Bytes.data() ), static_cast<std::streamsize>( Image.m_Bytes.size() ) );
+  EXPECT_TRUE( File );
+  return Image;
+}
+
+VImage As( IPixelFormat::Enum i_Format, const VImage& i_rImage )
+{
+  VImage Image = i_rImage;
+  Image.m_Info.m_PixelFormat = i_Format;
+  Image.m_Bytes = InSoftware( i_rImage, i_Format );
+  return Image;
+}
+
+// What a sensor behind red, green and blue filters sees of the picture: green and blue first, then red and green.
+VImage AsBayer( const VImage& i_rPicture )
+{
+  VImage Image = MakeImage( IPixelFormat::EBayerGB8, i_rPicture.m_Info.m_ImageWidth, i_rPicture.m_Info.m_ImageHeight );
+  const size_t Width = Image.m_Info.m_ImageWidth;
+  for( size_t Index = 0; Index < Image.m_Bytes.size(); ++Index )
+  {
+    const size_t Row = Index / Width % 2;
+    const size_t Column = Index % Width % 2;
+    const size_t Component = Row == Column ? 1 : ( Row == 0 ? 2 : 0 );
+    Image.m_Bytes[Index] = i_rPicture.m_Bytes[3 * Index + Component];
+  }
+  return Image;
+}
+
+}
+
+TEST( OpenGLAgreement, HoldsForNoiseInEveryFormat )
+{
+  const TestSupport::VAssertionCapture Assertions;   // of the software converter, for ten bits and an odd number of pixels
+  VPixelFormatConverterOpenGL Converter( {} );
+  for( int32_t Source = 1; Source < KVZ::PixelFormatCount; ++Source )
+  {
+    for( const auto& [Width, Height] : { std::pair{ 96u, 40u }, { 131u, 57u }, { 2u, 2u }, { 1u, 1u } } )
+    {
+      ExpectAgreement( Converter, MakeNoise( static_cast<IPixelFormat::Enum>( Source ), Width, Height ) );
+    }
+  }
+}
+
+TEST( OpenGLAgreement, HoldsForRealPictures )
+{
+  VPixelFormatConverterOpenGL Converter( {} );
+  const VImage Picture = ReadPicture();
+  const VImage Yuv = As( IPixelFormat::EU8Y8V8Y8, Picture );
+  ExpectAgreement( Converter, Picture );
+  ExpectAgreement( Converter, Yuv );
+  ExpectAgreement( Converter, As( IPixelFormat::EU10Y10V10Y10, Yuv ) );
+  ExpectAgreement( Converter, AsBayer( Picture ) );
+}
+
+// The software corrector has bytes between demosaic, gamma and saturation, where the shader rounds once.
+TEST( OpenGLAgreement, HoldsForCorrectedColours )
+{
+  const VImage Picture = AsBayer( ReadPicture() );
+  for( const KVZ::VColourRecord& rColour : { KVZ::VColourRecord{ 0.5f, 1.0f }, { 0.0f, 1.3f }, { 1.25f, 0.8f }, { 1.0f, 1.8f } } )
+  {
+    for( const VImage& rImage : { Picture, MakeNoise( IPixelFormat::EBayerGB8, 96, 40 ) } )
+    {
+      const VBytes Software = InSoftware( rImage, IPixelFormat::ER8G8B8, rColour );
+      const VBytes OpenGL = InOpenGL( rImage, IPixelFormat::ER8G8B8, rColour );
+      ASSERT_EQ( Software.size(), OpenGL.size() );
+      // Near black a gamma above 1 lifts one level of the demosaic by many.
+      int Largest = 0;
+      for( size_t Index = 0; Index < Software.size(); ++Index )
+      {
+        const bool bSteep = rColour.m_GammaCorrection > 1.0f && std::min( Software[Index], OpenGL[Index] ) < 96;
+        Largest = std::max( Largest, bSteep ? 0 : std::abs( Software[Index] - OpenGL[Index] ) );
+      }
+      EXPECT_LE( Largest, 2 ) << rColour.m_Saturation << ", " << rColour.m_GammaCorrection;
+    }
+  }
+  const VImage Yuv = MakeNoise( IPixelFormat::EU8Y8V8Y8, 64, 8 );
+  EXPECT_EQ( InOpenGL( Yuv, IPixelFormat::ER8G8B8 ), InOpenGL( Yuv, IPixelFormat::ER8G8B8, { 0.0f, 2.0f } ) );
+}
+
+// The mean of the colours that the same program makes.
+TEST( OpenGLAgreement, MakesLuminanceOfTheMean )
+{
+  for( const IPixelFormat::Enum Source : { IPixelFormat::ER8G8B8, IPixelFormat::EB8G8R8u8, IPixelFormat::ER5G6B5, IPixelFormat::ELuminance8,
+         IPixelFormat::EBayerBG8, IPixelFormat::EY8U8Y8V8 } )
+  {
+    const VImage Image = MakeNoise( Source, 51, 20 );
+    const VBytes Colour = InOpenGL( Image, IPixelFormat::ER8G8B8 );
+    VBytes Mean;
+    for( size_t Index = 0; Index + 2 < Colour.size(); Index += 3 )
+    {
+      Mean.push_back( static_cast<uint8_t>( ( Colour[Index] + Colour[Index + 1] + Colour[Index + 2] + 1 ) / 3 ) );
+    }
+    EXPECT_LE( LargestDifference( Mean, InOpenGL( Image, IPixelFormat::ELuminance8 ) ), 1 ) << KVZ::ToName( Source );
+  }
+  const VImage Grey = MakeNoise( IPixelFormat::ELuminance7, 51, 20 );
+  EXPECT_EQ( InSoftware( Grey, IPixelFormat::ELuminance8 ), InOpenGL( Grey, IPixelFormat::ELuminance8 ) );
+}
+
+TEST( OpenGLAgreement, WritesHalfAsAlpha )
+{
+  for( const IPixelFormat::Enum Source :
+    { IPixelFormat::ER8G8B8u8, IPixelFormat::EBayerGR8, IPixelFormat::ELuminance6, IPixelFormat::EU10Y10V10Y10 } )
+  {
+    for( const IPixelFormat::Enum Target : { IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8 } )
+    {
+      const VBytes Image = InOpenGL( MakeNoise( Source, 48, 8 ), Target );
+      ASSERT_FALSE( Image.empty() );
+      for( size_t Index = 3; Index < Image.size(); Index += 4 )
+      {
+        ASSERT_TRUE( Image[Index] == 127 || Image[Index] == 128 ) << int{ Image[Index] };
+      }
+    }
+  }
+}
+
+// The second luma is the odd pixel's, and both share the colour.
+TEST( OpenGLAgreement, TakesTheThirdComponentAtOddColumns )
+{
+  VImage Image = MakeImage( IPixelFormat::EU8Y8V8Y8, 4, 1 );
+  Image.m_Bytes = { 128, 10, 128, 200, 128, 60, 128, 110 };
+  const VBytes Colour = InOpenGL( Image, IPixelFormat::ER8G8B8 );
+  ASSERT_EQ( 12u, Colour.size() );
+  EXPECT_NEAR( 10, Colour[0], 1 );
+  EXPECT_NEAR( 200, Colour[3], 1 );
+  EXPECT_NEAR( 60, Colour[6], 1 );
+  EXPECT_NEAR( 110, Colour[9], 1 );
+}
+
+// Two pixels of Y 403 and V 515, U in the middle. Red: 403 / 4 + 1.403 * 3 / 4, which is 101.8. Cut to eight bits before it were 100.
+TEST( OpenGLAgreement, KeepsTenBits )
+{
+  VImage Image = MakeImage( IPixelFormat::EU10Y10V10Y10, 2, 1 );
+  const std::array<uint32_t, 2> Words = { 512u | 403u << 10 | 515u << 20, 403u };
+  std::copy_n( reinterpret_cast<const uint8_t*>( Words.data() ), sizeof( Words ), Image.m_Bytes.begin() );
+  const VBytes Colour = InOpenGL( Image, IPixelFormat::ER8G8B8 );
+  ASSERT_EQ( 6u, Colour.size() );
+  EXPECT_EQ( 102, Colour[0] );
+  EXPECT_EQ( 102, Colour[3] );
+}
+
+// A host has an application object of its own, with windows and on another thread, and wants OpenGL ES.
+TEST( OpenGLAgreement, HoldsForOpenGLESInAHostWithWindows )
+{
+  setenv( "QT_XCB_GL_INTEGRATION", "xcb_egl", 1 );
+  std::string Name = "host";
+  std::string Option = "-platform";
+  std::string Platform = "xcb";
+  std::array<char*, 4> Arguments = { Name.data(), Option.data(), Platform.data(), nullptr };
+  int Count = 3;
+  const QSurfaceFormat Former = QSurfaceFormat::defaultFormat();
+  QSurfaceFormat Format = Former;
+  Format.setRenderableType( QSurfaceFormat::OpenGLES );
+  QSurfaceFormat::setDefaultFormat( Format );
+  {
+    const QGuiApplication Application( Count, Arguments.data() );
+    const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
+    VPixelFormatConverterOpenGL Converter( {} );
+    for( const IPixelFormat::Enum Source : { IPixelFormat::EB8G8R8, IPixelFormat::EBayerGB7, IPixelFormat::ELuminance8, IPixelFormat::EY8U8Y8V8 } )
+    {
+      ExpectAgreement( Converter, MakeNoise( Source, 132, 57 ) );
+    }
+    const VImage TenBits = MakeNoise( IPixelFormat::EU10Y10V10Y10, 132, 57 );   // cut to eight: its textures have no more
+    EXPECT_LE(
+      LargestDifference( InSoftware( TenBits, IPixelFormat::EB8G8R8 ), Convert( Converter, TenBits, IPixelFormat::EB8G8R8 ).value_or( VBytes() ) ),
+      2 );
+    const VImage Grey = MakeNoise( IPixelFormat::ELuminance8, 51, 20 );
+    EXPECT_EQ( Grey.m_Bytes, Convert( Converter, Grey, IPixelFormat::ELuminance8 ) );
+    const auto Texts = Log.Texts();
+    EXPECT_EQ( 1,
+      std::count_if( Texts.begin(), Texts.end(), []( const std::string& i_rText ) { return i_rText.compare( 0, 17, "OpenGL OpenGL ES " ) == 0; } ) );
+  }
+  QSurfaceFormat::setDefaultFormat( Former );
+  unsetenv( "QT_XCB_GL_INTEGRATION" );
+}
+
+// Frames of several sizes and formats through one converter, from several threads at once: each gets its own back.
+TEST( OpenGLAgreement, HoldsForFramesFromSeveralThreads )
+{
+  VPixelFormatConverterOpenGL Converter( {} );
+  std::atomic<int> Wrong{ 0 };
+  boost::thread_group Threads;
+  for( uint32_t Thread = 0; Thread < 4; ++Thread )
+  {
+    Threads.create_thread(
+      [&, Thread]
+      {
+        const VImage Image = MakeNoise( Thread % 2 == 0 ? IPixelFormat::EBayerRG8 : IPixelFormat::ER8G8B8, 32 + 16 * ( Thread / 2 ), 24 );
+        const VBytes Expected = InSoftware( Image, IPixelFormat::EB8G8R8 );
+        for( int Round = 0; Round < 10; ++Round )
+        {
+          Wrong += LargestDifference( Expected, Convert( Converter, Image, IPixelFormat::EB8G8R8 ).value_or( VBytes() ) ) > 1 ? 1 : 0;
+        }
+      } );
+  }
+  Threads.join_all();
+  EXPECT_EQ( 0, Wrong );
+}

@@ -1,0 +1,192 @@
+// The lens: where its correction moves pixels to, how exactly the mesh does it, and what inversion has to do with it.
+#include "CoreVideoUtilsOpenGL/LensMesh.h"
+#include "tests/CoreVideoUtilsOpenGL/Images.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+
+using namespace OpenGLTests;
+using namespace CoreVideoUtilsOpenGL;
+using KVZ::VLensDistortionRecord;
+
+namespace
+{
+
+using VPoint = std::array<double, 2>;
+
+VLensDistortionRecord MakeRecord( VPoint i_Centre, std::array<double, 3> i_Parameters )
+{
+  VLensDistortionRecord Record;
+  Record.m_RadialModel = VLensDistortionRecord::ETarvo3Parameter;
+  Record.m_Centre = i_Centre;
+  Record.m_Parameters = i_Parameters;
+  return Record;
+}
+
+VBytes Corrected( const VImage& i_rImage, IPixelFormat::Enum i_Target, const VLensDistortionRecord& i_rLens, EUse i_Use = EUse::Always )
+{
+  VPixelFormatConverterOpenGL Converter( { i_Use } );
+  Converter.SetLensCorrection( i_rLens );
+  Converter.SetLensCorrectionEnabled( true );
+  return Convert( Converter, i_rImage, i_Target ).value_or( VBytes() );
+}
+
+VPoint Mix( const VPoint& i_rA, const VPoint& i_rB, double i_Part )
+{
+  return { i_rA[0] + ( i_rB[0] - i_rA[0] ) * i_Part, i_rA[1] + ( i_rB[1] - i_rA[1] ) * i_Part };
+}
+
+// How far the mesh's triangles lead points of one cell away from where they belong: the middles of the three sides and of the triangles.
+double ErrorOfCell( const VLens& i_rLens, const VPoint& i_rFrom, const VPoint& i_rTo )
+{
+  const std::array<VPoint, 4> Corners = { i_rFrom, { i_rTo[0], i_rFrom[1] }, { i_rFrom[0], i_rTo[1] }, i_rTo };
+  double Largest = 0.0;
+  const auto Check = [&]( size_t i_A, size_t i_B, double i_Part )
+  {
+    const VPoint Drawn = Mix( Undistort( i_rLens, Corners[i_A] ), Undistort( i_rLens, Corners[i_B] ), i_Part );
+    const VPoint True = Undistort( i_rLens, Mix( Corners[i_A], Corners[i_B], i_Part ) );
+    Largest = std::max( Largest, std::hypot( Drawn[0] - True[0], Drawn[1] - True[1] ) );
+  };
+  for( const double Part : { 0.25, 0.5, 0.75 } )
+  {
+    Check( 0, 1, Part );
+    Check( 0, 2, Part );
+    Check( 1, 2, Part );
+    Check( 1, 3, Part );
+    Check( 2, 3, Part );
+  }
+  return Largest;
+}
+
+double ErrorOfMesh( const VLens& i_rLens, uint32_t i_Width, uint32_t i_Height )
+{
+  const VMeshCells Cells = CellsFor( i_rLens, i_Width, i_Height );
+  const VPoint Cell = { 1.0 * i_Width / Cells.m_Columns, 1.0 * i_Height / Cells.m_Rows };
+  double Largest = 0.0;
+  for( uint32_t Row = 0; Row < Cells.m_Rows; ++Row )
+  {
+    for( uint32_t Column = 0; Column < Cells.m_Columns; ++Column )
+    {
+      Largest = std::max( Largest, ErrorOfCell( i_rLens, { Column * Cell[0], Row * Cell[1] }, { ( Column + 1 ) * Cell[0], ( Row + 1 ) * Cell[1] } ) );
+    }
+  }
+  std::printf( "mesh of %u by %u cells: %.4f pixels\n", Cells.m_Columns, Cells.m_Rows, Largest );
+  return Largest;
+}
+
+}
+
+// A corner of this image is 1102 pixels from its middle. Each parameter alone moves it by the part of that distance that is named: up to where the
+// image would fold, and on the other side to ten times its size, which no lens does.
+TEST( LensMesh, KeepsToATenthOfAPixel )
+{
+  constexpr uint32_t Width = 1920;
+  constexpr uint32_t Height = 1080;
+  const double Square = 960.0 * 960.0 + 540.0 * 540.0;
+  for( const double Part : { -0.33, 0.1, 0.5, 2.0, 9.0 } )
+  {
+    for( const std::array<double, 3>& rK : { std::array<double, 3>{ Part / Square, 0.0, 0.0 }, { 0.0, 0.6 * Part / Square / Square, 0.0 },
+           { 0.0, 0.0, 0.4 * Part / Square / Square / Square },
+           { Part / Square, -0.5 * Part / Square / Square, 0.1 * Part / Square / Square / Square } } )
+    {
+      EXPECT_LE( ErrorOfMesh( { { 960.0, 540.0 }, rK }, Width, Height ), MeshTolerance );
+    }
+  }
+  EXPECT_LE( ErrorOfMesh( { { 100.0, 1000.0 }, { 1.0 / Square, 0.0, 0.0 } }, Width, Height ), MeshTolerance );
+  const VMeshCells Quad = CellsFor( {}, Width, Height );
+  EXPECT_EQ( 1u, Quad.m_Columns * Quad.m_Rows );
+}
+
+// Grey rises by a level a column, and then a row: what is found at a place tells where it came from.
+TEST( Lens, MovesPixelsAwayFromTheCentreOrTowardsIt )
+{
+  constexpr uint32_t Size = 256;
+  for( const double K : { -4e-6, 4e-6 } )
+  {
+    const VLensDistortionRecord Record = MakeRecord( { 100.0, 140.0 }, { K, K * 1e-5, 0.0 } );
+    const VLens Lens = MakeLens( Record );
+    for( const size_t Axis : { size_t{ 0 }, size_t{ 1 } } )
+    {
+      VImage Ramp = MakeImage( IPixelFormat::ELuminance8, Size, Size );
+      for( size_t Index = 0; Index < Ramp.m_Bytes.size(); ++Index )
+      {
+        Ramp.m_Bytes[Index] = static_cast<uint8_t>( Axis == 0 ? Index % Size : Index / Size );
+      }
+      const VBytes Drawn = Corrected( Ramp, IPixelFormat::ELuminance8, Record );
+      ASSERT_EQ( Ramp.m_Bytes.size(), Drawn.size() );
+      for( uint32_t Row = 20; Row < Size - 20; Row += 12 )
+      {
+        for( uint32_t Column = 20; Column < Size - 20; Column += 12 )
+        {
+          const VPoint To = Undistort( Lens, { Column + 0.5, Row + 0.5 } );
+          const VPoint Pixel = { std::floor( To[0] ), std::floor( To[1] ) };
+          if( Pixel[0] < 0 || Pixel[1] < 0 || Pixel[0] >= Size || Pixel[1] >= Size )
+          {
+            continue;
+          }
+          const int Found = Drawn[static_cast<size_t>( Pixel[1] ) * Size + static_cast<size_t>( Pixel[0] )];
+          ASSERT_NEAR( Axis == 0 ? Column : Row, Found, 1.5 ) << Column << ", " << Row << ", " << K;
+        }
+      }
+    }
+  }
+}
+
+// What comes in from outside is black.
+TEST( Lens, LeavesBlackWhereThereIsNoImage )
+{
+  VImage White = MakeImage( IPixelFormat::ER8G8B8, 64, 64 );
+  std::fill( White.m_Bytes.begin(), White.m_Bytes.end(), uint8_t{ 255 } );
+  const VBytes Shrunk = Corrected( White, IPixelFormat::ER8G8B8u8, MakeRecord( { 32.0, 32.0 }, { -1e-4, 0.0, 0.0 } ) );
+  ASSERT_EQ( 64u * 64 * 4, Shrunk.size() );
+  EXPECT_EQ( 0, Shrunk[0] );
+  EXPECT_NEAR( 127.5, Shrunk[3], 1.0 );
+  EXPECT_EQ( 255, Shrunk[4 * ( 32 * 64 + 32 )] );
+}
+
+TEST( Lens, CorrectsNothingWithItsCentreAtTheOriginOrWithoutAModel )
+{
+  const VImage Image = MakeNoise( IPixelFormat::EBayerGB8, 96, 40 );
+  const VBytes Plain = InOpenGL( Image, IPixelFormat::ER8G8B8 );
+  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 0.0, 0.0 }, { 1e-3, 1e-3, 1.0 } ) ) );
+  VLensDistortionRecord Bad = MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } );
+  EXPECT_NE( Plain, Corrected( Image, IPixelFormat::ER8G8B8, Bad ) );
+  Bad.m_RadialModel = VLensDistortionRecord::EBadRadialModel;
+  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, Bad ) );
+  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 48.0, NAN }, { 1e-4, 0.0, 0.0 } ) ) );
+
+  VLensDistortionRecord Two = MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 1e-8 } );
+  Two.m_RadialModel = VLensDistortionRecord::ETarvo2Parameter;
+  EXPECT_EQ( Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } ) ),
+    Corrected( Image, IPixelFormat::ER8G8B8, Two ) );
+}
+
+// The rows of a frame that is stored bottom-up, turned before or while it is drawn, with a lens whose centre lies in the upper half: were the mesh
+// turned too, its centre would be.
+TEST( Lens, StaysWhereItIsWhenTheImageIsInverted )
+{
+  const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 40, 30 );
+  VImage BottomUp = Image;
+  BottomUp.m_Info.m_bInverted = true;
+  for( size_t Row = 0; Row < 30; ++Row )
+  {
+    std::copy_n( Image.m_Bytes.begin() + static_cast<std::ptrdiff_t>( Row * 120 ), 120,
+      BottomUp.m_Bytes.begin() + static_cast<std::ptrdiff_t>( ( 29 - Row ) * 120 ) );
+  }
+  EXPECT_EQ( Image.m_Bytes, InOpenGL( BottomUp, IPixelFormat::ER8G8B8 ) );
+  const VLensDistortionRecord Record = MakeRecord( { 20.0, 8.0 }, { 1e-4, 0.0, 0.0 } );
+  EXPECT_LE( LargestDifference( Corrected( Image, IPixelFormat::ER8G8B8, Record ), Corrected( BottomUp, IPixelFormat::ER8G8B8, Record ) ), 2 );
+}
+
+// Where OpenGL serves the lens alone, an image without one comes from the software converter: its fourth byte is 255.
+TEST( Lens, IsAllThatOpenGLIsUsedForWhereItIsAskedForThat )
+{
+  const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 40, 30 );
+  VPixelFormatConverterOpenGL Converter( { EUse::LensAlone } );
+  EXPECT_EQ( InSoftware( Image, IPixelFormat::EB8G8R8u8 ), Convert( Converter, Image, IPixelFormat::EB8G8R8u8 ) );
+  const VLensDistortionRecord Record = MakeRecord( { 20.0, 15.0 }, { 1e-4, 0.0, 0.0 } );
+  const VBytes Drawn = Corrected( Image, IPixelFormat::EB8G8R8u8, Record, EUse::LensAlone );
+  EXPECT_EQ( Corrected( Image, IPixelFormat::EB8G8R8u8, Record ), Drawn );
+  EXPECT_NE( InSoftware( Image, IPixelFormat::EB8G8R8u8 ), Drawn );
+}
