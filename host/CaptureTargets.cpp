@@ -156,6 +156,9 @@ VCaptureTarget VCaptureTargets::MakeTarget( const std::string& i_rName, const st
   }
   Target.m_JPEGQuality = m_Options.m_JPEGQuality;
   Target.m_bBurnInTimecode = m_Options.m_bBurnInTimecode;
+  Target.m_Converter = m_Options.m_Converter;
+  Target.m_bCorrectLens = m_Options.m_bCorrectLens;
+  Target.m_Lens = m_Options.m_Lens;
   return Target;
 }
 

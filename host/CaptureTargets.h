@@ -2,6 +2,7 @@
 // has a folder of its own, named as the file of another container would be.
 #pragma once
 
+#include "Core/VideoInterface/FrameRecords.h"
 #include "Core/VideoInterface/PixelFormat.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
@@ -25,6 +26,9 @@ struct VCaptureTargetOptions
   KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EUnspecified;   // of uncompressed video; "Unspecified" keeps what was captured
   int m_JPEGQuality = 0;                                                     // 1 to 100; 0 leaves the choice to the module
   bool m_bBurnInTimecode = false;
+  int32_t m_Converter = 0;       // as VCaptureTarget has it
+  bool m_bCorrectLens = false;   // m_Lens is undone
+  KVZ::VLensDistortionRecord m_Lens;
 };
 
 // What a device is called in file names: the user's name for it, or its URN without the colon.

@@ -1,6 +1,7 @@
 // The services that the host hands to a module at Initialise. The host object outlives the module's engine.
 #pragma once
 
+#include "Core/VideoInterface/FrameRecords.h"
 #include "Core/VideoInterface/Timecode.h"
 #include "NotificationSystem/IPostalService.h"
 #include "NotificationSystem/MultiCallback.h"
@@ -84,6 +85,9 @@ struct VCaptureTarget
   int32_t m_PixelFormat = 0;                // KVZ::IPixelFormat::Enum of uncompressed video; 0 keeps what was captured
   int32_t m_JPEGQuality = 0;                // 1 to 100; 0 leaves the choice to the module
   bool m_bBurnInTimecode = false;           // each frame's timecode is drawn into its picture
+  int32_t m_Converter = 0;                  // of pixel formats: 1 OpenGL, 2 software, 3 OpenGL where it alone can; 0 leaves it to the module
+  bool m_bCorrectLens = false;              // every picture is converted, in its own format if no other is wanted, and the lens undone
+  KVZ::VLensDistortionRecord m_Lens;
 };
 
 // What became of one file of a capture.

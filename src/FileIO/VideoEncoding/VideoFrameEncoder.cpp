@@ -57,11 +57,16 @@ void ReportUnsupported( IVideoPayload::Enum i_Payload )
   KVZ_LOG_ERROR( "VideoEncoding", "Unsupported video payload format '%s'.", KVZ::NameOrUnspecified( i_Payload ) );
 }
 
-// Whatever is not one of the first two is the third.
+// Whatever is not one of the first two is the third. A build without OpenGL has the second alone.
 std::shared_ptr<KVZ::IPixelFormatConverter> MakeConverter( EConverter i_Converter, const VEncoderParts& i_rParts )
 {
   const bool bNamed = i_Converter == EConverter::OpenGLFirst || i_Converter == EConverter::Software;
-  const auto Found = i_rParts.m_ConverterMakers.find( bNamed ? i_Converter : EConverter::OpenGLSecond );
+  auto Found = i_rParts.m_ConverterMakers.find( bNamed ? i_Converter : EConverter::OpenGLSecond );
+  if( Found == i_rParts.m_ConverterMakers.end() && i_Converter != EConverter::Software )
+  {
+    KVZ_LOG_WARNING( "VideoEncoding", "There is no OpenGL in this build: pixel formats are converted in software." );
+    Found = i_rParts.m_ConverterMakers.find( EConverter::Software );
+  }
   return Found == i_rParts.m_ConverterMakers.end() ? nullptr : Found->second();
 }
 

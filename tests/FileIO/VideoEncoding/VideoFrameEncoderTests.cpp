@@ -225,6 +225,14 @@ TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
     VVideoFrameEncoder( static_cast<EConverter>( Argument ), m_Parts );
   }
   EXPECT_EQ( Made, "12333" );
+  m_Parts.m_ConverterMakers.erase( EConverter::OpenGLFirst );
+  m_Parts.m_ConverterMakers.erase( EConverter::OpenGLSecond );
+  for( const int Argument : { 1, 2, 3 } )
+  {
+    VVideoFrameEncoder( static_cast<EConverter>( Argument ), m_Parts );
+  }
+  EXPECT_EQ( Made, "12333222" );
+  EXPECT_EQ( 2u, m_Log.Count( "There is no OpenGL in this build: pixel formats are converted in software." ) );
 }
 
 TEST( PixelFormatForPayload, EachKeepsWhatItsCompressorTakes )

@@ -18,7 +18,9 @@ VFrameConversion::VFrameConversion( const StageCorePluginInterface::VCaptureTarg
   : m_Payload( static_cast<IVideoPayload::Enum>( i_rTarget.m_VideoPayload ) ),
     m_WantedFormat( static_cast<IPixelFormat::Enum>( i_rTarget.m_PixelFormat ) ),
     m_bTimecode( i_rTarget.m_bBurnInTimecode ),
-    m_Converter( i_rSettings.m_Converter ),
+    m_bLens( i_rTarget.m_bCorrectLens ),
+    m_Lens( i_rTarget.m_Lens ),
+    m_Converter( ConverterFor( i_rTarget, i_rSettings ) ),
     m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Capture video" ) )
 {
 }
@@ -32,7 +34,7 @@ IPixelFormat::Enum VFrameConversion::FormatFor( IPixelFormat::Enum i_Captured ) 
   {
     return m_WantedFormat != IPixelFormat::EUnspecified ? m_WantedFormat : i_Captured;
   }
-  if( m_bTimecode )
+  if( m_bTimecode || m_bLens )
   {
     VideoEncoding::PixelFormatForPayloadFormat( m_Payload, i_Captured, Format );
   }
@@ -42,7 +44,7 @@ IPixelFormat::Enum VFrameConversion::FormatFor( IPixelFormat::Enum i_Captured ) 
 bool VFrameConversion::Apply( const KVZ::ITimecode& i_rTimecode, KVZ::VBufferList& io_rVideo, KVZ::VideoFrameInfo& io_rInfo )
 {
   const IPixelFormat::Enum Format = FormatFor( io_rInfo.m_PixelFormat );
-  if( !m_bTimecode && Format == io_rInfo.m_PixelFormat )
+  if( !m_bTimecode && !m_bLens && Format == io_rInfo.m_PixelFormat )
   {
     return true;
   }
@@ -68,13 +70,30 @@ std::unique_ptr<VideoEncoding::VVideoFrameEncoder> VFrameConversion::TakeEncoder
       return pEncoder;
     }
   }
-  return std::make_unique<VEncoder>( m_Converter );
+  return MakeEncoder();
+}
+
+// The writer's own encoder knows nothing of the lens, which is undone once.
+std::unique_ptr<VideoEncoding::VVideoFrameEncoder> VFrameConversion::MakeEncoder() const
+{
+  auto pEncoder = std::make_unique<VEncoder>( m_Converter );
+  if( m_bLens )
+  {
+    pEncoder->SetLensCorrection( m_Lens );
+    pEncoder->SetLensCorrectionEnabled( true );
+  }
+  return pEncoder;
 }
 
 void VFrameConversion::GiveBack( std::unique_ptr<VEncoder> i_pEncoder )
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   m_FreeEncoders.push_back( std::move( i_pEncoder ) );
+}
+
+VideoEncoding::EConverter ConverterFor( const StageCorePluginInterface::VCaptureTarget& i_rTarget, const VVideoEncoderSettings& i_rSettings )
+{
+  return i_rTarget.m_Converter != 0 ? static_cast<VideoEncoding::EConverter>( i_rTarget.m_Converter ) : i_rSettings.m_Converter;
 }
 
 std::string BurnInTextOf( const KVZ::ITimecode& i_rTimecode )

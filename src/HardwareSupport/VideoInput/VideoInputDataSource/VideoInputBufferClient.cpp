@@ -25,10 +25,11 @@ using SyncSystem::VRefCountedToken;
 namespace
 {
 
-std::shared_ptr<VideoEncoding::VVideoFrameEncoder> MakeEncoder( const VVideoEncoderSettings& i_rSettings, int i_JPEGQuality )
+std::shared_ptr<VideoEncoding::VVideoFrameEncoder> MakeEncoder( const VVideoEncoderSettings& i_rSettings,
+  const StageCorePluginInterface::VCaptureTarget& i_rTarget )
 {
-  auto pEncoder = std::make_shared<VideoEncoding::VVideoFrameEncoder>( i_rSettings.m_Converter );
-  pEncoder->SetJPEGQuality( i_JPEGQuality != 0 ? i_JPEGQuality : i_rSettings.m_JPEGQuality );
+  auto pEncoder = std::make_shared<VideoEncoding::VVideoFrameEncoder>( ConverterFor( i_rTarget, i_rSettings ) );
+  pEncoder->SetJPEGQuality( i_rTarget.m_JPEGQuality != 0 ? i_rTarget.m_JPEGQuality : i_rSettings.m_JPEGQuality );
   pEncoder->SetBurnIn( i_rSettings.m_BurnIn );
   return pEncoder;
 }
@@ -68,7 +69,7 @@ void VVideoInputBufferClient::AddFile( const StageCorePluginInterface::VCaptureT
   // An encoder for each file: writers may use theirs on threads of their own.
   auto pFile = std::make_unique<VFileRecord>( i_rTarget, m_Settings.m_Encoder,
     m_Settings.m_pWriterFactory->Make( static_cast<KVZ::IVideoContainer::Enum>( i_rTarget.m_Container ),
-      MakeEncoder( m_Settings.m_Encoder, i_rTarget.m_JPEGQuality ) ) );
+      MakeEncoder( m_Settings.m_Encoder, i_rTarget ) ) );
   pFile->Report().m_CaptureSessionId = m_Settings.m_Header.m_CaptureSessionId;
   pFile->Report().m_DeviceURN = m_Device.m_URN;
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
