@@ -73,7 +73,12 @@ std::vector<VUnit> SplitUnits( const VBytes& i_rStream )
 char FrameType( const VUnit& i_rUnit )
 {
   size_t Bit = 8;
-  const auto NextBit = [&] { return i_rUnit.m_Bytes.at( Bit / 8 ) >> ( 7 - Bit++ % 8 ) & 1; };
+  const auto NextBit = [&]
+  {
+    const int Value = i_rUnit.m_Bytes.at( Bit / 8 ) >> ( 7 - Bit % 8 ) & 1;
+    ++Bit;
+    return Value;
+  };
   uint32_t Value = 0;
   for( int Number = 0; Number < 2; ++Number )
   {
