@@ -9,9 +9,11 @@
 #include "tests/support/system/Rates.h"
 #include "tests/support/system/StageHost.h"
 
+#include <boost/filesystem/operations.hpp>
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <cstdlib>
 #include <fstream>
 #include <iterator>
 
@@ -30,6 +32,7 @@ struct VMovieRow
   const char* m_pContainer;
   const char* m_pVideo;
   const char* m_pCodec;
+  const char* m_pTag;
   bool m_bTimecodeTrack;
 };
 
@@ -37,14 +40,14 @@ struct VMovieRow
 const std::string UnknownTimecodeCodec = "Unsupported codec with id 0 for input stream 2\n";
 
 const VMovieRow Movies[] = {
-  { "mkv", "uncompressed", "rawvideo", false },
-  { "mkv", "jpeg", "mjpeg", false },
-  { "mov", "uncompressed", "rawvideo", true },
-  { "mov", "jpeg", "mjpeg", true },
-  { "mp4", "uncompressed", "rawvideo", true },
-  { "mp4", "jpeg", "mjpeg", true },
-  { "avi", "uncompressed", "rawvideo", false },
-  { "avi", "jpeg", "mjpeg", false },
+  { "mkv", "uncompressed", "rawvideo", "UYVY", false },
+  { "mkv", "jpeg", "mjpeg", "[0][0][0][0]", false },
+  { "mov", "uncompressed", "rawvideo", "2vuy", true },
+  { "mov", "jpeg", "mjpeg", "jpeg", true },
+  { "mp4", "uncompressed", "rawvideo", "2vuy", true },
+  { "mp4", "jpeg", "mjpeg", "jpeg", true },
+  { "avi", "uncompressed", "rawvideo", "UYVY", false },
+  { "avi", "jpeg", "mjpeg", "MJPG", false },
 };
 
 std::string CardText( const VSignalRate& i_rRate, const std::string& i_rStartLabel )
@@ -61,6 +64,24 @@ uint64_t SamplesBefore( const VSignalRate& i_rRate, uint64_t i_Frame )
     Sum += i_rRate.m_SampleCadence[Frame % i_rRate.m_SampleCadence.size()];
   }
   return Sum;
+}
+
+}
+
+namespace
+{
+
+void CheckByMkvToolNix( const std::string& i_rPath )
+{
+  const nlohmann::json Told = nlohmann::json::parse( TestSupport::RunProgram( { "mkvmerge", "-J", i_rPath } ).m_Output, nullptr, false );
+  EXPECT_TRUE( Told.value( "warnings", nlohmann::json() ).empty() && Told.value( "errors", nlohmann::json() ).empty() ) << Told;
+  EXPECT_EQ( Told.value( "tracks", nlohmann::json() ).size(), 2u ) << Told;
+  const VRunResult Info = TestSupport::RunProgram( { "mkvinfo", "--all", "--check-mode", i_rPath } );
+  EXPECT_EQ( Info.m_ExitCode, 0 ) << Describe( Info );
+  for( const char* pWord : { "(Unknown element", "arning", "rror", "damaged" } )
+  {
+    EXPECT_EQ( Info.m_Output.find( pWord ), std::string::npos ) << Info.m_Output.substr( Info.m_Output.find( pWord ), 200 );
+  }
 }
 
 }
@@ -128,6 +149,10 @@ TEST_P( MovieTest, HoldsTheCardsFramesSoundAndTimecode )
 
   std::map<std::string, std::string> Told = TestSupport::AskFFprobe( Path, rRow.m_bTimecodeTrack ? UnknownTimecodeCodec : "" );
   EXPECT_EQ( Told["streams.stream.0.codec_name"], rRow.m_pCodec );
+  EXPECT_EQ( Told["streams.stream.0.codec_tag_string"], rRow.m_pTag );
+  EXPECT_EQ( Told["streams.stream.0.width"] + " x " + Told["streams.stream.0.height"], "720 x 486" );
+  EXPECT_NEAR( std::strtod( Told["format.duration"].c_str(), nullptr ), FrameCount * 1001.0 / 30000.0, FrameCount * 1e-6 )
+    << "whole microseconds a frame";
   EXPECT_EQ( Told["streams.stream.0.nb_read_frames"], std::to_string( FrameCount ) );
   EXPECT_EQ( Told["streams.stream.0.r_frame_rate"], "30000/1001" );
   EXPECT_EQ( Told["streams.stream.0.avg_frame_rate"], "30000/1001" );
@@ -137,6 +162,16 @@ TEST_P( MovieTest, HoldsTheCardsFramesSoundAndTimecode )
   if( rRow.m_bTimecodeTrack )
   {
     EXPECT_EQ( Told["streams.stream.2.tags.timecode"], Result.Device().value( "start_timecode", "" ) );
+  }
+
+  EXPECT_EQ( TestSupport::AskMediaInfo( Path, "Video;%Width% %Height% %FrameRate% %FrameCount%" ), "720 486 29.970 67" );
+  if( std::string( rRow.m_pContainer ) != "mp4" )   // there MediaInfo does not know this description of PCM
+  {
+    EXPECT_EQ( TestSupport::AskMediaInfo( Path, "Audio;%Channels% %BitDepth% %SamplingRate%" ), "2 16 48000" );
+  }
+  if( std::string( rRow.m_pContainer ) == "mkv" )
+  {
+    CheckByMkvToolNix( Path );
   }
 
   const bool bExact = std::string( rRow.m_pVideo ) == "uncompressed";
@@ -176,4 +211,116 @@ TEST( KilledMovieTest, AMatroskaRecordingHoldsItsFrames )
   const VRunResult Probe = TestSupport::RunProgram(
     { "ffprobe", "-v", "quiet", "-count_frames", "-show_entries", "stream=nb_read_frames", "-of", "csv=p=0", Path } );
   EXPECT_EQ( Probe.m_Output, Whole + "\n" + Whole + "\n" ) << "pictures and sounds";
+}
+
+// What is another in each take: times, and the container.
+bool IsOfOneTake( const std::string& i_rKey )
+{
+  const auto Has = [&]( const char* i_pWord ) { return i_rKey.find( i_pWord ) != std::string::npos; };
+  return Has( "Time" ) || Has( "Start" ) || Has( "Container" );
+}
+
+TEST( MovieAttributesTest, MatroskaHoldsAllThatTheSystemsOwnContainerHolds )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  const auto Take = [&]( const std::string& i_rContainer )
+  {
+    return Record( Folder.File( i_rContainer ),
+      { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "3", "--container", i_rContainer, "--audio-channels", "2" } )
+      .Path();
+  };
+  const TestSupport::VTvidParser Reference( Take( "tvid" ) );
+  std::ifstream Stream( Take( "mkv" ), std::ios::binary );
+  auto Tags = TestSupport::ReadTags( TestSupport::VEbmlParser( { std::istreambuf_iterator<char>( Stream ), {} } ) );
+  EXPECT_EQ( Tags.size(), Reference.Internal().size() + Reference.External().size() );
+  for( const auto& [pPrefix, rBlock] :
+    { std::pair( "Tarvo.Internal.", Reference.Internal() ), std::pair( "Tarvo.External.", Reference.External() ) } )
+  {
+    for( const auto& [rKey, rValue] : rBlock )
+    {
+      const auto Found = Tags.find( pPrefix + rKey );
+      ASSERT_NE( Found, Tags.end() ) << rKey;
+      const std::string* const pText = std::get_if<std::string>( &rValue );
+      EXPECT_TRUE( !pText || IsOfOneTake( rKey ) || *pText == Found->second ) << rKey << " " << Found->second;
+    }
+  }
+}
+
+class MovieDiskTest : public testing::TestWithParam<std::pair<const char*, uint64_t>>
+{
+protected:
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+TEST_P( MovieDiskTest, AFullDiskIsTold )
+{
+  const auto& [pContainer, Bytes] = GetParam();
+  VRunOptions Options;
+  Options.m_FileSizeLimit = Bytes;
+  const VRecordResult Result = Record( m_Folder.File( "out" ),
+    { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "12", "--container", pContainer, "--audio-channels", "2" }, Options );
+  const std::string Path = m_Folder.File( "out" ) + "/take_vi0." + pContainer;
+  EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: vi:0: " ) ) << Describe( Result.m_Run );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "\"" + Path + "\"" ) ) << Describe( Result.m_Run );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "File too large" ) ) << Describe( Result.m_Run );
+  EXPECT_FALSE( Result.Device().value( "errors", nlohmann::json::array() ).empty() ) << Describe( Result.m_Run );
+  EXPECT_LT( Result.Device().value( "frames_written", 12u ), 12u ) << Describe( Result.m_Run );
+}
+
+// In the headers, between two frames and in a picture.
+INSTANTIATE_TEST_SUITE_P( Containers, MovieDiskTest,
+  testing::ValuesIn(
+    []
+    {
+      std::vector<std::pair<const char*, uint64_t>> Cases;
+      for( const char* pContainer : { "mov", "mp4", "avi", "mkv" } )
+      {
+        for( const uint64_t Bytes : { 20u, 900000u, 5000000u } )
+        {
+          Cases.emplace_back( pContainer, Bytes );
+        }
+      }
+      return Cases;
+    }() ),
+  []( const auto& i_rInfo ) { return i_rInfo.param.first + std::to_string( i_rInfo.param.second ); } );
+
+// A place that takes everything and keeps nothing: the writer has no complaint, the file is wrong all the same.
+TEST( MovieCheckTest, AFinishedMovieThatCannotBeReadIsAFailure )
+{
+  for( const std::string Container : { "mov", "mp4" } )
+  {
+    const TestSupport::VTemporaryFolder Folder;
+    const std::string Path = Folder.File( "take_vi0." + Container );
+    boost::filesystem::create_symlink( "/dev/null", Path );
+    const VRecordResult Result = Record( Folder.File( "" ),
+      { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "3", "--container", Container, "--overwrite" } );
+    EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+    EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "is not right: The file has no tracks: it was not finished." ) )
+      << Describe( Result.m_Run );
+    EXPECT_FALSE( Result.Device().value( "errors", nlohmann::json::array() ).empty() ) << Describe( Result.m_Run );
+  }
+}
+
+TEST( MovieLimitTest, ARecordingThatIsToBeLongerThanItsContainerIsWarnedOf )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  VRunOptions Options;
+  Options.m_OnErrorText = [bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
+  {
+    if( !bSent && i_rText.find( "frames_captured=" ) != std::string::npos )
+    {
+      bSent = true;
+      kill( i_Child, SIGINT );
+    }
+  };
+  const VArguments Card = { "--card", CardText( Rate2997Drop, "01:00:00;00" ), "--progress" };
+  const VRecordResult Movie = Record( Folder.File( "mov" ), Card + VArguments{ "--seconds", "20000", "--container", "mov" }, Options );
+  EXPECT_NEAR( Movie.Device().value( "longest_seconds", 0.0 ), 4294967295.0 / 240000.0, 0.01 ) << Describe( Movie.m_Run );
+  EXPECT_NE( std::string::npos,
+    Movie.m_Run.m_Error.find( "stagehost: vi:0: With these settings a MOV file is full after 5.0 hours. The recording is to be longer." ) )
+    << Describe( Movie.m_Run );
+  const VRecordResult Plain = Record( Folder.File( "tvid" ), Card + VArguments{ "--seconds", "20000" }, Options );
+  EXPECT_TRUE( Plain.Device().contains( "longest_seconds" ) && Plain.Device()["longest_seconds"].is_null() ) << Describe( Plain.m_Run );
+  EXPECT_EQ( std::string::npos, Plain.m_Run.m_Error.find( "is full" ) ) << Describe( Plain.m_Run );
 }
