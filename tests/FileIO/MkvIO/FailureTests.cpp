@@ -93,6 +93,8 @@ TEST( MkvWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesTheWholeFram
 {
   VSmallMovie Whole;
   ASSERT_TRUE( WriteSmallMovie( Whole ).m_bClosed );
+  ASSERT_GT( Whole.m_pBytes->size(), 600u );
+  RecordProperty( "offsets", static_cast<int>( Whole.m_pBytes->size() ) );
   for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
   {
     SCOPED_TRACE( Offset );

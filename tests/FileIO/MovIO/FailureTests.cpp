@@ -90,6 +90,8 @@ TEST( MovWriterFailures, ADiskThatIsFullAtAnyByteIsReported )
   VSmallMovie Whole;
   ASSERT_TRUE( WriteMovie( Whole ).m_bClosed );
   EXPECT_EQ( CountWholeFrames( *Whole.m_pBytes ), Frames );
+  ASSERT_GT( Whole.m_pBytes->size(), 600u );
+  RecordProperty( "offsets", static_cast<int>( Whole.m_pBytes->size() ) );
   for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
   {
     SCOPED_TRACE( Offset );

@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <set>
 #include <string_view>
 
 using namespace KVZ;
@@ -87,17 +88,45 @@ bool IsConsistent( const VAviFile& i_rFile, const VResult& i_rResult )
   }
 }
 
+// Beginning, content and end of every chunk.
+void AddBoundaries( const std::vector<TestSupport::VRiffChunk>& i_rChunks, std::set<uint64_t>& o_rOffsets )
+{
+  for( const TestSupport::VRiffChunk& rChunk : i_rChunks )
+  {
+    for( const uint64_t Boundary : { rChunk.m_Position, rChunk.m_Position + 4, rChunk.m_Data, rChunk.m_Data + rChunk.m_Size } )
+    {
+      o_rOffsets.insert( { Boundary - ( Boundary != 0 ), Boundary, Boundary + 1 } );
+    }
+    AddBoundaries( rChunk.m_Children, o_rOffsets );
+  }
 }
 
-// In the headers every place is like its neighbours.
+// Every byte behind the headers, and in them, where a place is like its neighbours, the boundaries and some places between.
+std::set<uint64_t> FaultOffsets( const VAviFile& i_rWhole, uint64_t i_HeaderEnd )
+{
+  std::set<uint64_t> Offsets;
+  AddBoundaries( i_rWhole.Parse().Riff().Riffs(), Offsets );
+  const uint64_t Size = i_rWhole.m_pBytes->size();
+  for( uint64_t Offset = 0; Offset < Size; Offset += Offset + 97 < i_HeaderEnd ? 97 : 1 )
+  {
+    Offsets.insert( Offset );
+  }
+  Offsets.erase( Offsets.lower_bound( Size ), Offsets.end() );
+  return Offsets;
+}
+
+}
+
 TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame )
 {
   VAviFile Whole( {}, ThreeRiffs );
   ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
   ASSERT_EQ( WalkFrames( *Whole.m_pBytes ).size(), Frames );
-  const uint64_t Size = Whole.m_pBytes->size();
   const uint64_t HeaderEnd = Whole.Parse().Headers().m_Data + Whole.Parse().Headers().m_Size;
-  for( uint64_t Offset = 0; Offset < Size; Offset += Offset + 97 < HeaderEnd ? 97 : 1 )
+  const std::set<uint64_t> Offsets = FaultOffsets( Whole, HeaderEnd );
+  ASSERT_GT( Offsets.size(), 600u );
+  RecordProperty( "offsets", static_cast<int>( Offsets.size() ) );
+  for( const uint64_t Offset : Offsets )
   {
     SCOPED_TRACE( Offset );
     VAviFile File( {}, ThreeRiffs, { .m_Offset = Offset } );
