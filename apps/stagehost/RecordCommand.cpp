@@ -1,6 +1,7 @@
 // stagehost record: writes a range of frames of one or more devices to files.
 #include "Core/VideoInterface/Timecode.h"
 #include "apps/stagehost/Commands.h"
+#include "apps/stagehost/ConverterOptions.h"
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/FileValidation.h"
 #include "apps/stagehost/HostSession.h"
@@ -43,6 +44,7 @@ struct VOptions
   uint64_t m_Frames = 0;
   double m_PreRoll = 0.0;
   VFormatOptions m_Format;
+  VConverterOptions m_Converter;
   std::string m_Output;
   std::string m_Name = "take";
   bool m_bOverwrite = false;
@@ -112,10 +114,14 @@ bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, cons
 }
 
 // While the device is stopped, so that the next buffer session holds frames of these settings alone.
-int ApplySettings( VHostSession& i_rSession, const VFormatOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
 {
-  const VRecordFormat Format( i_rOptions, i_rDevice );
-  const std::string Refusal = Format.WhyRefused();
+  const VRecordFormat Format( i_rOptions.m_Format, i_rDevice );
+  std::string Refusal = Format.WhyRefused();
+  if( Refusal.empty() )
+  {
+    Refusal = WhyRefused( i_rOptions.m_Converter, i_rOptions.m_Format, i_rDevice );
+  }
   if( !Refusal.empty() )
   {
     Complain( Refusal );
@@ -154,6 +160,7 @@ int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const st
   Targets.m_Folder = i_rOptions.m_Output;
   Targets.m_bOverwrite = i_rOptions.m_bOverwrite;
   ApplyFormat( i_rOptions.m_Format, Targets );
+  Apply( i_rOptions.m_Converter, Targets );
   i_rSession.Host().Targets().Configure( Targets );
   for( const VDeviceInfo& rDevice : i_rDevices )
   {
@@ -263,11 +270,13 @@ int Run( const VOptions& i_rOptions )
     Complain( "record needs one of --seconds S (above 0) and --frames N (2 or more)." );
     return ExitUsage;
   }
-  const std::string Refusal = VRecordFormat::WhyRefused( i_rOptions.m_Format );
-  if( !Refusal.empty() )
+  for( const std::string& rRefusal : { VRecordFormat::WhyRefused( i_rOptions.m_Format ), WhyRefused( i_rOptions.m_Converter ) } )
   {
-    Complain( Refusal );
-    return ExitUsage;
+    if( !rRefusal.empty() )
+    {
+      Complain( rRefusal );
+      return ExitUsage;
+    }
   }
   if( const int Result = CheckOutput( i_rOptions ) )
   {
@@ -285,7 +294,7 @@ int Run( const VOptions& i_rOptions )
   }
   for( const VDeviceInfo& rDevice : Devices )
   {
-    if( const int Result = ApplySettings( Session, i_rOptions.m_Format, rDevice ) )
+    if( const int Result = ApplySettings( Session, i_rOptions, rDevice ) )
     {
       return Result;
     }
@@ -318,6 +327,7 @@ VCommand AddRecordCommand( CLI::App& io_rApp )
     ->type_name( "S" )
     ->check( NumberCheck( 0.0, LongestPreRoll, "seconds from 0 to 3600" ) );
   AddFormatOptions( rCommand, pOptions->m_Format );
+  AddConverterOptions( rCommand, pOptions->m_Converter );
   rCommand.add_option( "--memory", pOptions->m_Session.m_MemoryMiB, "Memory for frames of all devices, in MiB" )
     ->type_name( "MIB" )
     ->check( WholeNumberCheck( static_cast<double>( StageHost::MinimumMemoryMiB ), MostMemoryMiB,

@@ -12,8 +12,25 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Driver.h"
 #include "StageCoreRuntime/Shared.h"
 
+#if defined( STAGECORE_OPENGL )
+#include "CoreVideoUtilsOpenGL/PixelFormatConverterOpenGL.h"
+#endif
+
 namespace Composition
 {
+
+#if defined( STAGECORE_OPENGL )
+namespace
+{
+
+std::shared_ptr<KVZ::IPixelFormatConverter> MakeOpenGLConverter( CoreVideoUtilsOpenGL::EUse i_Use )
+{
+  return std::make_shared<CoreVideoUtilsOpenGL::VPixelFormatConverterOpenGL>(
+    CoreVideoUtilsOpenGL::VPixelFormatConverterOpenGL::VSettings{ .m_Use = i_Use } );
+}
+
+}
+#endif
 
 std::vector<VideoInputHAL::VDriverMaker> DriverMakers()
 {
@@ -64,6 +81,10 @@ VideoEncoding::VEncoderParts EncoderParts()
 {
   VideoEncoding::VEncoderParts Parts;
   Parts.m_ConverterMakers[VideoEncoding::EConverter::Software] = [] { return std::make_shared<CoreVideoUtils::VPixelFormatConverter>(); };
+#if defined( STAGECORE_OPENGL )
+  Parts.m_ConverterMakers[VideoEncoding::EConverter::OpenGLFirst] = [] { return MakeOpenGLConverter( CoreVideoUtilsOpenGL::EUse::Always ); };
+  Parts.m_ConverterMakers[VideoEncoding::EConverter::OpenGLSecond] = [] { return MakeOpenGLConverter( CoreVideoUtilsOpenGL::EUse::LensAlone ); };
+#endif
   Parts.m_Compressors = VideoEncoding::ImageCompressors();
   Parts.m_DrawText = []( KVZ::IPixelFormatConverter& i_rConverter, const KVZ::VideoFrameInfo& i_rInfo, const VideoEncoding::VBurnInSettings& i_rText,
                        uint8_t* io_pPixels, size_t i_Size )
