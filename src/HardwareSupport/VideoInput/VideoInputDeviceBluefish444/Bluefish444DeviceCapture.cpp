@@ -187,7 +187,7 @@ void VBluefish444Device::VImpl::Pause() NO_LOCK_ANALYSIS
 {
   m_bSynced = false;
   m_NamedBuffer.reset();
-  if( m_Pause )
+  if( m_Pause && !IsStopping() )
   {
     m_Pause( NoSignalPause );
     return;
