@@ -31,7 +31,12 @@ constexpr const char* pCardKeys = R"(Keys of a virtual card, parted by commas:
   script=FILE          events: signal-loss, format, drop, timecode-jump, timecode-loss, late, remove, arrive
   speed=X              frame rate factor, 0.01 to 100
   loop=0               an input that ends is not begun again
-  input=REST           a file, a URL, or FFmpeg's input options; comes last)";
+  input=REST           a file, a URL, or FFmpeg's input options; comes last
+A card of the kind bluefish444 knows these as well:
+  inputs=N             0 to 4
+  outputs=N            0 to 4
+  connectors=N         0 to 4; as many as inputs by default
+  driver=old           a driver that does not tell the card's features)";
 
 std::string JoinURNs( const std::vector<VDeviceInfo>& i_rDevices )
 {
