@@ -87,7 +87,7 @@ struct VCaptureTarget
   bool m_bBurnInTimecode = false;           // each frame's timecode is drawn into its picture
   int32_t m_Converter = 0;                  // of pixel formats: 1 OpenGL, 2 software, 3 OpenGL where it alone can; 0 leaves it to the module
   bool m_bCorrectLens = false;              // every picture is converted, in its own format if no other is wanted, and the lens undone
-  KVZ::VLensDistortionRecord m_Lens;
+  KVZ::VLensDistortionRecord m_Lens{};
 };
 
 // What became of one file of a capture.
