@@ -31,3 +31,4 @@ std::vector<VFigure> MeasureMovies( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureImageCompression( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureImageSequence( const VBenchOptions& i_rOptions );
 std::vector<VFigure> MeasureFlow( const VBenchOptions& i_rOptions );
+std::vector<VFigure> MeasureOpenGL( const VBenchOptions& i_rOptions );

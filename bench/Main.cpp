@@ -30,7 +30,7 @@ struct VSubject
 // Recording comes first: a child's peak memory begins with what its parent has at the fork.
 constexpr VSubject Subjects[] = { { "record", &MeasureRecording }, { "framepath", &MeasureFramePath }, { "file", &MeasureFileWriting },
   { "pixels", &MeasurePixelConversion }, { "movies", &MeasureMovies }, { "compression", &MeasureImageCompression },
-  { "images", &MeasureImageSequence }, { "flow", &MeasureFlow } };
+  { "images", &MeasureImageSequence }, { "flow", &MeasureFlow }, { "opengl", &MeasureOpenGL } };
 
 // A folder of its own in the one that was asked for, removed with all in it.
 class VScratchFolder
@@ -97,8 +97,8 @@ int main( int i_Count, char** i_ppArguments )
   CLI::App App( "Measures speed and memory against their bounds. Run it on a machine that does nothing else.", "stagecore_bench" );
   App.add_flag( "--quick", Options.m_bQuick, "Fewer and shorter rounds; the figures scatter more" );
   App.add_option( "--folder", Options.m_Folder, "Where files are written and removed again (default: the system's temporary folder)" );
-  App.add_option( "subject", Names, "What to measure: record, framepath, file, pixels, movies, compression, images, flow (default: all)" )
-    ->check( CLI::IsMember( { "record", "framepath", "file", "pixels", "movies", "compression", "images", "flow" } ) );
+  App.add_option( "subject", Names, "What to measure: record, framepath, file, pixels, movies, compression, images, flow, opengl (default: all)" )
+    ->check( CLI::IsMember( { "record", "framepath", "file", "pixels", "movies", "compression", "images", "flow", "opengl" } ) );
   try
   {
     App.parse( i_Count, i_ppArguments );

@@ -115,7 +115,7 @@ const uint8_t* CompletePairs( const VPreparation& i_rFrame )
   return pImage;
 }
 
-// What each code of ten bits becomes in a texel.
+// What each code of ten bits becomes in a texel: colour differences, and luma.
 template<class TComponent>
 class VTenBitTable
 {
@@ -126,33 +126,29 @@ public:
     const auto Limit = [Full]( double i_Value ) { return static_cast<TComponent>( std::clamp( i_Value + 0.5, 0.0, Full ) ); };
     for( int32_t Code = 0; Code < 1024; ++Code )
     {
-      m_Luma[static_cast<size_t>( Code )] = Limit( Full * Code / 1020.0 );
-      m_Difference[static_cast<size_t>( Code )] = Limit( Full * ( ( Code - 512 ) / 1020.0 + 0.5 ) );
+      m_Values[0][static_cast<size_t>( Code )] = Limit( Full * ( ( Code - 512 ) / 1020.0 + 0.5 ) );
+      m_Values[1][static_cast<size_t>( Code )] = Limit( Full * Code / 1020.0 );
     }
   }
 
-  std::array<TComponent, 1024> m_Luma;
-  std::array<TComponent, 1024> m_Difference;
+  std::array<std::array<TComponent, 1024>, 2> m_Values;
 };
 
-// Four words hold six pixels, as U Y V and again from the low end; three texels of y0 u y1 v.
+// Four words hold six pixels, from the low end as U Y V Y and again: three texels of y0 u y1 v, of which the first are written.
 template<class TComponent>
 void SpreadGroup( const VTenBitTable<TComponent>& i_rTable, const uint8_t* i_pWords, TComponent* o_pTexels, size_t i_Texels )
 {
-  std::array<uint32_t, 4> Words;
-  std::memcpy( Words.data(), i_pWords, sizeof( Words ) );
-  for( size_t Texel = 0; Texel < i_Texels; ++Texel )
+  std::array<TComponent, 12> Texels;
+  for( size_t Word = 0; Word < 4; ++Word )
   {
-    const auto Code = [&]( size_t i_Value )
+    uint32_t Codes = 0;
+    std::memcpy( &Codes, i_pWords + 4 * Word, sizeof( Codes ) );
+    for( size_t Index = 3 * Word; Index < 3 * Word + 3; ++Index, Codes >>= 10 )
     {
-      const size_t Index = 4 * Texel + i_Value;
-      return Words[Index / 3] >> 10 * ( Index % 3 ) & 0x3FF;
-    };
-    o_pTexels[4 * Texel] = i_rTable.m_Luma[Code( 1 )];
-    o_pTexels[4 * Texel + 1] = i_rTable.m_Difference[Code( 0 )];
-    o_pTexels[4 * Texel + 2] = i_rTable.m_Luma[Code( 3 )];
-    o_pTexels[4 * Texel + 3] = i_rTable.m_Difference[Code( 2 )];
+      Texels[Index ^ 1] = i_rTable.m_Values[Index % 2][Codes & 0x3FF];
+    }
   }
+  std::copy_n( Texels.begin(), 4 * i_Texels, o_pTexels );
 }
 
 template<class TComponent>
@@ -165,14 +161,9 @@ const uint8_t* SpreadTenBits( const VPreparation& i_rFrame )
   {
     const uint8_t* const pSource = i_rFrame.m_pSource + Row * SourceBytes;
     TComponent* const pTarget = reinterpret_cast<TComponent*>( pImage ) + 4 * Row * i_rFrame.Pairs();
-    size_t Texel = 0;
-    for( ; Texel + 3 <= i_rFrame.Pairs(); Texel += 3 )
+    for( size_t Texel = 0; Texel < i_rFrame.Pairs(); Texel += 3 )
     {
-      SpreadGroup( s_Table, pSource + Texel / 3 * 16, pTarget + 4 * Texel, 3 );
-    }
-    if( Texel < i_rFrame.Pairs() )
-    {
-      SpreadGroup( s_Table, pSource + Texel / 3 * 16, pTarget + 4 * Texel, i_rFrame.Pairs() - Texel );
+      SpreadGroup( s_Table, pSource + Texel / 3 * 16, pTarget + 4 * Texel, std::min<size_t>( 3, i_rFrame.Pairs() - Texel ) );
     }
   }
   return pImage;

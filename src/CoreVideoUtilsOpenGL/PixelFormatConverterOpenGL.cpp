@@ -83,7 +83,7 @@ void VPixelFormatConverterOpenGL::DrawOnThread( const VFrame& i_rFrame, EResult&
   }
   if( !m_pImpl->WhyUnusable().empty() )
   {
-    KVZ_LOG_WARNING( "CoreVideoUtilsOpenGL", "OpenGL cannot be used: %1%. Pixel formats are converted in software.", m_pImpl->WhyUnusable() );
+    KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "OpenGL cannot be used: %1%. Pixel formats are converted in software.", m_pImpl->WhyUnusable() );
     m_pImpl.reset();
     m_bUnusable = true;
     return;
@@ -95,7 +95,7 @@ bool VPixelFormatConverterOpenGL::ConvertInSoftware( const VFrame& i_rFrame )
 {
   if( i_rFrame.m_bLensEnabled )
   {
-    KVZ_LOG_WARNING( "CoreVideoUtilsOpenGL", "Lens un-distortion not supported in software conversion." );
+    KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "Lens un-distortion not supported in software conversion." );
   }
   return m_Software.Convert( i_rFrame.m_Source, i_rFrame.m_pSource, i_rFrame.m_SourceSize, i_rFrame.m_Target, i_rFrame.m_pTarget,
     i_rFrame.m_TargetSize );
