@@ -85,6 +85,7 @@ void VBluefish444Device::VImpl::RunRound()
 
 void VBluefish444Device::VImpl::TakeCommand()
 {
+  const bool bFormerStart = m_Command.m_bStart;
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     if( m_Commands.empty() )
@@ -93,11 +94,10 @@ void VBluefish444Device::VImpl::TakeCommand()
     }
     m_InForce = m_Commands.front();
     m_Commands.pop_front();
+    m_Command = m_InForce;
   }
-  const VCaptureCommand Former = m_Command;
-  m_Command = m_InForce;
   m_bSetUpDue = true;
-  if( Former.m_bStart != m_Command.m_bStart )
+  if( bFormerStart != m_Command.m_bStart )
   {
     m_StatusChanged();
   }
