@@ -37,8 +37,8 @@ VCost Record( const std::string& i_rFolder, uint64_t i_Frames, uint64_t i_Memory
   const boost::filesystem::path Folder = boost::filesystem::path( i_rFolder ) / "recording";
   TestSupport::VRunOptions Options;
   Options.m_Seconds = 120.0;
-  const auto Result = TestSupport::RunProgram( { Program(), "record", "--settings", "none", "--card", Card, "--frames", std::to_string( i_Frames ), "--memory",
-                                                 std::to_string( i_MemoryMiB ), "--output", Folder.string(), "--json" },
+  const auto Result = TestSupport::RunProgram( { Program(), "record", "--settings", "none", "--card", Card, "--frames", std::to_string( i_Frames ),
+                                                 "--memory", std::to_string( i_MemoryMiB ), "--output", Folder.string(), "--json" },
     Options );
   boost::filesystem::remove_all( Folder );
   if( Result.m_ExitCode != 0 )
