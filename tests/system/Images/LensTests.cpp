@@ -1,0 +1,110 @@
+// A lens that is undone on the way to the file, with a display to draw on and without.
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/TvidParser.h"
+#include "tests/support/system/BackgroundProgram.h"
+#include "tests/support/system/StageHost.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+using namespace SystemTests;
+using TestSupport::VTvidParser;
+
+namespace
+{
+
+constexpr size_t Width = 720;
+constexpr size_t Height = 576;
+constexpr uint64_t Frames = 4;
+
+const VArguments Card = { "--card", "decklink:standard=SD_720_576I_5000", "--frames", std::to_string( Frames ) };
+const VArguments Colour = { "--pixel-format", "B8G8R8u8" };
+// A corner is drawn a quarter of its way nearer to the middle.
+const VArguments Lens = { "--lens", "360,288,-1.2e-6,0" };
+
+std::vector<uint8_t> FirstFrame( const VRecordResult& i_rResult )
+{
+  VTvidParser File( i_rResult.Path() );
+  return File.Frames().empty() ? std::vector<uint8_t>() : File.Video( File.Frames()[0] );
+}
+
+// The fourth bytes that there are, lowest and highest.
+std::pair<int, int> FourthBytes( const std::vector<uint8_t>& i_rFrame )
+{
+  std::pair<int, int> Range = { 255, 0 };
+  for( size_t Byte = 3; Byte < i_rFrame.size(); Byte += 4 )
+  {
+    Range = { std::min<int>( Range.first, i_rFrame[Byte] ), std::max<int>( Range.second, i_rFrame[Byte] ) };
+  }
+  return Range;
+}
+
+class LensTest : public testing::Test
+{
+protected:
+  VRecordResult RecordOn( const std::string& i_rDisplay, const VArguments& i_rMore )
+  {
+    VRunOptions Options;
+    Options.m_Environment = { "DISPLAY=" + i_rDisplay, "LIBGL_ALWAYS_SOFTWARE=1" };
+    return Record( m_Folder.File( "recording" ), Card + i_rMore, Options );
+  }
+
+  const TestSupport::VTemporaryFolder m_Folder;
+};
+
+}
+
+#if defined( STAGECORE_OPENGL )
+
+namespace
+{
+
+// The last number of what the server printed.
+std::string DisplayOf( const std::string& i_rPrinted )
+{
+  const size_t End = i_rPrinted.find_last_of( "0123456789" );
+  const size_t Before = i_rPrinted.find_last_not_of( "0123456789", End );
+  return ":" + i_rPrinted.substr( Before + 1, End - Before );
+}
+
+}
+
+TEST_F( LensTest, IsUndoneByOpenGL )
+{
+  VBackgroundProgram Server( { "Xvfb", "-displayfd", "1", "-screen", "0", "640x480x24", "-nolisten", "tcp" } );
+  ASSERT_TRUE( Server.WaitFor( "\n", 30.0 ) ) << Server.Printed();
+  const std::string Display = DisplayOf( Server.Printed() );
+  for( const char* pConverter : { "opengl", "auto" } )
+  {
+    const VRecordResult Result = RecordOn( Display, Colour + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
+    ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+    EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
+    const std::vector<uint8_t> Frame = FirstFrame( Result );
+    ASSERT_EQ( Width * Height * 4, Frame.size() );
+    const auto [Lowest, Highest] = FourthBytes( Frame );
+    EXPECT_TRUE( Lowest >= 127 && Highest <= 128 ) << Lowest << " to " << Highest;
+    EXPECT_EQ( 0, Frame[0] + Frame[1] + Frame[2] );
+    // The bars' left one is grey, at a point that comes from the image's left edge, where nothing moves up or down.
+    const size_t Left = ( Height / 2 * Width + 80 ) * 4;
+    EXPECT_GT( Frame[Left], 100 );
+  }
+}
+
+#endif
+
+TEST_F( LensTest, IsLeftAsItIsWithoutADisplay )
+{
+  const VRecordResult Result = RecordOn( "", Colour + Lens );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
+  EXPECT_EQ( std::make_pair( 255, 255 ), FourthBytes( FirstFrame( Result ) ) );
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "ixel formats are converted in software." ) ) << Describe( Result.m_Run );
+}
+
+TEST_F( LensTest, IsRefusedWhereItCannotBeUndone )
+{
+  EXPECT_EQ( 2, RecordOn( "", Lens ).m_Run.m_ExitCode );   // the card's own 4:2:2, uncompressed
+  EXPECT_EQ( 2, RecordOn( "", Colour + Lens + VArguments{ "--converter", "software" } ).m_Run.m_ExitCode );
+  EXPECT_EQ( 2, RecordOn( "", Colour + VArguments{ "--lens", "360,288" } ).m_Run.m_ExitCode );
+}
