@@ -99,7 +99,11 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
   MakeClip( File( "clip,a.mkv" ), "1280x720", "50", ClipFrames, 1.0 );
   Plug( "decklink:input=" + File( "clip,a.mkv" ) );
   RunFFmpeg( { "-i", File( "clip,a.mkv" ), "-map", "0:a", "-ar", "48000", "-c:a", "pcm_s32le", "-f", "s32le", File( "sound" ) } );
-  const VBytes Sound = ReadFile( File( "sound" ) );
+  // FFmpeg ends the sound with the last picture, by whole packets: what a pass lacks is silence.
+  constexpr size_t PassBytes = size_t{ ClipFrames } * 960 * 2 * 4;
+  VBytes Sound = ReadFile( File( "sound" ) );
+  ASSERT_GT( Sound.size(), PassBytes / 2 );
+  Sound.resize( PassBytes );
   const struct
   {
     uint32_t m_Format;
@@ -127,10 +131,13 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
     ASSERT_EQ( Pictures.size(), ClipFrames * m_Pictures[0].size() );
     ExpectPictures( 0, Pictures );
     ExpectPictures( ClipFrames, Pictures );
-    const size_t PassBytes = ClipFrames * 960 * 2 * 4;
     ASSERT_EQ( m_Sound.size(), 2 * PassBytes );
-    EXPECT_TRUE( std::equal( m_Sound.begin(), m_Sound.begin() + PassBytes, Sound.begin() ) );
-    EXPECT_TRUE( std::equal( m_Sound.begin() + PassBytes, m_Sound.end(), Sound.begin() ) ) << "the next pass begins with its own sound";
+    for( size_t Pass = 0; Pass < 2; ++Pass )
+    {
+      const auto First = m_Sound.begin() + static_cast<std::ptrdiff_t>( Pass * PassBytes );
+      const auto Differs = std::mismatch( Sound.begin(), Sound.end(), First ).first;
+      EXPECT_EQ( static_cast<size_t>( Differs - Sound.begin() ), PassBytes ) << "pass " << Pass << ": each begins with its own sound";
+    }
   }
   EXPECT_EQ( m_Client.m_Seen.back().m_StreamTime, ( 2 * ClipFrames - 1 ) * 2700000 );
 }
