@@ -57,7 +57,7 @@ uint32_t BytesPerSample( uint32_t i_Flags ) { return i_Flags & Flag::Bits16 ? 2 
 uint32_t DecodeSamples( const VHancHeader& i_rHeader, const uint8_t* i_pSamples, BlueVelvet::VHancDecodeRecord& io_rRecord )
 {
   const std::vector<uint32_t> Channels = ChannelsOf( io_rRecord.m_ChannelMask );
-  const uint32_t Samples = i_rHeader.m_Channels == 0 ? 0 : std::min( i_rHeader.m_Samples, io_rRecord.m_MostSamples );
+  const uint32_t Samples = i_rHeader.m_Channels == 0 ? 0 : std::min( uint32_t{ i_rHeader.m_Samples }, uint32_t{ io_rRecord.m_MostSamples } );
   const uint32_t Bytes = BytesPerSample( io_rRecord.m_SampleFlags );
   uint8_t* pOut = static_cast<uint8_t*>( io_rRecord.m_pSamples );
   for( uint32_t Sample = 0; Sample < Samples; ++Sample )

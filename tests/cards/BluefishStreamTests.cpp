@@ -1,4 +1,4 @@
-// A virtual card's buffers, frame by frame under a clock moved by hand.
+// A virtual card's buffers, frame by frame under a clock moved by hand. Records are packed: a plus copies the field that a check would bind to.
 #include "tests/cards/BluefishClient.h"
 
 using namespace BluefishTests;
@@ -37,7 +37,7 @@ TEST_F( BluefishStream, ANamedBufferIsWholeAtTheNextSyncButOne )
     EXPECT_EQ( CounterIn( Readable, Mode576i ), *First + Round );
     const VDecoded Decoded = Decode( Readable, AllChannels, SampleFlag::Bits16, 2002 );
     EXPECT_TRUE( Decoded.m_bDone );
-    EXPECT_EQ( Decoded.m_Record.m_Samples, 1920u * 16 );
+    EXPECT_EQ( +Decoded.m_Record.m_Samples, 1920u * 16 );
     EXPECT_EQ( TestSupport::ReadRamp( { Decoded.m_Samples.data(), 1920, 16, 2 }, 16 ), static_cast<uint16_t>( ( *First + Round ) * 1920 ) );
   }
   EXPECT_EQ( CounterIn( 7, Mode576i ), std::nullopt ) << "never filled";
@@ -106,7 +106,7 @@ TEST_F( BluefishStream, DecodesTheChannelsAndSamplesAskedFor )
   }
   // No more than there is room for
   const VDecoded Few = Decode( 0, 3, SampleFlag::Bits32, 100 );
-  EXPECT_EQ( Few.m_Record.m_Samples, 200u );
+  EXPECT_EQ( +Few.m_Record.m_Samples, 200u );
   EXPECT_TRUE( TestSupport::ReadRamp( { Few.m_Samples.data(), 100, 2, 4 }, 2 ) );
   EXPECT_EQ( Few.m_Samples[800], 0xAA );
 }
@@ -120,15 +120,15 @@ TEST_F( BluefishStream, TimecodeWordsHoldTheLabelInBCD )
   Sync();
   const VDecoded Decoded = Decode( 1, 0, 0, 0 );
   constexpr uint64_t Word = 0x02'01'04'03'00'05'06'08;   // tens and units of hours, minutes, seconds, frames; drop-frame beside the tens of frames
-  EXPECT_EQ( Decoded.m_Record.m_Timecodes[TimecodePlace::RP188LTC], Word );
-  EXPECT_EQ( Decoded.m_Record.m_Timecodes[TimecodePlace::RP188VITC], Word );
-  EXPECT_EQ( Decoded.m_Record.m_Timecodes[TimecodePlace::SDVITC], Word );
-  EXPECT_EQ( Decoded.m_Record.m_Timecodes[TimecodePlace::ExternalLTC], 0u ) << "nothing is plugged in there";
+  EXPECT_EQ( +Decoded.m_Record.m_Timecodes[TimecodePlace::RP188LTC], Word );
+  EXPECT_EQ( +Decoded.m_Record.m_Timecodes[TimecodePlace::RP188VITC], Word );
+  EXPECT_EQ( +Decoded.m_Record.m_Timecodes[TimecodePlace::SDVITC], Word );
+  EXPECT_EQ( +Decoded.m_Record.m_Timecodes[TimecodePlace::ExternalLTC], 0u ) << "nothing is plugged in there";
 
   Event( R"({"do": "timecode-loss"})" );
   Sync();
   Sync();
-  EXPECT_EQ( Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0u ) << "left as it was";
+  EXPECT_EQ( +Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0u ) << "left as it was";
 }
 
 // At 50 frames a second each label comes on two frames, the second with the field mark, which lies beside the tens of hours.
@@ -139,9 +139,9 @@ TEST_F( BluefishStream, TheSecondFrameOfALabelCarriesTheFieldMark )
   Begin();
   Event( R"({"do": "timecode-jump", "to": "01:00:00:00"})" );
   Sync();
-  EXPECT_EQ( Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0x00'01'00'00'00'00'00'00u );
+  EXPECT_EQ( +Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0x00'01'00'00'00'00'00'00u );
   Sync();
-  EXPECT_EQ( Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0x08'01'00'00'00'00'00'00u );
+  EXPECT_EQ( +Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0x08'01'00'00'00'00'00'00u );
 }
 
 TEST_F( BluefishStream, ASignalThatGoesLeavesTheBuffersAlone )

@@ -21,7 +21,7 @@ VMovPrimitiveWriter::VMovPrimitiveWriter( std::shared_ptr<WriterSupport::VWatche
 
 VMovPrimitiveWriter& VMovPrimitiveWriter::Put( const void* i_pData, size_t i_Size )
 {
-  if( !m_bOk || ( m_Cursor + i_Size > Capacity && !Flush() ) )
+  if( !m_bOk || i_Size == 0 || ( m_Cursor + i_Size > Capacity && !Flush() ) )
   {
     return *this;
   }

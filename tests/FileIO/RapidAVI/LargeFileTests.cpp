@@ -125,11 +125,11 @@ TEST_F( LargeAvi, PositionsBeyond4GiBAreIndexed )
   for( size_t Entry = 0; Entry < Entries.size(); ++Entry )
   {
     const uint32_t Frames = Entry == 0 ? 1 : 2;
-    EXPECT_EQ( Entries[Entry].m_Position, Expected ) << Entry;
-    EXPECT_EQ( Entries[Entry].m_Duration, Frames );
+    EXPECT_EQ( uint64_t{ Entries[Entry].m_Position }, Expected ) << Entry;
+    EXPECT_EQ( uint32_t{ Entries[Entry].m_Duration }, Frames );
     VStandardIndexHeader Header;
     std::memcpy( &Header, Pieces.at( Expected + 8 ).data(), sizeof( Header ) );
-    EXPECT_EQ( Header.m_BasePosition, Expected - Frames * ( 8 + FrameBytes ) );
+    EXPECT_EQ( uint64_t{ Header.m_BasePosition }, Expected - Frames * ( 8 + FrameBytes ) );
     // The rest of this index, "idx1" of the first RIFF, and the heads of the next one with two frames.
     Expected += 8 + 24 + Frames * 8 + ( Entry == 0 ? 8 + 16 : 0 ) + 24 + 2 * ( 8 + FrameBytes );
   }

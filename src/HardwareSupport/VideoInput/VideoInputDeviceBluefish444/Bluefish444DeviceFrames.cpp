@@ -95,7 +95,11 @@ void VBluefish444Device::VImpl::PrepareRecord( uint8_t* o_pSamples )
   m_Record.m_SampleFlags = ToSampleType( m_Command.m_AudioFormat ).m_Flags;
   m_Record.m_MostSamples = SamplesPerFrame( m_Setup.m_pStandard->m_Period );
   m_Record.m_Samples = 0;
-  std::fill( std::begin( m_Record.m_Timecodes ), std::end( m_Record.m_Timecodes ), NoTimecodeWord );
+  // One by one: the record is packed, and no reference may be taken to a word of it.
+  for( size_t Word = 0; Word < sizeof( m_Record.m_Timecodes ) / sizeof( uint64_t ); ++Word )
+  {
+    m_Record.m_Timecodes[Word] = NoTimecodeWord;
+  }
 }
 
 // A frame whose ancillary data cannot be had carries neither sound nor timecode. One with fewer samples than the mode has carries those.
