@@ -121,7 +121,7 @@ private:
   std::string m_Rest GUARDED_BY( m_Mutex );
   bool m_bGo GUARDED_BY( m_Mutex ) = false;
   bool m_bFree GUARDED_BY( m_Mutex ) = false;
-  uint64_t m_FieldCount = 1000;
+  std::atomic<uint64_t> m_FieldCount{ 1000 };
 };
 
 struct VObject
