@@ -12,11 +12,10 @@ namespace TestSupport
 class VSparseFile : public UtilsIO::IClosableStream
 {
 public:
-  static constexpr size_t SmallestImage = 4096;
-
   using VPieces = std::map<uint64_t, std::vector<uint8_t>>;   // as they were written, by position
 
-  explicit VSparseFile( VPieces& o_rPieces ) : m_rPieces( o_rPieces ) {}
+  // Bytes from which a piece is taken for an image.
+  explicit VSparseFile( VPieces& o_rPieces, size_t i_SmallestImage = 4096 ) : m_rPieces( o_rPieces ), m_SmallestImage( i_SmallestImage ) {}
 
   bool Read( void*, size_t ) override { return false; }
   bool ReadBlock( void*, size_t, size_t& ) override { return false; }
@@ -24,7 +23,7 @@ public:
   using UtilsIO::IClosableStream::Write;
   bool Write( const void* i_pData, size_t i_Size ) override
   {
-    if( i_Size < SmallestImage )
+    if( i_Size < m_SmallestImage )
     {
       const auto* pBytes = static_cast<const uint8_t*>( i_pData );
       m_rPieces[m_Position].assign( pBytes, pBytes + i_Size );
@@ -46,6 +45,7 @@ public:
 
 private:
   VPieces& m_rPieces;
+  const size_t m_SmallestImage;
   uint64_t m_Position = 0;
 };
 

@@ -1,6 +1,7 @@
 // Files of many GiB, into a stream that forgets images, and numbers that 32 bits do not hold.
 #include "tests/FileIO/RapidAVI/AviFile.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SparseFile.h"
 
 #include <gtest/gtest.h>
 
@@ -27,44 +28,8 @@ private:
   const size_t m_Size;
 };
 
-// Keeps the small pieces of a file and where they lie; images are forgotten.
-class VSparseStream : public UtilsIO::IClosableStream
-{
-public:
-  using VPieces = std::map<uint64_t, VBytes>;
-
-  explicit VSparseStream( VPieces& o_rPieces ) : m_rPieces( o_rPieces ) {}
-
-  bool Read( void*, size_t ) override { return false; }
-  bool ReadBlock( void*, size_t, size_t& ) override { return false; }
-  bool IsGood() const override { return true; }
-  using UtilsIO::IClosableStream::Write;
-  bool Write( const void* i_pData, size_t i_Size ) override
-  {
-    if( i_Size < 20000 )
-    {
-      const auto* pBytes = static_cast<const uint8_t*>( i_pData );
-      m_rPieces[m_Position].assign( pBytes, pBytes + i_Size );
-    }
-    m_Position += i_Size;
-    return true;
-  }
-  bool Tell( uint64_t& o_rPosition ) override
-  {
-    o_rPosition = m_Position;
-    return true;
-  }
-  bool Seek( uint64_t i_Position ) override
-  {
-    m_Position = i_Position;
-    return true;
-  }
-  bool Close() override { return true; }
-
-private:
-  VPieces& m_rPieces;
-  uint64_t m_Position = 0;
-};
+// An index of full length is no image.
+constexpr size_t SmallestImage = 20000;
 
 class LargeAvi : public testing::Test
 {
@@ -103,8 +68,8 @@ TEST_F( LargeAvi, PositionsBeyond4GiBAreIndexed )
   Settings.m_Video = Video( IPixelFormat::ELuminance8, Side, Side );
   Settings.m_Timing.m_FramePeriodInTicks = 135000000;
   Settings.m_Audio = {};
-  VSparseStream::VPieces Pieces;
-  VRapidAVIWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<VSparseStream>( Pieces ); } );
+  TestSupport::VSparseFile::VPieces Pieces;
+  VRapidAVIWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<TestSupport::VSparseFile>( Pieces, SmallestImage ); } );
   ASSERT_TRUE( Writer.Open( "sparse" ) );
   ASSERT_TRUE( Settings.WriteHeader( Writer ) );
   for( uint64_t Key = 0; Key < 7; ++Key )
@@ -140,11 +105,11 @@ TEST_F( LargeAvi, WhatDoesNotFit32BitsIsRefusedByName )
 {
   VSettings Settings;
   Settings.m_Audio = { IAudioSampleFormat::EUInt8, 48000, 1 };
-  VSparseStream::VPieces Pieces;
+  TestSupport::VSparseFile::VPieces Pieces;
   const auto WriteSounds = [&]( const VSegmentLimits& i_rLimits, const std::vector<uint64_t>& i_rSizes )
   {
     VRapidAVIWriter Writer(
-      {}, [&]( const std::string& ) { return std::make_unique<VSparseStream>( Pieces ); }, i_rLimits );
+      {}, [&]( const std::string& ) { return std::make_unique<TestSupport::VSparseFile>( Pieces, SmallestImage ); }, i_rLimits );
     EXPECT_TRUE( Writer.Open( "sparse" ) );
     EXPECT_TRUE( Settings.WriteHeader( Writer ) );
     size_t Written = 0;

@@ -1,5 +1,6 @@
 #include "tests/FileIO/TarvoVideo/SmallFile.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SparseFile.h"
 
 #include <gtest/gtest.h>
 
@@ -171,45 +172,6 @@ TEST_F( TarvoWriter, WithoutAStreamOpenFails )
   EXPECT_FALSE( OnDisk.Open( "/no such folder/file.tvid" ) );
 }
 
-// Keeps the small pieces of a file and where they lie; images are forgotten.
-class VSparseStream : public UtilsIO::IClosableStream
-{
-public:
-  using VPieces = std::map<uint64_t, VBytes>;
-
-  explicit VSparseStream( VPieces& o_rPieces ) : m_rPieces( o_rPieces ) {}
-
-  bool Read( void*, size_t ) override { return false; }
-  bool ReadBlock( void*, size_t, size_t& ) override { return false; }
-  bool IsGood() const override { return true; }
-  using UtilsIO::IClosableStream::Write;
-  bool Write( const void* i_pData, size_t i_Size ) override
-  {
-    if( i_Size < 1000 )
-    {
-      const auto* pBytes = static_cast<const uint8_t*>( i_pData );
-      m_rPieces[m_Position].assign( pBytes, pBytes + i_Size );
-    }
-    m_Position += i_Size;
-    return true;
-  }
-  bool Tell( uint64_t& o_rPosition ) override
-  {
-    o_rPosition = m_Position;
-    return true;
-  }
-  bool Seek( uint64_t i_Position ) override
-  {
-    m_Position = i_Position;
-    return true;
-  }
-  bool Close() override { return true; }
-
-private:
-  VPieces& m_rPieces;
-  uint64_t m_Position = 0;
-};
-
 TEST( TarvoWriterOfLargeFiles, PositionsBeyond4GiBAreIndexed )
 {
   constexpr uint32_t Side = 32768;
@@ -217,8 +179,8 @@ TEST( TarvoWriterOfLargeFiles, PositionsBeyond4GiBAreIndexed )
   VideoFrameInfo Info = SmallVideo();
   Info.m_ImageWidth = Side;
   Info.m_ImageHeight = Side;
-  VSparseStream::VPieces Pieces;
-  VWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<VSparseStream>( Pieces ); } );
+  TestSupport::VSparseFile::VPieces Pieces;
+  VWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<TestSupport::VSparseFile>( Pieces ); } );
   ASSERT_TRUE( Writer.Open( "sparse" ) );
   ASSERT_TRUE( Writer.WriteHeader( Info, {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
   const VBufferList Rows( Side, Buffer( VBytes( Side ) ) );
