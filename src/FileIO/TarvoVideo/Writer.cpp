@@ -1,12 +1,9 @@
 #include "FileIO/TarvoVideo/Writer.h"
 
-#include "Core/VideoInterface/EnumTable.h"
 #include "CoreVideoUtils/FrameSize.h"
-#include "FileIO/AudioEncoding/AudioEncoding.h"
 #include "FileIO/TarvoVideo/Format.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "FileIO/WriterSupport/AttributeMaps.h"
-#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <limits>
 
@@ -30,10 +27,7 @@ void AppendSpans( std::vector<KVZ::IOutputStream::VSpan>& o_rSpans, const KVZ::V
 }
 
 VWriter::VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
-  : VWriterBase( "TarvoVideo" ),
-    m_StreamMaker( std::move( i_StreamMaker ) ),
-    m_pAllocator( std::make_shared<KVZ::IStandardBufferAllocator>( "Unnamed" ) ),
-    m_pEncoder( i_pEncoder ? std::move( i_pEncoder ) : std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software ) )
+  : VWriterBase( "TarvoVideo" ), m_StreamMaker( std::move( i_StreamMaker ) ), m_Essence( std::move( i_pEncoder ) )
 {
 }
 
@@ -53,32 +47,17 @@ bool VWriter::DoOpen( const std::string& i_rPath )
 
 bool VWriter::DoWriteHeader( const WriterSupport::VHeader& i_rHeader )
 {
-  StoreDescriptions( i_rHeader );
+  m_Essence.Store( i_rHeader );
   // A failure here shows in the block that follows, since the stream refuses it then.
   const VFixedHeader Header;
   m_pStream->Write( &Header, sizeof( Header ) );
   return WriteInternalBlock() && WriteExternalBlock( i_rHeader );
 }
 
-void VWriter::StoreDescriptions( const WriterSupport::VHeader& i_rHeader )
-{
-  m_VideoPayload = i_rHeader.m_VideoPayload;
-  m_AudioPayload = i_rHeader.m_AudioPayload;
-  m_Video = i_rHeader.m_rVideo;
-  m_Audio = i_rHeader.m_rAudio;
-  VideoEncoding::PixelFormatForPayloadFormat( m_VideoPayload, i_rHeader.m_rVideo.m_PixelFormat, m_Video.m_PixelFormat );
-  bool bConversionNeeded = false;
-  AudioEncoding::SampleFormatForPayloadFormat( m_AudioPayload, i_rHeader.m_rAudio.m_SampleFormat, m_Audio.m_SampleFormat, bConversionNeeded );
-  if( m_Audio.m_SampleFormat == KVZ::IAudioSampleFormat::EUnspecified )
-  {
-    m_Audio = {};
-  }
-}
-
 bool VWriter::WriteInternalBlock()
 {
   KVZ::IVideoAttributes Attributes;
-  if( !WriterSupport::EncodeInternalAttributes( m_Video, m_Audio, Attributes ) )
+  if( !WriterSupport::EncodeInternalAttributes( m_Essence.Video(), m_Essence.Audio(), Attributes ) )
   {
     KVZ_LOG_ERROR( Category(), "Could not encode internal attributes." );
     return false;
@@ -111,11 +90,11 @@ bool VWriter::WriteExternalBlock( const WriterSupport::VHeader& i_rHeader )
 
 bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
 {
-  if( m_pStream->HasFailed() || !Encode( io_rFrame ) )
+  if( m_pStream->HasFailed() || !m_Essence.Encode( io_rFrame, Category() ) )
   {
     return false;
   }
-  const bool bAudio = m_Audio.HasAudio();
+  const bool bAudio = m_Essence.Audio().HasAudio();
   const uint64_t AudioSum = bAudio ? KVZ::GetTotalSize( io_rFrame.m_rAudio ) : 0;
   if( !FitsDescription( io_rFrame, AudioSum ) )
   {
@@ -140,33 +119,17 @@ bool VWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
   return bVideoWritten;
 }
 
-bool VWriter::Encode( WriterSupport::VFrame& io_rFrame )
-{
-  if( !m_pEncoder->Encode( *m_pAllocator, io_rFrame.m_rVideo, io_rFrame.m_rVideoInfo, m_VideoPayload, m_Video.m_PixelFormat ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Encoding to '%s' failed.", KVZ::NameOrUnspecified( m_VideoPayload ) );
-    return false;
-  }
-  if( m_Audio.HasAudio() &&
-    !AudioEncoding::EncodeIfRequired( *m_pAllocator, io_rFrame.m_rAudio, io_rFrame.m_rAudioInfo, m_AudioPayload, m_Audio.m_SampleFormat,
-      m_Audio.m_Channels ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Encoding to '%s' failed.", KVZ::NameOrUnspecified( m_AudioPayload ) );
-    return false;
-  }
-  return true;
-}
-
 // A record carries no length of its own: one that does not match the header's description would make every reader see a wrong picture.
 bool VWriter::FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const
 {
   const uint64_t VideoBytes = KVZ::GetTotalSize( i_rFrame.m_rVideo );
-  const uint64_t StoredBytes = CoreVideoUtils::GetFrameSize( m_Video );
+  const KVZ::VideoFrameInfo& rStored = m_Essence.Video();
+  const uint64_t StoredBytes = CoreVideoUtils::GetFrameSize( rStored );
   const KVZ::VideoFrameInfo& rInfo = i_rFrame.m_rVideoInfo;
-  if( VideoBytes != StoredBytes || rInfo.m_ImageWidth != m_Video.m_ImageWidth || rInfo.m_ImageHeight != m_Video.m_ImageHeight )
+  if( VideoBytes != StoredBytes || rInfo.m_ImageWidth != rStored.m_ImageWidth || rInfo.m_ImageHeight != rStored.m_ImageHeight )
   {
     KVZ_LOG_ERROR( Category(), "Frame %1% of %2% x %3% pixels and %4% bytes does not fit the file's %5% x %6% pixels and %7% bytes.", i_rFrame.m_Key,
-      rInfo.m_ImageWidth, rInfo.m_ImageHeight, VideoBytes, m_Video.m_ImageWidth, m_Video.m_ImageHeight, StoredBytes );
+      rInfo.m_ImageWidth, rInfo.m_ImageHeight, VideoBytes, rStored.m_ImageWidth, rStored.m_ImageHeight, StoredBytes );
     return false;
   }
   if( i_AudioBytes > std::numeric_limits<uint32_t>::max() )

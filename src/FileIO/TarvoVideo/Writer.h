@@ -3,7 +3,7 @@
 #pragma once
 
 #include "Core/VideoInterface/WriterCapabilities.h"
-#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "FileIO/WriterSupport/Essence.h"
 #include "FileIO/WriterSupport/WatchedStream.h"
 #include "FileIO/WriterSupport/WriterBase.h"
 
@@ -44,24 +44,17 @@ private:
   bool DoWriteFrame( WriterSupport::VFrame& io_rFrame ) override;
   bool DoClose() override;
 
-  void StoreDescriptions( const WriterSupport::VHeader& i_rHeader );
   bool WriteInternalBlock();
   bool WriteExternalBlock( const WriterSupport::VHeader& i_rHeader );
-  bool Encode( WriterSupport::VFrame& io_rFrame );
   void CollectSpans( const WriterSupport::VFrame& i_rFrame, const uint32_t* i_pAudioLength );
   bool FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i_AudioBytes ) const;
   bool WriteIndex( WriterSupport::VWatchedStream& io_rStream ) const;
 
   const VWriterCapabilities m_Capabilities;
   const WriterSupport::VStreamMaker m_StreamMaker;
-  const std::shared_ptr<KVZ::IBufferAllocator> m_pAllocator;
-  const std::shared_ptr<VideoEncoding::VVideoFrameEncoder> m_pEncoder;
+  WriterSupport::VEssence m_Essence;
 
   std::unique_ptr<WriterSupport::VWatchedStream> m_pStream;
-  KVZ::IVideoPayload::Enum m_VideoPayload = KVZ::IVideoPayload::ENone;
-  KVZ::IAudioPayload::Enum m_AudioPayload = KVZ::IAudioPayload::ENone;
-  KVZ::VideoFrameInfo m_Video;   // as stored
-  KVZ::AudioFrameInfo m_Audio;   // as stored
   std::map<uint64_t, VRecord> m_Index;
   uint64_t m_IncompleteFrames = 0;   // without their sound
   VSpans m_VideoSpans;               // both kept for their memory
