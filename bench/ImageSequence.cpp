@@ -9,6 +9,7 @@
 #include "bench/Measuring.h"
 
 #include <boost/filesystem/operations.hpp>
+#include <boost/thread/latch.hpp>
 #include <boost/thread/thread.hpp>
 
 #include <algorithm>
@@ -101,23 +102,17 @@ double WriteSequence( const std::string& i_rFolder, const VPayloadRow& i_rPayloa
   const std::vector<std::shared_ptr<const KVZ::IBufferConst>>& i_rPictures )
 {
   VSequence Sequence( i_rFolder, i_rPayload.m_Payload );
+  boost::latch AllDone( i_rPayload.m_Frames );   // outlives the threads that count it down
   auto pThreads = std::make_shared<VideoInputHAL::VWorkerThreads>( "Bench", i_Threads );
-  VideoInputHAL::VFrameWorkers Workers( pThreads, i_rPayload.m_Frames, [] {} );
+  VideoInputHAL::VFrameWorkers Workers( pThreads, i_rPayload.m_Frames, [&AllDone] { AllDone.count_down(); } );
   const int64_t Begin = NowNanoseconds();
   for( uint64_t Key = 0; Key < i_rPayload.m_Frames; ++Key )
   {
     Workers.Add( 0, [&Sequence, &rPicture = i_rPictures[Key % i_rPictures.size()], Key] { return Sequence.Write( rPicture, Key ); } );
   }
-  std::vector<VideoInputHAL::VFrameWorkers::VDone> Done;
-  while( Done.size() < i_rPayload.m_Frames )
-  {
-    for( VideoInputHAL::VFrameWorkers::VDone& rDone : Workers.TakeDone() )
-    {
-      Done.push_back( std::move( rDone ) );
-    }
-    boost::this_thread::sleep_for( boost::chrono::microseconds( 200 ) );
-  }
+  AllDone.wait();
   const double Seconds = static_cast<double>( NowNanoseconds() - Begin ) * 1e-9;
+  const std::vector<VideoInputHAL::VFrameWorkers::VDone> Done = Workers.TakeDone();
   if( std::any_of( Done.begin(), Done.end(), []( const auto& i_rDone ) { return !i_rDone.m_Outcome.m_bWritten; } ) )
   {
     throw std::runtime_error( "An image could not be written." );
