@@ -7,6 +7,7 @@
 #include "bench/Figures.h"
 #include "bench/Measuring.h"
 #include "bench/PlainFile.h"
+#include "tests/support/SparseFile.h"
 
 #include <boost/filesystem/operations.hpp>
 
@@ -153,47 +154,12 @@ private:
   std::vector<std::shared_ptr<const KVZ::IBufferConst>> m_Images;
 };
 
-// Takes all and keeps nothing.
-class VNowhere : public UtilsIO::IClosableStream
-{
-public:
-  bool Read( void*, size_t ) override { return false; }
-  bool ReadBlock( void*, size_t, size_t& ) override { return false; }
-  bool IsGood() const override { return true; }
-  bool Write( const void*, size_t i_Size ) override
-  {
-    m_Position += i_Size;
-    return true;
-  }
-  bool Write( const std::vector<VSpan>& i_rSpans ) override
-  {
-    for( const VSpan& rSpan : i_rSpans )
-    {
-      m_Position += rSpan.second;
-    }
-    return true;
-  }
-  bool Tell( uint64_t& o_rPosition ) override
-  {
-    o_rPosition = m_Position;
-    return true;
-  }
-  bool Seek( uint64_t i_Position ) override
-  {
-    m_Position = i_Position;
-    return true;
-  }
-  bool Close() override { return true; }
-
-private:
-  uint64_t m_Position = 0;
-};
-
 // With sound: it has entries of its own in most tables. The memory is the most that was taken at once, while the tables grew.
 std::vector<VFigure> MeasureManyFrames( const VMovieCase& i_rCase )
 {
+  TestSupport::VSparseFile::VPieces Pieces;   // stays empty: from 0 bytes on all counts as an image
   const std::unique_ptr<KVZ::IVideoWriter> pWriter = MakeWriter( i_rCase.m_Container,
-    []( const std::string& ) { return std::make_unique<VNowhere>(); } );
+    [&Pieces]( const std::string& ) { return std::make_unique<TestSupport::VSparseFile>( Pieces, 0 ); } );
   KVZ::VFrameSet Frame{ std::make_shared<KVZ::IStandardBuffer>( 16 * 2 * 2 ), MakeVideoInfo( 16, 2 ), { std::make_shared<KVZ::IStandardBuffer>( 8 ) },
     { KVZ::IAudioSampleFormat::EInt16, 48000, 1 } };
   WriteHeader( *pWriter, i_rCase, "nowhere", Frame );
