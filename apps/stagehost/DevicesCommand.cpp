@@ -17,11 +17,10 @@ using StageHost::VDeviceInfo;
 namespace
 {
 
-constexpr double PollSeconds = 0.02;
 constexpr double RateSeconds = 2.0;
 constexpr double ReactionSeconds = 0.1;
 
-struct VOptions
+struct VDevicesOptions
 {
   VSessionOptions m_Session;
   bool m_bJson = false;
@@ -79,7 +78,7 @@ void WaitForRate( VHostSession& i_rSession, const std::vector<VDeviceInfo>& i_rD
   WaitUninterrupted( ReactionSeconds );
 }
 
-int Run( const VOptions& i_rOptions )
+int Run( const VDevicesOptions& i_rOptions )
 {
   VHostSession Session;
   if( const int Result = Session.Start( i_rOptions.m_Session ) )
@@ -114,7 +113,7 @@ int Run( const VOptions& i_rOptions )
 VCommand AddDevicesCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "devices", "List the capture devices and what comes into them" );
-  auto pOptions = std::make_shared<VOptions>();
+  auto pOptions = std::make_shared<VDevicesOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print one JSON document" );
   return [pOptions] { return Run( *pOptions ); };

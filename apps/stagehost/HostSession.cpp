@@ -15,7 +15,6 @@ using StageHost::VDeviceInfo;
 namespace
 {
 
-constexpr double PollSeconds = 0.02;
 // Real drivers announce their cards within this time.
 constexpr double ArrivalSeconds = 1.5;
 constexpr double SignalSeconds = 5.0;
@@ -74,7 +73,8 @@ bool VHostSession::ChooseSettingsFile( std::string& o_rPath ) const
   {
     o_rPath = StageHost::DefaultSettingsPath();
   }
-  else if( !o_rPath.empty() && !m_Options.m_bMayMakeSettings && !boost::filesystem::exists( o_rPath, Error ) )
+  else if( !o_rPath.empty() && !m_Options.m_bMayMakeSettings &&
+    boost::filesystem::status( o_rPath, Error ).type() == boost::filesystem::file_not_found )
   {
     Complain( "There is no settings file \"" + o_rPath + "\"." );
     return false;

@@ -22,7 +22,7 @@ using TarvoVideo::VReader;
 namespace
 {
 
-struct VOptions
+struct VInspectOptions
 {
   std::string m_Path;
   bool m_bFrames = false;
@@ -112,7 +112,7 @@ std::string AudioText( const KVZ::AudioFrameInfo& i_rAudio )
 }
 
 // The head of the report. False with an error in the reader.
-bool PrintSummary( VReader& io_rReader, const VOptions& i_rOptions )
+bool PrintSummary( VReader& io_rReader, const VInspectOptions& i_rOptions )
 {
   uint64_t Frames = 0;
   if( !io_rReader.CountFrames( Frames ) )
@@ -161,7 +161,7 @@ void PrintRows( VReader& io_rReader )
   }
 }
 
-bool PrintJson( VReader& io_rReader, const VOptions& i_rOptions )
+bool PrintJson( VReader& io_rReader, const VInspectOptions& i_rOptions )
 {
   uint64_t Frames = 0;
   if( !io_rReader.CountFrames( Frames ) )
@@ -201,7 +201,7 @@ std::string WhyNoFile( const std::string& i_rPath )
   return boost::filesystem::is_regular_file( Status ) ? std::string() : "This is no file.";
 }
 
-int Run( const VOptions& i_rOptions )
+int Run( const VInspectOptions& i_rOptions )
 {
   const std::string WhyNot = WhyNoFile( i_rOptions.m_Path );
   if( !WhyNot.empty() )
@@ -232,7 +232,7 @@ int Run( const VOptions& i_rOptions )
 VCommand AddInspectCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "inspect", "Show what a tvid file holds" );
-  auto pOptions = std::make_shared<VOptions>();
+  auto pOptions = std::make_shared<VInspectOptions>();
   rCommand.add_option( "FILE", pOptions->m_Path, "A .tvid file" )->required();
   rCommand.add_flag( "--frames", pOptions->m_bFrames, "Add a row for each frame, with CRC-32 of video and audio" );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print one JSON document" );

@@ -6,6 +6,9 @@ void InstallInterrupt();
 
 bool IsInterrupted();
 
+// How long a command that polls waits between two looks.
+inline constexpr double PollSeconds = 0.02;
+
 // Waits, at most so long, and returns earlier when the first signal comes. False when it came.
 bool WaitUninterrupted( double i_Seconds );
 

@@ -37,3 +37,6 @@ inline CLI::Validator WholeNumberCheck( double i_Least, double i_Most, const std
   };
   return CLI::Validator( Check, "", "" );
 }
+
+// How long something runs: up to days, so that times in ticks stay far from their ends.
+inline CLI::Validator SecondsCheck() { return NumberCheck( 0.0, 1e6, "seconds above 0, up to 1000000", ELowerEnd::Excluded ); }

@@ -17,10 +17,9 @@ using StageHost::VSettingInfo;
 namespace
 {
 
-constexpr double PollSeconds = 0.02;
-constexpr double SettleSeconds = 3.0;
+constexpr double AnswerSeconds = 3.0;
 
-struct VOptions
+struct VParamsOptions
 {
   VSessionOptions m_Session;
   bool m_bJson = false;
@@ -28,7 +27,7 @@ struct VOptions
   std::string m_Value;
 };
 
-using VVerb = int ( * )( VHostSession&, const VOptions& );
+using VVerb = int ( * )( VHostSession&, const VParamsOptions& );
 
 // What is no UTF-8 is shown all the same.
 std::string Dump( const nlohmann::ordered_json& i_rJson, int i_Indent )
@@ -36,7 +35,7 @@ std::string Dump( const nlohmann::ordered_json& i_rJson, int i_Indent )
   return i_rJson.dump( i_Indent, ' ', false, nlohmann::ordered_json::error_handler_t::replace );
 }
 
-int List( VHostSession& i_rSession, const VOptions& i_rOptions )
+int List( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 {
   const std::vector<VSettingInfo> Settings = i_rSession.Settings().List();
   const std::vector<VDataPath> Saved = i_rSession.SettingsFile().GetPaths();
@@ -49,7 +48,7 @@ int List( VHostSession& i_rSession, const VOptions& i_rOptions )
   return ExitComplete;
 }
 
-int Get( VHostSession& i_rSession, const VOptions& i_rOptions )
+int Get( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 {
   const auto Setting = i_rSession.Settings().Find( i_rOptions.m_Path );
   if( !Setting )
@@ -64,7 +63,7 @@ int Get( VHostSession& i_rSession, const VOptions& i_rOptions )
 // False where the owner of a value has not answered in time.
 bool AwaitAnswer( VHostSession& i_rSession, const std::string& i_rPath )
 {
-  const double Until = i_rSession.Host().Time().Now() + SettleSeconds;
+  const double Until = i_rSession.Host().Time().Now() + AnswerSeconds;
   const auto IsAnswered = [&]
   {
     const auto Setting = i_rSession.Settings().Find( i_rPath );
@@ -81,7 +80,7 @@ bool AwaitAnswer( VHostSession& i_rSession, const std::string& i_rPath )
 }
 
 // Shows the value as its owner has settled it, once it is in the file.
-int Set( VHostSession& i_rSession, const VOptions& i_rOptions )
+int Set( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 {
   std::string Error;
   if( !i_rSession.Settings().Set( i_rOptions.m_Path, i_rOptions.m_Value, Error ) )
@@ -107,12 +106,12 @@ std::vector<VDataPath> SavedBelow( VHostSession& i_rSession, const std::string& 
 {
   std::vector<VDataPath> Paths = i_rSession.SettingsFile().GetPaths();
   const VDataPath Branch = VDataPath::FromString( i_rPath );
-  Paths.erase( std::remove_if( Paths.begin(), Paths.end(), [&]( const VDataPath& i_rSaved ) { return !i_rSaved.BeginsWith( Branch ); } ),
-    Paths.end() );
+  const auto IsElsewhere = [&]( const VDataPath& i_rSaved ) { return Branch.IsEmpty() || !i_rSaved.BeginsWith( Branch ); };
+  Paths.erase( std::remove_if( Paths.begin(), Paths.end(), IsElsewhere ), Paths.end() );
   return Paths;
 }
 
-int Reset( VHostSession& i_rSession, const VOptions& i_rOptions )
+int Reset( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 {
   std::string Error;
   const std::vector<VDataPath> Saved = SavedBelow( i_rSession, i_rOptions.m_Path );
@@ -127,6 +126,13 @@ int Reset( VHostSession& i_rSession, const VOptions& i_rOptions )
     Complain( Error );
     return ExitFailed;
   }
+  for( const VDataPath& rPath : Saved )
+  {
+    if( std::count( Reset.begin(), Reset.end(), rPath ) == 0 )
+    {
+      Complain( rPath.ToString() + " is no longer saved." );
+    }
+  }
   for( const VDataPath& rPath : Reset )
   {
     AwaitAnswer( i_rSession, rPath.ToString() );
@@ -139,7 +145,7 @@ int Reset( VHostSession& i_rSession, const VOptions& i_rOptions )
   return ExitComplete;
 }
 
-int Watch( VHostSession& i_rSession, const VOptions& i_rOptions )
+int Watch( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 {
   StageHost::VSettingsWatcher Watcher( i_rSession.Host().Parameters(), i_rOptions.m_Path );
   if( Watcher.Count() == 0 )
@@ -158,7 +164,7 @@ int Watch( VHostSession& i_rSession, const VOptions& i_rOptions )
   return ExitComplete;
 }
 
-int Run( const VOptions& i_rOptions, VVerb i_pVerb )
+int Run( const VParamsOptions& i_rOptions, VVerb i_pVerb )
 {
   VSessionOptions SessionOptions = i_rOptions.m_Session;
   SessionOptions.m_bMayMakeSettings = i_pVerb == &Set || i_pVerb == &Reset;
@@ -191,7 +197,7 @@ constexpr std::array Verbs = { VVerbRow{ "list", "All settings", &List }, VVerbR
 VCommand AddParamsCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "params", "List, read, change and watch the settings of devices" );
-  auto pOptions = std::make_shared<VOptions>();
+  auto pOptions = std::make_shared<VParamsOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print one JSON document; with watch, one a line" );
   rCommand.require_subcommand( 0, 1 );

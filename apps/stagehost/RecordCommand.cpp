@@ -26,17 +26,13 @@ using StageHost::VDeviceSettings;
 namespace
 {
 
-constexpr double PollSeconds = 0.02;
 constexpr double ReadySeconds = 10.0;
 constexpr double SettleSeconds = 5.0;
-
-// Days of recording; times in ticks stay far from their ends.
-constexpr double LongestSeconds = 1e6;
 constexpr double MostFrames = 1e8;
 constexpr double LongestPreRoll = 3600.0;
 constexpr double MostMemoryMiB = 1048576.0;
 
-struct VOptions
+struct VRecordOptions
 {
   VSessionOptions m_Session;
   VReportOptions m_Report;
@@ -51,7 +47,7 @@ struct VOptions
 };
 
 // Before anything is started: what can be seen to be wrong from the command line and the file system.
-int CheckOutput( const VOptions& i_rOptions )
+int CheckOutput( const VRecordOptions& i_rOptions )
 {
   boost::system::error_code Error;
   boost::filesystem::create_directories( i_rOptions.m_Output, Error );
@@ -114,7 +110,7 @@ bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, cons
 }
 
 // While the device is stopped, so that the next buffer session holds frames of these settings alone.
-int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const VDeviceInfo& i_rDevice )
+int ApplySettings( VHostSession& i_rSession, const VRecordOptions& i_rOptions, const VDeviceInfo& i_rDevice )
 {
   const VRecordFormat Format( i_rOptions.m_Format, i_rDevice );
   std::string Refusal = Format.WhyRefused();
@@ -154,7 +150,7 @@ int ApplySettings( VHostSession& i_rSession, const VOptions& i_rOptions, const V
   return ExitComplete;
 }
 
-int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+int CheckTargets( VHostSession& i_rSession, const VRecordOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VCaptureTargetOptions Targets;
   Targets.m_Folder = i_rOptions.m_Output;
@@ -174,7 +170,7 @@ int CheckTargets( VHostSession& i_rSession, const VOptions& i_rOptions, const st
   return ExitComplete;
 }
 
-StageHost::VRecordingRequest MakeRequest( const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+StageHost::VRecordingRequest MakeRequest( const VRecordOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VRecordingRequest Request;
   for( const VDeviceInfo& rDevice : i_rDevices )
@@ -209,7 +205,7 @@ int ExitCodeOf( const std::vector<StageHost::VDeviceOutcome>& i_rOutcomes )
 }
 
 // What each file can hold, told where it is little.
-std::vector<VLimitNotice> FindLimits( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+std::vector<VLimitNotice> FindLimits( VHostSession& i_rSession, const VRecordOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   std::vector<VLimitNotice> Limits;
   for( const VDeviceInfo& rDevice : i_rDevices )
@@ -227,7 +223,7 @@ std::vector<VLimitNotice> FindLimits( VHostSession& i_rSession, const VOptions& 
   return Limits;
 }
 
-int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+int RunRecording( VHostSession& i_rSession, const VRecordOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   StageHost::VRecording Recording( i_rSession.Host().Engine(), i_rSession.Host().Targets(), i_rSession.Host().Time() );
   const StageHost::VRecordingRequest Request = MakeRequest( i_rOptions, i_rDevices );
@@ -263,7 +259,7 @@ int RunRecording( VHostSession& i_rSession, const VOptions& i_rOptions, const st
   return Report.Print( Outcomes ) ? ExitCodeOf( Outcomes ) : ExitFailed;
 }
 
-int Run( const VOptions& i_rOptions )
+int Run( const VRecordOptions& i_rOptions )
 {
   if( ( i_rOptions.m_Frames != 0 ) == ( i_rOptions.m_Seconds > 0.0 ) )
   {
@@ -311,15 +307,13 @@ int Run( const VOptions& i_rOptions )
 VCommand AddRecordCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "record", "Record devices to files" );
-  auto pOptions = std::make_shared<VOptions>();
+  auto pOptions = std::make_shared<VRecordOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   pOptions->m_Session.m_bLeaveOutDisabled = true;
   rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to record, such as vi:0; all that are enabled when absent" )
     ->type_name( "URN" )
     ->allow_extra_args( false );
-  rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )
-    ->type_name( "S" )
-    ->check( NumberCheck( 0.0, LongestSeconds, "seconds above 0, up to 1000000", ELowerEnd::Excluded ) );
+  rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to record" )->type_name( "S" )->check( SecondsCheck() );
   rCommand.add_option( "--frames", pOptions->m_Frames, "How many frames of each device to record" )
     ->type_name( "N" )
     ->check( WholeNumberCheck( 2.0, MostFrames, "a whole number from 2 to 100000000" ) );

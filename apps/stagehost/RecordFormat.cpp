@@ -21,8 +21,6 @@ using KVZ::IPixelFormat;
 using KVZ::IVideoContainer;
 using KVZ::IVideoPayload;
 
-constexpr uint32_t MostChannels = 16;
-
 template<class TEnum>
 struct VWord
 {

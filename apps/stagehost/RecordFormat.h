@@ -15,6 +15,9 @@ namespace CLI
 class App;
 }
 
+// Of sound, on any card.
+inline constexpr uint32_t MostChannels = 16;
+
 struct VFormatOptions
 {
   // Empty words leave the choice to the device's settings. A payload that the container does not take gives way to the first that it takes,

@@ -10,8 +10,6 @@
 namespace
 {
 
-constexpr uint32_t MostChannels = 16;
-
 template<class TEnum>
 TEnum ReadSetting( VHostSession& i_rSession, const std::string& i_rURN, const char* i_pKey )
 {

@@ -21,10 +21,9 @@ namespace
 {
 
 constexpr double RefreshSeconds = 0.25;
-constexpr double LongestSeconds = 1e6;
 constexpr const char* SupplyingNode = "VideoInputDataSource";
 
-struct VOptions
+struct VWatchOptions
 {
   VSessionOptions m_Session;
   double m_Seconds = 0.0;   // 0: until interrupted
@@ -159,7 +158,7 @@ bool WatchUntilDone( VHostSession& i_rSession, const std::vector<VWatch>& i_rWat
   return true;
 }
 
-int Watch( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
+int Watch( VHostSession& i_rSession, const VWatchOptions& i_rOptions, const std::vector<VDeviceInfo>& i_rDevices )
 {
   std::vector<VWatch> Watches = MakeGraph( i_rSession.Host(), i_rDevices, !i_rOptions.m_Snapshots.empty() );
   if( Watches.empty() )
@@ -180,7 +179,7 @@ int Watch( VHostSession& i_rSession, const VOptions& i_rOptions, const std::vect
   return Report.Print( Watched ) && bWritten && bHealthy ? ExitCodeOf( Watched ) : ExitFailed;
 }
 
-int Run( const VOptions& i_rOptions )
+int Run( const VWatchOptions& i_rOptions )
 {
   if( const int Result = i_rOptions.m_Snapshots.empty() ? ExitComplete : CheckSnapshotFolder( i_rOptions.m_Snapshots ) )
   {
@@ -200,7 +199,7 @@ int Run( const VOptions& i_rOptions )
 VCommand AddWatchCommand( CLI::App& io_rApp )
 {
   CLI::App& rCommand = *io_rApp.add_subcommand( "watch", "Follow devices live: frame rate, latency, dropped frames" );
-  auto pOptions = std::make_shared<VOptions>();
+  auto pOptions = std::make_shared<VWatchOptions>();
   AddSessionOptions( rCommand, pOptions->m_Session );
   pOptions->m_Session.m_bLeaveOutDisabled = true;
   rCommand.add_option( "--device", pOptions->m_Session.m_DeviceURNs, "A device to watch, such as vi:0; all that are enabled when absent" )
@@ -208,7 +207,7 @@ VCommand AddWatchCommand( CLI::App& io_rApp )
     ->allow_extra_args( false );
   rCommand.add_option( "--seconds", pOptions->m_Seconds, "How long to watch; until interrupted when absent" )
     ->type_name( "S" )
-    ->check( NumberCheck( 0.0, LongestSeconds, "seconds above 0, up to 1000000", ELowerEnd::Excluded ) );
+    ->check( SecondsCheck() );
   rCommand.add_option( "--snapshot", pOptions->m_Snapshots, "Keep the last image of each device there, as LABEL.png" )->type_name( "DIR" );
   rCommand.add_flag( "--json", pOptions->m_bJson, "Print the final figures as one JSON document" );
   return [pOptions] { return Run( *pOptions ); };
