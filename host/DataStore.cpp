@@ -46,6 +46,18 @@ void ForEachInBranch( VDataStoreNode& i_rNode, const TFunction& i_rFunction )
   }
 }
 
+// Adds the paths of the nodes that have a value.
+auto PathCollector( std::vector<VDataPath>& o_rPaths )
+{
+  return [&o_rPaths]( const VDataStoreNode& i_rNode )
+  {
+    if( i_rNode.HasValue() )
+    {
+      o_rPaths.push_back( i_rNode.Path() );
+    }
+  };
+}
+
 bool HoldsAnything( const VDataStoreNode& i_rNode )
 {
   const auto HoldsChild = []( const auto& i_rChild ) { return !i_rChild.second->IsWildcard() && HoldsAnything( *i_rChild.second ); };
@@ -122,28 +134,15 @@ bool VDataStore::GetChildNames( const VDataAddress& i_rAddress, std::vector<std:
 bool VDataStore::GetValuePaths( const VDataAddress& i_rAddress, std::vector<VDataPath>& o_rPaths )
 {
   o_rPaths.clear();
-  const auto AddPath = [&o_rPaths]( const VDataStoreNode& i_rNode )
-  {
-    if( i_rNode.HasValue() )
-    {
-      o_rPaths.push_back( i_rNode.Path() );
-    }
-  };
-  ForEachMatch( m_Root, i_rAddress.Path().Segments(), 0, [&AddPath]( VDataStoreNode& i_rNode ) { ForEachInBranch( i_rNode, AddPath ); } );
+  ForEachMatch( m_Root, i_rAddress.Path().Segments(), 0,
+    [&o_rPaths]( VDataStoreNode& i_rNode ) { ForEachInBranch( i_rNode, PathCollector( o_rPaths ) ); } );
   return !o_rPaths.empty();
 }
 
 bool VDataStore::GetMatches( const VDataAddress& i_rAddress, std::vector<VDataPath>& o_rPaths )
 {
   o_rPaths.clear();
-  const auto AddPath = [&o_rPaths]( const VDataStoreNode& i_rNode )
-  {
-    if( i_rNode.HasValue() )
-    {
-      o_rPaths.push_back( i_rNode.Path() );
-    }
-  };
-  ForEachMatch( m_Root, i_rAddress.Path().Segments(), 0, AddPath );
+  ForEachMatch( m_Root, i_rAddress.Path().Segments(), 0, PathCollector( o_rPaths ) );
   return !o_rPaths.empty();
 }
 
