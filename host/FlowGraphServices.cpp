@@ -265,30 +265,28 @@ uint32_t VFlowGraphServices::GlobalItems( VFlowLimit i_Limit, KVZ::VFlowItemList
   return Result;
 }
 
-uint32_t VFlowGraphServices::WaitInputConnected( uint32_t i_Input, VFlowLimit i_Limit )
+template<class TPort>
+uint32_t VFlowGraphServices::WaitConnected( const std::vector<TPort>& i_rPorts, uint32_t i_Index, VFlowLimit i_Limit )
 {
   const VDeadline Deadline( i_Limit );
   VLock Lock( m_rWiring.m_Mutex );
-  if( i_Input >= m_rNode.m_Inputs.size() )
+  if( i_Index >= i_rPorts.size() )
   {
     return EFlowResult::UnknownPort;
   }
-  const uint32_t Result = Wait( Deadline, [&]() NO_LOCK_ANALYSIS { return m_rWiring.IsConnected( m_rNode.m_Inputs[i_Input] ); } );
+  const uint32_t Result = Wait( Deadline, [&]() NO_LOCK_ANALYSIS { return m_rWiring.IsConnected( i_rPorts[i_Index] ); } );
   m_rNode.m_bRewired = false;
   return Result;
 }
 
+uint32_t VFlowGraphServices::WaitInputConnected( uint32_t i_Input, VFlowLimit i_Limit )
+{
+  return WaitConnected( m_rNode.m_Inputs, i_Input, i_Limit );
+}
+
 uint32_t VFlowGraphServices::WaitOutputConnected( uint32_t i_Output, VFlowLimit i_Limit )
 {
-  const VDeadline Deadline( i_Limit );
-  VLock Lock( m_rWiring.m_Mutex );
-  if( i_Output >= m_rNode.m_Outputs.size() )
-  {
-    return EFlowResult::UnknownPort;
-  }
-  const uint32_t Result = Wait( Deadline, [&]() NO_LOCK_ANALYSIS { return m_rWiring.IsConnected( m_rNode.m_Outputs[i_Output] ); } );
-  m_rNode.m_bRewired = false;
-  return Result;
+  return WaitConnected( m_rNode.m_Outputs, i_Output, i_Limit );
 }
 
 namespace

@@ -35,6 +35,8 @@ private:
   // Sleeps until the predicate holds. Ok, Stopping, which comes first, or WouldBlock.
   template<class TPredicate>
   uint32_t Wait( const VDeadline& i_rDeadline, TPredicate i_Predicate ) NO_LOCK_ANALYSIS;
+  template<class TPort>
+  uint32_t WaitConnected( const std::vector<TPort>& i_rPorts, uint32_t i_Index, KVZ::VFlowLimit i_Limit );
   uint64_t BeginCall();
   uint32_t SleepInCall( const VDeadline& i_rDeadline, bool i_bRewirable );
   bool AreInputs( const std::vector<uint32_t>& i_rInputs ) const { return AreBelow( i_rInputs, m_rNode.m_Inputs.size() ); }
