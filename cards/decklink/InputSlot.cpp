@@ -12,6 +12,33 @@ namespace
 
 constexpr int64_t TicksPerSecond = 135000000;
 
+// Answers QueryInterface for an object with one interface.
+template<class TInterface>
+HRESULT GiveInterface( TInterface* i_pObject, bool i_bKnown, void** o_ppObject )
+{
+  if( !o_ppObject )
+  {
+    return E_POINTER;
+  }
+  *o_ppObject = i_bKnown ? i_pObject : nullptr;
+  if( i_bKnown )
+  {
+    i_pObject->AddRef();
+  }
+  return i_bKnown ? S_OK : E_NOINTERFACE;
+}
+
+HRESULT GiveTimes( int64_t i_Time, int64_t i_Duration, int64_t i_TimeScale, int64_t* o_pTime, int64_t* o_pDuration )
+{
+  if( !o_pTime || !o_pDuration || i_TimeScale <= 0 )
+  {
+    return i_TimeScale <= 0 ? E_INVALIDARG : E_POINTER;
+  }
+  *o_pTime = ToScale( i_Time, i_TimeScale );
+  *o_pDuration = ToScale( i_Duration, i_TimeScale );
+  return S_OK;
+}
+
 }
 
 int64_t ToScale( int64_t i_Ticks, int64_t i_Scale )
@@ -21,17 +48,8 @@ int64_t ToScale( int64_t i_Ticks, int64_t i_Scale )
 
 HRESULT VInputFrame::QueryInterface( REFIID i_Id, void** o_ppObject )
 {
-  if( !o_ppObject )
-  {
-    return E_POINTER;
-  }
   const bool bKnown = i_Id == IID_IDeckLinkVideoInputFrame || i_Id == IID_IDeckLinkVideoFrame || i_Id == IID_IUnknown;
-  *o_ppObject = bKnown ? static_cast<IDeckLinkVideoInputFrame*>( this ) : nullptr;
-  if( bKnown )
-  {
-    AddRef();
-  }
-  return bKnown ? S_OK : E_NOINTERFACE;
+  return GiveInterface<IDeckLinkVideoInputFrame>( this, bKnown, o_ppObject );
 }
 
 ULONG VInputFrame::Release()
@@ -81,39 +99,18 @@ HRESULT VInputFrame::GetAncillaryData( IDeckLinkVideoFrameAncillary** o_ppAncill
 
 HRESULT VInputFrame::GetStreamTime( int64_t* o_pFrameTime, int64_t* o_pFrameDuration, int64_t i_TimeScale )
 {
-  if( !o_pFrameTime || !o_pFrameDuration || i_TimeScale <= 0 )
-  {
-    return i_TimeScale <= 0 ? E_INVALIDARG : E_POINTER;
-  }
-  *o_pFrameTime = ToScale( m_rSlot.m_Times.m_Stream, i_TimeScale );
-  *o_pFrameDuration = ToScale( m_rSlot.m_Times.m_Duration, i_TimeScale );
-  return S_OK;
+  return GiveTimes( m_rSlot.m_Times.m_Stream, m_rSlot.m_Times.m_Duration, i_TimeScale, o_pFrameTime, o_pFrameDuration );
 }
 
 HRESULT VInputFrame::GetHardwareReferenceTimestamp( int64_t i_TimeScale, int64_t* o_pFrameTime, int64_t* o_pFrameDuration )
 {
-  if( !o_pFrameTime || !o_pFrameDuration || i_TimeScale <= 0 )
-  {
-    return i_TimeScale <= 0 ? E_INVALIDARG : E_POINTER;
-  }
-  *o_pFrameTime = ToScale( m_rSlot.m_Times.m_Hardware, i_TimeScale );
-  *o_pFrameDuration = ToScale( m_rSlot.m_Times.m_Duration, i_TimeScale );
-  return S_OK;
+  return GiveTimes( m_rSlot.m_Times.m_Hardware, m_rSlot.m_Times.m_Duration, i_TimeScale, o_pFrameTime, o_pFrameDuration );
 }
 
 HRESULT VInputPacket::QueryInterface( REFIID i_Id, void** o_ppObject )
 {
-  if( !o_ppObject )
-  {
-    return E_POINTER;
-  }
   const bool bKnown = i_Id == IID_IDeckLinkAudioInputPacket || i_Id == IID_IUnknown;
-  *o_ppObject = bKnown ? static_cast<IDeckLinkAudioInputPacket*>( this ) : nullptr;
-  if( bKnown )
-  {
-    AddRef();
-  }
-  return bKnown ? S_OK : E_NOINTERFACE;
+  return GiveInterface<IDeckLinkAudioInputPacket>( this, bKnown, o_ppObject );
 }
 
 ULONG VInputPacket::Release()
