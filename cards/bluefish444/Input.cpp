@@ -232,13 +232,11 @@ void VBluefishInput::OnFrame( const VSignalFrame& i_rFrame )
   HoldForClient();
   VPictureFormat Format;
   VFramePointer pFrame;
-  bool bSignal = i_rFrame.m_bSignal;
-  if( PlanFrame( i_rFrame, Format, pFrame ) && !m_Source.m_pContent->Take( i_rFrame, Format, *pFrame ) )
+  if( PlanFrame( i_rFrame, Format, pFrame ) && !( m_bShown = m_Source.m_pContent->Take( i_rFrame, Format, *pFrame ) ) )
   {
-    bSignal = false;   // a clip that has ended
     pFrame.reset();
   }
-  PassSync( i_rFrame, bSignal, pFrame );
+  PassSync( i_rFrame, i_rFrame.m_bSignal && m_bShown, pFrame );
 }
 
 void VBluefishInput::HoldForClient() NO_LOCK_ANALYSIS

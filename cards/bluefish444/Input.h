@@ -84,6 +84,7 @@ private:
 
   const uint32_t m_Index;
   const VSignalSource m_Source;
+  bool m_bShown = true;   // what was last asked for was there: it is no more when a clip has ended. Card's thread
 
   mutable boost::mutex m_Mutex;
   boost::condition_variable m_Sync;
