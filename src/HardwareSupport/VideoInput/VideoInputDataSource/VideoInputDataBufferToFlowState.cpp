@@ -62,13 +62,14 @@ KVZ::VFlowItemPtr VVideoInputDataBufferToFlowState::MakeAudio( const SyncSystem:
 
 KVZ::VFlowItemPtr VVideoInputDataBufferToFlowState::MakeCamera( const SyncSystem::VFrameRecord& i_rRecord ) const
 {
-  const auto pDevice = m_pDeviceManager ? m_pDeviceManager->GetDevice( static_cast<uint32_t>( FrameOf( i_rRecord ).m_DeviceIndex ) ) : nullptr;
+  const int32_t DeviceIndex = FrameOf( i_rRecord ).m_DeviceIndex;
+  const auto pDevice = m_pDeviceManager ? m_pDeviceManager->GetDevice( static_cast<uint32_t>( DeviceIndex ) ) : nullptr;
   if( !pDevice )
   {
     throw Flow2Utils::VFlowException( "Device identifier not found." );
   }
   auto pItem = m_rServices.CreateItemOf<KVZ::VFlowCameraHardware>( KVZ::FlowLabels::CameraHardware );
-  pItem->m_DeviceURN = pDevice->GetDeviceURN();
+  pItem->m_DeviceURN = MakeDeviceURN( DeviceIndex );   // not asked of the device: it may be busy with its next frame, and answer only after that
   pItem->m_DeviceName = pDevice->GetDeviceName();
   pItem->m_Tick = i_rRecord.m_Tick;
   pItem->m_Period = i_rRecord.m_Period;

@@ -170,7 +170,7 @@ bool VVideoInputDataSource::BeginCapture( const KVZ::ICaptureHeader& i_rHeader,
   const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>& i_pInfo, uint32_t, std::vector<SyncSystem::VCaptureError>& io_rErrors )
 {
   StopClient();
-  const std::string URN = m_pDevice->GetDeviceURN();
+  const std::string URN = GetSourceName();
   std::vector<VCaptureTarget> Targets;
   for( const int32_t Container : m_pCaptureTargets ? m_pCaptureTargets->GetContainers( URN ) : std::vector<int32_t>() )
   {
@@ -212,7 +212,7 @@ void VVideoInputDataSource::StartClient( const KVZ::ICaptureHeader& i_rHeader,
   Settings.m_pPostalService = m_Options.m_MakeWriterService ? m_Options.m_MakeWriterService() : nullptr;
   Settings.m_pFrameService = m_Options.m_MakeFrameService ? m_Options.m_MakeFrameService() : nullptr;
   const auto pClient = std::make_shared<VVideoInputBufferClient>( std::move( Settings ) );
-  pClient->AddDevice( { m_pDevice->GetDeviceURN(), m_pDevice->GetManufacturerName(), m_pDevice->GetDriverName(), m_pDevice->GetDeviceName() } );
+  pClient->AddDevice( { GetSourceName(), m_pDevice->GetManufacturerName(), m_pDevice->GetDriverName(), m_pDevice->GetDeviceName() } );
   for( const VCaptureTarget& rTarget : i_rTargets )
   {
     pClient->AddFile( rTarget );

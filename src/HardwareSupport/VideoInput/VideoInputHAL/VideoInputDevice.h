@@ -85,6 +85,7 @@ public:
   virtual VEventCallback& GetTimecodeChangedCallback() = 0;
   virtual void SetDataCallback( std::shared_ptr<IVideoInputDataCallback> i_pCallback ) = 0;   // kept weakly
   virtual void SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) = 0;
+  // The three names are fixed, and known at once: also while the device is busy with a frame, when all else may wait for its end.
   virtual std::string GetManufacturerName() const = 0;
   virtual std::string GetDriverName() const = 0;
   virtual std::string GetDeviceName() const = 0;

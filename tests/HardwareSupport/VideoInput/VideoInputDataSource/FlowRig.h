@@ -26,9 +26,10 @@ class VFlowRig : public VVideoRig
 public:
   using VVideoRig::VVideoRig;
 
-  std::shared_ptr<VTestVideoSource> MakeManaged()
+  std::shared_ptr<VTestVideoSource> MakeManaged() { return MakeManaged( m_pDevice ); }
+  std::shared_ptr<VTestVideoSource> MakeManaged( const std::shared_ptr<VideoInputHAL::IVideoInputDevice>& i_pDevice )
   {
-    std::vector<VideoInputHAL::VDriverMaker> Makers = { [pDevice = m_pDevice] { return std::make_shared<VOneDeviceDriver>( pDevice ); } };
+    std::vector<VideoInputHAL::VDriverMaker> Makers = { [i_pDevice] { return std::make_shared<VOneDeviceDriver>( i_pDevice ); } };
     m_pManager = KVZ::MakeShared<VideoInputHAL::VVideoInputDeviceManager>( std::move( Makers ) );
     m_pManager->StartDiscovery();
     m_pFrames = std::make_shared<VideoInputHAL::VVideoInputDataSourceAllocator>( m_Memory.m_pAllocator );
@@ -38,7 +39,7 @@ public:
     Options.m_pWriterFactory = pFactory;
     Options.m_pPostalService = m_pStrand;
     Options.m_MakeWriterService = [pService = m_pWriterService] { return pService; };
-    const auto pSource = KVZ::MakeShared<VTestVideoSource>( m_pManager, m_pDevice, m_pFrames, nullptr, nullptr, m_pTargets, m_pTime, Options );
+    const auto pSource = KVZ::MakeShared<VTestVideoSource>( m_pManager, i_pDevice, m_pFrames, nullptr, nullptr, m_pTargets, m_pTime, Options );
     m_pSource = pSource;
     return pSource;
   }
