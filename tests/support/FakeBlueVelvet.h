@@ -37,6 +37,8 @@ constexpr uint32_t Lines = 8;
 constexpr uint32_t LineBytes = 16;
 constexpr uint32_t ImageBytes = Lines * LineBytes;
 
+constexpr uint64_t FieldsBefore = 1000;   // that have passed when a test begins
+
 class VCard
 {
 public:
@@ -121,7 +123,7 @@ private:
   std::string m_Rest GUARDED_BY( m_Mutex );
   bool m_bGo GUARDED_BY( m_Mutex ) = false;
   bool m_bFree GUARDED_BY( m_Mutex ) = false;
-  std::atomic<uint64_t> m_FieldCount{ 1000 };
+  std::atomic<uint64_t> m_FieldCount{ FieldsBefore };
 };
 
 struct VObject

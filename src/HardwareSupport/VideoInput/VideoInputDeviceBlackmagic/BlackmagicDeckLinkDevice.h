@@ -4,9 +4,7 @@
 // with the device's lock held. A listener that is added without a postal service of its own is called on the driver's.
 #pragma once
 
-#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDevice.h"
-#include "NotificationSystem/IPostalService.h"
-#include "StageCoreRuntime/Shared.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/CaptureDevice.h"
 #include "VendorInterfaces/DeckLinkAPI.h"
 
 #include <boost/smart_ptr/intrusive_ptr.hpp>
@@ -19,7 +17,7 @@
 namespace VideoInputHAL
 {
 
-class VBlackmagicDeckLinkDevice : public KVZ::VShared, public IVideoInputDevice
+class VBlackmagicDeckLinkDevice : public VCaptureDevice
 {
 public:
   VBlackmagicDeckLinkDevice( DeckLinkAPI::IDeckLink* i_pCard, int32_t i_CardNumber, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService );
@@ -31,26 +29,14 @@ public:
   // Ends the streams and lets the card go. No frame is delivered and nothing fires after this; StartCapture finds no mode any more.
   void Close();
 
-  void SetDeviceIndex( int32_t i_Index ) override;
-  VCountCallback& GetDroppedFramesCallback() override;
-  VEventCallback& GetStatusChangedCallback() override;
-  VEventCallback& GetPixelFormatsChangedCallback() override;
-  VEventCallback& GetVideoStandardChangedCallback() override;
-  VEventCallback& GetTimecodeChangedCallback() override;
-  void SetDataCallback( std::shared_ptr<IVideoInputDataCallback> i_pCallback ) override;
-  void SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) override;
   std::string GetManufacturerName() const override;
   std::string GetDriverName() const override;
-  std::string GetDeviceName() const override;
-  std::string GetDeviceURN() const override;
   KVZ::IVideoStandard::Enum GetVideoStandard() const override;
   KVZ::IPixelFormat::Enum GetPixelFormat() const override;
-  KVZ::ITimecode GetTimecode() const override;
   // With a signal, what was detected in it; without, all that the card can carry.
   void GetSupportedPixelFormats( std::set<KVZ::IPixelFormat::Enum>& o_rFormats ) const override;
   void GetSupportedTimecodeSources( std::set<KVZ::ITimecodeSource::Enum>& o_rSources ) const override;
   void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& o_rFormats ) const override;
-  void GetSupportedAudioSampleRates( std::set<uint32_t>& o_rRates ) const override;
   void GetSupportedAudioChannelCounts( std::set<uint32_t>& o_rCounts ) const override;
   // A failure may leave the streams stopped until the format changes or capture is started again.
   VDeviceResult StartCapture( KVZ::IPixelFormat::Enum i_PixelFormat, KVZ::ITimecodeSource::Enum i_TimecodeSource,
@@ -58,10 +44,12 @@ public:
   // The card goes on streaming.
   bool StopCapture() override;
   EStatus::Enum GetStatus() const override;
-  int32_t GetDeviceIndex() const override;
 
 private:
   class VImpl;
+
+  explicit VBlackmagicDeckLinkDevice( boost::intrusive_ptr<VImpl> i_pImpl );
+
   const boost::intrusive_ptr<VImpl> m_pImpl;   // the vendor holds it too, until its last callback has returned
 };
 

@@ -9,7 +9,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <new>
 #include <utility>
 
 namespace VideoInputHAL
@@ -88,7 +87,10 @@ std::shared_ptr<IVideoInputDataCallback> VBlackmagicDeckLinkDevice::VImpl::Handl
   }
   CountDroppedFrames( i_rVideo );
   VTimecodeReading Reading = ReadTimecode( i_rVideo, m_TimecodeSource );
-  ResolveRepeats( Reading );
+  if( FollowTimecode( Reading.m_Timecode, Reading.m_FramePeriod ) )
+  {
+    m_TimecodeChanged();
+  }
   const KVZ::IPixelFormat::Enum PixelFormat = ToPixelFormat( i_rVideo.GetPixelFormat() );
   std::shared_ptr<IVideoInputDataCallback> pReceiver = m_pDataCallback.lock();
   if( !pReceiver )
@@ -115,9 +117,8 @@ void VBlackmagicDeckLinkDevice::VImpl::UpdateSignal( bool i_bHasSignal )
   m_bHasSignal = i_bHasSignal;
   m_VideoStandardChanged();
   m_PixelFormatsChanged();
-  if( !m_bHasSignal && KVZ::IsValid( m_LastTimecode ) )
+  if( !m_bHasSignal && LoseTimecode() )
   {
-    m_LastTimecode = {};
     m_TimecodeChanged();
   }
 }
@@ -139,26 +140,6 @@ void VBlackmagicDeckLinkDevice::VImpl::CountDroppedFrames( IDeckLinkVideoInputFr
   m_LastHardwareTime = Time;
 }
 
-// Video may run faster than its timecode: frames that carry one label lie a frame period apart within it.
-void VBlackmagicDeckLinkDevice::VImpl::ResolveRepeats( VTimecodeReading& io_rReading )
-{
-  if( KVZ::IsSameReading( io_rReading.m_Timecode, m_LastTimecode ) )
-  {
-    ++m_Repeats;
-  }
-  else
-  {
-    const bool bOtherStandard = io_rReading.m_Timecode.m_Standard != m_LastTimecode.m_Standard;
-    m_LastTimecode = io_rReading.m_Timecode;
-    m_Repeats = 0;
-    if( bOtherStandard )
-    {
-      m_TimecodeChanged();
-    }
-  }
-  KVZ::AddTicks( io_rReading.m_Timecode, m_Repeats * io_rReading.m_FramePeriod );
-}
-
 // Null, with a line in the log, where the frame is lost.
 VVideoInputDataSourceFrame* VBlackmagicDeckLinkDevice::VImpl::CopyFrame( IDeckLinkVideoInputFrame& i_rVideo, IDeckLinkAudioInputPacket* i_pAudio,
   KVZ::IPixelFormat::Enum i_PixelFormat )
@@ -171,39 +152,20 @@ VVideoInputDataSourceFrame* VBlackmagicDeckLinkDevice::VImpl::CopyFrame( IDeckLi
   {
     return nullptr;
   }
-  VVideoInputDataSourceFrame* const pFrame = MakeFrame( Info, ImageBytes, Audio.size() );
-  if( pFrame )
-  {
-    std::memcpy( pFrame->Image(), Image.data(), Image.size() );
-    std::memset( pFrame->Image() + Image.size(), 0, ImageBytes - Image.size() );
-    if( !Audio.empty() )
-    {
-      std::memcpy( pFrame->Audio(), Audio.data(), Audio.size() );
-    }
-  }
-  return pFrame;
-}
-
-// The header filled in, but for the timecode.
-VVideoInputDataSourceFrame* VBlackmagicDeckLinkDevice::VImpl::MakeFrame( const KVZ::VideoFrameInfo& i_rInfo, uint64_t i_ImageBytes,
-  uint64_t i_AudioBytes )
-{
-  const uint64_t BlockSize = VVideoInputDataSourceFrame::BlockSize( i_ImageBytes, i_AudioBytes );
-  void* const pBlock = m_pAllocator ? m_pAllocator->Allocate( BlockSize ) : nullptr;
-  if( !pBlock )
+  VVideoInputDataSourceFrame* const pFrame = MakeFrame( m_pAllocator.get(), Info, ImageBytes, Audio.size() );
+  if( !pFrame )
   {
     KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
     return nullptr;
   }
-  auto* const pFrame = new( pBlock ) VVideoInputDataSourceFrame;
-  pFrame->m_pAllocator = m_pAllocator.get();
   pFrame->m_DeviceIndex = m_DeviceIndex;
-  pFrame->m_VideoInfo = i_rInfo;
-  pFrame->m_AudioInfo = i_AudioBytes == 0 ? KVZ::AudioFrameInfo() : m_Audio;
-  pFrame->m_ImageBytes = static_cast<uint32_t>( i_ImageBytes );
-  pFrame->m_ImageCapacity = static_cast<uint32_t>( VVideoInputDataSourceFrame::RoundUp( i_ImageBytes ) );
-  pFrame->m_AudioBytes = static_cast<uint32_t>( i_AudioBytes );
-  pFrame->m_AudioCapacity = pFrame->m_AudioBytes;
+  std::memcpy( pFrame->Image(), Image.data(), Image.size() );
+  std::memset( pFrame->Image() + Image.size(), 0, ImageBytes - Image.size() );
+  if( !Audio.empty() )
+  {
+    pFrame->m_AudioInfo = m_Audio;
+    std::memcpy( pFrame->Audio(), Audio.data(), Audio.size() );
+  }
   return pFrame;
 }
 

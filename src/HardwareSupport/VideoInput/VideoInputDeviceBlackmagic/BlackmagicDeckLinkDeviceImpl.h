@@ -37,12 +37,10 @@ namespace VideoInputHAL
 //   Close is like StartCapture, and calls the vendor with m_Mutex held only when no callback can wait any more. It lets the vendor's objects
 //     go without m_Mutex.
 //   Subscribers are called by postal services; firing with m_Mutex held only queues.
-class VBlackmagicDeckLinkDevice::VImpl final : public DeckLinkAPI::IDeckLinkInputCallback
+class VBlackmagicDeckLinkDevice::VImpl final : public DeckLinkAPI::IDeckLinkInputCallback, public VCaptureDeviceState
 {
 public:
   VImpl( DeckLinkAPI::IDeckLink* i_pCard, int32_t i_CardNumber, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService );
-  VImpl( const VImpl& ) = delete;
-  VImpl& operator=( const VImpl& ) = delete;
 
   DeckLinkAPI::HRESULT QueryInterface( DeckLinkAPI::REFIID i_Id, void** o_ppObject ) override;
   DeckLinkAPI::ULONG AddRef() override;
@@ -58,23 +56,10 @@ public:
     KVZ::IAudioSampleFormat::Enum i_AudioFormat, uint32_t i_AudioChannels ) EXCLUDES( m_Mutex, m_ControlMutex );
   void StopCapture() EXCLUDES( m_Mutex );
 
-  void SetDeviceIndex( int32_t i_Index ) EXCLUDES( m_Mutex );
-  void SetDataCallback( std::weak_ptr<IVideoInputDataCallback> i_pCallback ) EXCLUDES( m_Mutex );
-  void SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) EXCLUDES( m_Mutex );
-  const std::string& GetDeviceName() const { return m_DisplayName; }
-  std::string GetDeviceURN() const EXCLUDES( m_Mutex );
   KVZ::IVideoStandard::Enum GetVideoStandard() const EXCLUDES( m_Mutex );
   KVZ::IPixelFormat::Enum GetPixelFormat() const EXCLUDES( m_Mutex );
-  KVZ::ITimecode GetTimecode() const EXCLUDES( m_Mutex );
   std::set<KVZ::IPixelFormat::Enum> GetSupportedPixelFormats() const EXCLUDES( m_Mutex );
   bool IsCapturing() const EXCLUDES( m_Mutex );
-  int32_t GetDeviceIndex() const EXCLUDES( m_Mutex );
-
-  NotificationSystem::VMultiCallbackPostal<void( unsigned int )> m_DroppedFrames;
-  NotificationSystem::VMultiCallbackPostal<void()> m_StatusChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_PixelFormatsChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_VideoStandardChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_TimecodeChanged;
 
 private:
   struct VCaptureSettings;
@@ -96,28 +81,19 @@ private:
     DeckLinkAPI::IDeckLinkAudioInputPacket* i_pAudio ) REQUIRES( m_Mutex );
   void UpdateSignal( bool i_bHasSignal ) REQUIRES( m_Mutex );
   void CountDroppedFrames( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rVideo ) REQUIRES( m_Mutex );
-  void ResolveRepeats( VTimecodeReading& io_rReading ) REQUIRES( m_Mutex );
   VVideoInputDataSourceFrame* CopyFrame( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rVideo, DeckLinkAPI::IDeckLinkAudioInputPacket* i_pAudio,
     KVZ::IPixelFormat::Enum i_PixelFormat ) REQUIRES( m_Mutex );
   bool FindAudio( DeckLinkAPI::IDeckLinkAudioInputPacket& i_rAudio, std::span<const uint8_t>& o_rAudio ) REQUIRES( m_Mutex );
-  VVideoInputDataSourceFrame* MakeFrame( const KVZ::VideoFrameInfo& i_rInfo, uint64_t i_ImageBytes, uint64_t i_AudioBytes ) REQUIRES( m_Mutex );
 
-  // Fixed after construction
-  const std::string m_DisplayName;
   std::atomic<DeckLinkAPI::ULONG> m_References{ 1 };
 
   boost::mutex m_ControlMutex;
   VComPointer<DeckLinkAPI::IDeckLinkInput> m_pInput GUARDED_BY( m_ControlMutex );
 
-  mutable boost::mutex m_Mutex;
   bool m_bClosed GUARDED_BY( m_Mutex ) = false;
   VComPointer<DeckLinkAPI::IDeckLink> m_pCard GUARDED_BY( m_Mutex );
   std::vector<VComPointer<DeckLinkAPI::IDeckLinkDisplayMode>> m_Modes GUARDED_BY( m_Mutex );
   bool m_bDetectsFormat GUARDED_BY( m_Mutex ) = false;
-  int32_t m_DeviceIndex GUARDED_BY( m_Mutex ) = 0;
-  std::string m_URN GUARDED_BY( m_Mutex );
-  std::weak_ptr<IVideoInputDataCallback> m_pDataCallback GUARDED_BY( m_Mutex );
-  std::shared_ptr<IVideoInputAllocator> m_pAllocator GUARDED_BY( m_Mutex );
 
   // Chosen for capture
   bool m_bCapturing GUARDED_BY( m_Mutex ) = false;
@@ -130,8 +106,6 @@ private:
   uint32_t m_Mode GUARDED_BY( m_Mutex ) = DeckLinkAPI::DisplayModeUnknown;
   KVZ::IInterlacedFormat::Enum m_InterlacedFormat GUARDED_BY( m_Mutex ) = KVZ::IInterlacedFormat::EUnspecified;   // m_Mode's
   std::set<KVZ::IPixelFormat::Enum> m_DetectedFormats GUARDED_BY( m_Mutex );
-  KVZ::ITimecode m_LastTimecode GUARDED_BY( m_Mutex );    // as read, without the ticks of repeats
-  uint32_t m_Repeats GUARDED_BY( m_Mutex ) = 0;           // frames that have carried m_LastTimecode after the first
   int64_t m_LastHardwareTime GUARDED_BY( m_Mutex ) = 0;   // ticks; goes on from capture to capture
   uint32_t m_FrameIndex GUARDED_BY( m_Mutex ) = 0;
 };

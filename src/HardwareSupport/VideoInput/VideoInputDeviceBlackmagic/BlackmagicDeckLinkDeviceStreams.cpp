@@ -25,13 +25,7 @@ constexpr int32_t StartFailed = static_cast<int32_t>( 0x80000007u );
 }
 
 VBlackmagicDeckLinkDevice::VImpl::VImpl( IDeckLink* i_pCard, int32_t i_CardNumber, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService )
-  : m_DroppedFrames( i_pPostalService ),
-    m_StatusChanged( i_pPostalService ),
-    m_PixelFormatsChanged( i_pPostalService ),
-    m_VideoStandardChanged( i_pPostalService ),
-    m_TimecodeChanged( i_pPostalService ),
-    m_DisplayName( "DeckLink C" + std::to_string( i_CardNumber ) ),
-    m_pCard( i_pCard )
+  : VCaptureDeviceState( "DeckLink C" + std::to_string( i_CardNumber ), i_pPostalService ), m_pCard( i_pCard )
 {
 }
 

@@ -5,7 +5,6 @@
 #include "SyncSystem/Tick.h"
 
 #include <array>
-#include <span>
 
 namespace VideoInputHAL
 {
@@ -17,40 +16,20 @@ using KVZ::ITimecodeSource;
 
 namespace Format = DeckLinkAPI::TimecodeFormat;
 
-struct VSourceRow
-{
-  ITimecodeSource::Enum m_Source;
-  size_t m_FormatCount;
-  std::array<uint32_t, 4> m_Formats;   // tried in turn
-};
-
-// A source that is not listed reads nothing.
 constexpr std::array Sources = {
-  VSourceRow{ ITimecodeSource::ERP188_LTC, 1, { Format::RP188LTC } },
-  VSourceRow{ ITimecodeSource::ERP188_VITC1, 1, { Format::RP188VITC1 } },
-  VSourceRow{ ITimecodeSource::ERP188_VITC2, 1, { Format::RP188VITC2 } },
-  VSourceRow{ ITimecodeSource::EVITC_Field1, 1, { Format::VITCField1 } },
-  VSourceRow{ ITimecodeSource::EVITC_Field2, 1, { Format::VITCField2 } },
-  VSourceRow{ ITimecodeSource::ESerial, 1, { Format::Serial } },
-  VSourceRow{ ITimecodeSource::ERP188_Any, 1, { Format::RP188Any } },
-  VSourceRow{ ITimecodeSource::EAny, 4, { Format::RP188Any, Format::VITCField1, Format::VITCField2, Format::Serial } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_LTC, 1, { Format::RP188LTC } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_VITC1, 1, { Format::RP188VITC1 } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_VITC2, 1, { Format::RP188VITC2 } },
+  VTimecodeSourceRow{ ITimecodeSource::EVITC_Field1, 1, { Format::VITCField1 } },
+  VTimecodeSourceRow{ ITimecodeSource::EVITC_Field2, 1, { Format::VITCField2 } },
+  VTimecodeSourceRow{ ITimecodeSource::ESerial, 1, { Format::Serial } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_Any, 1, { Format::RP188Any } },
+  VTimecodeSourceRow{ ITimecodeSource::EAny, 4, { Format::RP188Any, Format::VITCField1, Format::VITCField2, Format::Serial } },
 };
-
-std::span<const uint32_t> FormatsOf( ITimecodeSource::Enum i_Source )
-{
-  for( const VSourceRow& rRow : Sources )
-  {
-    if( rRow.m_Source == i_Source )
-    {
-      return { rRow.m_Formats.data(), rRow.m_FormatCount };
-    }
-  }
-  return {};
-}
 
 VComPointer<DeckLinkAPI::IDeckLinkTimecode> FindTimecode( DeckLinkAPI::IDeckLinkVideoInputFrame& i_rFrame, ITimecodeSource::Enum i_Source )
 {
-  for( const uint32_t TimecodeFormat : FormatsOf( i_Source ) )
+  for( const uint32_t TimecodeFormat : FindTimecodeNumbers( Sources, i_Source ) )
   {
     DeckLinkAPI::IDeckLinkTimecode* pTimecode = nullptr;
     // An absent timecode may answer with a success that carries no object.

@@ -16,44 +16,23 @@ using KVZ::ITimecodeSource;
 
 VBluefish444Device::VBluefish444Device( const VBluefish444Input& i_rInput, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService,
   VPause i_Pause )
-  : m_pImpl( std::make_shared<VImpl>( i_rInput, i_pPostalService, std::move( i_Pause ) ) )
+  : VBluefish444Device( std::make_shared<VImpl>( i_rInput, i_pPostalService, std::move( i_Pause ) ) )
 {
-  m_pImpl->Start();
 }
+
+VBluefish444Device::VBluefish444Device( const std::shared_ptr<VImpl>& i_pImpl ) : VCaptureDevice( *i_pImpl ), m_pImpl( i_pImpl ) { m_pImpl->Start(); }
 
 VBluefish444Device::~VBluefish444Device() { m_pImpl->Close(); }
 
 void VBluefish444Device::Close() { m_pImpl->Close(); }
 
-void VBluefish444Device::SetDeviceIndex( int32_t i_Index ) { m_pImpl->SetDeviceIndex( i_Index ); }
-
-IVideoInputDevice::VCountCallback& VBluefish444Device::GetDroppedFramesCallback() { return m_pImpl->m_DroppedFrames; }
-
-IVideoInputDevice::VEventCallback& VBluefish444Device::GetStatusChangedCallback() { return m_pImpl->m_StatusChanged; }
-
-IVideoInputDevice::VEventCallback& VBluefish444Device::GetPixelFormatsChangedCallback() { return m_pImpl->m_PixelFormatsChanged; }
-
-IVideoInputDevice::VEventCallback& VBluefish444Device::GetVideoStandardChangedCallback() { return m_pImpl->m_VideoStandardChanged; }
-
-IVideoInputDevice::VEventCallback& VBluefish444Device::GetTimecodeChangedCallback() { return m_pImpl->m_TimecodeChanged; }
-
-void VBluefish444Device::SetDataCallback( std::shared_ptr<IVideoInputDataCallback> i_pCallback ) { m_pImpl->SetDataCallback( i_pCallback ); }
-
-void VBluefish444Device::SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) { m_pImpl->SetAllocator( std::move( i_pAllocator ) ); }
-
 std::string VBluefish444Device::GetManufacturerName() const { return "Bluefish 444"; }
 
-std::string VBluefish444Device::GetDriverName() const { return m_pImpl->GetDriverName(); }
-
-std::string VBluefish444Device::GetDeviceName() const { return m_pImpl->GetDeviceName(); }
-
-std::string VBluefish444Device::GetDeviceURN() const { return m_pImpl->GetDeviceURN(); }
+std::string VBluefish444Device::GetDriverName() const { return CardName( m_pImpl->GetCardType() ); }
 
 KVZ::IVideoStandard::Enum VBluefish444Device::GetVideoStandard() const { return m_pImpl->GetVideoStandard(); }
 
 IPixelFormat::Enum VBluefish444Device::GetPixelFormat() const { return IPixelFormat::EUnspecified; }
-
-KVZ::ITimecode VBluefish444Device::GetTimecode() const { return m_pImpl->GetTimecode(); }
 
 void VBluefish444Device::GetSupportedPixelFormats( std::set<IPixelFormat::Enum>& o_rFormats ) const
 {
@@ -71,8 +50,6 @@ void VBluefish444Device::GetSupportedAudioSampleFormats( std::set<IAudioSampleFo
 {
   o_rFormats = { IAudioSampleFormat::EInt16, IAudioSampleFormat::EInt24, IAudioSampleFormat::EInt32 };
 }
-
-void VBluefish444Device::GetSupportedAudioSampleRates( std::set<uint32_t>& o_rRates ) const { o_rRates = { AudioSampleRate }; }
 
 void VBluefish444Device::GetSupportedAudioChannelCounts( std::set<uint32_t>& o_rCounts ) const
 {
@@ -101,26 +78,20 @@ IVideoInputDevice::EStatus::Enum VBluefish444Device::GetStatus() const
   return m_pImpl->IsOrderedToCapture() ? EStatus::ECapturing : EStatus::EReady;
 }
 
-int32_t VBluefish444Device::GetDeviceIndex() const { return m_pImpl->GetDeviceIndex(); }
-
 bool VBluefish444Device::IsCapturing() const { return m_pImpl->IsCapturing(); }
 
 VBluefish444Device::VImpl::VImpl( const VBluefish444Input& i_rInput, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService, VPause i_Pause )
-  : m_DroppedFrames( i_pPostalService ),
-    m_StatusChanged( i_pPostalService ),
-    m_PixelFormatsChanged( i_pPostalService ),
-    m_VideoStandardChanged( i_pPostalService ),
-    m_TimecodeChanged( i_pPostalService ),
+  : VCaptureDeviceState( CardName( i_rInput.m_CardType ) + " C" + std::to_string( i_rInput.m_CardNumber ) + ":Ch" +
+        ChannelLetter( i_rInput.m_Channel ),
+      i_pPostalService ),
     m_CardType( i_rInput.m_CardType ),
     m_Channel( i_rInput.m_Channel ),
-    m_CardName( CardName( i_rInput.m_CardType ) ),
-    m_DisplayName( m_CardName + " C" + std::to_string( i_rInput.m_CardNumber ) + ":Ch" + ChannelLetter( i_rInput.m_Channel ) ),
     m_Pause( std::move( i_Pause ) ),
-    m_pCard( i_rInput.m_pCard ),
-    m_NoSignalMode( m_pCard->Query( BlueVelvet::Property::InvalidVideoModeFlag ).value_or( DefaultNoSignalMode ) ),
+    m_NoSignalMode( i_rInput.m_pCard->Query( BlueVelvet::Property::InvalidVideoModeFlag ).value_or( DefaultNoSignalMode ) ),
     m_Mode( m_NoSignalMode ),
-    m_DeviceIndex( i_rInput.m_DeviceIndex )
+    m_pCard( i_rInput.m_pCard )
 {
+  m_DeviceIndex = i_rInput.m_DeviceIndex;
 }
 
 void VBluefish444Device::VImpl::Start()
@@ -159,43 +130,6 @@ void VBluefish444Device::VImpl::Order( const VCaptureCommand& i_rCommand )
     m_Commands.push_back( i_rCommand );
     m_bOrdered = i_rCommand.m_bStart;
   }
-}
-
-void VBluefish444Device::VImpl::SetDeviceIndex( int32_t i_Index )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_DeviceIndex = i_Index;
-  m_URN = MakeDeviceURN( i_Index );
-}
-
-void VBluefish444Device::VImpl::SetDataCallback( std::weak_ptr<IVideoInputDataCallback> i_pCallback )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_pDataCallback.swap( i_pCallback );
-}
-
-void VBluefish444Device::VImpl::SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_pAllocator.swap( i_pAllocator );   // the former one ends with the argument, without the lock
-}
-
-std::string VBluefish444Device::VImpl::GetDeviceURN() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_URN;
-}
-
-int32_t VBluefish444Device::VImpl::GetDeviceIndex() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_DeviceIndex;
-}
-
-KVZ::ITimecode VBluefish444Device::VImpl::GetTimecode() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_TimecodeMutex );
-  return m_LastTimecode;
 }
 
 bool VBluefish444Device::VImpl::IsOrderedToCapture() const

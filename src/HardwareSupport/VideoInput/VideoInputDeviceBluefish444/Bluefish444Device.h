@@ -5,9 +5,7 @@
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444SDKWrapper.h"
-#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDevice.h"
-#include "NotificationSystem/IPostalService.h"
-#include "StageCoreRuntime/Shared.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/CaptureDevice.h"
 
 #include <chrono>
 #include <cstdint>
@@ -29,7 +27,7 @@ struct VBluefish444Input
   int32_t m_DeviceIndex = 0;
 };
 
-class VBluefish444Device : public KVZ::VShared, public IVideoInputDevice
+class VBluefish444Device : public VCaptureDevice
 {
 public:
   // Passes the time on the capture thread while there is no signal. Empty: the device's own wait, which its end cuts short.
@@ -43,26 +41,14 @@ public:
   // called on the capture thread itself: then what is under way there ends first. Orders are taken and have no effect any more.
   void Close();
 
-  void SetDeviceIndex( int32_t i_Index ) override;
-  VCountCallback& GetDroppedFramesCallback() override;
-  VEventCallback& GetStatusChangedCallback() override;
-  VEventCallback& GetPixelFormatsChangedCallback() override;
-  VEventCallback& GetVideoStandardChangedCallback() override;
-  VEventCallback& GetTimecodeChangedCallback() override;
-  void SetDataCallback( std::shared_ptr<IVideoInputDataCallback> i_pCallback ) override;
-  void SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) override;
   std::string GetManufacturerName() const override;
   std::string GetDriverName() const override;
-  std::string GetDeviceName() const override;
-  std::string GetDeviceURN() const override;
   KVZ::IVideoStandard::Enum GetVideoStandard() const override;
   // Always "Unspecified": the card delivers whatever is asked for.
   KVZ::IPixelFormat::Enum GetPixelFormat() const override;
-  KVZ::ITimecode GetTimecode() const override;
   void GetSupportedPixelFormats( std::set<KVZ::IPixelFormat::Enum>& o_rFormats ) const override;
   void GetSupportedTimecodeSources( std::set<KVZ::ITimecodeSource::Enum>& o_rSources ) const override;
   void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& o_rFormats ) const override;
-  void GetSupportedAudioSampleRates( std::set<uint32_t>& o_rRates ) const override;
   void GetSupportedAudioChannelCounts( std::set<uint32_t>& o_rCounts ) const override;
   // Cannot fail: what the card does not take is told in the log when the capture thread comes to it.
   VDeviceResult StartCapture( KVZ::IPixelFormat::Enum i_PixelFormat, KVZ::ITimecodeSource::Enum i_TimecodeSource,
@@ -70,13 +56,15 @@ public:
   bool StopCapture() override;
   // By the order given last, so that an order and the next never miss each other. IsCapturing tells how far the capture thread has come.
   EStatus::Enum GetStatus() const override;
-  int32_t GetDeviceIndex() const override;
 
   // The capture thread has taken an order to start, and none to stop since.
   bool IsCapturing() const;
 
 private:
   class VImpl;
+
+  explicit VBluefish444Device( const std::shared_ptr<VImpl>& i_pImpl );
+
   const std::shared_ptr<VImpl> m_pImpl;   // the capture thread holds it too
 };
 

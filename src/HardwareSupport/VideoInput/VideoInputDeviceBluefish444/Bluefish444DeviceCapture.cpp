@@ -11,10 +11,13 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Tables.h"
 
 #include "StageCoreRuntime/DebugServices.h"
+#include "StageCoreRuntime/GlobalLog.h"
 #include "Utils/UtilsMemory/LockedMemory.h"
 
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/lock_types.hpp>
+
+#include <utility>
 
 namespace VideoInputHAL
 {
@@ -36,11 +39,16 @@ void VBluefish444Device::VImpl::Run()
   const DebugServices::VCrashHandlerForThread CrashHandler;
   DebugServices::SetThreadName( m_DisplayName );
   m_pHanc = static_cast<uint8_t*>( UtilsMemory::AllocateLocked( BlueVelvet::HancBytes ) );
+  if( !m_pHanc )
+  {
+    KVZ_LOG( "VideoInputDeviceBluefish444", 2, "Memory allocation failed." );
+  }
   while( m_pHanc && !IsStopping() )
   {
     RunRound();
   }
   UtilsMemory::FreeLocked( m_pHanc, BlueVelvet::HancBytes );
+  m_pCard.reset();
 }
 
 void VBluefish444Device::VImpl::RunRound()
@@ -176,9 +184,14 @@ void VBluefish444Device::VImpl::SetMode( uint32_t i_Mode )
     return;
   }
   m_VideoStandardChanged();
-  if( i_Mode == m_NoSignalMode && KVZ::IsValid( GetTimecode() ) )
+  bool bTimecodeLost = false;
+  if( i_Mode == m_NoSignalMode )
   {
-    StoreTimecode( {} );
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    bTimecodeLost = LoseTimecode();
+  }
+  if( bTimecodeLost )
+  {
     m_TimecodeChanged();
   }
 }
@@ -208,11 +221,10 @@ bool VBluefish444Device::VImpl::WaitForSync()
   return m_bSynced;
 }
 
-// The first count of all only begins the counting.
+// The first count of all is the card's whole running time. One that goes back misses nothing.
 void VBluefish444Device::VImpl::CountDroppedFrames( uint64_t i_FieldCount )
 {
-  const uint64_t Last = m_LastFieldCount.value_or( i_FieldCount );
-  m_LastFieldCount = i_FieldCount;
+  const uint64_t Last = std::exchange( m_LastFieldCount, i_FieldCount );
   if( i_FieldCount > Last + FieldsPerFrame )
   {
     m_DroppedFrames( static_cast<unsigned int>( ( i_FieldCount - Last - FieldsPerFrame ) / FieldsPerFrame ) );

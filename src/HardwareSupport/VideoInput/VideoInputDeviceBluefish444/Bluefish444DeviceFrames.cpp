@@ -8,7 +8,6 @@
 #include <boost/thread/lock_guard.hpp>
 
 #include <algorithm>
-#include <new>
 
 namespace VideoInputHAL
 {
@@ -32,11 +31,14 @@ void VBluefish444Device::VImpl::DeliverFrame( uint32_t i_Buffer )
   }
   const uint64_t Samples = SamplesPerFrame( m_Setup.m_pStandard->m_Period );
   const uint64_t Channels = std::min( m_Command.m_AudioChannels, MostAudioChannels );
-  VVideoInputDataSourceFrame* const pFrame = MakeFrame( pAllocator.get(), Samples * Channels * ToSampleType( m_Command.m_AudioFormat ).m_Bytes );
+  VVideoInputDataSourceFrame* const pFrame = MakeFrame( pAllocator.get(), m_Setup.m_Image, m_Setup.m_ImageBytes,
+    Samples * Channels * ToSampleType( m_Command.m_AudioFormat ).m_Bytes );
   if( !pFrame )
   {
+    KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
     return;
   }
+  pFrame->m_DeviceIndex = GetDeviceIndex();
   if( !ReadFrame( i_Buffer, *pFrame ) )
   {
     pAllocator->Free( pFrame );
@@ -52,25 +54,6 @@ void VBluefish444Device::VImpl::DeliverFrame( uint32_t i_Buffer )
   {
     pAllocator->Free( pFrame );
   }
-}
-
-// The header filled in, but for what the ancillary data tells. Null, with a line in the log, where the frame is lost.
-VVideoInputDataSourceFrame* VBluefish444Device::VImpl::MakeFrame( IVideoInputAllocator* i_pAllocator, uint64_t i_AudioBytes )
-{
-  void* const pBlock = i_pAllocator ? i_pAllocator->Allocate( VVideoInputDataSourceFrame::BlockSize( m_Setup.m_ImageBytes, i_AudioBytes ) ) : nullptr;
-  if( !pBlock )
-  {
-    KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
-    return nullptr;
-  }
-  auto* const pFrame = new( pBlock ) VVideoInputDataSourceFrame;
-  pFrame->m_pAllocator = i_pAllocator;
-  pFrame->m_DeviceIndex = GetDeviceIndex();
-  pFrame->m_VideoInfo = m_Setup.m_Image;
-  pFrame->m_ImageBytes = static_cast<uint32_t>( m_Setup.m_ImageBytes );
-  pFrame->m_ImageCapacity = static_cast<uint32_t>( VVideoInputDataSourceFrame::RoundUp( m_Setup.m_ImageBytes ) );
-  pFrame->m_AudioCapacity = static_cast<uint32_t>( i_AudioBytes );
-  return pFrame;
 }
 
 // False, with a line in the log, where the card does not give its buffer.
@@ -91,9 +74,9 @@ bool VBluefish444Device::VImpl::ReadFrame( uint32_t i_Buffer, VVideoInputDataSou
 void VBluefish444Device::VImpl::PrepareRecord( uint8_t* o_pSamples )
 {
   m_Record.m_pSamples = o_pSamples;
-  m_Record.m_ChannelMask = ChannelMask( m_Command.m_AudioChannels );
-  m_Record.m_SampleFlags = ToSampleType( m_Command.m_AudioFormat ).m_Flags;
   m_Record.m_MostSamples = SamplesPerFrame( m_Setup.m_pStandard->m_Period );
+  m_Record.m_ChannelMask = m_Record.m_MostSamples == 0 ? 0 : ChannelMask( m_Command.m_AudioChannels );   // nothing is wanted where there is no room
+  m_Record.m_SampleFlags = ToSampleType( m_Command.m_AudioFormat ).m_Flags;
   m_Record.m_Samples = 0;
   // One by one: the record is packed, and no reference may be taken to a word of it.
   for( size_t Word = 0; Word < sizeof( m_Record.m_Timecodes ) / sizeof( uint64_t ); ++Word )
@@ -105,6 +88,8 @@ void VBluefish444Device::VImpl::PrepareRecord( uint8_t* o_pSamples )
 // A frame whose ancillary data cannot be had carries neither sound nor timecode. One with fewer samples than the mode has carries those.
 void VBluefish444Device::VImpl::Decode( uint32_t i_Buffer, VVideoInputDataSourceFrame& io_rFrame )
 {
+  io_rFrame.m_AudioBytes = 0;
+  io_rFrame.m_AudioCapacity = 0;
   PrepareRecord( io_rFrame.Audio() );
   if( !m_pCard->ReadBuffer( m_pHanc, BlueVelvet::HancBytes, i_Buffer | Buffer::ImageHanc | Buffer::DataHanc ) ||
     !m_pCard->DecodeHanc( m_CardType, m_pHanc, m_Record ) )
@@ -119,33 +104,26 @@ void VBluefish444Device::VImpl::Decode( uint32_t i_Buffer, VVideoInputDataSource
   {
     io_rFrame.m_AudioInfo = { m_Command.m_AudioFormat, AudioSampleRate, Channels };
     io_rFrame.m_AudioBytes = Samples * Channels * SampleBytes;
+    io_rFrame.m_AudioCapacity = io_rFrame.m_AudioBytes;
   }
-  io_rFrame.m_AudioCapacity = io_rFrame.m_AudioBytes;
 }
 
-void VBluefish444Device::VImpl::StoreTimecode( const KVZ::ITimecode& i_rTimecode )
-{
-  boost::lock_guard<boost::mutex> Lock( m_TimecodeMutex );
-  m_LastTimecode = i_rTimecode;
-}
-
-// Video may run faster than its timecode: frames that carry one label lie a frame period apart within it.
 void VBluefish444Device::VImpl::ResolveRepeats( KVZ::ITimecode& io_rTimecode )
 {
-  const KVZ::ITimecode Last = GetTimecode();
-  const bool bRepeated = KVZ::IsSameReading( io_rTimecode, Last );
-  m_Repeats = bRepeated ? m_Repeats + 1 : 0;
-  if( !bRepeated )
-  {
-    StoreTimecode( io_rTimecode );
-    if( io_rTimecode.m_Standard != Last.m_Standard )
-    {
-      m_TimecodeChanged();
-    }
-  }
+  const KVZ::ITimecode Read = io_rTimecode;
   const int64_t Period = m_Setup.m_pStandard->m_Period;
-  KVZ_LOG( LogCategory, 6, "Timecode=%1%, SubFrameCount=%2%, FramePeriod=%3%", KVZ::ToText( io_rTimecode ), m_Repeats, Period );
-  KVZ::AddTicks( io_rTimecode, m_Repeats * Period );
+  bool bOtherStandard = false;
+  uint32_t Repeats = 0;
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    bOtherStandard = FollowTimecode( io_rTimecode, Period );
+    Repeats = m_Repeats;
+  }
+  KVZ_LOG( LogCategory, 6, "Timecode=%1%, SubFrameCount=%2%, FramePeriod=%3%", KVZ::ToText( Read ), Repeats, Period );
+  if( bOtherStandard )
+  {
+    m_TimecodeChanged();
+  }
 }
 
 }

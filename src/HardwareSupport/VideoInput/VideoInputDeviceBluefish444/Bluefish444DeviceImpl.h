@@ -35,14 +35,10 @@ struct VCaptureSetup
   uint64_t m_GoldenBytes = 0;   // what the card copies for one image
 };
 
-// Two locks, each held for a few instructions by everybody and never together; none while the card, the allocator or the receiver is called.
-//
-//   m_Mutex          the queue, the order in force, and what callers set
-//   m_TimecodeMutex  the last timecode, so that asking for it never meets the rest
-//
+// The device lock is held for a few instructions by everybody, and never while the card, the allocator or the receiver is called or a callback fired.
 // What is marked "capture thread" has no lock. The thread lives as long as the device, and holds this object until it ends: a receiver may be the
 // device's last owner and let it go inside OnVideoInputData.
-class VBluefish444Device::VImpl : public std::enable_shared_from_this<VImpl>
+class VBluefish444Device::VImpl final : public VCaptureDeviceState, public std::enable_shared_from_this<VImpl>
 {
 public:
   VImpl( const VBluefish444Input& i_rInput, const std::shared_ptr<KVZ::IPostalService>& i_pPostalService, VPause i_Pause );
@@ -51,23 +47,10 @@ public:
   void Close() EXCLUDES( m_Mutex );
   void Order( const VCaptureCommand& i_rCommand ) EXCLUDES( m_Mutex );
 
-  void SetDeviceIndex( int32_t i_Index ) EXCLUDES( m_Mutex );
-  void SetDataCallback( std::weak_ptr<IVideoInputDataCallback> i_pCallback ) EXCLUDES( m_Mutex );
-  void SetAllocator( std::shared_ptr<IVideoInputAllocator> i_pAllocator ) EXCLUDES( m_Mutex );
-  const std::string& GetDriverName() const { return m_CardName; }
-  const std::string& GetDeviceName() const { return m_DisplayName; }
-  std::string GetDeviceURN() const EXCLUDES( m_Mutex );
-  int32_t GetDeviceIndex() const EXCLUDES( m_Mutex );
+  int GetCardType() const { return m_CardType; }
   KVZ::IVideoStandard::Enum GetVideoStandard() const { return StandardOf( m_Mode ); }
-  KVZ::ITimecode GetTimecode() const EXCLUDES( m_TimecodeMutex );
   bool IsOrderedToCapture() const EXCLUDES( m_Mutex );
   bool IsCapturing() const EXCLUDES( m_Mutex );
-
-  NotificationSystem::VMultiCallbackPostal<void( unsigned int )> m_DroppedFrames;
-  NotificationSystem::VMultiCallbackPostal<void()> m_StatusChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_PixelFormatsChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_VideoStandardChanged;
-  NotificationSystem::VMultiCallbackPostal<void()> m_TimecodeChanged;
 
 private:
   // The capture thread's
@@ -85,12 +68,10 @@ private:
   void SetMode( uint32_t i_Mode );
   uint32_t ReadMode();
   void DeliverFrame( uint32_t i_Buffer );
-  VVideoInputDataSourceFrame* MakeFrame( IVideoInputAllocator* i_pAllocator, uint64_t i_AudioBytes );
   bool ReadFrame( uint32_t i_Buffer, VVideoInputDataSourceFrame& io_rFrame );
   void PrepareRecord( uint8_t* o_pSamples );
   void Decode( uint32_t i_Buffer, VVideoInputDataSourceFrame& io_rFrame );
-  void StoreTimecode( const KVZ::ITimecode& i_rTimecode );
-  void ResolveRepeats( KVZ::ITimecode& io_rTimecode );
+  void ResolveRepeats( KVZ::ITimecode& io_rTimecode ) EXCLUDES( m_Mutex );
 
   KVZ::IVideoStandard::Enum StandardOf( uint32_t i_Mode ) const;
   bool IsStopping() const EXCLUDES( m_Mutex );
@@ -98,38 +79,27 @@ private:
   // Fixed after construction
   const int m_CardType;
   const uint32_t m_Channel;
-  const std::string m_CardName;
-  const std::string m_DisplayName;
   const VPause m_Pause;
-  const std::shared_ptr<VBluefish444SDKWrapper> m_pCard;
   const uint32_t m_NoSignalMode;
 
   std::atomic<uint32_t> m_Mode;   // written by the capture thread
   boost::thread m_Thread;         // started and joined by the device's owner
 
-  mutable boost::mutex m_Mutex;
   boost::condition_variable m_Stopping;
   bool m_bStop GUARDED_BY( m_Mutex ) = false;
   std::deque<VCaptureCommand> m_Commands GUARDED_BY( m_Mutex );
   bool m_bOrdered GUARDED_BY( m_Mutex ) = false;   // the last order's start flag
   VCaptureCommand m_InForce GUARDED_BY( m_Mutex );
-  int32_t m_DeviceIndex GUARDED_BY( m_Mutex );
-  std::string m_URN GUARDED_BY( m_Mutex );
-  std::weak_ptr<IVideoInputDataCallback> m_pDataCallback GUARDED_BY( m_Mutex );
-  std::shared_ptr<IVideoInputAllocator> m_pAllocator GUARDED_BY( m_Mutex );
-
-  mutable boost::mutex m_TimecodeMutex;
-  KVZ::ITimecode m_LastTimecode GUARDED_BY( m_TimecodeMutex );   // as read, without the ticks of repeats
 
   // Capture thread
-  VCaptureCommand m_Command;   // the order in force
+  std::shared_ptr<VBluefish444SDKWrapper> m_pCard;   // let go at the thread's end
+  VCaptureCommand m_Command;                         // the order in force
   VCaptureSetup m_Setup;
   bool m_bSetUpDue = true;
-  bool m_bSynced = false;                     // the sync that the coming round begins with has been waited for
-  uint32_t m_NextBuffer = 0;                  // to be named
-  std::optional<uint32_t> m_NamedBuffer;      // in the round before, with this set-up
-  std::optional<uint64_t> m_LastFieldCount;   // goes on from capture to capture
-  uint32_t m_Repeats = 0;                     // frames that have carried m_LastTimecode after the first
+  bool m_bSynced = false;                  // the sync that the coming round begins with has been waited for
+  uint32_t m_NextBuffer = 0;               // to be named
+  std::optional<uint32_t> m_NamedBuffer;   // in the round before, with this set-up
+  uint64_t m_LastFieldCount = 0;           // goes on from capture to capture
   uint32_t m_FrameIndex = 0;
   uint8_t* m_pHanc = nullptr;
   BlueVelvet::VHancDecodeRecord m_Record;

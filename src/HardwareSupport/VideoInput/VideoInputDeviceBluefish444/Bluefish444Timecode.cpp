@@ -14,20 +14,12 @@ using KVZ::ITimecodeSource;
 
 namespace Place = BlueVelvet::TimecodePlace;
 
-struct VSourceRow
-{
-  ITimecodeSource::Enum m_Source;
-  size_t m_PlaceCount;
-  std::array<uint32_t, 3> m_Places;   // tried in turn
-};
-
-// A source that is not listed reads nothing.
 constexpr std::array Sources = {
-  VSourceRow{ ITimecodeSource::ERP188_LTC, 1, { Place::RP188LTC } },
-  VSourceRow{ ITimecodeSource::ERP188_VITC1, 1, { Place::RP188VITC } },
-  VSourceRow{ ITimecodeSource::EExternal_LTC, 1, { Place::ExternalLTC } },
-  VSourceRow{ ITimecodeSource::ERP188_Any, 2, { Place::RP188LTC, Place::RP188VITC } },
-  VSourceRow{ ITimecodeSource::EAny, 3, { Place::RP188LTC, Place::RP188VITC, Place::ExternalLTC } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_LTC, 1, { Place::RP188LTC } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_VITC1, 1, { Place::RP188VITC } },
+  VTimecodeSourceRow{ ITimecodeSource::EExternal_LTC, 1, { Place::ExternalLTC } },
+  VTimecodeSourceRow{ ITimecodeSource::ERP188_Any, 2, { Place::RP188LTC, Place::RP188VITC } },
+  VTimecodeSourceRow{ ITimecodeSource::EAny, 3, { Place::RP188LTC, Place::RP188VITC, Place::ExternalLTC } },
 };
 
 constexpr uint32_t DropFrameBit = 10;
@@ -65,15 +57,12 @@ bool ToTimecode( uint64_t i_Word, int64_t i_FramePeriod, KVZ::ITimecode& o_rTime
 
 KVZ::ITimecode ReadTimecode( const BlueVelvet::VHancDecodeRecord& i_rRecord, ITimecodeSource::Enum i_Source, int64_t i_FramePeriod )
 {
-  for( const VSourceRow& rRow : Sources )
+  for( const uint32_t Place : FindTimecodeNumbers( Sources, i_Source ) )
   {
-    for( size_t Index = 0; rRow.m_Source == i_Source && Index < rRow.m_PlaceCount; ++Index )
+    KVZ::ITimecode Timecode;
+    if( ToTimecode( i_rRecord.m_Timecodes[Place], i_FramePeriod, Timecode ) )
     {
-      KVZ::ITimecode Timecode;
-      if( ToTimecode( i_rRecord.m_Timecodes[rRow.m_Places[Index]], i_FramePeriod, Timecode ) )
-      {
-        return Timecode;
-      }
+      return Timecode;
     }
   }
   return {};

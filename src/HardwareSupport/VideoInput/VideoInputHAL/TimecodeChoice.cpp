@@ -1,5 +1,6 @@
 #include "HardwareSupport/VideoInput/VideoInputHAL/TimecodeChoice.h"
 
+#include <algorithm>
 #include <array>
 
 namespace VideoInputHAL
@@ -38,6 +39,12 @@ ITimecodeStandard::Enum ChooseTimecodeStandard( int64_t i_FramePeriod, bool i_bD
     }
   }
   return ITimecodeStandard::ETimecode30;
+}
+
+std::span<const uint32_t> FindTimecodeNumbers( std::span<const VTimecodeSourceRow> i_Rows, KVZ::ITimecodeSource::Enum i_Source )
+{
+  const auto Found = std::find_if( i_Rows.begin(), i_Rows.end(), [=]( const VTimecodeSourceRow& i_r ) { return i_r.m_Source == i_Source; } );
+  return Found != i_Rows.end() ? std::span( Found->m_Numbers ).first( Found->m_Count ) : std::span<const uint32_t>();
 }
 
 }

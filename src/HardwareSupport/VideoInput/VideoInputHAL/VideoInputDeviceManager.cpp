@@ -36,7 +36,8 @@ void VVideoInputDeviceManager::PostConstruct()
   m_DriverMakers.clear();
   for( const auto& pDriver : CopyDrivers() )
   {
-    pDriver->GetDeviceArrivedCallback().Add( NotificationSystem::BindWeak( pWeak, &VVideoInputDeviceManager::OnDeviceArrived ) );
+    // On the announcing thread: a driver that announces while it discovers has its devices in the list before the next driver begins.
+    pDriver->GetDeviceArrivedCallback().AddImmediate( NotificationSystem::BindWeak( pWeak, &VVideoInputDeviceManager::OnDeviceArrived ) );
   }
 }
 

@@ -97,13 +97,14 @@ TEST_F( Bluefish444Driver, ACardThatCannotBeUsedIsPassedOver )
       "Card has no connectors, cannot continue.", "Error attaching input 1 to card 7." } ) );
 }
 
-// Somebody still has the device: it delivers nothing any more, and takes orders to no effect.
+// Somebody still has the device: it delivers nothing any more, has let its card go, and takes orders to no effect.
 TEST_F( Bluefish444Driver, ItsEndClosesItsDevices )
 {
   AddCard();
   Discover();
   m_Cards.front()->Freely();
   m_pDriver.reset();
+  EXPECT_EQ( Fake::Objects(), 0 );
   EXPECT_EQ( m_Arrived.front()->StartCapture( KVZ::IPixelFormat::EU8Y8V8Y8, KVZ::ITimecodeSource::EAny, KVZ::IAudioSampleFormat::EInt16, 0 ).m_Code,
     0 );
   EXPECT_EQ( m_Arrived.front()->GetStatus(), VideoInputHAL::IVideoInputDevice::EStatus::EReady );

@@ -27,6 +27,7 @@ protected:
 
   static constexpr uint32_t Mode576i = 0;
   static constexpr uint32_t Mode720p5994 = 2;
+  static constexpr uint32_t Mode1556PsF15 = 15;
   static constexpr uint32_t NoSignal = 46;
   static constexpr auto UYVY = KVZ::IPixelFormat::EU8Y8V8Y8;
   static constexpr auto AnyTimecode = KVZ::ITimecodeSource::EAny;

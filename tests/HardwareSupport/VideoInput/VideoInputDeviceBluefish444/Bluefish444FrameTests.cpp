@@ -77,6 +77,15 @@ TEST_F( Bluefish444Device, ADecoderMayFindFewerSamplesThanTheModeHas )
   EXPECT_FALSE( KVZ::IsValid( Undecoded.m_Timecode ) );
 }
 
+TEST_F( Bluefish444Device, AModeWithoutAFramePeriodHasNoSound )
+{
+  MakeCapturing( Mode1556PsF15, 2 );
+  const VReceivedFrame Frame = Next();
+  EXPECT_EQ( Frame.m_Period, 0 );
+  EXPECT_TRUE( Frame.m_Header.m_AudioInfo.IsEmpty() );
+  EXPECT_EQ( m_Card.m_LastRecord.m_ChannelMask, 0u ) << "the decoder is to write nothing where there is no room";
+}
+
 TEST_F( Bluefish444Device, WhatCannotBeHadCostsOneFrame )
 {
   MakeCapturing();

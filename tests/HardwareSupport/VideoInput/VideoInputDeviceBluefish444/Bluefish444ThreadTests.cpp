@@ -51,7 +51,7 @@ TEST_F( Bluefish444Device, OrdersFramesAndModesMixFreely )
   boost::thread Modes(
     [&]
     {
-      for( uint32_t Count = 0; Count < 2000; ++Count )
+      for( uint32_t Count = 0; Count < 200; ++Count )
       {
         m_Card.m_Mode = Count % 3 == 0 ? Mode720p5994 : Mode576i;
         m_pDevice->GetVideoStandard();

@@ -48,7 +48,8 @@ private:
   NotificationSystem::VMultiCallbackPostal<void()> m_Event;
 };
 
-// Announces on the caller's thread.
+// Announces on the caller's thread. The service of its own, which nothing runs here, must not come between it and the manager: devices of the first
+// driver have their places before the second begins.
 class VPlainDriver : public IVideoInputDriver
 {
 public:
@@ -62,7 +63,9 @@ public:
   }
 
   std::vector<std::shared_ptr<IVideoInputDevice>> m_OnDiscovery;
-  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<IVideoInputDevice> )> m_DeviceArrived;
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<IVideoInputDevice> )> m_DeviceArrived{
+    std::make_shared<TestSupport::VManualPostalService>()
+  };
 };
 
 class VideoInputDeviceManager : public ::testing::Test
