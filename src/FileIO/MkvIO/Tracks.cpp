@@ -2,11 +2,11 @@
 
 #include "FileIO/MkvIO/ElementSetting.h"
 #include "FileIO/MkvIO/Format.h"
+#include "FileIO/WriterSupport/BitmapHeader.h"
 
 #include <matroska/KaxSemantic.h>
 
 #include <algorithm>
-#include <bit>
 #include <cstring>
 #include <string>
 
@@ -23,20 +23,6 @@ enum ETrackType : uint64_t
   Video = 1,
   Audio = 2
 };
-
-// The BITMAPINFOHEADER of Video for Windows. The bit count and the image's size, which follow from the format, are left at 0.
-struct VBitmapHeader
-{
-  uint32_t m_Size = 40;
-  int32_t m_Width = 0;
-  int32_t m_Height = 0;
-  uint16_t m_Planes = 1;
-  uint16_t m_BitCount = 0;
-  char m_FourCC[4]{};
-  uint32_t m_ImageSize = 0;
-  uint32_t m_Rest[4]{};
-};
-static_assert( sizeof( VBitmapHeader ) == 40 && std::endian::native == std::endian::little );
 
 // Numbers count from 1, and each track's is its unique id too.
 KaxTrackEntry& AddTrack( KaxTracks& io_rTracks, uint64_t i_Number, ETrackType i_Type )
@@ -68,10 +54,10 @@ void FillCodec( KaxTrackEntry& o_rTrack, const KVZ::VideoFrameInfo& i_rVideo, co
   Set<KaxCodecID>( o_rTrack, std::string( i_rCodec.m_pId ) );
   if( i_rCodec.m_Place == EFourCCPlace::BitmapHeader )
   {
-    VBitmapHeader Header;
+    WriterSupport::VBitmapHeader Header;   // the bit count and the image's size, which follow from the format, are left at 0
     Header.m_Width = static_cast<int32_t>( i_rVideo.m_ImageWidth );
     Header.m_Height = static_cast<int32_t>( i_rVideo.m_ImageHeight );
-    std::memcpy( Header.m_FourCC, i_rCodec.m_pFourCC, sizeof( Header.m_FourCC ) );
+    std::memcpy( Header.m_Compression.data(), i_rCodec.m_pFourCC, Header.m_Compression.size() );
     SetBytes<KaxCodecPrivate>( o_rTrack, &Header, sizeof( Header ) );
   }
   if( i_rCodec.m_Place == EFourCCPlace::ColourSpace )

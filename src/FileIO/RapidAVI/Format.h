@@ -63,20 +63,6 @@ struct VStreamHeader
 };
 static_assert( sizeof( VStreamHeader ) == 56 );
 
-// "strf" of video; a palette may follow.
-struct VBitmapHeader
-{
-  uint32_t m_Size = 40;
-  int32_t m_Width = 0;
-  int32_t m_Height = 0;   // negative: the first row is the upper one
-  uint16_t m_Planes = 1;
-  uint16_t m_BitCount = 0;
-  VFourCC m_Compression{};
-  uint32_t m_ImageSize = 0;
-  uint32_t m_Reserved[4]{};
-};
-static_assert( sizeof( VBitmapHeader ) == 40 );
-
 // "strf" of audio, the extensible form
 struct VWaveFormat
 {

@@ -52,7 +52,7 @@ bool WriteSuperIndexRoom( VChunkWriter& io_rOut, VFourCC i_ChunkId, uint64_t& o_
 
 bool WriteBitmapHeader( VChunkWriter& io_rOut, const VFileDescription& i_rFile )
 {
-  const VBitmapHeader Header = MakeBitmapHeader( i_rFile );
+  const WriterSupport::VBitmapHeader Header = MakeBitmapHeader( i_rFile );
   const boost::optional<VPalette> Palette = MakePalette( i_rFile );
   VChunkScope Chunk( io_rOut, FourCC( "strf" ), static_cast<uint32_t>( sizeof( Header ) + ( Palette ? sizeof( *Palette ) : 0 ) ) );
   return io_rOut.Write( &Header, sizeof( Header ) ) && ( !Palette || io_rOut.Write( Palette->data(), sizeof( *Palette ) ) ) && Chunk.Close();

@@ -3,6 +3,7 @@
 
 #include "Core/VideoInterface/FrameRecords.h"
 #include "FileIO/RapidAVI/Format.h"
+#include "FileIO/WriterSupport/BitmapHeader.h"
 
 #include <boost/optional.hpp>
 
@@ -32,8 +33,8 @@ constexpr VFourCC AudioChunkId = FourCC( "01wb" );
 VStreamHeader MakeVideoStreamHeader( const VFileDescription& i_rFile );
 VStreamHeader MakeAudioStreamHeader( const VFileDescription& i_rFile );
 
-// A warning goes to the log for an image that every reader will show upside down.
-VBitmapHeader MakeBitmapHeader( const VFileDescription& i_rFile );
+// "strf" of video; a palette may follow. A warning goes to the log for an image that every reader will show upside down.
+WriterSupport::VBitmapHeader MakeBitmapHeader( const VFileDescription& i_rFile );
 
 // 256 entries of blue, green, red and a fourth byte. Grey values are stored as indexes into it.
 using VPalette = std::array<std::array<uint8_t, 4>, 256>;

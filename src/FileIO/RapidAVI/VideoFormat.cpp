@@ -95,7 +95,7 @@ VStreamHeader MakeVideoStreamHeader( const VFileDescription& i_rFile )
   return Header;
 }
 
-VBitmapHeader MakeBitmapHeader( const VFileDescription& i_rFile )
+WriterSupport::VBitmapHeader MakeBitmapHeader( const VFileDescription& i_rFile )
 {
   const VPixelRow Row = FindRow( i_rFile.m_Video.m_PixelFormat );
   if( Row.m_bAlwaysTopDown && i_rFile.m_Video.m_bInverted )
@@ -104,7 +104,7 @@ VBitmapHeader MakeBitmapHeader( const VFileDescription& i_rFile )
   }
   const bool bNegativeHeight = !i_rFile.m_Video.m_bInverted && !Row.m_bAlwaysTopDown && !IsJPEG( i_rFile );
   const auto Height = static_cast<int32_t>( i_rFile.m_Video.m_ImageHeight );
-  VBitmapHeader Header;
+  WriterSupport::VBitmapHeader Header;
   Header.m_Width = static_cast<int32_t>( i_rFile.m_Video.m_ImageWidth );
   Header.m_Height = bNegativeHeight ? -Height : Height;
   Header.m_BitCount = Row.m_BitCount;
