@@ -1,6 +1,7 @@
 #include "FileIO/MkvIO/Cluster.h"
 
 #include "FileIO/MkvIO/Format.h"
+#include "FileIO/WriterSupport/BufferSpans.h"
 
 #include <matroska/KaxCluster.h>
 #include <matroska/KaxSemantic.h>
@@ -65,13 +66,7 @@ void VCluster::AddBlock( const VBlock& i_rBlock, uint64_t i_Duration )
   AppendSize( m_Heads, i_rBlock.m_Track );
   m_Heads.insert( m_Heads.end(), { 0, 0, 0 } );   // at the cluster's own time; no lacing
   CloseHead();
-  for( const auto& rpBuffer : i_rBlock.m_rBuffers )
-  {
-    if( rpBuffer->Size() != 0 )
-    {
-      m_Spans.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
-    }
-  }
+  WriterSupport::AppendSpans( m_Spans, i_rBlock.m_rBuffers );
   AppendNumber( m_Heads, EBML_ID( KaxBlockDuration ), i_Duration );
 }
 

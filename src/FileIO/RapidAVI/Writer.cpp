@@ -4,6 +4,7 @@
 #include "FileIO/RapidAVI/JPEGImage.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "FileIO/WriterSupport/AttributeMaps.h"
+#include "FileIO/WriterSupport/BufferSpans.h"
 
 #include <limits>
 
@@ -115,10 +116,7 @@ bool VRapidAVIWriter::CollectVideo( const WriterSupport::VFrame& i_rFrame )
     KVZ_LOG_ERROR( Category(), "Frame %1% of %2% bytes does not fit the file's %3%.", i_rFrame.m_Key, Bytes, StoredBytes );
     return false;
   }
-  for( const auto& rpBuffer : i_rFrame.m_rVideo )
-  {
-    m_Video.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
-  }
+  WriterSupport::AppendSpans( m_Video, i_rFrame.m_rVideo );
   return true;
 }
 

@@ -4,27 +4,12 @@
 #include "FileIO/TarvoVideo/Format.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
 #include "FileIO/WriterSupport/AttributeMaps.h"
+#include "FileIO/WriterSupport/BufferSpans.h"
 
 #include <limits>
 
 namespace TarvoVideo
 {
-
-namespace
-{
-
-void AppendSpans( std::vector<KVZ::IOutputStream::VSpan>& o_rSpans, const KVZ::VBufferList& i_rBuffers )
-{
-  for( const auto& rpBuffer : i_rBuffers )
-  {
-    if( rpBuffer->Size() != 0 )
-    {
-      o_rSpans.emplace_back( rpBuffer->Data(), rpBuffer->Size() );
-    }
-  }
-}
-
-}
 
 VWriter::VWriter( std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
   : VWriterBase( "TarvoVideo" ), m_StreamMaker( std::move( i_StreamMaker ) ), m_Essence( std::move( i_pEncoder ) )
@@ -144,12 +129,12 @@ bool VWriter::FitsDescription( const WriterSupport::VFrame& i_rFrame, uint64_t i
 void VWriter::CollectSpans( const WriterSupport::VFrame& i_rFrame, const uint32_t* i_pAudioLength )
 {
   m_VideoSpans.clear();
-  AppendSpans( m_VideoSpans, i_rFrame.m_rVideo );
+  WriterSupport::AppendSpans( m_VideoSpans, i_rFrame.m_rVideo );
   m_AudioSpans.clear();
   if( i_pAudioLength )
   {
     m_AudioSpans.emplace_back( i_pAudioLength, sizeof( *i_pAudioLength ) );
-    AppendSpans( m_AudioSpans, i_rFrame.m_rAudio );
+    WriterSupport::AppendSpans( m_AudioSpans, i_rFrame.m_rAudio );
   }
 }
 
