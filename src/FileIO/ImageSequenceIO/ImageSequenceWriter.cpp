@@ -3,7 +3,6 @@
 #include "Core/VideoInterface/EnumTable.h"
 #include "FileIO/ImageSequenceIO/FileNames.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
-#include "FileIO/WriterSupport/AttributeMaps.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 
 #include <boost/filesystem/operations.hpp>
@@ -51,20 +50,9 @@ bool VImageSequenceWriter::DoWriteHeader( const WriterSupport::VHeader& i_rHeade
 
 bool VImageSequenceWriter::EncodeAttributes( const WriterSupport::VHeader& i_rHeader )
 {
-  m_InternalAttributes = {};
-  if( !WriterSupport::EncodeInternalAttributes( m_Video, KVZ::AudioFrameInfo(), m_InternalAttributes ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode internal attributes." );
-    return false;
-  }
   const WriterSupport::VRecordingDescription Recording{ i_rHeader.m_rAttributes, i_rHeader.m_rTiming, i_rHeader.m_rColour, i_rHeader.m_rTimecode,
     WriterSupport::ETimingKeys::Always, WriterSupport::ETimecodeKeys::Always };
-  if( !WriterSupport::EncodeExternalAttributes( Recording, m_ExternalAttributes ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode external attributes." );
-    return false;
-  }
-  return true;
+  return WriterSupport::EncodeAttributes( m_Video, KVZ::AudioFrameInfo(), Recording, Category(), m_Attributes );
 }
 
 bool VImageSequenceWriter::WriteSideFile() const
@@ -74,8 +62,8 @@ bool VImageSequenceWriter::WriteSideFile() const
   if( pStream )
   {
     WriterSupport::VWatchedStream File( std::move( pStream ) );
-    const bool bWritten = WriterSupport::WriteAttributeBlock( File, m_InternalAttributes ) &&
-      WriterSupport::WriteAttributeBlock( File, m_ExternalAttributes );
+    const bool bWritten = WriterSupport::WriteAttributeBlock( File, m_Attributes.m_Internal ) &&
+      WriterSupport::WriteAttributeBlock( File, m_Attributes.m_External );
     if( File.Close() && bWritten )
     {
       return true;

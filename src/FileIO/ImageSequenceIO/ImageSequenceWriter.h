@@ -5,9 +5,9 @@
 // threads at once, for different frame keys and in any order. The other operations are for one thread at a time.
 #pragma once
 
-#include "Core/VideoInterface/VideoAttributes.h"
 #include "Core/VideoInterface/WriterCapabilities.h"
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "FileIO/WriterSupport/AttributeMaps.h"
 #include "FileIO/WriterSupport/WatchedStream.h"
 #include "FileIO/WriterSupport/WriterBase.h"
 
@@ -55,8 +55,7 @@ private:
   KVZ::VideoFrameInfo m_Video;   // as stored
   KVZ::VTimingRecord m_Timing;
   KVZ::ITimecode m_StartTimecode;
-  KVZ::IVideoAttributes m_InternalAttributes;
-  KVZ::IVideoAttributes m_ExternalAttributes;
+  WriterSupport::VAttributeMaps m_Attributes;
 };
 
 }

@@ -43,11 +43,11 @@ boost::optional<uint32_t> FramePeriod( const KVZ::VTimingRecord& i_rTiming, cons
 }
 
 // Both maps describe the file as a whole, so they name no track.
-std::vector<VTagGroup> Attributes( const KVZ::IVideoAttributes& i_rInternal, const KVZ::IVideoAttributes& i_rExternal )
+std::vector<VTagGroup> TagsOf( const WriterSupport::VAttributeMaps& i_rAttributes )
 {
   std::vector<VTagGroup> Groups( 1 );
-  AddAttributes( Groups.front(), InternalPrefix, i_rInternal );
-  AddAttributes( Groups.front(), ExternalPrefix, i_rExternal );
+  AddAttributes( Groups.front(), InternalPrefix, i_rAttributes.m_Internal );
+  AddAttributes( Groups.front(), ExternalPrefix, i_rAttributes.m_External );
   return Groups;
 }
 
@@ -85,11 +85,11 @@ bool VMkvWriter::DoOpen( const std::string& i_rPath )
 bool VMkvWriter::DoWriteHeader( const WriterSupport::VHeader& i_rHeader )
 {
   m_Essence.Store( i_rHeader );
-  KVZ::IVideoAttributes Internal;
-  KVZ::IVideoAttributes External;
+  const WriterSupport::VRecordingDescription Recording{ i_rHeader.m_rAttributes, i_rHeader.m_rTiming, i_rHeader.m_rColour, i_rHeader.m_rTimecode };
+  WriterSupport::VAttributeMaps Attributes;
   const auto Period = FramePeriod( i_rHeader.m_rTiming, Category() );
   const auto VideoCodec = FindVideoCodec( m_Essence.VideoPayload(), m_Essence.Video().m_PixelFormat );
-  if( !Period || !VideoCodec || !EncodeAttributes( i_rHeader, Internal, External ) )
+  if( !Period || !VideoCodec || !WriterSupport::EncodeAttributes( m_Essence.Video(), m_Essence.Audio(), Recording, Category(), Attributes ) )
   {
     return false;
   }
@@ -100,26 +100,9 @@ bool VMkvWriter::DoWriteHeader( const WriterSupport::VHeader& i_rHeader )
     return false;
   }
   libmatroska::KaxTags Tags;
-  FillTags( Tags, Attributes( Internal, External ) );
+  FillTags( Tags, TagsOf( Attributes ) );
   m_pSegment = std::make_unique<VSegment>( *m_pFile );
   m_pSegment->Begin( { WritingApplication, *Period / TimecodeScale, Tracks, Tags } );
-  return true;
-}
-
-bool VMkvWriter::EncodeAttributes( const WriterSupport::VHeader& i_rHeader, KVZ::IVideoAttributes& o_rInternal,
-  KVZ::IVideoAttributes& o_rExternal ) const
-{
-  if( !WriterSupport::EncodeInternalAttributes( m_Essence.Video(), m_Essence.Audio(), o_rInternal ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode internal attributes." );
-    return false;
-  }
-  if( !WriterSupport::EncodeExternalAttributes( { i_rHeader.m_rAttributes, i_rHeader.m_rTiming, i_rHeader.m_rColour, i_rHeader.m_rTimecode },
-        o_rExternal ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode external attributes." );
-    return false;
-  }
   return true;
 }
 

@@ -39,8 +39,6 @@ private:
   bool DoWriteFrame( WriterSupport::VFrame& io_rFrame ) override;
   bool DoClose() override;
 
-  bool EncodeAttributes( const WriterSupport::VHeader& i_rHeader, KVZ::IVideoAttributes& o_rInternal, KVZ::IVideoAttributes& o_rExternal ) const;
-
   const VWriterCapabilities m_Capabilities;
   const WriterSupport::VStreamMaker m_StreamMaker;
   WriterSupport::VEssence m_Essence;

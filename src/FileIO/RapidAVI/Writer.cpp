@@ -3,7 +3,6 @@
 #include "CoreVideoUtils/FrameSize.h"
 #include "FileIO/RapidAVI/JPEGImage.h"
 #include "FileIO/WriterSupport/AttributeBlock.h"
-#include "FileIO/WriterSupport/AttributeMaps.h"
 #include "FileIO/WriterSupport/BufferSpans.h"
 
 #include <limits>
@@ -55,20 +54,9 @@ VFileDescription VRapidAVIWriter::Describe( const WriterSupport::VHeader& i_rHea
 
 bool VRapidAVIWriter::EncodeAttributes( const WriterSupport::VHeader& i_rHeader )
 {
-  m_Internal = {};
-  if( !WriterSupport::EncodeInternalAttributes( m_Essence.Video(), m_Essence.Audio(), m_Internal ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode internal attributes." );
-    return false;
-  }
   const WriterSupport::VRecordingDescription Recording{ i_rHeader.m_rAttributes, i_rHeader.m_rTiming, i_rHeader.m_rColour, i_rHeader.m_rTimecode,
     WriterSupport::ETimingKeys::WhenNotDefault, WriterSupport::ETimecodeKeys::Always };
-  if( !WriterSupport::EncodeExternalAttributes( Recording, m_External ) )
-  {
-    KVZ_LOG_ERROR( Category(), "Could not encode external attributes." );
-    return false;
-  }
-  return true;
+  return WriterSupport::EncodeAttributes( m_Essence.Video(), m_Essence.Audio(), Recording, Category(), m_Attributes );
 }
 
 bool VRapidAVIWriter::DoWriteFrame( WriterSupport::VFrame& io_rFrame )
@@ -166,7 +154,8 @@ bool VRapidAVIWriter::DoClose()
 bool VRapidAVIWriter::WriteAttributes( VChunkWriter& io_rOut ) const
 {
   VChunkScope Riff = VChunkScope::Riff( io_rOut, FourCC( "TMSL" ) );
-  return WriterSupport::WriteAttributeBlock( io_rOut, m_Internal ) && WriterSupport::WriteAttributeBlock( io_rOut, m_External ) && Riff.Close();
+  return WriterSupport::WriteAttributeBlock( io_rOut, m_Attributes.m_Internal ) &&
+    WriterSupport::WriteAttributeBlock( io_rOut, m_Attributes.m_External ) && Riff.Close();
 }
 
 }

@@ -8,6 +8,7 @@
 #include "Core/VideoInterface/WriterCapabilities.h"
 #include "FileIO/RapidAVI/Headers.h"
 #include "FileIO/RapidAVI/Segments.h"
+#include "FileIO/WriterSupport/AttributeMaps.h"
 #include "FileIO/WriterSupport/Essence.h"
 
 #include <boost/optional.hpp>
@@ -49,8 +50,7 @@ private:
   const VSegmentLimits m_Limits;
   WriterSupport::VEssence m_Essence;
 
-  KVZ::IVideoAttributes m_Internal;
-  KVZ::IVideoAttributes m_External;
+  WriterSupport::VAttributeMaps m_Attributes;
   std::unique_ptr<VChunkWriter> m_pOut;
   VOpenFields m_Fields;
   boost::optional<VIndex> m_Index;

@@ -22,4 +22,21 @@ bool EncodeExternalAttributes( const VRecordingDescription& i_rRecording, KVZ::I
   return !bTimecode || WriteAttributes( i_rRecording.m_rTimecode, o_rAttributes );
 }
 
+bool EncodeAttributes( const KVZ::VideoFrameInfo& i_rVideo, const KVZ::AudioFrameInfo& i_rAudio, const VRecordingDescription& i_rRecording,
+  const KVZ::VLogCategory& i_rCategory, VAttributeMaps& o_rMaps )
+{
+  o_rMaps = {};
+  if( !EncodeInternalAttributes( i_rVideo, i_rAudio, o_rMaps.m_Internal ) )
+  {
+    KVZ_LOG_ERROR( i_rCategory, "Could not encode internal attributes." );
+    return false;
+  }
+  if( !EncodeExternalAttributes( i_rRecording, o_rMaps.m_External ) )
+  {
+    KVZ_LOG_ERROR( i_rCategory, "Could not encode external attributes." );
+    return false;
+  }
+  return true;
+}
+
 }

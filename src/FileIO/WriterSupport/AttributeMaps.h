@@ -3,6 +3,7 @@
 
 #include "Core/VideoInterface/FrameRecords.h"
 #include "Core/VideoInterface/VideoAttributes.h"
+#include "StageCoreRuntime/GlobalLog.h"
 
 namespace WriterSupport
 {
@@ -35,5 +36,15 @@ struct VRecordingDescription
 
 // Replaces the map.
 bool EncodeExternalAttributes( const VRecordingDescription& i_rRecording, KVZ::IVideoAttributes& o_rAttributes );
+
+struct VAttributeMaps
+{
+  KVZ::IVideoAttributes m_Internal;
+  KVZ::IVideoAttributes m_External;
+};
+
+// Replaces both maps. False, with a line in the log, where one of them cannot be made.
+bool EncodeAttributes( const KVZ::VideoFrameInfo& i_rVideo, const KVZ::AudioFrameInfo& i_rAudio, const VRecordingDescription& i_rRecording,
+  const KVZ::VLogCategory& i_rCategory, VAttributeMaps& o_rMaps );
 
 }
