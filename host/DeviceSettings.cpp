@@ -64,17 +64,6 @@ boost::optional<KVZ::Variant> ValueFor( const IParameter& i_rParameter, const st
   return Value ? boost::optional<KVZ::Variant>( *Value ) : boost::none;
 }
 
-// As a device that has just appeared takes it: where the default is not allowed now, the first value that is.
-void SetDefault( IParameter& io_rParameter )
-{
-  KVZ::Variant Default;
-  VParameterChoices Choices;
-  if( io_rParameter.GetValueDefault( Default ) && !io_rParameter.SetValue( Default ) && io_rParameter.GetEnum( Choices ) && !Choices.empty() )
-  {
-    io_rParameter.SetValue( Choices.front().m_Value );
-  }
-}
-
 std::string UnknownSetting( const std::string& i_rPath ) { return "There is no setting \"" + i_rPath + "\"; \"params list\" shows them all."; }
 
 std::string JoinAllowed( const std::vector<std::string>& i_rTexts )
@@ -87,20 +76,31 @@ std::string JoinAllowed( const std::vector<std::string>& i_rTexts )
   return Joined;
 }
 
-std::string WhatIsAccepted( const VSettingInfo& i_rSetting, const IParameter& i_rParameter )
+}
+
+std::string WhatIsAccepted( const IParameter& i_rParameter )
 {
-  if( !i_rSetting.m_Allowed.empty() )
+  const std::vector<std::string> Allowed = Labels( i_rParameter );
+  if( !Allowed.empty() )
   {
-    return "it takes: " + JoinAllowed( i_rSetting.m_Allowed );
+    return "it takes: " + JoinAllowed( Allowed );
   }
-  if( !i_rSetting.m_Minimum.empty() || !i_rSetting.m_Maximum.empty() )
+  if( i_rParameter.HasMin() || i_rParameter.HasMax() )
   {
-    return "it takes values from " + ( i_rSetting.m_Minimum.empty() ? "any" : i_rSetting.m_Minimum ) + " to " +
-      ( i_rSetting.m_Maximum.empty() ? "any" : i_rSetting.m_Maximum );
+    return "it takes values from " + ( i_rParameter.HasMin() ? TextOf( i_rParameter, &IParameter::GetMin ) : "any" ) + " to " +
+      ( i_rParameter.HasMax() ? TextOf( i_rParameter, &IParameter::GetMax ) : "any" );
   }
   return "it takes a value of the type " + i_rParameter.GetSchema()->Name();
 }
 
+void SetDefault( IParameter& io_rParameter )
+{
+  KVZ::Variant Default;
+  VParameterChoices Choices;
+  if( io_rParameter.GetValueDefault( Default ) && !io_rParameter.SetValue( Default ) && io_rParameter.GetEnum( Choices ) && !Choices.empty() )
+  {
+    io_rParameter.SetValue( Choices.front().m_Value );
+  }
 }
 
 VDeviceSettings::VDeviceSettings( std::shared_ptr<IDataStore> i_pDataStore, const VParameterRegistry& i_rRegistry )
@@ -156,8 +156,7 @@ bool VDeviceSettings::Set( const std::string& i_rPath, const std::string& i_rVal
     o_rError = UnknownSetting( i_rPath );
     return false;
   }
-  const VSettingInfo Setting = Describe( *pParameter );
-  if( Setting.m_bReadOnly )
+  if( pParameter->IsReadOnly() )
   {
     o_rError = i_rPath + " is read-only.";
     return false;
@@ -165,7 +164,7 @@ bool VDeviceSettings::Set( const std::string& i_rPath, const std::string& i_rVal
   const auto Value = ValueFor( *pParameter, i_rValue );
   if( !Value || !pParameter->SetValue( *Value ) )
   {
-    o_rError = i_rPath + " cannot be \"" + i_rValue + "\": " + WhatIsAccepted( Setting, *pParameter ) + ".";
+    o_rError = i_rPath + " cannot be \"" + i_rValue + "\": " + WhatIsAccepted( *pParameter ) + ".";
     return false;
   }
   return true;

@@ -64,6 +64,12 @@ struct VSettingInfo
   bool m_bInTicks = false;   // a time in ticks of 1/135000000 s, whatever unit its display text names
 };
 
+// For people, as the end of a line that says what was refused: "it takes values from 0 to 1".
+std::string WhatIsAccepted( const IParameter& i_rParameter );
+
+// As a device that has just appeared takes it: where the default is not allowed now, the first value that is.
+void SetDefault( IParameter& io_rParameter );
+
 class VDeviceSettings
 {
 public:

@@ -32,6 +32,10 @@ void VShutdownManager::Shutdown()
 
 void VParameterRegistry::AddParameterGroup( std::shared_ptr<IParameterGroup> i_pGroup )
 {
+  if( m_Arrival )
+  {
+    m_Arrival( *i_pGroup );
+  }
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
   m_Groups.push_back( std::move( i_pGroup ) );
 }

@@ -33,6 +33,12 @@ private:
 class VParameterRegistry : public StageCorePluginInterface::IParameterRegistry
 {
 public:
+  using VArrival = std::function<void( const IParameterGroup& )>;
+
+  VParameterRegistry() = default;
+  // The function sees each group before it is in the list, on the thread that adds it.
+  explicit VParameterRegistry( VArrival i_Arrival ) : m_Arrival( std::move( i_Arrival ) ) {}
+
   void AddParameterGroup( std::shared_ptr<IParameterGroup> i_pGroup ) override;
   void RemoveParameterGroup( const std::shared_ptr<IParameterGroup>& i_pGroup ) override;
 
@@ -41,6 +47,7 @@ public:
   void Clear();
 
 private:
+  const VArrival m_Arrival;   // may be empty
   mutable boost::mutex m_Mutex;
   std::vector<std::shared_ptr<IParameterGroup>> m_Groups GUARDED_BY( m_Mutex );
 };

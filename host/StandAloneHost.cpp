@@ -49,7 +49,9 @@ VStandAloneHost::VStandAloneHost( const VHostOptions& i_rOptions )
     m_pAllocator( MakeAllocator( i_rOptions.m_MemoryMiB ) ),
     m_pShutdown( std::make_shared<VShutdownManager>() ),
     m_pFlowNodes( std::make_shared<VFlowNodeRegistry>() ),
-    m_pParameters( std::make_shared<VParameterRegistry>() ),
+    m_pRestoredSettings( std::make_shared<VRestoredSettings>( m_pDataStore ) ),
+    m_pParameters( std::make_shared<VParameterRegistry>(
+      [pRestored = m_pRestoredSettings]( const IParameterGroup& i_rGroup ) { pRestored->Check( i_rGroup ); } ) ),
     m_pHardwareStart( std::make_shared<VHardwareStartEvent>() ),
     m_pHardware( std::make_shared<VHardwareRegistry>() ),
     m_pTargets( std::make_shared<VCaptureTargets>( m_pDataStore ) ),
@@ -64,6 +66,13 @@ VStandAloneHost::VStandAloneHost( const VHostOptions& i_rOptions )
 }
 
 VStandAloneHost::~VStandAloneHost() { StopModule(); }
+
+std::vector<std::string> VStandAloneHost::RestoreSettings()
+{
+  std::vector<std::string> Messages = m_SettingsFile.Restore( *m_pDataStore );
+  m_pRestoredSettings->TakeAll();
+  return Messages;
+}
 
 bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rError )
 {

@@ -8,6 +8,7 @@
 #include "host/FlowGraph.h"
 #include "host/ModuleLoader.h"
 #include "host/Registries.h"
+#include "host/RestoredSettings.h"
 #include "host/SettingsFile.h"
 #include "host/SyncEngine.h"
 
@@ -43,7 +44,8 @@ public:
   ~VStandAloneHost() override;
 
   // Brings the saved settings back; before the module starts, so that its devices find them. What could not be brought back, a line each.
-  std::vector<std::string> RestoreSettings() { return m_SettingsFile.Restore( *m_pDataStore ); }
+  // A device's settings that it would not take from its user are told in the log when it appears, and go back to their defaults.
+  std::vector<std::string> RestoreSettings();
   VSettingsFile& SettingsFile() { return m_SettingsFile; }
 
   // Loads a module and takes it through the whole start up to the hardware start event. False with the reason in o_rError.
@@ -85,6 +87,7 @@ private:
   const std::shared_ptr<UtilsMemory::VBalancingAllocator> m_pAllocator;
   const std::shared_ptr<VShutdownManager> m_pShutdown;
   const std::shared_ptr<VFlowNodeRegistry> m_pFlowNodes;
+  const std::shared_ptr<VRestoredSettings> m_pRestoredSettings;
   const std::shared_ptr<VParameterRegistry> m_pParameters;
   const std::shared_ptr<VHardwareStartEvent> m_pHardwareStart;
   const std::shared_ptr<VHardwareRegistry> m_pHardware;

@@ -184,7 +184,8 @@ bool VParameter::SetValueDefault( const KVZ::Variant& i_rValue )
     return false;
   }
   VDataWriter Writer( *m_pDataStore );
-  return Writer.SetValue( m_Attributes[Default], i_rValue ) && ( Writer.Exists( m_Value ) || Writer.SetValue( m_Value, i_rValue ) );
+  const bool bHasValue = Writer.GetSchema( m_Value ) == GetSchema();   // a value of another type counts as none
+  return Writer.SetValue( m_Attributes[Default], i_rValue ) && ( bHasValue || Writer.SetValue( m_Value, i_rValue ) );
 }
 
 bool VParameter::SetLimit( EAttribute i_Attribute, const KVZ::Variant& i_rValue )

@@ -163,6 +163,11 @@ TEST_F( Parameters, ADefaultBecomesTheValueOnlyWhereThereIsNone )
   EXPECT_TRUE( pSaved->GetValueDefault( Default ) );
   EXPECT_EQ( Default, Variant::Make<int64_t>( 1 ) );
   EXPECT_EQ( ValueOf( *pSaved ), Variant::Make<int64_t>( 7 ) );
+
+  VDataWriter( *m_pStore ).SetValue( m_Parent + "Foreign", Variant::Make( "7" ) );
+  const auto pForeign = Make<int64_t>( "Foreign" );
+  EXPECT_TRUE( pForeign->SetValueDefault( Variant::Make<int64_t>( 1 ) ) );
+  EXPECT_EQ( ValueOf( *pForeign ), Variant::Make<int64_t>( 1 ) ) << "a value of another type is none";
 }
 
 TEST_F( Parameters, AnOwnerAnswersEachProposalAndTheValueSettles )

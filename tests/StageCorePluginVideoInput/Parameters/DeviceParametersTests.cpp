@@ -104,13 +104,24 @@ TEST_F( VParameters, ASavedChannelCountThatTheCardLacksBecomesTheLargest )
   EXPECT_EQ( Value<uint32_t>( "AudioChannelCount" ), 16u );
 }
 
+// Two formats without a name share a label, so that the list cannot be shown.
+TEST_F( VParameters, ASavedFormatThatTheCardLacksIsCorrectedAlsoWithoutAList )
+{
+  constexpr auto Nameless = static_cast<IPixelFormat::Enum>( 1000 );
+  m_pDevice->m_PixelFormats = { Nameless, static_cast<IPixelFormat::Enum>( 1001 ) };
+  Save( Keys::PixelFormat( m_Device ), IPixelFormat::EU8Y8V8Y8 );
+  Create();
+  EXPECT_EQ( Value<IPixelFormat::Enum>( "PixelFormat" ), Nameless );
+}
+
 TEST_F( VParameters, ASavedValueOfAnotherTypeCountsAsAbsent )
 {
   Save( DeviceSchemas::UserId( m_Device ), std::string( "seven" ) );
   Save( DeviceSchemas::Enabled( m_Device ), std::string( "yes" ) );
   Create();
   EXPECT_EQ( Value<uint32_t>( "UserId" ), 1u );
-  EXPECT_TRUE( m_pDevice->m_Starts.empty() );
+  EXPECT_TRUE( Value<bool>( "Enabled" ) ) << "the default";
+  EXPECT_EQ( m_pDevice->m_Starts.size(), 1u );
 }
 
 TEST_F( VParameters, ASavedEnabledThatIsOnlyVerifiedIsTheWishToo )

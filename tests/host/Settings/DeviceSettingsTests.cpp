@@ -1,12 +1,18 @@
 // Settings by their paths: back to their defaults, and watched.
+#include "Core/VideoInterface/Schemas.h"
+#include "StageCoreDataStore/DataVerifyWriter.h"
 #include "StageCoreParameters/Parameter.h"
 #include "StageCoreParameters/ParameterGroup.h"
 #include "StageCoreRuntime/Shared.h"
 #include "host/DataStore.h"
 #include "host/DeviceSettings.h"
+#include "host/RestoredSettings.h"
 #include "host/SettingsWatcher.h"
+#include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
+
+#include <cmath>
 
 using KVZ::Variant;
 using VTexts = std::vector<std::string>;
@@ -67,6 +73,7 @@ protected:
     return Result;
   }
 
+  const VDataPath m_Path{ "VideoInput", "vi:0", "Settings" };
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
   StageHost::VParameterRegistry m_Registry;
   StageHost::VDeviceSettings m_Settings{ m_pStore, m_Registry };
@@ -122,6 +129,68 @@ TEST_F( Settings, AnOwnerHearsOfAResetOnce )
   Device.m_pName->GetValueChangedCallback().AddImmediate( [&] { Heard.push_back( Text( Device.m_pName ) ); } );
   m_Settings.Reset( "VideoInput", m_Error );
   EXPECT_EQ( Heard, VTexts{ "default" } );
+}
+
+// As a device finds them in the store, and makes its parameters around them.
+TEST_F( Settings, RestoredValuesThatAreNotTakenGiveWayToTheDefault )
+{
+  using KVZ::IPixelFormat;
+  const auto Put = [this]( const char* i_pKey, const Variant& i_rValue, uint32_t i_Flags = 0 )
+  {
+    VDataVerifyWriter Writer( *m_pStore );
+    Writer.SetValueFlags( m_Path + i_pKey, i_Flags );
+    Writer.SetValue( m_Path + i_pKey, i_rValue );
+  };
+  Put( "Gain", Variant::Make( 5.5 ) );
+  Put( "Odd", Variant::Make( std::nan( "" ) ) );
+  Put( "Good", Variant::Make( 0.25 ) );
+  Put( "Asked", Variant::Make( 0.5 ), DataFlags::VerifyRequired );
+  VDataVerifyWriter( *m_pStore ).SetProposedValue( m_Path + "Asked", Variant::Make( 7.0 ) );
+  Put( "Foreign", Variant::Make( "maybe" ) );
+  Put( "Bare", Variant::Make( "maybe" ) );
+  Put( "Ratio", Variant::Make( 3.0 ) );
+  Put( "Format", Variant::Make( IPixelFormat::ELuminance8 ) );
+  Put( "Status", Variant::Make( 9.0 ), DataFlags::ReadOnly );
+  const auto pRestored = std::make_shared<StageHost::VRestoredSettings>( m_pStore );
+  pRestored->TakeAll();
+  StageHost::VParameterRegistry Registry( [&]( const IParameterGroup& i_rGroup ) { pRestored->Check( i_rGroup ); } );
+
+  const auto pGroup = std::make_shared<VParameterGroup>( m_pStore, m_Path, VDataPath{ "Attributes" } + m_Path );
+  const auto Add = [&]( const auto& i_rChecker, const char* i_pKey, const Variant& i_rDefault )
+  {
+    const auto pParameter = KVZ::MakeShared<VParameter>( m_pStore, i_rChecker, m_Path, i_pKey );
+    pParameter->SetRange( Variant::Make( 0.0 ), Variant::Make( 1.0 ) );
+    pParameter->SetValueDefault( i_rDefault );
+    pGroup->AddParameter( pParameter );
+    return pParameter;
+  };
+  for( const char* pKey : { "Gain", "Odd", "Good", "Asked", "Foreign", "Status", "Unsaved" } )
+  {
+    Add( GetParameterChecker<double>(), pKey, Variant::Make( 0.75 ) );
+  }
+  Add( GetParameterChecker<bool>(), "Bare", {} );
+  Add( GetParameterChecker<double>(), "Ratio", {} )->SetEnum( { { "One", Variant::Make( 1.0 ) } } );
+  Add( GetParameterChecker<IPixelFormat::Enum>(), "Format", {} )->SetEnum( { { "Other", Variant::Make( IPixelFormat::EU8Y8V8Y8 ) } } );
+
+  TestSupport::VLogCapture Log( "DataStore" );
+  Registry.AddParameterGroup( pGroup );
+  Registry.AddParameterGroup( pGroup );
+  VTexts Values;
+  for( const auto& pParameter : pGroup->GetParameters() )
+  {
+    Variant Value;
+    Values.push_back( pParameter->GetName() + "=" + ( pParameter->GetValue( Value ) ? Value.ToText() : "" ) );
+  }
+  EXPECT_EQ( Values,
+    ( VTexts{ "Gain=0.75", "Odd=0.75", "Good=0.25", "Asked=0.75", "Foreign=0.75", "Status=9", "Unsaved=0.75",
+      "Bare=", "Ratio=", "Format=Luminance8" } ) );
+  const std::string Path = "The saved setting \"VideoInput.vi:0.Settings.";
+  EXPECT_EQ( Log.Texts(),
+    ( VTexts{ Path + "Gain\" cannot be used: it is \"5.5\", and it takes values from 0 to 1.",
+      Path + "Odd\" cannot be used: it is \"nan\", and it takes values from 0 to 1.",
+      Path + "Asked\" cannot be used: it is \"7\", and it takes values from 0 to 1.",
+      Path + "Foreign\" cannot be used: it is of the type string, not double.", Path + "Bare\" cannot be used: it is of the type string, not bool.",
+      Path + "Ratio\" cannot be used: it is \"3\", and it takes: One." } ) );
 }
 
 TEST_F( Settings, EveryChangeIsHeardInItsOrder )
