@@ -73,12 +73,21 @@ bool ReadAll( int i_Handle, std::string& o_rText )
   return true;
 }
 
+// Owner and group are taken over where the system lets this user give them away.
+bool TakeOver( int i_Handle, const struct stat& i_rStatus )
+{
+  constexpr auto Same = static_cast<uid_t>( -1 );
+  static_cast<void>( fchown( i_Handle, i_rStatus.st_uid, Same ) == 0 );
+  static_cast<void>( fchown( i_Handle, Same, i_rStatus.st_gid ) == 0 );
+  return fchmod( i_Handle, i_rStatus.st_mode & Permissions ) == 0;
+}
+
 // A new file with the permissions of the one that it is to replace.
 bool WriteNewFile( const std::string& i_rPath, const std::string& i_rLike, const std::string& i_rText )
 {
   VHandle File( open( i_rPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, AllMayReadAndWrite ) );
   struct stat Status = {};
-  if( !File.IsOpen() || ( stat( i_rLike.c_str(), &Status ) == 0 && fchmod( File.Get(), Status.st_mode & Permissions ) != 0 ) )
+  if( !File.IsOpen() || ( stat( i_rLike.c_str(), &Status ) == 0 && !TakeOver( File.Get(), Status ) ) )
   {
     return false;
   }

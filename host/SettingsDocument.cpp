@@ -18,7 +18,7 @@ namespace StageHost
 namespace
 {
 
-constexpr int64_t CurrentVersion = 1;
+constexpr uint32_t CurrentVersion = 1;
 constexpr int DeepestNesting = 100;
 constexpr const char* VersionKey = "version";
 constexpr const char* SettingsKey = "settings";
@@ -85,7 +85,7 @@ bool IsTrueAt( const VJson& i_rEntry, const char* i_pKey )
 // Empty, or why this entry cannot be used.
 std::string ReadSetting( const VDataPath& i_rPath, const VJson& i_rEntry, IDataVerifyWriter& io_rDataWriter )
 {
-  if( i_rPath.IsEmpty() || i_rPath.IsWildcard() || !i_rEntry.is_object() )
+  if( i_rPath.IsEmpty() || i_rPath.IsWildcard() || i_rPath.Segments().front() == "Attributes" || !i_rEntry.is_object() )
   {
     return "it is no value with a place";
   }
@@ -143,6 +143,11 @@ bool WriteSetting( const VDataPath& i_rPath, const IDataVerifyReader& i_rDataRea
   return true;
 }
 
+bool IsLater( const VJson& i_rVersion )
+{
+  return i_rVersion.is_number_unsigned() ? i_rVersion.get<uint64_t>() > CurrentVersion : i_rVersion.get<int64_t>() > int64_t{ CurrentVersion };
+}
+
 VJson ParseText( const std::string& i_rText )
 {
   return VJson::parse( i_rText,
@@ -164,6 +169,11 @@ ESettingsText ParseSettings( const std::string& i_rText, VJson& o_rDocument, std
     o_rReason = "no JSON at byte " + std::to_string( rError.byte );
     return ESettingsText::Damaged;
   }
+  catch( const VJson::out_of_range& )
+  {
+    o_rReason = "a number in it is too large";
+    return ESettingsText::Damaged;
+  }
   catch( const std::exception& rError )
   {
     o_rReason = rError.what();
@@ -179,7 +189,7 @@ ESettingsText ParseSettings( const std::string& i_rText, VJson& o_rDocument, std
     o_rReason = "its version is no number";
     return ESettingsText::Damaged;
   }
-  if( Document.value( VersionKey, CurrentVersion ) > CurrentVersion )
+  if( IsLater( Document.value( VersionKey, VJson( CurrentVersion ) ) ) )
   {
     o_rReason = "it is of version " + Document[VersionKey].dump() + ", and this program knows versions up to " + std::to_string( CurrentVersion );
     return ESettingsText::OfLaterVersion;
@@ -198,7 +208,9 @@ std::vector<std::string> ReadSettings( const VJson& i_rDocument, IDataVerifyWrit
   }
   for( const auto& rItem : Settings->items() )
   {
-    const std::string Reason = ReadSetting( VDataPath::FromString( rItem.key() ), rItem.value(), io_rDataWriter );
+    const VDataPath Path = VDataPath::FromString( rItem.key() );
+    const bool bOneOfTwo = Path.ToString() != rItem.key();   // the value may stand there under its proper path too
+    const std::string Reason = bOneOfTwo ? "its path is \"" + Path.ToString() + "\"" : ReadSetting( Path, rItem.value(), io_rDataWriter );
     if( !Reason.empty() )
     {
       Refused.push_back( "The saved setting \"" + rItem.key() + "\" cannot be used: " + Reason + "." );

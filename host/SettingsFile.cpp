@@ -38,12 +38,19 @@ std::string HomeFolder()
   return pUser && pUser->pw_dir ? pUser->pw_dir : "";
 }
 
-// The file itself where the path is a link to it, so that the link stays one and all agree on the lock.
+constexpr int MostLinks = 40;   // as the system itself has it
+
+// The file itself where the path is a link to it, be it one that is not there yet, so that the link stays one and all agree on the lock.
 std::string FollowLinks( const std::string& i_rPath )
 {
   boost::system::error_code Error;
-  const boost::filesystem::path Path = boost::filesystem::canonical( i_rPath, Error );
-  return Error ? i_rPath : Path.string();
+  boost::filesystem::path Path( i_rPath );
+  for( int Links = 0; Links < MostLinks && boost::filesystem::symlink_status( Path, Error ).type() == boost::filesystem::symlink_file; ++Links )
+  {
+    Path = boost::filesystem::absolute( boost::filesystem::read_symlink( Path, Error ), Path.parent_path() );
+  }
+  const boost::filesystem::path Folder = boost::filesystem::canonical( Path.parent_path(), Error );
+  return Error ? Path.string() : ( Folder / Path.filename() ).string();
 }
 
 std::string Named( const std::string& i_rPath ) { return "The settings file \"" + i_rPath + "\""; }
@@ -144,7 +151,12 @@ bool Change( const std::string& i_rPath, const std::function<bool( VJson&, std::
   }
   VFileLock FileLock;
   std::string Reason;
-  if( !MakeFolder( Path, Reason ) || !Lock( Path, FileLock, Reason ) )
+  if( !MakeFolder( Path, Reason ) )
+  {
+    o_rError = "The folder of the settings file \"" + i_rPath + "\" cannot be made: " + Reason + ".";
+    return false;
+  }
+  if( !Lock( Path, FileLock, Reason ) )
   {
     o_rError = Named( i_rPath ) + " cannot be locked: " + Reason + ".";
     return false;

@@ -16,6 +16,9 @@
 #include <fstream>
 #include <limits>
 
+#include <sys/stat.h>
+#include <unistd.h>
+
 using KVZ::Variant;
 using StageHost::VSettingsFile;
 using VJson = nlohmann::json;
@@ -142,9 +145,12 @@ TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
     "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
     "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "B", "who": "me" },
     "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
+    "VideoInput..vi:0.Settings.Name": { "type": "string", "value": "not the place of Name" },
+    "Attributes.VideoInput.vi:0.Settings.Name.Max": { "type": "string", "value": "A" },
     "": 5 } })" );
-  EXPECT_EQ( Restore().size(), 3u );
+  EXPECT_EQ( Restore().size(), 5u );
   EXPECT_EQ( Text( "Name" ), "B" );
+  EXPECT_EQ( VDataReader( m_Restored ).CountValues( VDataPath{ "Attributes" } ), 0u );
   EXPECT_FALSE( VDataReader( m_Restored ).Exists( m_Device + "Old" ) );
 
   ASSERT_TRUE( Save( { "Name", "Gain" } ) ) << m_Error;
@@ -152,6 +158,8 @@ TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
     "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
     "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "A", "who": "me" },
     "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
+    "VideoInput..vi:0.Settings.Name": { "type": "string", "value": "not the place of Name" },
+    "Attributes.VideoInput.vi:0.Settings.Name.Max": { "type": "string", "value": "A" },
     "VideoInput.vi:0.Settings.Gain": { "type": "int32", "value": 3 },
     "": 5 } })" );
   EXPECT_EQ( ReadJson(), Expected );
@@ -167,7 +175,7 @@ TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
   ASSERT_TRUE( Save( { "Name" } ) );
   const std::string Whole = ReadFile( m_Path );
   const VTexts Damaged = { "", Whole.substr( 0, Whole.size() / 2 ), "[]", R"({ "settings": 5 })", R"({ "version": "x" })", "\xff\xfe",
-    std::string( 100000, '[' ) };
+    std::string( 100000, '[' ), R"({ "note": 1e999 })" };
   for( size_t Index = 0; Index < Damaged.size(); ++Index )
   {
     SCOPED_TRACE( Damaged[Index].substr( 0, 20 ) );
@@ -179,6 +187,7 @@ TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
     ASSERT_EQ( Messages.size(), 1u );
     EXPECT_NE( Messages[0].find( m_Path + "\" is damaged" ), std::string::npos ) << Messages[0];
     EXPECT_NE( Messages[0].find( Aside ), std::string::npos ) << Messages[0];
+    EXPECT_EQ( Messages[0].find( "exception" ), std::string::npos ) << "words for people: " << Messages[0];
     EXPECT_EQ( ReadFile( Aside ), Damaged[Index] );
     EXPECT_EQ( Restore(), VTexts() ) << "a file that is not there holds nothing";
     EXPECT_TRUE( Save( { "Name" } ) ) << m_Error;
@@ -189,13 +198,16 @@ TEST_F( SettingsFile, AFileOfALaterVersionIsLeftAlone )
 {
   Put( "Name", std::string( "A" ) );
   ASSERT_TRUE( Save( { "Name" } ) );
-  const std::string Later = R"({ "version": 2, "settings": {} })";
-  WriteFile( Later );
-  const VTexts Messages = Restore();
-  ASSERT_EQ( Messages.size(), 1u );
-  EXPECT_NE( Messages[0].find( "version 2" ), std::string::npos ) << Messages[0];
-  EXPECT_FALSE( Save( { "Name" } ) );
-  EXPECT_EQ( ReadFile( m_Path ), Later );
+  for( const std::string Version : { "2", "18446744073709551615" } )
+  {
+    const std::string Later = R"({ "settings": {}, "version": )" + Version + "}";
+    WriteFile( Later );
+    const VTexts Messages = Restore();
+    ASSERT_EQ( Messages.size(), 1u );
+    EXPECT_NE( Messages[0].find( "version " + Version ), std::string::npos ) << Messages[0];
+    EXPECT_FALSE( Save( { "Name" } ) );
+    EXPECT_EQ( ReadFile( m_Path ), Later );
+  }
 }
 
 // A device, a folder, a link that leads to nothing plain: neither read nor replaced.
@@ -215,13 +227,26 @@ TEST_F( SettingsFile, ALinkStaysALink )
   Put( "Name", std::string( "A" ) );
   ASSERT_TRUE( Save( { "Name" } ) );
   const std::string Link = m_Folder.File( "link.json" );
-  boost::filesystem::create_symlink( m_Path, Link );
+  boost::filesystem::create_symlink( "new/settings.json", Link );
   boost::filesystem::permissions( m_Path, boost::filesystem::owner_read | boost::filesystem::owner_write );
+  const bool bGivenAway = chown( m_Path.c_str(), 65534, 65534 ) == 0;   // by the superuser alone
   Put( "Name", std::string( "B" ) );
   ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
   EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
   EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
-  EXPECT_EQ( boost::filesystem::status( m_Path ).permissions(), boost::filesystem::owner_read | boost::filesystem::owner_write );
+  struct stat Status = {};
+  ASSERT_EQ( stat( m_Path.c_str(), &Status ), 0 );
+  EXPECT_EQ( Status.st_mode & 07777, 0600u );
+  EXPECT_EQ( Status.st_uid, bGivenAway ? 65534 : getuid() ) << "its owner must be able to write it again";
+
+  // Also a link to a file that is yet to come.
+  boost::filesystem::remove( m_Path );
+  ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
+  EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
+  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
+  const std::string Circle = m_Folder.File( "circle.json" );
+  boost::filesystem::create_symlink( Circle, Circle );
+  EXPECT_FALSE( VSettingsFile( Circle ).Save( m_Store, { m_Device + "Name" }, m_Error ) );
 }
 
 TEST_F( SettingsFile, AFullDiskLeavesTheOldFile )
