@@ -7,7 +7,9 @@
 #include "StageCoreDataStoreTypes/MaskGrid.h"
 #include "StageCorePluginVideoInput/FrameRateCheck.h"
 
+#include <algorithm>
 #include <cmath>
+#include <limits>
 #include <set>
 
 using KVZ::Variant;
@@ -222,7 +224,8 @@ void VVideoInputDeviceParameterHandler::ApplyTimeOffset()
   {
     return;
   }
-  const auto Offset = ReadOr<int64_t>( Keys::TimeOffsetTicksKey(), 0 );
+  constexpr int64_t Furthest = std::numeric_limits<int64_t>::max() / 4;   // sums with times stay in 64 bits
+  const int64_t Offset = std::clamp( ReadOr<int64_t>( Keys::TimeOffsetTicksKey(), 0 ), -Furthest, Furthest );
   const int64_t Period = pClock->GetPeriod().Count();
   const int64_t Beats = std::llround( static_cast<double>( Offset ) / static_cast<double>( Period ) );
   m_pDataSource->SetTimecodeAdjustment( KVZ::VTick( Beats * Period ) );

@@ -230,8 +230,12 @@ TEST_F( VReactions, TheTimeOffsetIsAWholeNumberOfMasterBeats )
   m_pSources->SetMasterPeriod( KVZ::VTick( 0 ) );
   m_pService->RunAll();
   EXPECT_EQ( m_pSource->m_Adjustment, -2252250 );
-  VDataWriter( *m_pStore ).RemoveValue( Keys::TimeOffsetTicks( m_Device ) );
+  Set( "TimeOffsetTicks", std::numeric_limits<int64_t>::max() );
   m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  m_pService->RunAll();
+  EXPECT_GT( m_pSource->m_Adjustment, int64_t{ 1 } << 60 ) << "far away, and not over the end";
+  VDataWriter( *m_pStore ).RemoveValue( Keys::TimeOffsetTicks( m_Device ) );
+  m_pSources->SetMasterPeriod( KVZ::VTick( 2252250 ) );
   m_pService->RunAll();
   EXPECT_EQ( m_pSource->m_Adjustment, 0 ) << "none is none";
 }
