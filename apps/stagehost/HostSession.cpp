@@ -3,6 +3,7 @@
 #include "StageCoreRuntime/GlobalLog.h"
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/Interrupt.h"
+#include "apps/stagehost/TextTable.h"
 
 #include <CLI/CLI.hpp>
 #include <boost/filesystem/operations.hpp>
@@ -49,7 +50,7 @@ std::string JoinURNs( const std::vector<VDeviceInfo>& i_rDevices )
 
 }
 
-void Complain( const std::string& i_rText ) { std::fprintf( stderr, "stagehost: %s\n", i_rText.c_str() ); }
+void Complain( const std::string& i_rText ) { std::fprintf( stderr, "stagehost: %s\n", OneLine( i_rText ).c_str() ); }
 
 void AddSessionOptions( CLI::App& io_rCommand, VSessionOptions& io_rOptions )
 {

@@ -4,6 +4,7 @@
 #include "apps/stagehost/HostSession.h"
 #include "apps/stagehost/Interrupt.h"
 #include "apps/stagehost/ParamsList.h"
+#include "apps/stagehost/TextTable.h"
 #include "host/SettingsWatcher.h"
 
 #include <CLI/CLI.hpp>

@@ -6,34 +6,52 @@
 
 #include <algorithm>
 #include <sstream>
+#include <utility>
 
 using StageHost::VSettingInfo;
 
 namespace
 {
 
-constexpr size_t LongestList = 80;   // characters
+// Characters in a cell; --json has it all.
+constexpr size_t LongestValue = 40;
+constexpr size_t LongestChoices = 60;
 
 bool IsSaved( const VSettingInfo& i_rSetting, const std::vector<VDataPath>& i_rSaved )
 {
   return std::count( i_rSaved.begin(), i_rSaved.end(), VDataPath::FromString( i_rSetting.m_Path ) ) > 0;
 }
 
-// What a person may choose from; nothing where there is no choice.
-std::string AcceptedText( const VSettingInfo& i_rSetting )
+// What a person may choose from, in as many lines as that takes; an empty one where there is no choice.
+std::vector<std::string> AcceptedTexts( const VSettingInfo& i_rSetting )
 {
   if( i_rSetting.m_bReadOnly )
   {
-    return {};
+    return { "" };
   }
   if( i_rSetting.m_Allowed.empty() )
   {
     const bool bRange = !i_rSetting.m_Minimum.empty() || !i_rSetting.m_Maximum.empty();
-    return bRange ? i_rSetting.m_Minimum + " to " + i_rSetting.m_Maximum : i_rSetting.m_Type;
+    return { bRange ? i_rSetting.m_Minimum + " to " + i_rSetting.m_Maximum : i_rSetting.m_Type };
   }
-  const std::string Whole = JoinTexts( i_rSetting.m_Allowed, ", " );
-  return Whole.size() <= LongestList ? Whole : std::to_string( i_rSetting.m_Allowed.size() ) + " choices";
+  std::vector<std::string> Lines;
+  for( const std::string& rChoice : i_rSetting.m_Allowed )
+  {
+    const bool bFits = !Lines.empty() && Lines.back().size() + rChoice.size() + 2 <= LongestChoices;
+    if( !Lines.empty() )
+    {
+      Lines.back() += bFits ? ", " : ",";
+    }
+    if( !bFits )
+    {
+      Lines.emplace_back();
+    }
+    Lines.back() += OneLine( rChoice );
+  }
+  return Lines;
 }
+
+std::string ValueText( const std::string& i_rValue ) { return Shortened( OneLine( i_rValue ), LongestValue ); }
 
 std::vector<std::string> Flags( const VSettingInfo& i_rSetting, const std::vector<VDataPath>& i_rSaved )
 {
@@ -74,13 +92,6 @@ std::vector<std::string> Groups( const std::vector<VSettingInfo>& i_rSettings )
 
 }
 
-std::string OneLine( std::string i_Text )
-{
-  std::replace_if(
-    i_Text.begin(), i_Text.end(), []( char i_Character ) { return static_cast<unsigned char>( i_Character ) < 0x20; }, ' ' );
-  return i_Text;
-}
-
 nlohmann::ordered_json ToJson( const VSettingInfo& i_rSetting, const std::vector<VDataPath>& i_rSaved )
 {
   return { { "path", i_rSetting.m_Path }, { "value", i_rSetting.m_Value }, { "proposed", i_rSetting.m_Proposed }, { "default", i_rSetting.m_Default },
@@ -103,11 +114,16 @@ std::string ToTree( const std::vector<VSettingInfo>& i_rSettings, const std::vec
     {
       if( GroupOf( rSetting ) == rGroup )
       {
-        Headings.push_back( Heading );
-        Heading.clear();
-        Table.AddRow( { "  " + VDataPath::FromString( rSetting.m_Path ).Name(), OneLine( rSetting.m_Value ),
-          rSetting.m_Proposed == rSetting.m_Value ? "" : OneLine( rSetting.m_Proposed ), AcceptedText( rSetting ),
+        const std::vector<std::string> Accepted = AcceptedTexts( rSetting );
+        Headings.push_back( std::exchange( Heading, "" ) );
+        Table.AddRow( { "  " + VDataPath::FromString( rSetting.m_Path ).Name(), ValueText( rSetting.m_Value ),
+          rSetting.m_Proposed == rSetting.m_Value ? "" : ValueText( rSetting.m_Proposed ), Accepted.front(),
           JoinTexts( Flags( rSetting, i_rSaved ), " " ), rSetting.m_Description } );
+        for( size_t Index = 1; Index < Accepted.size(); ++Index )
+        {
+          Headings.emplace_back();
+          Table.AddRow( { "", "", "", Accepted[Index] } );
+        }
       }
     }
   }

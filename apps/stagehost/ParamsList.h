@@ -11,8 +11,5 @@
 // The paths that are in the settings file are marked.
 nlohmann::ordered_json ToJson( const StageHost::VSettingInfo& i_rSetting, const std::vector<VDataPath>& i_rSaved );
 
-// A value as part of a line.
-std::string OneLine( std::string i_Text );
-
 // A tree: a heading for each group of a device, and its settings below, a line each.
 std::string ToTree( const std::vector<StageHost::VSettingInfo>& i_rSettings, const std::vector<VDataPath>& i_rSaved );

@@ -4,6 +4,19 @@
 #include <array>
 #include <cstdio>
 
+namespace
+{
+
+// UTF-8: all but a character's first byte.
+bool IsContinuation( char i_Byte ) { return ( static_cast<unsigned char>( i_Byte ) & 0xC0 ) == 0x80; }
+
+size_t CountCharacters( const std::string& i_rText )
+{
+  return i_rText.size() - static_cast<size_t>( std::count_if( i_rText.begin(), i_rText.end(), IsContinuation ) );
+}
+
+}
+
 VTextTable::VTextTable( std::vector<std::string> i_Heads ) : m_Rows{ std::move( i_Heads ) } {}
 
 void VTextTable::AddRow( std::vector<std::string> i_Cells )
@@ -19,7 +32,7 @@ std::string VTextTable::ToText() const
   {
     for( size_t Column = 0; Column < rRow.size(); ++Column )
     {
-      Widths[Column] = std::max( Widths[Column], rRow[Column].size() );
+      Widths[Column] = std::max( Widths[Column], CountCharacters( rRow[Column] ) );
     }
   }
   std::string Text;
@@ -28,12 +41,44 @@ std::string VTextTable::ToText() const
     std::string Line;
     for( size_t Column = 0; Column < rRow.size(); ++Column )
     {
-      Line += rRow[Column] + std::string( Widths[Column] - rRow[Column].size() + 2, ' ' );
+      Line += rRow[Column] + std::string( Widths[Column] - CountCharacters( rRow[Column] ) + 2, ' ' );
     }
     Line.erase( Line.find_last_not_of( ' ' ) + 1 );
     Text += Line + "\n";
   }
   return Text;
+}
+
+std::string OneLine( std::string i_Text )
+{
+  for( size_t Index = 0; Index < i_Text.size(); ++Index )
+  {
+    const auto Byte = static_cast<unsigned char>( i_Text[Index] );
+    const bool bSecondSet = Byte == 0xC2 && Index + 1 < i_Text.size() && static_cast<unsigned char>( i_Text[Index + 1] ) < 0xA0;   // U+0080 to U+009F
+    if( bSecondSet )
+    {
+      i_Text.erase( Index, 1 );
+    }
+    if( bSecondSet || Byte < 0x20 || Byte == 0x7F )
+    {
+      i_Text[Index] = ' ';
+    }
+  }
+  return i_Text;
+}
+
+std::string Shortened( const std::string& i_rText, size_t i_Characters )
+{
+  if( CountCharacters( i_rText ) <= i_Characters )
+  {
+    return i_rText;
+  }
+  size_t End = 0;
+  for( size_t Count = 0; End < i_rText.size() && ( Count + 3 < i_Characters || IsContinuation( i_rText[End] ) ); ++End )
+  {
+    Count += IsContinuation( i_rText[End] ) ? 0 : 1;
+  }
+  return i_rText.substr( 0, End ) + "...";
 }
 
 std::string JoinTexts( const std::vector<std::string>& i_rTexts, const std::string& i_rBetween )

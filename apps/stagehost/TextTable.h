@@ -10,7 +10,7 @@ class VTextTable
 {
 public:
   explicit VTextTable( std::vector<std::string> i_Heads );
-  // As many cells as there are heads.
+  // At most as many cells as there are heads.
   void AddRow( std::vector<std::string> i_Cells );
   // Columns padded to their widest cell, two spaces between them, a line each.
   std::string ToText() const;
@@ -18,6 +18,11 @@ public:
 private:
   std::vector<std::vector<std::string>> m_Rows;
 };
+
+// A text as part of a line: blanks in the place of what would end the line or move the cursor.
+std::string OneLine( std::string i_Text );
+// At most so many characters, with dots where some are missing.
+std::string Shortened( const std::string& i_rText, size_t i_Characters );
 
 std::string JoinTexts( const std::vector<std::string>& i_rTexts, const std::string& i_rBetween );
 

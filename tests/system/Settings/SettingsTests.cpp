@@ -99,6 +99,22 @@ TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
   EXPECT_TRUE( EndsWith( RecordMore( "e" ).Path(), "/e_vi0.tvid" ) );
 }
 
+// The Bluefish444 card comes first, and takes what the other does not.
+TEST_F( SettingsTest, EachKindOfCardTakesItsOwn )
+{
+  const VArguments Both = Card + VArguments{ "--card", "bluefish444:standard=SD_720_576I_5000,speed=4" };
+  EXPECT_EQ( "R8G8B8\n", Params( { "set", Key( "PixelFormat" ), "R8G8B8" }, Both ).m_Output );
+  EXPECT_EQ( "3\n", Params( { "set", Key( "AudioChannelCount" ), "3" }, Both ).m_Output );
+  const VRecordResult Result = RecordMore( "a", {}, Both );
+  const std::pair<const char*, int> Expected[] = { { "R8G8B8", 3 }, { "U8Y8V8Y8", 16 } };
+  for( size_t Device = 0; Device < std::size( Expected ); ++Device )
+  {
+    const nlohmann::json Told = Inspect( Result.Path( Device ) )["internal"];
+    EXPECT_EQ( Expected[Device].first, Told.value( "VideoFrameInfo.PixelFormat", "" ) ) << Describe( Result.m_Run );
+    EXPECT_EQ( Expected[Device].second, Told.value( "AudioFrameInfo.Channels", 0 ) );
+  }
+}
+
 TEST_F( SettingsTest, ADisabledDeviceIsLeftOutUnlessItIsNamed )
 {
   const VArguments Two = Card + Card;
@@ -139,6 +155,10 @@ TEST_F( SettingsTest, WhatIsRefusedLeavesNoTrace )
   EXPECT_EQ( 0, Params( { "reset", Key( "Threshold" ) } ).m_ExitCode );
   EXPECT_EQ( "", ReadFile( m_Path ) );
   Set( "Threshold", "0.25" );
+  for( const char* pNothing : { "", "." } )
+  {
+    EXPECT_EQ( 2, Params( { "reset", pNothing } ).m_ExitCode ) << "nothing named is not all";
+  }
   Set( "TimeOffsetTicks", "-135000" );
   EXPECT_EQ( "0.25\n", Get( "Threshold" ) );
   const nlohmann::json All = nlohmann::json::parse( Params( { "list", "--json" } ).m_Output, nullptr, false );
