@@ -15,12 +15,17 @@ struct VVideoInfo
   uint32_t m_GoldenBytes = 0;
 };
 
-// Zeros where the library does not know the mode.
-VVideoInfo GetVideoInfo( const VFlatFunctions& i_rFunctions, uint32_t i_Mode, uint32_t i_MemoryFormat, uint32_t i_UpdateMethod )
+// Zeros where the library does not know the mode. An older library tells no frame bytes.
+VVideoInfo GetVideoInfo( const VFlatFunctions& i_r, uint32_t i_Mode, uint32_t i_MemoryFormat, uint32_t i_UpdateMethod )
 {
+  if( !i_r.bfcGetVideoInfo )
+  {
+    return { i_r.bfcGetPixelsPerLine( i_Mode ), i_r.bfcGetLinesPerFrame( i_Mode, i_UpdateMethod ), i_r.bfcGetBytesPerLine( i_Mode, i_MemoryFormat ),
+      0, i_r.bfcGetGoldenValue( i_Mode, i_MemoryFormat, i_UpdateMethod ) };
+  }
   VVideoInfo Info;
-  const BErr Result = i_rFunctions.bfcGetVideoInfo( static_cast<int>( i_Mode ), static_cast<int>( i_UpdateMethod ),
-    static_cast<int>( i_MemoryFormat ), &Info.m_Width, &Info.m_Height, &Info.m_LineBytes, &Info.m_FrameBytes, &Info.m_GoldenBytes );
+  const BErr Result = i_r.bfcGetVideoInfo( static_cast<int>( i_Mode ), static_cast<int>( i_UpdateMethod ), static_cast<int>( i_MemoryFormat ),
+    &Info.m_Width, &Info.m_Height, &Info.m_LineBytes, &Info.m_FrameBytes, &Info.m_GoldenBytes );
   return Result == 0 ? Info : VVideoInfo();
 }
 
@@ -84,27 +89,23 @@ void BlueVelvetDestroy( CBlueVelvet4* i_pCard )
 
 uint32_t BlueVelvetGolden( const VFlatFunctions& i_rFunctions, uint32_t i_Mode, uint32_t i_MemoryFormat, uint32_t i_UpdateMethod )
 {
-  return i_rFunctions.bfcGetVideoInfo ? GetVideoInfo( i_rFunctions, i_Mode, i_MemoryFormat, i_UpdateMethod ).m_GoldenBytes
-                                      : i_rFunctions.bfcGetGoldenValue( i_Mode, i_MemoryFormat, i_UpdateMethod );
+  return GetVideoInfo( i_rFunctions, i_Mode, i_MemoryFormat, i_UpdateMethod ).m_GoldenBytes;
 }
 
-// The width belongs to the mode alone: any format and method will do.
+// What does not depend on format or method is asked for with any.
 uint32_t BlueVelvetLinePixels( const VFlatFunctions& i_rFunctions, uint32_t i_Mode )
 {
-  return i_rFunctions.bfcGetVideoInfo ? GetVideoInfo( i_rFunctions, i_Mode, MemoryFormat::TwoVUY, UpdateMethod::Frame ).m_Width
-                                      : i_rFunctions.bfcGetPixelsPerLine( i_Mode );
+  return GetVideoInfo( i_rFunctions, i_Mode, MemoryFormat::TwoVUY, UpdateMethod::Frame ).m_Width;
 }
 
 uint32_t BlueVelvetLineBytes( const VFlatFunctions& i_rFunctions, uint32_t i_Mode, uint32_t i_MemoryFormat )
 {
-  return i_rFunctions.bfcGetVideoInfo ? GetVideoInfo( i_rFunctions, i_Mode, i_MemoryFormat, UpdateMethod::Frame ).m_LineBytes
-                                      : i_rFunctions.bfcGetBytesPerLine( i_Mode, i_MemoryFormat );
+  return GetVideoInfo( i_rFunctions, i_Mode, i_MemoryFormat, UpdateMethod::Frame ).m_LineBytes;
 }
 
 uint32_t BlueVelvetFrameLines( const VFlatFunctions& i_rFunctions, uint32_t i_Mode, uint32_t i_UpdateMethod )
 {
-  return i_rFunctions.bfcGetVideoInfo ? GetVideoInfo( i_rFunctions, i_Mode, MemoryFormat::TwoVUY, i_UpdateMethod ).m_Height
-                                      : i_rFunctions.bfcGetLinesPerFrame( i_Mode, i_UpdateMethod );
+  return GetVideoInfo( i_rFunctions, i_Mode, MemoryFormat::TwoVUY, i_UpdateMethod ).m_Height;
 }
 
 bool hanc_decoder_ex( CBlueVelvet4& i_rCard, uint32_t i_CardType, uint32_t* i_pHanc, VHancDecodeRecord& io_rRecord )

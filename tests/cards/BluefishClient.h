@@ -152,6 +152,14 @@ protected:
     Sync();
   }
 
+  // A card whose first input is captured from.
+  void Play( const std::string& i_rText )
+  {
+    Plug( i_rText );
+    m_Object.SetUp( InputChannelA, MemoryFormat::TwoVUY );
+    Begin();
+  }
+
   std::vector<uint8_t> ReadImage( uint32_t i_Buffer, uint32_t i_Mode, uint32_t i_MemoryFormat )
   {
     std::vector<uint8_t> Image( BlueVelvetGolden( Functions(), i_Mode, i_MemoryFormat, UpdateMethod::Frame ) );

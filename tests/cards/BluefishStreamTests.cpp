@@ -20,9 +20,7 @@ constexpr uint32_t AllChannels = 0x3FCFF;   // 1 to 8, and 9 to 16 behind the tw
 
 TEST_F( BluefishStream, ANamedBufferIsWholeAtTheNextSyncButOne )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000,pattern=counter,audio=ramp,timecode=23:59:59:20" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter,audio=ramp,timecode=23:59:59:20" );
   const std::optional<uint32_t> First = CounterIn( 0, Mode576i );
   ASSERT_TRUE( First );
   std::optional<uint64_t> LastCount;
@@ -88,9 +86,7 @@ TEST_F( BluefishStream, DeliversEveryMemoryFormat )
 
 TEST_F( BluefishStream, DecodesTheChannelsAndSamplesAskedFor )
 {
-  Plug( "bluefish444:standard=SD_720_486I_5994,audio=ramp,channels=10,timecode=00:00:59;28" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_486I_5994,audio=ramp,channels=10,timecode=00:00:59;28" );
   // Channels 9 and 10 exist, 11 does not; the bits between belong to the analogue outputs
   const VDecoded Upper = Decode( 0, 1u << 7 | 7u << 10, SampleFlag::Bits24, 2002 );
   ASSERT_TRUE( Upper.m_bDone );
@@ -113,9 +109,7 @@ TEST_F( BluefishStream, DecodesTheChannelsAndSamplesAskedFor )
 
 TEST_F( BluefishStream, TimecodeWordsHoldTheLabelInBCD )
 {
-  Plug( "bluefish444:standard=SD_720_486I_5994" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_486I_5994" );
   Event( R"({"do": "timecode-jump", "to": "21:43:05;28"})" );
   Sync();
   const VDecoded Decoded = Decode( 1, 0, 0, 0 );
@@ -134,9 +128,7 @@ TEST_F( BluefishStream, TimecodeWordsHoldTheLabelInBCD )
 // At 50 frames a second each label comes on two frames, the second with the field mark, which lies beside the tens of hours.
 TEST_F( BluefishStream, TheSecondFrameOfALabelCarriesTheFieldMark )
 {
-  Plug( "bluefish444:standard=HD_1280_720P_5000" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=HD_1280_720P_5000" );
   Event( R"({"do": "timecode-jump", "to": "01:00:00:00"})" );
   Sync();
   EXPECT_EQ( +Decode( 1, 0, 0, 0 ).m_Record.m_Timecodes[TimecodePlace::RP188LTC], 0x00'01'00'00'00'00'00'00u );
@@ -146,9 +138,7 @@ TEST_F( BluefishStream, TheSecondFrameOfALabelCarriesTheFieldMark )
 
 TEST_F( BluefishStream, ASignalThatGoesLeavesTheBuffersAlone )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
   EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode576i );
   const auto Before = CounterIn( 0, Mode576i );
   Event( R"({"do": "signal-loss", "frames": 1000000})" );
@@ -165,9 +155,7 @@ TEST_F( BluefishStream, ASignalThatGoesLeavesTheBuffersAlone )
 
 TEST_F( BluefishStream, AnotherFormatIsDetectedWithItsFirstFrame )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
   Event( R"({"do": "format", "standard": "HD_1920_1080P_2500"})" );
   Sync();
   EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode1080p25 );
@@ -176,9 +164,7 @@ TEST_F( BluefishStream, AnotherFormatIsDetectedWithItsFirstFrame )
 
 TEST_F( BluefishStream, DroppedFramesShowInTheFieldCount )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
   Name( 1 );
   const auto Before = Sync();
   Event( R"({"do": "drop", "frames": 3})" );
@@ -192,9 +178,7 @@ TEST_F( BluefishStream, DroppedFramesShowInTheFieldCount )
 // A frame that comes while the client is still busy with the one before is held until it waits again.
 TEST_F( BluefishStream, AClientThatIsBusyIsWaitedFor )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
   Name( 1 );
   const auto Before = Sync();
   boost::thread Card( [&] { EXPECT_TRUE( Control().Step( m_Card, 3 ) ); } );
@@ -227,9 +211,7 @@ TEST_F( BluefishStream, InputsWorkOnTheirOwn )
 // Nobody must be left waiting: not the client for a sync that never comes, nor the card for a client that has gone.
 TEST_F( BluefishStream, ACardThatGoesLetsItsClientGo )
 {
-  Plug( "bluefish444:standard=SD_720_576I_5000" );
-  m_Object.SetUp( 2, MemoryFormat::TwoVUY );
-  Begin();
+  Play( "bluefish444:standard=SD_720_576I_5000" );
   Event( R"({"do": "remove"})" );
   EXPECT_FALSE( Sync() );
   EXPECT_FALSE( m_Object.Capture( 0 ) );
