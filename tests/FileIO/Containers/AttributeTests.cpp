@@ -9,15 +9,15 @@
 #include <gtest/gtest.h>
 
 using namespace Containers;
-using TestSupport::VTvidParser;
+using namespace TestSupport;
 
 namespace
 {
 
 // A value of each type. Times count in the base of MOV files, so that all containers can keep the same.
-VRecordingSettings Recording()
+VHeader Recording()
 {
-  VRecordingSettings Settings( 4, 2 );
+  VHeader Settings = MovieHeader( 4, 2 );
   Settings.m_Timing = { 1080000000, 36036000, -720720000 };
   Settings.m_Timecode = { KVZ::ITimecodeStandard::ETimecode30Drop, 10, 11, 12, 13 };
   Settings.m_Colour = { 0.75f, 2.2f };
@@ -44,10 +44,10 @@ protected:
   std::string Write( const VContainerRow& i_rRow ) const
   {
     const std::string Path = m_Folder.File( std::string( "movie." ) + i_rRow.m_pName );
-    const VRecordingSettings Settings = Recording();
+    const VHeader Settings = Recording();
     const auto pWriter = MakeWriter( i_rRow.m_Container );
-    EXPECT_TRUE( pWriter->Open( Path ) && Settings.WriteHeader( *pWriter ) );
-    EXPECT_TRUE( pWriter->WriteFrame( KVZ::VFrameSet{ Buffer( VBytes( 16 ) ), Settings.m_Video, { Buffer( VBytes( 8 ) ) }, Settings.m_Audio }, 0 ) );
+    EXPECT_TRUE( pWriter->Open( Path ) && Settings.WriteTo( *pWriter ) );
+    EXPECT_TRUE( Settings.WriteFrame( *pWriter, VBytes( 16 ), VBytes( 8 ), 0 ) );
     EXPECT_TRUE( pWriter->Close() );
     return Path;
   }
@@ -56,11 +56,11 @@ protected:
   VBytes ReferenceBlocks() const
   {
     constexpr std::ptrdiff_t FixedHeader = 48;
-    const VBytes File = TestSupport::VRiffParser::ReadFile( m_Reference );
+    const VBytes File = VRiffParser::ReadFile( m_Reference );
     return { File.begin() + FixedHeader, File.begin() + static_cast<std::ptrdiff_t>( VTvidParser( m_Reference ).RecordsStart() ) };
   }
 
-  const TestSupport::VTemporaryFolder m_Folder;
+  const VTemporaryFolder m_Folder;
   const std::string m_Reference = Write( { "tvid", KVZ::IVideoContainer::ETVID } );
 };
 
@@ -82,24 +82,24 @@ bool IsText( const VTvidParser::VValue& i_rValue, const std::string& i_rText )
 
 TEST_F( Attributes, OfMovAndMP4AreTheSameBytes )
 {
-  for( const size_t Row : { 0u, 1u } )
+  for( const VContainerRow& rRow : { Mov, MP4 } )
   {
-    const auto File = TestSupport::VMovParser::OfFile( Write( Movies[Row] ) );
-    EXPECT_EQ( File.Body( File.Root().Child( "TMSL" ) ), ReferenceBlocks() ) << Movies[Row].m_pName;
+    const auto File = VMovParser::OfFile( Write( rRow ) );
+    EXPECT_EQ( File.Body( File.Root().Child( "TMSL" ) ), ReferenceBlocks() ) << rRow.m_pName;
   }
 }
 
 TEST_F( Attributes, OfAviAreTheSameBytes )
 {
-  const TestSupport::VRiffParser File( TestSupport::VRiffParser::ReadFile( Write( Movies[2] ) ) );
+  const VRiffParser File( VRiffParser::ReadFile( Write( Avi ) ) );
   ASSERT_EQ( File.Riffs().back().m_Form, "TMSL" );
   EXPECT_EQ( File.Content( File.Riffs().back() ), ReferenceBlocks() );
 }
 
 TEST_F( Attributes, OfMatroskaAreTheSameValues )
 {
-  const TestSupport::VEbmlParser File( TestSupport::VRiffParser::ReadFile( Write( Movies[3] ) ) );
-  std::map<std::string, std::string> Tags = TestSupport::ReadTags( File );
+  const VEbmlParser File( VRiffParser::ReadFile( Write( Mkv ) ) );
+  std::map<std::string, std::string> Tags = ReadTags( File );
   const VTvidParser Reference( m_Reference );
   EXPECT_EQ( Tags.size(), Reference.Internal().size() + Reference.External().size() );
   for( const auto& [pPrefix, rBlock] :

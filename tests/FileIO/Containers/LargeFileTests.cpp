@@ -1,6 +1,7 @@
 // Files of 5 GiB, and of 35 GiB, on a disk that is spared: what is zero in a picture becomes a hole in the file. FFmpeg sees files of full size.
 #include "Utils/UtilsIO/LargeFile.h"
 #include "tests/FileIO/Containers/MovieWriters.h"
+#include "tests/support/LogCapture.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
 
@@ -11,6 +12,7 @@
 #include <cstdlib>
 
 using namespace Containers;
+using namespace TestSupport;
 
 namespace
 {
@@ -70,17 +72,17 @@ struct VLargeCase
 };
 
 // Matroska's segment has a size that its field cannot hold from 32 GiB on.
-constexpr VLargeCase Cases[] = { { Movies[0], 40 }, { Movies[1], 40 }, { Movies[2], 40 }, { Movies[3], 40 }, { Movies[3], 280 } };
+constexpr VLargeCase Cases[] = { { Mov, 40 }, { MP4, 40 }, { Avi, 40 }, { Mkv, 40 }, { Mkv, 280 } };
 
 class LargeFile : public testing::TestWithParam<VLargeCase>
 {
 protected:
   void Write() const
   {
-    const VRecordingSettings Settings( Side, Side );
+    const VHeader Settings = MovieHeader( Side, Side );
     const auto pZeros = std::make_shared<VZeros>( ImageBytes - HeadBytes );
-    const auto pWriter = MakeWriter( GetParam().m_Row.m_Container, MakeHoleFile );
-    ASSERT_TRUE( pWriter->Open( m_Path ) && Settings.WriteHeader( *pWriter ) );
+    const auto pWriter = MakeWriter( GetParam().m_Row.m_Container, { MakeHoleFile } );
+    ASSERT_TRUE( pWriter->Open( m_Path ) && Settings.WriteTo( *pWriter ) );
     for( uint32_t Frame = 0; Frame < GetParam().m_Frames; ++Frame )
     {
       KVZ::VBufferList Video = { Buffer( Head( Frame ) ), pZeros };
@@ -98,12 +100,13 @@ protected:
   {
     std::vector<std::string> Arguments = { "ffmpeg", "-nostdin", "-v", "error", "-ss", std::to_string( i_Frame * 0.04 ), "-i", m_Path };
     Arguments.insert( Arguments.end(), i_rOptions.begin(), i_rOptions.end() );
-    const TestSupport::VRunResult Run = TestSupport::RunProgram( Arguments );
+    const VRunResult Run = RunProgram( Arguments );
     EXPECT_EQ( Run.m_Error, "" );
-    return { Run.m_Output.begin(), Run.m_Output.end() };
+    return Bytes( Run.m_Output );
   }
 
-  const TestSupport::VTemporaryFolder m_Folder;
+  const VLogCapture m_Log{ "MkvIO" };
+  const VTemporaryFolder m_Folder;
   const std::string m_Path = m_Folder.File( std::string( "large." ) + GetParam().m_Row.m_pName );
 };
 
@@ -113,6 +116,7 @@ TEST_P( LargeFile, IsSoughtByFFmpegToItsLastFrame )
 {
   Write();
   const uint32_t Frames = GetParam().m_Frames;
+  EXPECT_EQ( m_Log.Texts().size(), Frames == Cases[4].m_Frames ? 1u : 0u ) << "the size of a segment that stays marked unknown";
   ASSERT_GT( boost::filesystem::file_size( m_Path ), Frames * ImageBytes );
   for( const uint32_t Frame : { Frames - 1, Frames / 2 } )
   {

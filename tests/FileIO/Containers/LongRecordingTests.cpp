@@ -16,6 +16,7 @@
 #include <sstream>
 
 using namespace Containers;
+using namespace TestSupport;
 
 namespace
 {
@@ -35,8 +36,8 @@ struct VRate
   double Period() const { return m_PeriodInTicks / 135e6; }
 };
 
-constexpr VRate Rate25 = { 15000, 5400000, { 1920, 1920, 1920, 1920, 1920 }, KVZ::ITimecodeStandard::ETimecode25 };
-constexpr VRate Rate2997 = { 17982, 4504500, { 1602, 1601, 1602, 1601, 1602 }, KVZ::ITimecodeStandard::ETimecode30Drop };
+constexpr VRate Every40ms = { 15000, 5400000, { 1920, 1920, 1920, 1920, 1920 }, KVZ::ITimecodeStandard::ETimecode25 };
+constexpr VRate Drop2997 = { 17982, 4504500, { 1602, 1601, 1602, 1601, 1602 }, KVZ::ITimecodeStandard::ETimecode30Drop };
 
 uint64_t SamplesBefore( const VRate& i_rRate, uint64_t i_Frame )
 {
@@ -92,8 +93,7 @@ struct VTimes
 
 VTimes AskTimes( const std::string& i_rPath )
 {
-  const TestSupport::VRunResult Run = TestSupport::RunProgram(
-    { "ffprobe", "-v", "quiet", "-show_entries", "packet=stream_index,pts_time,size", "-of", "csv=p=0", i_rPath } );
+  const VRunResult Run = RunProgram( { "ffprobe", "-v", "quiet", "-show_entries", "packet=stream_index,pts_time,size", "-of", "csv=p=0", i_rPath } );
   std::istringstream Lines( Run.m_Output );
   VTimes Times;
   uint64_t Samples = 0;
@@ -125,19 +125,18 @@ struct VLongCase
 };
 
 // At 29.97 FFmpeg takes every single sample of a MOV file for a frame of its own, which takes it minutes.
-constexpr VLongCase ForFFmpeg[] = { { Movies[0], Rate25 }, { Movies[1], Rate25 }, { Movies[2], Rate2997 }, { Movies[3], Rate2997 } };
+constexpr VLongCase ForFFmpeg[] = { { Mov, Every40ms }, { MP4, Every40ms }, { Avi, Drop2997 }, { Mkv, Drop2997 } };
 
 void Write( const std::string& i_rPath, const VLongCase& i_rCase )
 {
-  VRecordingSettings Settings( Width, Height );
+  VHeader Settings = MovieHeader( Width, Height );
   Settings.m_Timing.m_FramePeriodInTicks = i_rCase.m_Rate.m_PeriodInTicks;
   Settings.m_Timecode = { i_rCase.m_Rate.m_Timecode, 1 };
-  const auto pWriter = MakeWriter( i_rCase.m_Row.m_Container, WriterSupport::MakeFile, RiffBytes );
-  ASSERT_TRUE( pWriter->Open( i_rPath ) && Settings.WriteHeader( *pWriter ) );
+  const auto pWriter = MakeWriter( i_rCase.m_Row.m_Container, { .m_RiffBytes = RiffBytes } );
+  ASSERT_TRUE( pWriter->Open( i_rPath ) && Settings.WriteTo( *pWriter ) );
   for( uint32_t Frame = 0; Frame < i_rCase.m_Rate.m_FramesInTenMinutes; ++Frame )
   {
-    ASSERT_TRUE( pWriter->WriteFrame(
-      KVZ::VFrameSet{ Buffer( Picture( Frame ) ), Settings.m_Video, { Buffer( Sound( i_rCase.m_Rate, Frame ) ) }, Settings.m_Audio }, Frame ) );
+    ASSERT_TRUE( Settings.WriteFrame( *pWriter, Picture( Frame ), Sound( i_rCase.m_Rate, Frame ), Frame ) );
   }
   ASSERT_TRUE( pWriter->Close() );
 }
@@ -147,7 +146,7 @@ class LongRecording : public testing::TestWithParam<VLongCase>
 protected:
   void CheckContent() const
   {
-    const VBytes Pictures = TestSupport::DecodeVideo( m_Path, "uyvy422" );
+    const VBytes Pictures = DecodeVideo( m_Path, "uyvy422" );
     const size_t PictureBytes = Width * Height * 2;
     ASSERT_EQ( Pictures.size(), m_Rate.m_FramesInTenMinutes * PictureBytes );
     for( uint32_t Frame = 0; Frame < m_Rate.m_FramesInTenMinutes; ++Frame )
@@ -155,14 +154,14 @@ protected:
       const VBytes Expected = Picture( Frame );
       ASSERT_TRUE( std::equal( Expected.begin(), Expected.end(), Pictures.begin() + static_cast<std::ptrdiff_t>( Frame * PictureBytes ) ) ) << Frame;
     }
-    const VBytes Samples = TestSupport::DecodeAudio( m_Path, "s16le" );
+    const VBytes Samples = DecodeAudio( m_Path, "s16le" );
     ASSERT_EQ( Samples.size(), SamplesBefore( m_Rate, m_Rate.m_FramesInTenMinutes ) * sizeof( int16_t ) );
-    const auto First = TestSupport::ReadRamp( { Samples.data(), Samples.size() / sizeof( int16_t ), 1 }, 1 );
+    const auto First = ReadRamp( { Samples.data(), Samples.size() / sizeof( int16_t ), 1 }, 1 );
     EXPECT_TRUE( First && *First == 0 );
   }
 
   const VRate& m_Rate = GetParam().m_Rate;
-  const TestSupport::VTemporaryFolder m_Folder;
+  const VTemporaryFolder m_Folder;
   const std::string m_Path = m_Folder.File( std::string( "long." ) + GetParam().m_Row.m_pName );
 };
 
@@ -190,21 +189,21 @@ INSTANTIATE_TEST_SUITE_P( Containers, LongRecording, testing::ValuesIn( ForFFmpe
 
 TEST( LongMovie, KeepsEveryFrameWithItsSoundAt2997 )
 {
-  const TestSupport::VTemporaryFolder Folder;
-  Write( Folder.File( "long.mov" ), { Movies[0], Rate2997 } );
-  const auto File = TestSupport::VMovParser::OfFile( Folder.File( "long.mov" ) );
-  const TestSupport::VMovTrack& rVideo = File.Track( "vide" );
-  const TestSupport::VMovTrack& rSound = File.Track( "soun" );
-  ASSERT_EQ( rVideo.m_Samples.size(), Rate2997.m_FramesInTenMinutes );
-  ASSERT_EQ( rSound.m_Samples.size(), Rate2997.m_FramesInTenMinutes );
+  const VTemporaryFolder Folder;
+  Write( Folder.File( "long.mov" ), { Mov, Drop2997 } );
+  const auto File = VMovParser::OfFile( Folder.File( "long.mov" ) );
+  const VMovTrack& rVideo = File.Track( "vide" );
+  const VMovTrack& rSound = File.Track( "soun" );
+  ASSERT_EQ( rVideo.m_Samples.size(), Drop2997.m_FramesInTenMinutes );
+  ASSERT_EQ( rSound.m_Samples.size(), Drop2997.m_FramesInTenMinutes );
   ASSERT_EQ( rVideo.m_Timescale, rSound.m_Timescale );
   const auto UnitsASample = static_cast<int64_t>( rSound.m_Timescale / 48000 );
-  for( uint32_t Frame = 0; Frame < Rate2997.m_FramesInTenMinutes; ++Frame )
+  for( uint32_t Frame = 0; Frame < Drop2997.m_FramesInTenMinutes; ++Frame )
   {
     const auto Shown = static_cast<int64_t>( rVideo.m_Samples[Frame].m_DecodeTime );
     ASSERT_EQ( Shown * 30000, int64_t{ Frame } * 1001 * rVideo.m_Timescale ) << Frame;
     ASSERT_LT( std::abs( static_cast<int64_t>( rSound.m_Samples[Frame].m_DecodeTime ) - Shown ), UnitsASample ) << Frame;
     ASSERT_TRUE( File.Bytes( rVideo.m_Samples[Frame] ) == Picture( Frame ) ) << Frame;
-    ASSERT_TRUE( File.Bytes( rSound.m_Samples[Frame] ) == Sound( Rate2997, Frame ) ) << Frame;
+    ASSERT_TRUE( File.Bytes( rSound.m_Samples[Frame] ) == Sound( Drop2997, Frame ) ) << Frame;
   }
 }

@@ -16,8 +16,8 @@ namespace
 
 VEbmlParser HeaderOf( const VDescription& i_rDescription )
 {
-  VSmallMovie Movie;
-  EXPECT_TRUE( Movie.Begin( i_rDescription ) );
+  VSmallMovie Movie( i_rDescription );
+  EXPECT_TRUE( Movie.Begin() );
   return VEbmlParser( *Movie.m_pBytes );
 }
 

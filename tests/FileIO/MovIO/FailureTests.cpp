@@ -11,38 +11,19 @@
 
 using namespace KVZ;
 using namespace MovIO;
+using namespace TestSupport;
 
 namespace
 {
 
-constexpr uint8_t Frames = 4;
+constexpr int Frames = 4;
 
 VBytes Video( size_t i_Number ) { return VBytes( 16, static_cast<uint8_t>( 1 + i_Number ) ); }
 VBytes Audio( size_t i_Number ) { return VBytes( 6, static_cast<uint8_t>( 0x81 + i_Number ) ); }
 
-struct VResult
+VFaultyRun WriteMovie( VSmallMovie& io_rMovie )
 {
-  bool m_bHeader = false;
-  bool m_bClosed = false;
-  size_t m_Written = 0;   // frames whose call gave true
-  bool m_bLaterRefused = true;
-};
-
-// Goes on after a failure as no client would.
-VResult WriteMovie( VSmallMovie& io_rMovie )
-{
-  VResult Result;
-  Result.m_bHeader = io_rMovie.Start();
-  bool bFailed = !Result.m_bHeader;
-  for( uint8_t Frame = 0; Frame < Frames; ++Frame )
-  {
-    const bool bWritten = io_rMovie.Frame( Video( Result.m_Written ), Audio( Result.m_Written ) );
-    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
-    Result.m_Written += bWritten;
-    bFailed = bFailed || !bWritten;
-  }
-  Result.m_bClosed = io_rMovie.m_Writer.Close();
-  return Result;
+  return RunIntoFault( io_rMovie, Frames, [&]( size_t i_Frame ) { return io_rMovie.Frame( Video( i_Frame ), Audio( i_Frame ) ); } );
 }
 
 // Frames that a reader finds; all must be what was written. -1 for a file that cannot be read. What comes behind the tables, and may be cut off, is
@@ -57,7 +38,7 @@ try
     const size_t Size = Moov[-2] * 256u + Moov[-1];
     i_Bytes.resize( std::min( i_Bytes.size(), static_cast<size_t>( Moov - i_Bytes.begin() ) - 4 + Size ) );
   }
-  const auto Parser = TestSupport::VMovParser::OfBytes( i_Bytes );
+  const auto Parser = VMovParser::OfBytes( i_Bytes );
   const auto& rVideo = Parser.Track( "vide" );
   const auto& rAudio = Parser.Track( "soun" );
   EXPECT_EQ( rVideo.m_Samples.size(), rAudio.m_Samples.size() );
@@ -73,7 +54,7 @@ catch( const std::runtime_error& )
   return -1;
 }
 
-void CheckLeftBehind( const VSmallMovie& i_rMovie, const VResult& i_rResult )
+void CheckLeftBehind( const VSmallMovie& i_rMovie, const VFaultyRun& i_rResult )
 {
   EXPECT_FALSE( i_rResult.m_bClosed );
   EXPECT_TRUE( i_rResult.m_bLaterRefused );
@@ -96,7 +77,7 @@ TEST( MovWriterFailures, ADiskThatIsFullAtAnyByteIsReported )
   {
     SCOPED_TRACE( Offset );
     VSmallMovie Movie( {}, { .m_Offset = Offset } );
-    const VResult Result = WriteMovie( Movie );
+    const VFaultyRun Result = WriteMovie( Movie );
     EXPECT_LE( Movie.m_pBytes->size(), Offset );
     CheckLeftBehind( Movie, Result );
   }
@@ -123,9 +104,9 @@ TEST( MovWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 TEST( MovWriterFailures, OneBadWriteIsTracedThroughTheAtomsAroundIt )
 {
   constexpr size_t Many = 20000;
-  const TestSupport::VLogCapture Log( "MovIO" );
+  const VLogCapture Log( "MovIO" );
   VSmallMovie Movie( VMovieSettings::Silent(), { .m_Offset = 52 + 16 * Many + 100000 } );
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   for( size_t Frame = 0; Frame < Many; ++Frame )
   {
     ASSERT_TRUE( Movie.Frame( VBytes( 16 ) ) );
@@ -144,26 +125,26 @@ TEST( MovWriterFailures, OnARealDisk )
   const VMovieSettings Settings = VMovieSettings::Silent();
   VMovWriter Full( IVideoContainer::EMOV );
   ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( WriteHeader( Full, Settings ) );
+  EXPECT_FALSE( Settings.WriteTo( Full ) );
   EXPECT_FALSE( Full.Close() );
 
   // The tables find room where the last frame could not be finished.
-  const TestSupport::VTemporaryFolder Folder;
+  const VTemporaryFolder Folder;
   VMovieSettings Large = Settings;
-  Large.m_Video = VideoInfo( 100, 100, IPixelFormat::EU8Y8V8Y8 );
+  Large.m_Video = VideoInfo( IPixelFormat::EU8Y8V8Y8, 100, 100 );
   {
-    const TestSupport::VFileSizeLimit Limit( 75000 );
+    const VFileSizeLimit Limit( 75000 );
     VMovWriter Writer( IVideoContainer::EMOV );
-    ASSERT_TRUE( Writer.Open( Folder.File( "cut.mov" ) ) && WriteHeader( Writer, Large ) );
+    ASSERT_TRUE( Writer.Open( Folder.File( "cut.mov" ) ) && Large.WriteTo( Writer ) );
     size_t Written = 0;
-    while( AppendFrame( Writer, Large, VBytes( 20000, static_cast<uint8_t>( 'a' + Written ) ) ) )
+    while( Large.WriteFrame( Writer, VBytes( 20000, static_cast<uint8_t>( 'a' + Written ) ) ) )
     {
       ++Written;
     }
     EXPECT_EQ( Written, 3u );
     EXPECT_FALSE( Writer.Close() );
   }
-  const auto Parser = TestSupport::VMovParser::OfFile( Folder.File( "cut.mov" ) );
+  const auto Parser = VMovParser::OfFile( Folder.File( "cut.mov" ) );
   EXPECT_EQ( Parser.Root().Child( "free" ).m_End, 75000u );
   const auto& rVideo = Parser.Track( "vide" );
   ASSERT_EQ( rVideo.m_Samples.size(), 3u );
@@ -171,18 +152,18 @@ TEST( MovWriterFailures, OnARealDisk )
 }
 
 // A stream that has run out of memory, and one that throws.
-class VThrowingStream : public TestSupport::VMemoryFile
+class VThrowingStream : public VMemoryFile
 {
 public:
-  using TestSupport::VMemoryFile::VMemoryFile;
-  using TestSupport::VMemoryFile::Write;
+  using VMemoryFile::VMemoryFile;
+  using VMemoryFile::Write;
   bool Write( const void* i_pData, size_t i_Size ) override
   {
     if( i_Size == 16 )
     {
       throw std::runtime_error( "no memory" );
     }
-    return TestSupport::VMemoryFile::Write( i_pData, i_Size );
+    return VMemoryFile::Write( i_pData, i_Size );
   }
 };
 
@@ -191,8 +172,8 @@ TEST( MovWriterFailures, NoExceptionLeavesAnOperation )
   const VMovieSettings Settings = VMovieSettings::Silent();
   VMovWriter Writer( IVideoContainer::EMOV, {},
     []( const std::string& ) { return std::make_unique<VThrowingStream>( std::make_shared<VBytes>() ); } );
-  ASSERT_TRUE( Writer.Open( "memory" ) && WriteHeader( Writer, Settings ) );
-  EXPECT_FALSE( AppendFrame( Writer, Settings, VBytes( 16 ) ) );
+  ASSERT_TRUE( Writer.Open( "memory" ) && Settings.WriteTo( Writer ) );
+  EXPECT_FALSE( Settings.WriteFrame( Writer, VBytes( 16 ) ) );
   const VBytes Video( 16 );
   EXPECT_FALSE( Writer.WriteStoredFrame( { { Video.data(), Video.size() } }, {}, 'I' ) );
   Writer.Close();

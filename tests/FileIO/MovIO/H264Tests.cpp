@@ -20,8 +20,8 @@ namespace
 VMovieSettings H264Settings()
 {
   VMovieSettings Settings;
-  Settings.m_Video = VideoInfo( 64, 48, IPixelFormat::EU8Y8V8Y8 );
-  Settings.m_VideoPayload = IVideoPayload::EVideoH264;
+  Settings.m_Video = VideoInfo( IPixelFormat::EU8Y8V8Y8, 64, 48 );
+  Settings.m_Payload = IVideoPayload::EVideoH264;
   return Settings;
 }
 
@@ -30,7 +30,7 @@ VMovWriter::VSpans Spans( const VBytes& i_rBytes ) { return { { i_rBytes.data(),
 // Writes frames of one byte each, of these types in decoding order.
 void WriteTypes( VSmallMovie& io_rMovie, const std::string& i_rTypes )
 {
-  ASSERT_TRUE( io_rMovie.Start() && io_rMovie.m_Writer.SetSPS( Bytes( "sps" ) ) && io_rMovie.m_Writer.SetPPS( Bytes( "pp" ) ) );
+  ASSERT_TRUE( io_rMovie.Begin() && io_rMovie.m_Writer.SetSPS( Bytes( "sps" ) ) && io_rMovie.m_Writer.SetPPS( Bytes( "pp" ) ) );
   for( const char Type : i_rTypes )
   {
     ASSERT_TRUE( io_rMovie.m_Writer.WriteStoredFrame( Spans( Bytes( std::string( 1, Type ) ) ), Spans( Bytes( "aabb" ) ), Type ) );
@@ -118,7 +118,7 @@ protected:
     constexpr int SPS = 7;
     constexpr int PPS = 8;
     VMovWriter Writer( IVideoContainer::EMOV );
-    EXPECT_TRUE( Writer.Open( m_Path ) && WriteHeader( Writer, H264Settings() ) );
+    EXPECT_TRUE( Writer.Open( m_Path ) && H264Settings().WriteTo( Writer ) );
     std::string Types;
     for( const VUnit& rUnit : m_Units )
     {
@@ -227,7 +227,7 @@ TEST_F( MovOfH264, ParameterSetsAreTakenWhereTheyBelong )
   VSmallMovie Movie( H264Settings() );
   EXPECT_TRUE( Movie.m_Writer.SetSPS( Bytes( "first" ) ) );
   EXPECT_FALSE( Movie.m_Writer.SetPPS( Bytes( "too early" ) ) );
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   EXPECT_TRUE( Movie.m_Writer.SetSPS( Bytes( "first" ) ) );
   EXPECT_FALSE( Movie.m_Writer.SetSPS( Bytes( "other" ) ) );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "SPS has changed mid-way through movie." } );
@@ -241,7 +241,7 @@ TEST_F( MovOfH264, ParameterSetsAreTakenWhereTheyBelong )
   EXPECT_EQ( Parser.Bytes( Parser.Track( "vide" ).m_Samples.at( 0 ) ), ( VBytes{ 0, 0, 0, 3, 't', 'w', 'o', 0, 0, 0, 1, 'x' } ) );
 
   VSmallMovie Uncompressed;
-  ASSERT_TRUE( Uncompressed.Start() );
+  ASSERT_TRUE( Uncompressed.Begin() );
   EXPECT_FALSE( Uncompressed.m_Writer.SetPPS( Bytes( "pps" ) ) );
 }
 
@@ -250,7 +250,7 @@ TEST_F( MovOfH264, PicturesAreRefusedAtTheFirstFrame )
 {
   const VLogCapture Log;
   VSmallMovie Movie( H264Settings() );
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   EXPECT_TRUE( Log.Texts().empty() );
   EXPECT_FALSE( Movie.Frame( VBytes( 64 * 48 * 2 ) ) );
   EXPECT_TRUE( Log.Has( "Unsupported video payload format 'VideoH264'." ) );

@@ -7,15 +7,16 @@
 #include <random>
 
 using namespace MovIO;
+using namespace TestSupport;
 
 namespace
 {
 
 struct VOutput
 {
-  explicit VOutput( const TestSupport::VFault& i_rFault = {} )
+  explicit VOutput( const VFault& i_rFault = {} )
     : m_Out( std::make_shared<WriterSupport::VWatchedStream>(
-        std::make_unique<TestSupport::VFailingStream>( std::make_unique<TestSupport::VMemoryFile>( m_pBytes ), i_rFault, &m_Operations ) ) )
+        std::make_unique<VFailingStream>( std::make_unique<VMemoryFile>( m_pBytes ), i_rFault, &m_Operations ) ) )
   {
   }
 
@@ -120,7 +121,7 @@ TEST( MovPrimitiveWriter, AFailureIsKept )
 
 TEST( MovAtomScope, AnotherSizeThanTheOneLaidDownIsReportedAndCarriedOn )
 {
-  const TestSupport::VLogCapture Log( "MovIO" );
+  const VLogCapture Log( "MovIO" );
   VOutput Output;
   VAtomScope Outer( Output.m_Out, "trak" );
   VAtomScope Inner( Output.m_Out, "tkhd" );

@@ -9,6 +9,7 @@
 
 using namespace KVZ;
 using namespace MovIO;
+using namespace TestSupport;
 
 namespace
 {
@@ -28,7 +29,7 @@ VTrack GoodTrack()
 
 VTexts MessagesOf( const VTrack& i_rTrack, uint32_t i_Timescale, bool i_bValid )
 {
-  const TestSupport::VLogCapture Log( "MovIO" );
+  const VLogCapture Log( "MovIO" );
   VTexts Messages;
   EXPECT_EQ( ValidateTrack( i_rTrack, i_Timescale, &Messages ), i_bValid );
   EXPECT_EQ( Log.Texts(), Messages );
@@ -44,7 +45,7 @@ VTexts CheckBytes( const VBytes& i_rBytes )
 VBytes MakeFile( const VMovieSettings& i_rSettings, size_t i_Frames )
 {
   VSmallMovie Movie( i_rSettings );
-  EXPECT_TRUE( Movie.Start() );
+  EXPECT_TRUE( Movie.Begin() );
   for( size_t Frame = 0; Frame < i_Frames; ++Frame )
   {
     EXPECT_TRUE( Movie.Frame( VBytes( 16 ), VBytes( 2 * 1920 ) ) );
@@ -115,14 +116,14 @@ TEST( MovFileCheck, EmptyTracksAreTold )
 TEST( MovFileCheck, FilesThatAreNotFinishedOrDamagedAreTold )
 {
   VSmallMovie Unfinished;
-  ASSERT_TRUE( Unfinished.Start() && Unfinished.Frame( VBytes( 16 ) ) );
+  ASSERT_TRUE( Unfinished.Begin() && Unfinished.Frame( VBytes( 16 ) ) );
   EXPECT_EQ( CheckBytes( *Unfinished.m_pBytes ), VTexts{ "The 'mdat' atom at 32 has no valid size." } );
   EXPECT_EQ( CheckBytes( {} ), VTexts{ "The file has no tracks: it was not finished." } );
 
   // Cut short anywhere it is never right, and never more is read than there is.
   const VBytes Whole = MakeFile( {}, 1 );
 
-  const uint64_t MoovEnd = TestSupport::VMovParser::OfBytes( Whole ).Root().Child( "moov" ).m_End;
+  const uint64_t MoovEnd = VMovParser::OfBytes( Whole ).Root().Child( "moov" ).m_End;
   for( uint64_t Size = 0; Size < MoovEnd; ++Size )
   {
     ASSERT_FALSE( CheckBytes( VBytes( Whole.begin(), Whole.begin() + static_cast<std::ptrdiff_t>( Size ) ) ).empty() ) << Size;
@@ -136,6 +137,6 @@ TEST( MovFileCheck, FilesThatAreNotFinishedOrDamagedAreTold )
     Deep.insert( Deep.end(), Header.begin(), Header.end() );
   }
   EXPECT_EQ( CheckBytes( Deep ), VTexts{ "The atoms at 136 lie too deep in each other." } );
-  const TestSupport::VTemporaryFolder Folder;
+  const VTemporaryFolder Folder;
   EXPECT_EQ( CheckMovFile( Folder.File( "missing.mov" ) ), VTexts{ "The file could not be opened." } );
 }

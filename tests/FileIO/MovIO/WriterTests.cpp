@@ -10,6 +10,7 @@
 
 using namespace KVZ;
 using namespace MovIO;
+using namespace TestSupport;
 
 namespace
 {
@@ -19,7 +20,7 @@ using VStandard = ITimecodeStandard;
 class MovWriter : public testing::Test
 {
 protected:
-  const TestSupport::VLogCapture m_Log{ "MovIO" };
+  const VLogCapture m_Log{ "MovIO" };
 };
 
 // Timescale and sample periods of a file without frames, by its tables.
@@ -37,7 +38,7 @@ std::ostream& operator<<( std::ostream& o_rOut, const VTimes& i_rTimes )
   return o_rOut << i_rTimes.m_Timescale << " " << i_rTimes.m_Video << " " << i_rTimes.m_Audio << " " << i_rTimes.m_Timecode;
 }
 
-const TestSupport::VMovAtom& SampleTable( const TestSupport::VMovParser& i_rParser, size_t i_Track )
+const VMovAtom& SampleTable( const VMovParser& i_rParser, size_t i_Track )
 {
   return i_rParser.Root().Child( "moov" ).Child( "trak", i_Track ).Child( "mdia" ).Child( "minf" ).Child( "stbl" );
 }
@@ -45,7 +46,7 @@ const TestSupport::VMovAtom& SampleTable( const TestSupport::VMovParser& i_rPars
 VTimes TimesOf( const VMovieSettings& i_rSettings )
 {
   VSmallMovie Movie( i_rSettings );
-  EXPECT_TRUE( Movie.Start() && Movie.m_Writer.Close() );
+  EXPECT_TRUE( Movie.Begin() && Movie.m_Writer.Close() );
   const auto Parser = Movie.Parse();
   const bool bAudio = Parser.Tracks().size() == 3;
   const auto Period = [&]( size_t i_Track ) { return Parser.Number( SampleTable( Parser, i_Track ).Child( "stts" ), 12 ); };
@@ -86,7 +87,7 @@ VStart StartOf( const ITimecode& i_rTimecode, uint32_t i_Period = 5400000 )
   VMovieSettings Settings = WithTimes( i_Period, i_rTimecode.m_Standard, 48000 );
   Settings.m_Timecode = i_rTimecode;
   VSmallMovie Movie( Settings );
-  EXPECT_TRUE( Movie.Start() && Movie.m_Writer.Close() );
+  EXPECT_TRUE( Movie.Begin() && Movie.m_Writer.Close() );
   const auto Parser = Movie.Parse();
   const auto& rStsd = SampleTable( Parser, 2 ).Child( "stsd" );
   const auto& rTrack = Parser.Track( "tmcd" );
@@ -120,7 +121,7 @@ TEST_F( MovWriter, TimesThatNoFieldCanHoldAreRefused )
   const auto Refuses = [&]( const VMovieSettings& i_rSettings )
   {
     VSmallMovie Movie( i_rSettings );
-    return !Movie.Start() && !Movie.m_Writer.Close();
+    return !Movie.Begin() && !Movie.m_Writer.Close();
   };
   VMovieSettings Settings = WithTimes( 0x20000000, VStandard::ETimecode25, 0 );   // eight base ticks each
   EXPECT_TRUE( Refuses( Settings ) );
@@ -136,8 +137,8 @@ TEST_F( MovWriter, TimesThatNoFieldCanHoldAreRefused )
   // Frames of H.264 are shown three periods later.
   Settings = WithTimes( 0, VStandard::ETimecode25, 0 );
   Settings.m_Timing = { 1080000000, 1500000001, 0 };
-  EXPECT_TRUE( VSmallMovie( Settings ).Start() );
-  Settings.m_VideoPayload = IVideoPayload::EVideoH264;
+  EXPECT_TRUE( VSmallMovie( Settings ).Begin() );
+  Settings.m_Payload = IVideoPayload::EVideoH264;
   EXPECT_TRUE( Refuses( Settings ) );
   EXPECT_EQ( m_Log.Texts().back(), "Video frame period, timecode period or audio sample period cannot be represented in 32 bits." );
 }
@@ -146,14 +147,14 @@ TEST_F( MovWriter, DescriptionsThatNoFieldCanHoldAreRefused )
 {
   VMovieSettings Settings = VMovieSettings::Silent();
   Settings.m_Video.m_ImageWidth = 65536;
-  EXPECT_FALSE( VSmallMovie( Settings ).Start() );
+  EXPECT_FALSE( VSmallMovie( Settings ).Begin() );
   Settings.m_Video.m_ImageWidth = 65535;
-  EXPECT_TRUE( VSmallMovie( Settings ).Start() );
+  EXPECT_TRUE( VSmallMovie( Settings ).Begin() );
   Settings = {};
   Settings.m_Audio = { IAudioSampleFormat::EUInt8, 96000, 1 };
-  EXPECT_FALSE( VSmallMovie( Settings ).Start() );
+  EXPECT_FALSE( VSmallMovie( Settings ).Begin() );
   Settings.m_Audio = { IAudioSampleFormat::EInt16, 96000, 17 };
-  EXPECT_FALSE( VSmallMovie( Settings ).Start() );
+  EXPECT_FALSE( VSmallMovie( Settings ).Begin() );
   EXPECT_EQ( m_Log.Texts(),
     ( std::vector<std::string>{ "An image of 65536 x 2 pixels is larger than the 65535 x 65535 that the file can say.",
       "A sample rate of 96000 is more than the 65535 that the file can say of 8-bit samples.", "Cannot support 17 channels of audio." } ) );
@@ -194,7 +195,7 @@ TEST_F( MovWriter, AnInvalidTimecodeCountsInTheStandardThatFitsTheFrames )
 TEST_F( MovWriter, FramesLieOneAfterAnotherEachWithItsSound )
 {
   VSmallMovie Movie;
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   VBytes MediaData = { 0, 1, 0x5F, 0x90 };
   const auto AddFrame = [&]( uint8_t i_Number, size_t i_AudioBytes )
   {
@@ -222,52 +223,19 @@ TEST_F( MovWriter, FramesLieOneAfterAnotherEachWithItsSound )
   EXPECT_EQ( Parser.Track( "tmcd" ).m_MediaDuration, 3 * 1920u );
 }
 
-TEST_F( MovWriter, AFrameMayComeInSeveralBuffersAndLosesSurplusChannels )
-{
-  VSmallMovie Movie;
-  ASSERT_TRUE( Movie.Start() );
-  VBufferList Video = { Buffer( Bytes( "ABCDEF" ) ), Buffer( {} ), Buffer( Bytes( "GHIJKLMNOP" ) ) };
-  VBufferList Audio = { Buffer( Bytes( "aabbxxyy" ) ), Buffer( Bytes( "ccddzzww" ) ) };
-  EXPECT_TRUE( Movie.m_Writer.WriteFrame( Video, Movie.m_Settings.m_Video, Audio, { IAudioSampleFormat::EInt16, 48000, 2 }, 0 ) );
-  ASSERT_TRUE( Movie.m_Writer.Close() );
-  const auto Parser = Movie.Parse();
-  EXPECT_EQ( Parser.Bytes( Parser.Track( "vide" ).m_Samples.at( 0 ) ), Bytes( "ABCDEFGHIJKLMNOP" ) );
-  EXPECT_EQ( Parser.Bytes( Parser.Track( "soun" ).m_Samples.at( 0 ) ), Bytes( "aaxxcczz" ) );
-}
-
-TEST_F( MovWriter, OnlyTheNextFrameIsTaken )
-{
-  VSmallMovie Movie;
-  ASSERT_TRUE( Movie.Start() );
-  const auto Write = [&]( uint64_t i_Key ) {
-    return Movie.m_Writer.WriteFrame( VFrameSet{ Buffer( VBytes( 16 ) ), Movie.m_Settings.m_Video, {}, {} }, i_Key );
-  };
-  EXPECT_FALSE( Write( 1 ) );
-  EXPECT_TRUE( Write( 0 ) );
-  EXPECT_FALSE( Write( 0 ) );
-  EXPECT_FALSE( Write( 5 ) );
-  EXPECT_TRUE( Write( 1 ) );
-  EXPECT_TRUE( Write( VMovWriter::AppendKey ) );
-  EXPECT_FALSE( Write( 2 ) );
-  EXPECT_TRUE( Movie.m_Writer.Close() );
-  EXPECT_EQ( Movie.m_pBytes->at( 32 + 15 ), 20 + 3 * 16 );   // of the media data, in the file
-  EXPECT_EQ( Movie.Parse().Track( "vide" ).m_Samples.size(), 3u );
-  EXPECT_TRUE( m_Log.Texts().empty() );
-}
-
 TEST_F( MovWriter, FramesThatAreNotWhatTheFileSaysAreRefused )
 {
   VSmallMovie Movie;
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   const size_t Before = Movie.m_pBytes->size();
   EXPECT_FALSE( Movie.Frame( VBytes( 15 ) ) );
   EXPECT_TRUE( m_Log.Texts().empty() );
   VBufferList Video = { Buffer( VBytes( 16 ) ) };
   VBufferList Audio;
-  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, VideoInfo( 2, 4, IPixelFormat::EU8Y8V8Y8 ), Audio, {}, 0 ) );
-  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, VideoInfo( 4, 2, IPixelFormat::ELuminance8 ), Audio, {}, 0 ) );
+  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, VideoInfo( IPixelFormat::EU8Y8V8Y8, 2, 4 ), Audio, {}, 0 ) );
+  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, VideoInfo( IPixelFormat::ELuminance8, 4, 2 ), Audio, {}, 0 ) );
   Audio = { Buffer( VBytes( 2 ) ) };
-  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, Movie.m_Settings.m_Video, Audio, { IAudioSampleFormat::EUInt16, 48000, 1 }, 0 ) );
+  EXPECT_FALSE( Movie.m_Writer.WriteFrame( Video, Movie.m_Header.m_Video, Audio, { IAudioSampleFormat::EUInt16, 48000, 1 }, 0 ) );
   EXPECT_EQ( Movie.m_pBytes->size(), Before );
   EXPECT_TRUE( Movie.Frame( VBytes( 18 ) ) );
   EXPECT_FALSE( Movie.Frame( VBytes( 16 ) ) );
@@ -284,9 +252,9 @@ TEST_F( MovWriter, ImagesThatDoNotBeginAsTheyShouldAreRefused )
   {
     SCOPED_TRACE( ToName( Payload ) );
     VMovieSettings Settings = VMovieSettings::Silent();
-    Settings.m_VideoPayload = Payload;
+    Settings.m_Payload = Payload;
     VSmallMovie Movie( Settings );
-    ASSERT_TRUE( Movie.Start() );
+    ASSERT_TRUE( Movie.Begin() );
     const auto Write = [&]( const std::string& i_rImage ) {
       return Movie.m_Writer.WriteStoredFrame( { { i_rImage.data(), i_rImage.size() } }, {}, 'I' );
     };
@@ -307,7 +275,7 @@ TEST_F( MovWriter, ImagesThatDoNotBeginAsTheyShouldAreRefused )
 TEST_F( MovWriter, AFileThatIsFullSaysWhichLimitItHasReached )
 {
   VSmallMovie Movie( WithTimes( 400000001, VStandard::ETimecode25, 0 ) );
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   size_t Written = 0;
   while( Written < 100 && Movie.Frame( VBytes( 16 ) ) )
   {
@@ -323,7 +291,7 @@ TEST_F( MovWriter, AFileThatIsFullSaysWhichLimitItHasReached )
 TEST_F( MovWriter, SoundThatIsTooLongIsRefusedToo )
 {
   VSmallMovie Movie( WithTimes( 5400000, VStandard::ETimecode25, 44100 ) );   // 907 units a sample
-  ASSERT_TRUE( Movie.Start() );
+  ASSERT_TRUE( Movie.Begin() );
   EXPECT_TRUE( Movie.Frame( VBytes( 16 ), VBytes( 2 * 4000000 ) ) );
   EXPECT_FALSE( Movie.Frame( VBytes( 16 ), VBytes( 2 * 735356 ) ) );
   EXPECT_TRUE( Movie.Frame( VBytes( 16 ), VBytes( 2 * 735355 ) ) );
@@ -342,7 +310,7 @@ TEST_F( MovWriter, AttributesAreRescaledAndKeptWhateverTheyAre )
   Settings.m_Attributes.Set( "Saturation", "the caller's" );
   Settings.m_Attributes.Set( "Take", int32_t{ 3 } );
   VSmallMovie Movie( Settings );
-  ASSERT_TRUE( Movie.Start() && Movie.m_Writer.Close() );
+  ASSERT_TRUE( Movie.Begin() && Movie.m_Writer.Close() );
   const auto Parser = Movie.Parse();
   const VBytes Body = Parser.Body( Parser.Root().Child( "TMSL" ) );
   ISimpleInputStreamAdapter Stream( Body );
@@ -367,32 +335,9 @@ TEST_F( MovWriter, AttributesAreRescaledAndKeptWhateverTheyAre )
   EXPECT_EQ( External.Values().size(), 15u );
 }
 
-TEST_F( MovWriter, OperationsOutOfOrderAreRefused )
+TEST_F( MovWriter, OtherContainersAreRefused )
 {
-  VMovWriter Other( IVideoContainer::EAVI );
-  EXPECT_FALSE( Other.Open( "memory" ) );
-  EXPECT_FALSE( Other.IsOpen() );
-  VMovWriter Nowhere( IVideoContainer::EMOV );
-  EXPECT_FALSE( Nowhere.Open( "/no such folder/file.mov" ) );
-  VSmallMovie Movie;
-  EXPECT_FALSE( Movie.m_Writer.Close() );
-  EXPECT_FALSE( Movie.Frame( VBytes( 16 ) ) );
-  EXPECT_FALSE( Movie.m_Writer.WriteStoredFrame( {}, {}, 'I' ) );
-  ASSERT_TRUE( Movie.Start() );
-  EXPECT_FALSE( Movie.m_Writer.Open( "memory" ) );
-  EXPECT_TRUE( Movie.m_Writer.Close() );
-  EXPECT_FALSE( Movie.m_Writer.Close() );
-  EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "Container must be MOV or MP4.", "WriteHeader must be called before WriteFrame is called.",
-      "WriteHeader must be called before WriteFrame is called.", "File already open." } ) );
-}
-
-// Without a sample rate or channels there is nothing to store, although the payload says so.
-TEST_F( MovWriter, SoundWithoutADescriptionIsNoTrack )
-{
-  VMovieSettings Settings;
-  Settings.m_Audio = {};
-  VSmallMovie Movie( Settings );
-  ASSERT_TRUE( Movie.Start() && Movie.Frame( VBytes( 16 ), VBytes( 4 ) ) && Movie.m_Writer.Close() );
-  EXPECT_EQ( Movie.Parse().Tracks().size(), 2u );
+  EXPECT_FALSE( VMovWriter( IVideoContainer::EAVI ).Open( "memory" ) );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Container must be MOV or MP4." } );
+  EXPECT_FALSE( VSmallMovie().m_Writer.WriteStoredFrame( {}, {}, 'I' ) );
 }

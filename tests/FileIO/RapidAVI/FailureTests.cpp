@@ -10,6 +10,7 @@
 
 using namespace KVZ;
 using namespace RapidAVI;
+using namespace TestSupport;
 
 namespace
 {
@@ -17,29 +18,14 @@ namespace
 constexpr uint32_t Frames = 7;
 constexpr VSegmentLimits ThreeRiffs{ 80, 80 };
 
-struct VResult
+VFaultyRun WriteSmallFile( VAviFile& io_rFile )
 {
-  bool m_bHeader = false;
-  bool m_bClosed = false;
-  uint32_t m_Written = 0;
-  bool m_bLaterRefused = true;
-};
-
-// Goes on after a failure as no client would.
-VResult WriteSmallFile( VAviFile& io_rFile )
-{
-  VResult Result;
-  Result.m_bHeader = io_rFile.OpenAndWriteHeader();
-  bool bFailed = !Result.m_bHeader;
-  for( uint32_t Frame = 0; Frame < Frames; ++Frame )
+  const auto WriteFrame = [&]( size_t i_Frame )
   {
-    const bool bWritten = io_rFile.WriteFrame( VRapidAVIWriter::AppendKey, Noise( 8, Frame ), Noise( 2, Frame ) );
-    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
-    Result.m_Written += bWritten ? 1 : 0;
-    bFailed = bFailed || !bWritten;
-  }
-  Result.m_bClosed = io_rFile.m_Writer.Close();
-  return Result;
+    const auto Number = static_cast<uint32_t>( i_Frame );
+    return io_rFile.Frame( Noise( 8, Number ), Noise( 2, Number ) );
+  };
+  return RunIntoFault( io_rFile, Frames, WriteFrame );
 }
 
 // The frames that a walk finds up to the first place that makes no sense.
@@ -59,7 +45,7 @@ std::vector<VBytes> WalkFrames( const VBytes& i_rBytes )
   return Found;
 }
 
-void CheckLeftBehind( const VAviFile& i_rFile, const VResult& i_rResult )
+void CheckLeftBehind( const VAviFile& i_rFile, const VFaultyRun& i_rResult )
 {
   EXPECT_FALSE( i_rResult.m_bClosed );
   EXPECT_TRUE( i_rResult.m_bLaterRefused );
@@ -73,11 +59,11 @@ void CheckLeftBehind( const VAviFile& i_rFile, const VResult& i_rResult )
 }
 
 // Whether the file is whole but for what was refused, with every index right.
-bool IsConsistent( const VAviFile& i_rFile, const VResult& i_rResult )
+bool IsConsistent( const VAviFile& i_rFile, const VFaultyRun& i_rResult )
 {
   try
   {
-    const TestSupport::VAviParser Parser = i_rFile.Parse();
+    const VAviParser Parser = i_rFile.Parse();
     EXPECT_GE( Parser.TotalFrames(), i_rResult.m_Written );
     EXPECT_EQ( Parser.Chunks( 0 ).size(), Parser.TotalFrames() );
     return Parser.CountIndexed( 0 ) == Parser.TotalFrames();
@@ -89,9 +75,9 @@ bool IsConsistent( const VAviFile& i_rFile, const VResult& i_rResult )
 }
 
 // Beginning, content and end of every chunk.
-void AddBoundaries( const std::vector<TestSupport::VRiffChunk>& i_rChunks, std::set<uint64_t>& o_rOffsets )
+void AddBoundaries( const std::vector<VRiffChunk>& i_rChunks, std::set<uint64_t>& o_rOffsets )
 {
-  for( const TestSupport::VRiffChunk& rChunk : i_rChunks )
+  for( const VRiffChunk& rChunk : i_rChunks )
   {
     for( const uint64_t Boundary : { rChunk.m_Position, rChunk.m_Position + 4, rChunk.m_Data, rChunk.m_Data + rChunk.m_Size } )
     {
@@ -119,7 +105,7 @@ std::set<uint64_t> FaultOffsets( const VAviFile& i_rWhole, uint64_t i_HeaderEnd 
 
 TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame )
 {
-  VAviFile Whole( {}, ThreeRiffs );
+  VAviFile Whole( VSettings(), ThreeRiffs );
   ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
   ASSERT_EQ( WalkFrames( *Whole.m_pBytes ).size(), Frames );
   const uint64_t HeaderEnd = Whole.Parse().Headers().m_Data + Whole.Parse().Headers().m_Size;
@@ -129,8 +115,8 @@ TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame
   for( const uint64_t Offset : Offsets )
   {
     SCOPED_TRACE( Offset );
-    VAviFile File( {}, ThreeRiffs, { .m_Offset = Offset } );
-    const VResult Result = WriteSmallFile( File );
+    VAviFile File( VSettings(), ThreeRiffs, { .m_Offset = Offset } );
+    const VFaultyRun Result = WriteSmallFile( File );
     EXPECT_LE( File.m_pBytes->size(), Offset );
     EXPECT_EQ( Result.m_bHeader, Offset >= HeaderEnd );
     CheckLeftBehind( File, Result );
@@ -140,7 +126,7 @@ TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame
 // Here the stream works again after the failure, so that only the writer's own memory keeps it.
 TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 {
-  VAviFile Whole( {}, ThreeRiffs );
+  VAviFile Whole( VSettings(), ThreeRiffs );
   ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
   const uint64_t Operations = Whole.m_Operations;
   ASSERT_GT( Operations, 50u );
@@ -149,8 +135,8 @@ TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
   for( uint64_t Operation = 0; Operation < Operations; ++Operation )
   {
     SCOPED_TRACE( Operation );
-    VAviFile File( {}, ThreeRiffs, { .m_Operation = Operation } );
-    const VResult Result = WriteSmallFile( File );
+    VAviFile File( VSettings(), ThreeRiffs, { .m_Operation = Operation } );
+    const VFaultyRun Result = WriteSmallFile( File );
     CheckLeftBehind( File, Result );
     if( Result.m_bHeader && Result.m_Written < Frames )
     {
@@ -165,19 +151,20 @@ TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 
 TEST( AviWriterFailures, OnARealDisk )
 {
-  const VSettings Settings{ .m_Video = Video( IPixelFormat::EU8Y8V8Y8, 100, 100 ), .m_Audio = {} };
+  VSettings Settings( VideoInfo( IPixelFormat::EU8Y8V8Y8, 100, 100 ) );
+  Settings.m_Audio = {};
   VRapidAVIWriter Full;
   ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( Settings.WriteHeader( Full ) );
+  EXPECT_FALSE( Settings.WriteTo( Full ) );
   EXPECT_FALSE( Full.Close() );
 
-  const TestSupport::VTemporaryFolder Folder;
-  const TestSupport::VFileSizeLimit Limit( 90000 );
+  const VTemporaryFolder Folder;
+  const VFileSizeLimit Limit( 90000 );
   VRapidAVIWriter Writer;
   ASSERT_TRUE( Writer.Open( Folder.File( "cut.avi" ) ) );
-  ASSERT_TRUE( Settings.WriteHeader( Writer ) );
+  ASSERT_TRUE( Settings.WriteTo( Writer ) );
   uint32_t Written = 0;
-  while( Settings.WriteFrame( Writer, Written, Noise( 20000, Written ), {} ) )
+  while( Settings.WriteFrame( Writer, Noise( 20000, Written ) ) )
   {
     ++Written;
   }
@@ -185,22 +172,12 @@ TEST( AviWriterFailures, OnARealDisk )
   EXPECT_FALSE( Writer.Close() );
 
   // The indexes have taken the place of the frame that was cut off.
-  VBytes Bytes = TestSupport::VRiffParser::ReadFile( Folder.File( "cut.avi" ) );
+  VBytes File = VRiffParser::ReadFile( Folder.File( "cut.avi" ) );
   constexpr std::string_view AttributesName = "TMSL";
-  const auto Attributes = std::search( Bytes.begin(), Bytes.end(), AttributesName.begin(), AttributesName.end() );
-  ASSERT_NE( Attributes, Bytes.end() );
-  Bytes.erase( Attributes - 8, Bytes.end() );
-  const TestSupport::VAviParser Parser( Bytes );
+  const auto Attributes = std::search( File.begin(), File.end(), AttributesName.begin(), AttributesName.end() );
+  ASSERT_NE( Attributes, File.end() );
+  File.erase( Attributes - 8, File.end() );
+  const VAviParser Parser( File );
   EXPECT_EQ( Parser.TotalFrames(), 3u );
   EXPECT_EQ( Parser.CountIndexed( 0 ), 3u );
-}
-
-TEST( AviWriterFailures, AFileWithoutAHeaderIsClosedAsAFailure )
-{
-  VRapidAVIWriter Unopened;
-  EXPECT_FALSE( Unopened.Close() );
-  VAviFile File;
-  ASSERT_TRUE( File.m_Writer.Open( "memory" ) );
-  EXPECT_FALSE( File.m_Writer.Close() );
-  EXPECT_FALSE( File.m_Writer.IsOpen() );
 }

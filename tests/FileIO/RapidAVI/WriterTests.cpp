@@ -1,49 +1,20 @@
-#include "FileIO/WriterSupport/AttributeBlock.h"
 #include "tests/FileIO/RapidAVI/AviFile.h"
+#include "tests/support/ByteBuilder.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
 
 using namespace KVZ;
 using namespace RapidAVI;
+using namespace TestSupport;
 
 namespace
 {
 
-// Bytes put together piece by piece, numbers little-endian.
-class VBuilder
-{
-public:
-  VBuilder& Raw( const std::string& i_rText )
-  {
-    m_Bytes.insert( m_Bytes.end(), i_rText.begin(), i_rText.end() );
-    return *this;
-  }
-  VBuilder& U32( uint64_t i_Value ) { return Number( i_Value, 4 ); }
-  VBuilder& U16( uint64_t i_Value ) { return Number( i_Value, 2 ); }
-  VBuilder& U64( uint64_t i_Value ) { return Number( i_Value, 8 ); }
-  VBuilder& Number( uint64_t i_Value, size_t i_Size )
-  {
-    for( ; i_Size != 0; --i_Size )
-    {
-      m_Bytes.push_back( static_cast<uint8_t>( i_Value ) );
-      i_Value >>= 8;
-    }
-    return *this;
-  }
-  VBuilder& Zeros( size_t i_Count )
-  {
-    m_Bytes.resize( m_Bytes.size() + i_Count );
-    return *this;
-  }
-
-  VBytes m_Bytes;
-};
-
 // Two frames of 4 x 1 pixels, the first with one sample of sound and the second with none, up to the attributes.
 VBytes ExpectedFile()
 {
-  VBuilder File;
+  VLittleEndian File;
   File.Raw( "RIFF" ).U32( 33626 ).Raw( "AVI " );
   File.Raw( "LIST" ).U32( 33416 ).Raw( "hdrl" );
   File.Raw( "avih" ).U32( 56 ).U32( 40000 ).U32( 200 ).U32( 0 ).U32( 0x810 );   // period, bytes a second, padding, flags
@@ -86,8 +57,6 @@ VBytes ExpectedFile()
   return File.m_Bytes;
 }
 
-VBytes Bytes( const std::string& i_rText ) { return { i_rText.begin(), i_rText.end() }; }
-
 // An encoder that compresses every image to the same bytes.
 std::shared_ptr<VideoEncoding::VVideoFrameEncoder> EncoderTo( const VBytes& i_rImage )
 {
@@ -115,7 +84,7 @@ VBytes Image( size_t i_Tables, const std::string& i_rData )
 class AviWriter : public testing::Test
 {
 protected:
-  const TestSupport::VLogCapture m_Log{ "RapidAVI" };
+  const VLogCapture m_Log{ "RapidAVI" };
 };
 
 }
@@ -123,11 +92,11 @@ protected:
 TEST_F( AviWriter, ASmallFileIsTheseBytes )
 {
   VAviFile File;
-  ASSERT_TRUE( File.OpenAndWriteHeader() );
-  ASSERT_TRUE( File.WriteFrame( 0, Bytes( "ABCDEFGH" ), Bytes( "ab" ) ) );
+  ASSERT_TRUE( File.Begin() );
+  ASSERT_TRUE( File.Frame( Bytes( "ABCDEFGH" ), Bytes( "ab" ), 0 ) );
   VBufferList Video{ Buffer( Bytes( "IJK" ) ), Buffer( {} ), Buffer( Bytes( "LMNOP" ) ) };
   VBufferList Audio;
-  ASSERT_TRUE( File.m_Writer.WriteFrame( Video, File.m_Settings.m_Video, Audio, MonoAudio, VRapidAVIWriter::AppendKey ) );
+  ASSERT_TRUE( File.m_Writer.WriteFrame( Video, File.m_Header.m_Video, Audio, MonoAudio, AppendKey ) );
   ASSERT_TRUE( File.m_Writer.Close() );
   const VBytes Expected = ExpectedFile();
   EXPECT_EQ( VBytes( File.m_pBytes->begin(), File.m_pBytes->begin() + static_cast<std::ptrdiff_t>( Expected.size() ) ), Expected );
@@ -135,60 +104,23 @@ TEST_F( AviWriter, ASmallFileIsTheseBytes )
   EXPECT_TRUE( m_Log.Texts().empty() );
 }
 
-TEST_F( AviWriter, TheAttributesEndTheFile )
-{
-  VSettings Settings;
-  Settings.m_Attributes.Set( "Take", "one" );
-  Settings.m_Timecode.m_Hours = 99;   // no valid one
-  VAviFile File( Settings );
-  ASSERT_TRUE( File.OpenAndWriteHeader() );
-  ASSERT_TRUE( File.m_Writer.Close() );
-  const TestSupport::VAviParser Parser = File.Parse();
-  const VBytes Blocks = Parser.Riff().Content( Parser.Riff().Riffs().back() );
-  ISimpleInputStreamAdapter Stream( Blocks );
-  IVideoAttributes Internal;
-  IVideoAttributes External;
-  std::string Error;
-  ASSERT_TRUE( WriterSupport::ReadAttributeBlock( Stream, Blocks.size(), Internal, Error ) ) << Error;
-  ASSERT_TRUE( WriterSupport::ReadAttributeBlock( Stream, Blocks.size(), External, Error ) ) << Error;
-  EXPECT_TRUE( Stream.IsEnd() );
-  VideoFrameInfo Video;
-  EXPECT_TRUE( Video.ReadAttributes( Internal ) );
-  EXPECT_EQ( Video, Settings.m_Video );
-  VTimingRecord Timing;
-  EXPECT_TRUE( Timing.ReadAttributes( External ) );
-  EXPECT_EQ( Timing, Rate25 );
-  ITimecode Timecode;
-  EXPECT_TRUE( ReadAttributes( Timecode, External ) );
-  EXPECT_EQ( Timecode.m_Hours, 99 );
-  EXPECT_TRUE( External.Has( "Take" ) && External.Has( "Saturation" ) );
-
-  // The colour rides on the timing.
-  Settings.m_Timing = {};
-  VAviFile Untimed( Settings );
-  ASSERT_TRUE( Untimed.OpenAndWriteHeader() );
-  ASSERT_TRUE( Untimed.m_Writer.Close() );
-  EXPECT_LT( Untimed.m_pBytes->size(), File.m_pBytes->size() );
-  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "The frame rate is not known: readers will take one of their own." } );
-}
-
 TEST_F( AviWriter, ARiffTakesFramesUntilItHasReachedItsLimit )
 {
   // 8 bytes of image and 2 of sound count 24 and 18: the fourth image reaches 4 x 24 + 3 x 18 = 150 exactly.
-  VAviFile File( {}, { 150, 60 } );
-  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  VAviFile File( VSettings(), { 150, 60 } );
+  ASSERT_TRUE( File.Begin() );
   for( uint32_t Frame = 0; Frame < 9; ++Frame )
   {
-    ASSERT_TRUE( File.WriteFrame( Frame, Noise( 8, Frame ), Noise( 2, Frame ) ) );
+    ASSERT_TRUE( File.Frame( Noise( 8, Frame ), Noise( 2, Frame ), Frame ) );
   }
   ASSERT_TRUE( File.m_Writer.Close() );
 
-  const TestSupport::VAviParser Parser = File.Parse();
+  const VAviParser Parser = File.Parse();
   std::vector<std::string> Layout;
-  for( const TestSupport::VRiffChunk& rRiff : Parser.Riff().Riffs() )
+  for( const VRiffChunk& rRiff : Parser.Riff().Riffs() )
   {
     std::string Text = rRiff.m_Form + ":";
-    for( const TestSupport::VRiffChunk& rChunk : rRiff.Count( "movi" ) == 0 ? rRiff.m_Children : rRiff.Child( "movi" ).m_Children )
+    for( const VRiffChunk& rChunk : rRiff.Count( "movi" ) == 0 ? rRiff.m_Children : rRiff.Child( "movi" ).m_Children )
     {
       Text += " " + rChunk.m_Id;
     }
@@ -212,14 +144,14 @@ TEST_F( AviWriter, ARiffTakesFramesUntilItHasReachedItsLimit )
 
 TEST_F( AviWriter, ASuperIndexHoldsTheFirst1024Riffs )
 {
-  VAviFile File( {}, { 1, 1 } );
-  ASSERT_TRUE( File.OpenAndWriteHeader() );
+  VAviFile File( VSettings(), { 1, 1 } );
+  ASSERT_TRUE( File.Begin() );
   for( uint32_t Frame = 0; Frame < 1030; ++Frame )
   {
-    ASSERT_TRUE( File.WriteFrame( Frame, Noise( 8, Frame ), {} ) );
+    ASSERT_TRUE( File.Frame( Noise( 8, Frame ), {}, Frame ) );
   }
   ASSERT_TRUE( File.m_Writer.Close() );
-  const TestSupport::VAviParser Parser = File.Parse();
+  const VAviParser Parser = File.Parse();
   // The last one has the sound of the last frame alone.
   EXPECT_EQ( Parser.Riff().Riffs().size(), 1030u + 1 + 1 );
   EXPECT_EQ( Parser.SuperIndexEntries( 0 ), 1024u );
@@ -234,12 +166,12 @@ TEST_F( AviWriter, JPEGImagesGetAnAVI1Header )
   const auto WriteImage = []( const VBytes& i_rImage, IPixelFormat::Enum i_Format = IPixelFormat::ER8G8B8 )
   {
     VSettings Settings;
-    Settings.m_Video = Video( i_Format, 2, 1 );
+    Settings.m_Video = VideoInfo( i_Format, 2, 1 );
     Settings.m_Payload = IVideoPayload::EImageJPEG;
     Settings.m_Audio = {};
     VAviFile File( Settings, {}, {}, EncoderTo( i_rImage ) );
-    EXPECT_TRUE( File.OpenAndWriteHeader() );
-    const bool bWritten = File.WriteFrame( 0, Noise( 6, 0 ), {} );
+    EXPECT_TRUE( File.Begin() );
+    const bool bWritten = File.Frame( Noise( 6, 0 ), {}, 0 );
     EXPECT_TRUE( File.m_Writer.Close() );
     return bWritten ? File.Parse().Riff().Content( File.Parse().Chunks( 0 ).at( 0 ) ) : VBytes();
   };
@@ -263,46 +195,37 @@ TEST_F( AviWriter, JPEGImagesGetAnAVI1Header )
   EXPECT_EQ( WriteImage( Bytes( "no image" ) ), VBytes() );
 }
 
-TEST_F( AviWriter, FramesThatDoNotFitAreRefusedAndLeaveNoTrace )
+TEST_F( AviWriter, RefusalsSayWhy )
 {
-  VSettings Settings;
-  Settings.m_Audio.m_Channels = 2;
-  VAviFile File( Settings );
-  EXPECT_FALSE( File.WriteFrame( 0, Noise( 8, 0 ), {} ) );
-  ASSERT_TRUE( File.OpenAndWriteHeader() );
-  EXPECT_FALSE( File.WriteFrame( 1, Noise( 8, 0 ), {} ) );
-  EXPECT_FALSE( File.WriteFrame( 0, Noise( 7, 0 ), {} ) );
-  VSettings Other = Settings;
-  Other.m_Video = Video( IPixelFormat::EU8Y8V8Y8, 2, 2 );
-  EXPECT_FALSE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), {} ) );
-  // Sound with more channels loses them, with fewer it is refused.
-  Other = Settings;
-  Other.m_Audio.m_Channels = 1;
-  EXPECT_FALSE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), Noise( 4, 0 ) ) );
-  Other.m_Audio.m_Channels = 4;
-  EXPECT_TRUE( Other.WriteFrame( File.m_Writer, 0, Noise( 8, 0 ), Bytes( "AABBCCDDEEFFGGHH" ) ) );
-  EXPECT_FALSE( File.WriteFrame( 0, Noise( 8, 1 ), {} ) );
-  EXPECT_TRUE( File.WriteFrame( 1, Noise( 8, 1 ), {} ) );
-  EXPECT_TRUE( File.m_Writer.Close() );
-  EXPECT_FALSE( File.m_Writer.Close() );
-  const TestSupport::VAviParser Parser = File.Parse();
-  EXPECT_EQ( Parser.TotalFrames(), 2u );
-  EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 1 ).at( 0 ) ), Bytes( "AABBEEFF" ) );
-  EXPECT_EQ( Parser.StreamLength( 1 ), 2u );
+  VAviFile File;
+  ASSERT_TRUE( File.Begin() );
+  EXPECT_FALSE( File.Frame( VBytes( 8 ), {}, 1 ) );
+  EXPECT_FALSE( File.Frame( VBytes( 7 ), {}, 0 ) );
+  EXPECT_FALSE( VSettings( VideoInfo( IPixelFormat::EU8Y8V8Y8, 2, 2 ) ).WriteFrame( File.m_Writer, VBytes( 8 ) ) );
+  EXPECT_FALSE( VSettings( VideoInfo( IPixelFormat::ELuminance8 ) ).WriteFrame( File.m_Writer, VBytes( 4 ) ) );
   EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "WriteHeader must be called before WriteFrame is called.", "Frame 1 cannot be stored where frame 0 comes next.",
-      "Frame 0 of 7 bytes does not fit the file's 8.", "A frame of 2 x 2 pixels does not fit the file's 4 x 1.", "Encoding to 'Uncompressed' failed.",
-      "Frame 0 cannot be stored where frame 1 comes next." } ) );
+    ( std::vector<std::string>{ "Frame 1 cannot be stored where frame 0 comes next.", "Frame 0 of 7 bytes does not fit the file's 8.",
+      "A frame of 2 x 2 pixels does not fit the file's 4 x 1.", "Encoding to 'Uncompressed' failed." } ) );
+}
+
+TEST_F( AviWriter, WithoutARateThereIsNoColourEither )
+{
+  VAviFile Timed;
+  VAviFile Untimed;
+  Untimed.m_Header.m_Timing = {};
+  ASSERT_TRUE( Timed.Begin() && Timed.m_Writer.Close() && Untimed.Begin() && Untimed.m_Writer.Close() );
+  EXPECT_LT( Untimed.m_pBytes->size(), Timed.m_pBytes->size() );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "The frame rate is not known: readers will take one of their own." } );
 }
 
 TEST_F( AviWriter, WithoutASampleFormatThereIsNoSound )
 {
-  const TestSupport::VLogCapture Log( "AVIIO" );
+  const VLogCapture Log( "AVIIO" );
   VAviFile File;
   ASSERT_TRUE( File.m_Writer.Open( "memory" ) );
   ASSERT_TRUE(
-    File.m_Writer.WriteHeader( File.m_Settings.m_Video, {}, Rate25, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::EUncompressed ) );
-  EXPECT_TRUE( File.WriteFrame( 0, Noise( 8, 0 ), Noise( 2, 0 ) ) );
+    File.m_Writer.WriteHeader( File.m_Header.m_Video, {}, Rate25, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::EUncompressed ) );
+  EXPECT_TRUE( File.Frame( Noise( 8, 0 ), Noise( 2, 0 ), 0 ) );
   ASSERT_TRUE( File.m_Writer.Close() );
   EXPECT_EQ( File.Parse().Headers().Count( "strl" ), 1u );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported audio payload when writing AVI file." } );
@@ -311,7 +234,7 @@ TEST_F( AviWriter, WithoutASampleFormatThereIsNoSound )
 TEST_F( AviWriter, ChunksAreClosedWithTheirSizes )
 {
   const auto pBytes = std::make_shared<VBytes>();
-  VChunkWriter Out( std::make_unique<TestSupport::VMemoryFile>( pBytes ) );
+  VChunkWriter Out( std::make_unique<VMemoryFile>( pBytes ) );
   EXPECT_TRUE( Out.OpenRiff( FourCC( "Test" ) ) );
   EXPECT_TRUE( Out.OpenChunk( FourCC( "open" ) ) );
   EXPECT_TRUE( Out.Write( "odd", 3 ) );
@@ -320,7 +243,7 @@ TEST_F( AviWriter, ChunksAreClosedWithTheirSizes )
   EXPECT_TRUE( Out.Reserve( 2 ) );
   EXPECT_TRUE( Out.CloseChunk() );
   EXPECT_TRUE( Out.CloseChunk() );
-  VBuilder Expected;
+  VLittleEndian Expected;
   Expected.Raw( "RIFF" ).U32( 26 ).Raw( "Test" ).Raw( "open" ).U32( 3 ).Raw( "odd" ).Zeros( 1 ).Raw( "stat" ).U32( 2 ).Zeros( 2 );
   EXPECT_EQ( *pBytes, Expected.m_Bytes );
 }

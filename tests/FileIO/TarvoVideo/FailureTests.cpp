@@ -7,6 +7,7 @@
 
 using namespace KVZ;
 using namespace TarvoVideo;
+using namespace TestSupport;
 
 namespace
 {
@@ -19,40 +20,20 @@ VFrameContent Content( uint64_t i_Key, uint8_t i_Version = 0 )
   return { VBytes( 4, Byte ), VBytes( 6, static_cast<uint8_t>( Byte + 1 ) ) };
 }
 
-struct VResult
+// Four frames, and the second one once more.
+VFaultyRun WriteSmallFile( VSmallFile& io_rFile )
 {
-  bool m_bHeader = false;
-  bool m_bClosed = false;
-  size_t m_Written = 0;   // frames whose call gave true
-  size_t m_Incomplete = 0;
-  bool m_bLaterRefused = true;
-};
-
-// Four frames, and the second one once more. Goes on after a failure as no client would.
-VResult WriteSmallFile( VSmallFile& io_rFile )
-{
-  VResult Result;
-  Result.m_bHeader = io_rFile.OpenAndWriteHeader();
-  bool bFailed = !Result.m_bHeader;
-  const auto WriteFrame = [&]( uint64_t i_Key, uint8_t i_Version )
+  const auto WriteFrame = [&]( size_t i_Frame )
   {
-    const bool bWritten = io_rFile.WriteFrame( i_Key, Content( i_Key, i_Version ) );
-    Result.m_bLaterRefused = Result.m_bLaterRefused && !( bFailed && bWritten );
-    Result.m_Written += bWritten;
-    bFailed = bFailed || !bWritten;
+    const bool bAgain = i_Frame == std::size( Keys );
+    const uint64_t Key = bAgain ? Keys[1] : Keys[i_Frame];
+    return io_rFile.WriteFrame( Key, Content( Key, bAgain ) );
   };
-  for( const uint64_t Key : Keys )
-  {
-    WriteFrame( Key, 0 );
-  }
-  WriteFrame( Keys[1], 1 );
-  Result.m_bClosed = io_rFile.m_Writer.Close();
-  Result.m_Incomplete = io_rFile.m_Writer.CountIncompleteFrames();
-  return Result;
+  return RunIntoFault( io_rFile, std::size( Keys ) + 1, WriteFrame );
 }
 
 // Every frame that a reader finds by its key is one that was written, and whole.
-void CheckLeftBehind( const VSmallFile& i_rFile, const VResult& i_rResult )
+void CheckLeftBehind( const VSmallFile& i_rFile, const VFaultyRun& i_rResult )
 {
   EXPECT_FALSE( i_rResult.m_bClosed );
   EXPECT_TRUE( i_rResult.m_bLaterRefused );
@@ -60,7 +41,7 @@ void CheckLeftBehind( const VSmallFile& i_rFile, const VResult& i_rResult )
   const VFound Found = ReadAll( *i_rFile.m_pBytes );
   if( i_rResult.m_bHeader && i_rResult.m_Written < std::size( Keys ) )
   {
-    EXPECT_EQ( Found.m_Frames.size(), i_rResult.m_Written - i_rResult.m_Incomplete );
+    EXPECT_EQ( Found.m_Frames.size(), i_rResult.m_Written - i_rFile.m_Writer.CountIncompleteFrames() );
   }
   if( Found.m_bFinished )
   {
@@ -88,7 +69,7 @@ TEST( TarvoWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFra
   {
     SCOPED_TRACE( Offset );
     VSmallFile File( { .m_Offset = Offset } );
-    const VResult Result = WriteSmallFile( File );
+    const VFaultyRun Result = WriteSmallFile( File );
     EXPECT_LE( File.m_pBytes->size(), Offset );
     CheckLeftBehind( File, Result );
   }
@@ -106,7 +87,7 @@ TEST( TarvoWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
   {
     SCOPED_TRACE( Operation );
     VSmallFile File( { .m_Operation = Operation } );
-    const VResult Result = WriteSmallFile( File );
+    const VFaultyRun Result = WriteSmallFile( File );
     CheckLeftBehind( File, Result );
     Finished += ReadAll( *File.m_pBytes ).m_bFinished;
   }
@@ -118,18 +99,19 @@ TEST( TarvoWriterFailures, OnARealDisk )
 {
   VWriter Full;
   ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( Full.WriteHeader( SmallVideo(), {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
+  EXPECT_FALSE( VSmallHeader().WriteTo( Full ) );
   EXPECT_FALSE( Full.Close() );
 
-  const TestSupport::VTemporaryFolder Folder;
-  const TestSupport::VFileSizeLimit Limit( 2000 );
-  VideoFrameInfo Info = SmallVideo();
-  Info.m_ImageHeight = 100;
+  const VTemporaryFolder Folder;
+  const VFileSizeLimit Limit( 2000 );
+  VSmallHeader Header;
+  Header.m_Video.m_ImageHeight = 100;
+  Header.m_Audio = {};
   VWriter Writer;
   ASSERT_TRUE( Writer.Open( Folder.File( "cut.tvid" ) ) );
-  ASSERT_TRUE( Writer.WriteHeader( Info, {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
+  ASSERT_TRUE( Header.WriteTo( Writer ) );
   uint64_t Written = 0;
-  while( Writer.WriteFrame( VFrameSet{ Buffer( VBytes( 400, 'x' ) ), Info, {}, {} }, Written ) )
+  while( Header.WriteFrame( Writer, VBytes( 400, 'x' ), {}, Written ) )
   {
     ++Written;
   }

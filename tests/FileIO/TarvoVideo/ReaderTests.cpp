@@ -5,11 +5,12 @@
 
 using namespace KVZ;
 using namespace TarvoVideo;
+using namespace TestSupport;
 
 namespace
 {
 
-VFrameContent Content( uint64_t i_Key )
+VFrameContent FrameOf( uint64_t i_Key )
 {
   return { VBytes( 4, static_cast<uint8_t>( i_Key ) ), VBytes( i_Key % 3 * 2, static_cast<uint8_t>( 0xF0 + i_Key ) ) };
 }
@@ -19,7 +20,7 @@ VContents Contents( uint64_t i_Count )
   VContents Result;
   for( uint64_t Key = 0; Key < i_Count; ++Key )
   {
-    Result[Key] = Content( Key );
+    Result[Key] = FrameOf( Key );
   }
   return Result;
 }
@@ -28,7 +29,7 @@ VContents Contents( uint64_t i_Count )
 VBytes MakeFile( bool i_bClose )
 {
   VSmallFile File;
-  EXPECT_TRUE( File.OpenAndWriteHeader() );
+  EXPECT_TRUE( File.Begin() );
   for( const auto& [Key, rContent] : Contents( 5 ) )
   {
     EXPECT_TRUE( File.WriteFrame( Key, rContent ) );
@@ -50,8 +51,8 @@ TEST( TarvoReader, ReadsWhatTheWriterWrote )
   const VBytes File = MakeFile( true );
   VReader Reader;
   ASSERT_TRUE( Reader.Open( std::make_unique<ISimpleInputStreamAdapter>( File ), File.size() ) );
-  EXPECT_EQ( Reader.GetVideoInfo(), SmallVideo() );
-  EXPECT_EQ( Reader.GetAudioInfo(), SmallAudio );
+  EXPECT_EQ( Reader.GetVideoInfo(), VideoInfo() );
+  EXPECT_EQ( Reader.GetAudioInfo(), MonoAudio );
   std::string Take;
   EXPECT_TRUE( Reader.GetExternalAttributes().Get( "Take", Take ) );
   EXPECT_EQ( Take, "one" );
@@ -140,7 +141,7 @@ TEST( TarvoReader, LengthsFromTheFileAreCheckedBeforeUse )
     std::copy( i_rBytes.begin(), i_rBytes.end(), File.begin() + static_cast<std::ptrdiff_t>( i_Position ) );
     return ReadAll( File ).m_Error;
   };
-  const VBytes Huge = VBuilder().U32( 0xFFFFFFF0 ).m_Bytes;
+  const VBytes Huge = VLittleEndian().U32( 0xFFFFFFF0 ).m_Bytes;
   EXPECT_EQ( Damage( false, 48, Huge ), "The internal attribute block at 48 is damaged: entry 14: the keys are not in ascending order." );
   EXPECT_EQ( Damage( false, 52, Huge ), "The internal attribute block at 48 is damaged: entry 1: it runs past the end of the file." );
   // In a file that is said to be long enough for the length, the block's own limit holds.
@@ -152,16 +153,16 @@ TEST( TarvoReader, LengthsFromTheFileAreCheckedBeforeUse )
 
   const VBytes Whole = MakeFile( true );
   const size_t IndexPosition = Whole.size() - 5 * 16 - 8;
-  EXPECT_EQ( Damage( true, IndexPosition, VBuilder().U64( 0x1000000000000005 ).m_Bytes ),
+  EXPECT_EQ( Damage( true, IndexPosition, VLittleEndian().U64( 0x1000000000000005 ).m_Bytes ),
     "The index is said to have 1152921504606846981 entries of 16 bytes, but 80 bytes are there." );
-  EXPECT_EQ( Damage( true, IndexPosition + 16, VBuilder().U64( 0xFFFFFFFFFFFFFFFE ).m_Bytes ),
+  EXPECT_EQ( Damage( true, IndexPosition + 16, VLittleEndian().U64( 0xFFFFFFFFFFFFFFFE ).m_Bytes ),
     "The index is damaged: a frame of 8 bytes cannot be at 18446744073709551614." );
-  EXPECT_EQ( Damage( true, 40, VBuilder().U64( 0xFFFFFFFFFFFFFFFE ).m_Bytes ).substr( 0, 21 ), "The index is said to " );
+  EXPECT_EQ( Damage( true, 40, VLittleEndian().U64( 0xFFFFFFFFFFFFFFFE ).m_Bytes ).substr( 0, 21 ), "The index is said to " );
 }
 
 TEST( TarvoReader, WhatIsNoFileOfOursIsRefused )
 {
-  const TestSupport::VTemporaryFolder Folder;
+  const VTemporaryFolder Folder;
   VReader Reader;
   for( const std::string& rPath : { Folder.File( "missing.tvid" ), Folder.File( "" ), std::string( "/dev/null" ) } )
   {

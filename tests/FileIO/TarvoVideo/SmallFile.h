@@ -3,61 +3,15 @@
 
 #include "FileIO/TarvoVideo/Reader.h"
 #include "FileIO/TarvoVideo/Writer.h"
-#include "tests/support/FailingStream.h"
-#include "tests/support/MemoryFile.h"
+#include "tests/support/ByteBuilder.h"
+#include "tests/support/SmallRecording.h"
 
-#include <cstring>
 #include <map>
-#include <memory>
-#include <vector>
 
 namespace TarvoVideo
 {
 
-using VBytes = std::vector<uint8_t>;
-
-// Bytes put together piece by piece, numbers little-endian.
-class VBuilder
-{
-public:
-  VBuilder& Raw( const std::string& i_rText )
-  {
-    m_Bytes.insert( m_Bytes.end(), i_rText.begin(), i_rText.end() );
-    return *this;
-  }
-  template<class T>
-  VBuilder& Number( T i_Value )
-  {
-    const auto* pBytes = reinterpret_cast<const uint8_t*>( &i_Value );
-    m_Bytes.insert( m_Bytes.end(), pBytes, pBytes + sizeof( T ) );
-    return *this;
-  }
-  VBuilder& U32( uint32_t i_Value ) { return Number( i_Value ); }
-  VBuilder& U64( uint64_t i_Value ) { return Number( i_Value ); }
-  VBuilder& Text( const std::string& i_rText ) { return U32( static_cast<uint32_t>( i_rText.size() ) ).Raw( i_rText ); }
-
-  VBytes m_Bytes;
-};
-
-inline std::shared_ptr<const KVZ::IBufferConst> Buffer( const VBytes& i_rBytes )
-{
-  auto pBuffer = std::make_shared<KVZ::IStandardBuffer>();
-  pBuffer->Bytes() = i_rBytes;
-  return pBuffer;
-}
-
-inline KVZ::VideoFrameInfo SmallVideo()
-{
-  KVZ::VideoFrameInfo Info;
-  Info.m_ImageWidth = 4;
-  Info.m_ImageHeight = 1;
-  Info.m_PixelFormat = KVZ::IPixelFormat::ELuminance8;
-  Info.m_PixelAspectRatio = 1.0;
-  Info.m_InterlacedFormat = KVZ::IInterlacedFormat::ENotInterlaced;
-  return Info;
-}
-
-constexpr KVZ::AudioFrameInfo SmallAudio{ KVZ::IAudioSampleFormat::EInt16, 48000, 1 };
+using TestSupport::VBytes;
 
 struct VFrameContent
 {
@@ -67,36 +21,25 @@ struct VFrameContent
 };
 using VContents = std::map<uint64_t, VFrameContent>;
 
-// A writer into memory. The results of its operations are kept.
-struct VSmallFile
+// Without timing; with an attribute.
+struct VSmallHeader : TestSupport::VHeader
+{
+  VSmallHeader()
+  {
+    m_Video = TestSupport::VideoInfo();
+    m_Timing = {};
+    m_Attributes.Set( "Take", "one" );
+  }
+};
+
+struct VSmallFile : TestSupport::VMemoryRecording<VWriter>
 {
   explicit VSmallFile( const TestSupport::VFault& i_rFault = {} )
-    : m_Writer( {},
-        [this, i_rFault]( const std::string& )
-        {
-          m_pBytes->clear();
-          return std::make_unique<TestSupport::VFailingStream>( std::make_unique<TestSupport::VMemoryFile>( m_pBytes ), i_rFault, &m_Operations );
-        } )
+    : VMemoryRecording( VSmallHeader(), i_rFault, []( WriterSupport::VStreamMaker i_Maker ) { return VWriter( {}, std::move( i_Maker ) ); } )
   {
   }
 
-  bool OpenAndWriteHeader( const KVZ::VideoFrameInfo& i_rVideo = SmallVideo(), const KVZ::AudioFrameInfo& i_rAudio = SmallAudio )
-  {
-    KVZ::IVideoAttributes External;
-    External.Set( "Take", "one" );
-    const auto AudioPayload = i_rAudio.IsEmpty() ? KVZ::IAudioPayload::ENone : KVZ::IAudioPayload::EUncompressed;
-    return m_Writer.Open( "memory" ) &&
-      m_Writer.WriteHeader( i_rVideo, i_rAudio, {}, {}, {}, External, KVZ::IVideoPayload::EUncompressed, AudioPayload );
-  }
-
-  bool WriteFrame( uint64_t i_Key, const VFrameContent& i_rContent, const KVZ::VideoFrameInfo& i_rVideo = SmallVideo() )
-  {
-    return m_Writer.WriteFrame( KVZ::VFrameSet{ Buffer( i_rContent.m_Video ), i_rVideo, { Buffer( i_rContent.m_Audio ) }, SmallAudio }, i_Key );
-  }
-
-  std::shared_ptr<VBytes> m_pBytes = std::make_shared<VBytes>();
-  uint64_t m_Operations = 0;
-  VWriter m_Writer;
+  bool WriteFrame( uint64_t i_Key, const VFrameContent& i_rContent ) { return Frame( i_rContent.m_Video, i_rContent.m_Audio, i_Key ); }
 };
 
 // What a reader finds. The error is empty for a file that it reads to the end.

@@ -6,18 +6,19 @@
 
 using namespace KVZ;
 using namespace TarvoVideo;
+using namespace TestSupport;
 
 namespace
 {
 
 VBytes ExpectedFile()
 {
-  VBuilder File;
+  VLittleEndian File;
   File.Raw( "###TarvoVideoFile###" ).U32( 0x9F31C19C ).U32( 1 ).U32( 2 ).U64( 1 );   // fixed header
   File.U64( 597 );                                                                   // position of the index
   File.U32( 13 );                                                                    // internal block: entries
   File.Text( "AudioFrameInfo.Channels" ).U32( 7 ).U32( 1 );
-  File.Text( "AudioFrameInfo.Present" ).U32( 0 ).Number( uint8_t{ 1 } );
+  File.Text( "AudioFrameInfo.Present" ).U32( 0 ).U8( 1 );
   File.Text( "AudioFrameInfo.SampleFormat" ).U32( 11 ).Text( "Int16" );
   File.Text( "AudioFrameInfo.SampleRate" ).U32( 7 ).U32( 48000 );
   File.Text( "VideoFrameInfo.ImageHeight" ).U32( 7 ).U32( 1 );
@@ -25,10 +26,10 @@ VBytes ExpectedFile()
   File.Text( "VideoFrameInfo.ImageX" ).U32( 7 ).U32( 0 );
   File.Text( "VideoFrameInfo.ImageY" ).U32( 7 ).U32( 0 );
   File.Text( "VideoFrameInfo.InterlacedFormat" ).U32( 11 ).Text( "NotInterlaced" );
-  File.Text( "VideoFrameInfo.Inverted" ).U32( 0 ).Number( uint8_t{ 0 } );
-  File.Text( "VideoFrameInfo.PixelAspectRatio" ).U32( 10 ).Number( 1.0 );
+  File.Text( "VideoFrameInfo.Inverted" ).U32( 0 ).U8( 0 );
+  File.Text( "VideoFrameInfo.PixelAspectRatio" ).U32( 10 ).Double( 1.0 );
   File.Text( "VideoFrameInfo.PixelFormat" ).U32( 11 ).Text( "Luminance8" );
-  File.Text( "VideoFrameInfo.Present" ).U32( 0 ).Number( uint8_t{ 1 } );
+  File.Text( "VideoFrameInfo.Present" ).U32( 0 ).U8( 1 );
   File.U32( 1 ).Text( "Take" ).U32( 11 ).Text( "one" );   // external block
   EXPECT_EQ( File.m_Bytes.size(), 577u );
   File.Raw( "ABCD" ).U32( 4 ).Raw( "abcd" );   // record of key 7: video, audio length, audio
@@ -38,8 +39,6 @@ VBytes ExpectedFile()
   File.U64( 7 ).U64( 577 );
   return File.m_Bytes;
 }
-
-VBytes Bytes( const std::string& i_rText ) { return { i_rText.begin(), i_rText.end() }; }
 
 class TarvoWriter : public testing::Test
 {
@@ -52,15 +51,17 @@ protected:
 
   IVideoAttributes WriteEmpty( const VTimingRecord& i_rTiming, const ITimecode& i_rTimecode, const IVideoAttributes& i_rAttributes )
   {
-    VWriter& rWriter = m_File.m_Writer;
-    EXPECT_TRUE( rWriter.Open( "memory" ) );
-    EXPECT_TRUE( rWriter.WriteHeader( SmallVideo(), {}, i_rTiming, i_rTimecode, { 0.5f, 2.0f }, i_rAttributes, IVideoPayload::EUncompressed,
-      IAudioPayload::ENone ) );
-    EXPECT_TRUE( rWriter.Close() );
+    VHeader& rHeader = m_File.m_Header;
+    rHeader.m_Audio = {};
+    rHeader.m_Timing = i_rTiming;
+    rHeader.m_Timecode = i_rTimecode;
+    rHeader.m_Colour = { 0.5f, 2.0f };
+    rHeader.m_Attributes = i_rAttributes;
+    EXPECT_TRUE( m_File.Begin() && m_File.m_Writer.Close() );
     return Read().GetExternalAttributes();
   }
 
-  const TestSupport::VLogCapture m_Log{ "TarvoVideo" };
+  const VLogCapture m_Log{ "TarvoVideo" };
   VSmallFile m_File;
   VReader m_Reader;
 };
@@ -69,7 +70,7 @@ protected:
 
 TEST_F( TarvoWriter, ASmallFileIsTheseBytes )
 {
-  ASSERT_TRUE( m_File.OpenAndWriteHeader() );
+  ASSERT_TRUE( m_File.Begin() );
   ASSERT_TRUE( m_File.WriteFrame( 7, { Bytes( "ABCD" ), Bytes( "abcd" ) } ) );
   ASSERT_TRUE( m_File.WriteFrame( 3, { Bytes( "EFGH" ), {} } ) );
   ASSERT_TRUE( m_File.m_Writer.Close() );
@@ -79,7 +80,7 @@ TEST_F( TarvoWriter, ASmallFileIsTheseBytes )
 
 TEST_F( TarvoWriter, AKeyWrittenAgainReplacesItsRecordInPlace )
 {
-  ASSERT_TRUE( m_File.OpenAndWriteHeader() );
+  ASSERT_TRUE( m_File.Begin() );
   ASSERT_TRUE( m_File.WriteFrame( 0, { Bytes( "ABCD" ), Bytes( "ab" ) } ) );
   ASSERT_TRUE( m_File.WriteFrame( 1, { Bytes( "EFGH" ), Bytes( "ef" ) } ) );
   EXPECT_TRUE( m_File.WriteFrame( 0, { Bytes( "IJKL" ), Bytes( "ij" ) } ) );
@@ -94,16 +95,13 @@ TEST_F( TarvoWriter, AKeyWrittenAgainReplacesItsRecordInPlace )
 
 TEST_F( TarvoWriter, AFrameThatIsNotWhatTheHeaderSaysIsRefusedWithBothSizes )
 {
-  ASSERT_TRUE( m_File.OpenAndWriteHeader() );
+  ASSERT_TRUE( m_File.Begin() );
   const size_t Before = m_File.m_pBytes->size();
   EXPECT_FALSE( m_File.WriteFrame( 5, { Bytes( "ABC" ), {} } ) );
   EXPECT_EQ( m_Log.Texts().back(), "Frame 5 of 4 x 1 pixels and 3 bytes does not fit the file's 4 x 1 pixels and 4 bytes." );
-  VideoFrameInfo Turned = SmallVideo();
-  std::swap( Turned.m_ImageWidth, Turned.m_ImageHeight );
-  EXPECT_FALSE( m_File.WriteFrame( 5, { Bytes( "ABCD" ), {} }, Turned ) );
-  VideoFrameInfo Colour = SmallVideo();
-  Colour.m_PixelFormat = IPixelFormat::ER8G8B8;
-  EXPECT_FALSE( m_File.WriteFrame( 5, { VBytes( 12 ), {} }, Colour ) );
+  VHeader Colour = m_File.m_Header;
+  Colour.m_Video.m_PixelFormat = IPixelFormat::ER8G8B8;
+  EXPECT_FALSE( Colour.WriteFrame( m_File.m_Writer, VBytes( 12 ), {}, 5 ) );
   EXPECT_EQ( m_Log.Texts().back(), "Encoding to 'Uncompressed' failed." );
   EXPECT_EQ( m_File.m_pBytes->size(), Before );
   EXPECT_TRUE( m_File.WriteFrame( 5, { Bytes( "ABCD" ), {} } ) );
@@ -139,63 +137,41 @@ TEST_F( TarvoWriter, OnlyAValidTimecodeIsStored )
   EXPECT_TRUE( m_Log.Texts().empty() );
 }
 
-TEST_F( TarvoWriter, OperationsOutOfOrderAreRefused )
+TEST_F( TarvoWriter, AHeaderThatCannotBeEncodedSpoilsTheFile )
 {
   VWriter& rWriter = m_File.m_Writer;
-  const auto WriteHeader = [&]( const AudioFrameInfo& i_rAudio, IVideoPayload::Enum i_Payload )
-  { return rWriter.WriteHeader( SmallVideo(), i_rAudio, {}, {}, {}, {}, i_Payload, IAudioPayload::EUncompressed ); };
-  EXPECT_FALSE( rWriter.Close() );
-  EXPECT_FALSE( m_File.WriteFrame( 0, { Bytes( "ABCD" ), {} } ) );
-  EXPECT_FALSE( WriteHeader( SmallAudio, IVideoPayload::EUncompressed ) );
   ASSERT_TRUE( rWriter.Open( "memory" ) );
-  EXPECT_FALSE( rWriter.Open( "memory" ) );
-  EXPECT_FALSE( WriteHeader( SmallAudio, IVideoPayload::EImageJPEG ) );
-  EXPECT_FALSE( m_File.WriteFrame( 0, { Bytes( "ABCD" ), {} } ) );
-  EXPECT_FALSE( WriteHeader( { IAudioSampleFormat::EInt16, 48000, 0 }, IVideoPayload::EUncompressed ) );
-  EXPECT_FALSE( WriteHeader( SmallAudio, IVideoPayload::EUncompressed ) );
+  EXPECT_FALSE( rWriter.WriteHeader( VideoInfo(), { IAudioSampleFormat::EInt16, 48000, 0 }, {}, {}, {}, {}, IVideoPayload::EUncompressed,
+    IAudioPayload::EUncompressed ) );
+  EXPECT_FALSE( m_File.m_Header.WriteTo( rWriter ) );
   EXPECT_FALSE( rWriter.Close() );
-  EXPECT_FALSE( rWriter.IsOpen() );
-  EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "WriteHeader must be called before WriteFrame is called.",
-      "File must be opened for write access before WriteHeader is called.", "File already open.",
-      "Video payload format 'ImageJPEG' is not supported.", "WriteHeader must be called before WriteFrame is called.",
-      "Could not encode internal attributes.", "WriteHeader must be called once only." } ) );
-}
-
-TEST_F( TarvoWriter, WithoutAStreamOpenFails )
-{
-  VWriter Writer( {}, []( const std::string& ) { return nullptr; } );
-  EXPECT_FALSE( Writer.Open( "memory" ) );
-  EXPECT_FALSE( Writer.IsOpen() );
-  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "File could not be opened." } );
-  VWriter OnDisk;
-  EXPECT_FALSE( OnDisk.Open( "/no such folder/file.tvid" ) );
+  EXPECT_EQ( m_Log.Texts(), ( std::vector<std::string>{ "Could not encode internal attributes.", "WriteHeader must be called once only." } ) );
 }
 
 TEST( TarvoWriterOfLargeFiles, PositionsBeyond4GiBAreIndexed )
 {
   constexpr uint32_t Side = 32768;
   constexpr uint64_t FrameBytes = uint64_t{ Side } * Side;   // 1 GiB
-  VideoFrameInfo Info = SmallVideo();
-  Info.m_ImageWidth = Side;
-  Info.m_ImageHeight = Side;
-  TestSupport::VSparseFile::VPieces Pieces;
-  VWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<TestSupport::VSparseFile>( Pieces ); } );
+  VHeader Header;
+  Header.m_Video = VideoInfo( IPixelFormat::ELuminance8, Side, Side );
+  Header.m_Audio = {};
+  VSparseFile::VPieces Pieces;
+  VWriter Writer( {}, [&]( const std::string& ) { return std::make_unique<VSparseFile>( Pieces ); } );
   ASSERT_TRUE( Writer.Open( "sparse" ) );
-  ASSERT_TRUE( Writer.WriteHeader( Info, {}, {}, {}, {}, {}, IVideoPayload::EUncompressed, IAudioPayload::ENone ) );
+  ASSERT_TRUE( Header.WriteTo( Writer ) );
   const VBufferList Rows( Side, Buffer( VBytes( Side ) ) );
   for( uint64_t Key = 0; Key < 5; ++Key )
   {
     VBufferList Video = Rows;
     VBufferList Audio;
-    ASSERT_TRUE( Writer.WriteFrame( Video, Info, Audio, {}, Key ) );
+    ASSERT_TRUE( Writer.WriteFrame( Video, Header.m_Video, Audio, {}, Key ) );
   }
   ASSERT_TRUE( Writer.Close() );
 
   uint64_t IndexPosition = 0;
   std::memcpy( &IndexPosition, Pieces.at( 40 ).data(), sizeof( IndexPosition ) );
-  EXPECT_EQ( Pieces.at( IndexPosition ), VBuilder().U64( 5 ).m_Bytes );
-  VBuilder Entries;
+  EXPECT_EQ( Pieces.at( IndexPosition ), VLittleEndian().U64( 5 ).m_Bytes );
+  VLittleEndian Entries;
   for( uint64_t Key = 0; Key < 5; ++Key )
   {
     Entries.U64( Key ).U64( IndexPosition - ( 5 - Key ) * FrameBytes );

@@ -56,11 +56,7 @@ void PrintTo( const VWriterRow& i_rRow, std::ostream* o_pText ) { *o_pText << i_
 VHeaderArguments::VHeaderArguments( const VWriterRow& i_rRow )
   : m_VideoPayload( i_rRow.m_Payload ), m_AudioPayload( i_rRow.m_bAudio ? KVZ::IAudioPayload::EUncompressed : KVZ::IAudioPayload::ENone )
 {
-  m_Video.m_ImageWidth = 48;
-  m_Video.m_ImageHeight = 4;
-  m_Video.m_PixelFormat = i_rRow.m_PixelFormat;
-  m_Video.m_PixelAspectRatio = 1.0;
-  m_Video.m_InterlacedFormat = KVZ::IInterlacedFormat::ENotInterlaced;
+  m_Video = VideoInfo( i_rRow.m_PixelFormat, 48, 4 );
   if( i_rRow.m_bAudio )
   {
     m_Audio = { KVZ::IAudioSampleFormat::EInt16, 48000, 2 };
@@ -69,18 +65,18 @@ VHeaderArguments::VHeaderArguments( const VWriterRow& i_rRow )
 
 bool VHeaderArguments::WriteTo( KVZ::IVideoWriter& io_rWriter ) const
 {
-  return io_rWriter.WriteHeader( m_Video, m_Audio, { 135000000, 5400000, 0 }, { KVZ::ITimecodeStandard::ETimecode25, 1, 2, 3, 4 }, {}, {},
-    m_VideoPayload, m_AudioPayload );
+  return io_rWriter.WriteHeader( m_Video, m_Audio, Rate25, { KVZ::ITimecodeStandard::ETimecode25, 1, 2, 3, 4 }, {}, {}, m_VideoPayload,
+    m_AudioPayload );
 }
 
-VContractWriter::VContractWriter( const VWriterRow& i_rRow, const TestSupport::VFault& i_rFault )
+VContractWriter::VContractWriter( const VWriterRow& i_rRow, const VFault& i_rFault )
   : m_Header( i_rRow ),
     m_pWriter( i_rRow.m_Make( MakeEncoder(),
       [this, i_rFault]( const std::string& i_rPath )
       {
         auto& rpBytes = m_Files[i_rPath];
         rpBytes = std::make_shared<VBytes>();
-        return std::make_unique<TestSupport::VFailingStream>( std::make_unique<TestSupport::VMemoryFile>( rpBytes ), i_rFault, &m_Operations );
+        return std::make_unique<VFailingStream>( std::make_unique<VMemoryFile>( rpBytes ), i_rFault, &m_Operations );
       } ) )
 {
 }
@@ -123,13 +119,6 @@ bool VContractWriter::Holds( const VBytes& i_rBytes ) const
       const VBytes& rFile = *i_rFile.second;
       return std::search( rFile.begin(), rFile.end(), i_rBytes.begin(), i_rBytes.end() ) != rFile.end();
     } );
-}
-
-std::shared_ptr<const KVZ::IBufferConst> Buffer( const VBytes& i_rBytes )
-{
-  auto pBuffer = std::make_shared<KVZ::IStandardBuffer>( i_rBytes.size() );
-  std::copy( i_rBytes.begin(), i_rBytes.end(), pBuffer->Data() );
-  return pBuffer;
 }
 
 INSTANTIATE_TEST_SUITE_P( All, WriterContract, testing::ValuesIn( Writers ), testing::PrintToStringParamName() );

@@ -2,12 +2,9 @@
 #pragma once
 
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "FileIO/WriterSupport/WatchedStream.h"
-#include "tests/support/FailingStream.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SmallRecording.h"
 #include "tests/support/TemporaryFolder.h"
-
-#include "Core/VideoInterface/VideoWriter.h"
 
 #include <gtest/gtest.h>
 
@@ -19,9 +16,7 @@
 namespace WriterContract
 {
 
-using VBytes = std::vector<uint8_t>;
-
-constexpr uint64_t AppendKey = ~uint64_t{ 0 };
+using namespace TestSupport;
 
 enum class EKeys
 {
@@ -68,7 +63,7 @@ struct VHeaderArguments
 class VContractWriter
 {
 public:
-  explicit VContractWriter( const VWriterRow& i_rRow, const TestSupport::VFault& i_rFault = {} );
+  explicit VContractWriter( const VWriterRow& i_rRow, const VFault& i_rFault = {} );
 
   KVZ::IVideoWriter& Writer() { return *m_pWriter; }
   const std::map<std::string, std::shared_ptr<VBytes>>& Files() const { return m_Files; }
@@ -89,19 +84,17 @@ public:
 
 private:
   const char* const m_pFileName = "movie%FRAME%";
-  const TestSupport::VTemporaryFolder m_Folder;
+  const VTemporaryFolder m_Folder;
   const VHeaderArguments m_Header;
   std::map<std::string, std::shared_ptr<VBytes>> m_Files;
   uint64_t m_Operations = 0;
   std::shared_ptr<KVZ::IVideoWriter> m_pWriter;
 };
 
-std::shared_ptr<const KVZ::IBufferConst> Buffer( const VBytes& i_rBytes );
-
 class WriterContract : public testing::TestWithParam<VWriterRow>
 {
 protected:
-  const TestSupport::VLogCapture m_Log{ GetParam().m_pCategory };
+  const VLogCapture m_Log{ GetParam().m_pCategory };
 };
 
 }
