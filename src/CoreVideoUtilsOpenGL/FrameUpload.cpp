@@ -4,6 +4,7 @@
 #include "CoreVideoUtils/PixelRows.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <cstring>
 
 #ifndef GL_RGBA16
@@ -48,7 +49,7 @@ constexpr std::array Formats = {
 };
 static_assert( Formats.size() == KVZ::PixelFormatCount - 1 );
 
-// Formats of texels. The internal format of OpenGL ES 2.0 is the format itself.
+// Formats of texels. The internal format of OpenGL ES is the format itself, but for 16 bits.
 struct VTexels
 {
   GLint m_InternalFormat;
@@ -93,24 +94,46 @@ const uint8_t* SpreadColour( const VPreparation& i_rFrame )
   return pTarget;
 }
 
-// Rows of an odd width end with half a texel: its second luma is never seen, its V is that of the pair before it.
-const uint8_t* CompletePairs( const VPreparation& i_rFrame )
+// What a code of eight bits becomes in a texel, with 128 of a colour difference at one half where there are 16. Of its 0, which is no picture's,
+// half a code is cut off there.
+template<class TComponent>
+TComponent LumaOf( uint8_t i_Code )
 {
-  if( i_rFrame.Width() % 2 == 0 )
+  return static_cast<TComponent>( sizeof( TComponent ) == 1 ? i_Code : 257 * i_Code );
+}
+
+template<class TComponent>
+TComponent ChromaOf( uint8_t i_Code )
+{
+  return static_cast<TComponent>( sizeof( TComponent ) == 1 ? i_Code : std::max( 257 * i_Code, 128 ) - 128 );
+}
+
+// Rows of an odd width end with half a texel: its second luma is never seen, its V is that of the pair before it.
+template<class TComponent>
+const uint8_t* SpreadPairs( const VPreparation& i_rFrame )
+{
+  if( sizeof( TComponent ) == 1 && i_rFrame.Width() % 2 == 0 )
   {
     return i_rFrame.m_pSource;
   }
-  const size_t V = i_rFrame.m_rInfo.m_PixelFormat == IPixelFormat::EU8Y8V8Y8 ? 2 : 3;
-  const size_t SourceBytes = 2 * i_rFrame.Width();
-  const size_t TargetBytes = 4 * i_rFrame.Pairs();
-  uint8_t* const pImage = i_rFrame.Scratch( TargetBytes * i_rFrame.Height() );
+  const size_t Luma = i_rFrame.m_rInfo.m_PixelFormat == IPixelFormat::EU8Y8V8Y8 ? 1 : 0;
+  const size_t Chroma = 1 - Luma;
+  uint8_t* const pImage = i_rFrame.Scratch( 4 * sizeof( TComponent ) * i_rFrame.Pairs() * i_rFrame.Height() );
   for( size_t Row = 0; Row < i_rFrame.Height(); ++Row )
   {
-    uint8_t* const pTarget = pImage + Row * TargetBytes;
-    std::memcpy( pTarget, i_rFrame.m_pSource + Row * SourceBytes, SourceBytes );
-    uint8_t* const pLast = pTarget + TargetBytes - 4;
-    pLast[5 - V] = 0;
-    pLast[V] = i_rFrame.Pairs() > 1 ? pLast[V - 4] : 128;
+    const uint8_t* const pSource = i_rFrame.m_pSource + Row * 2 * i_rFrame.Width();
+    TComponent* const pTarget = reinterpret_cast<TComponent*>( pImage ) + 4 * Row * i_rFrame.Pairs();
+    for( size_t Pixel = 0; Pixel < i_rFrame.Width(); ++Pixel )
+    {
+      pTarget[2 * Pixel + Luma] = LumaOf<TComponent>( pSource[2 * Pixel + Luma] );
+      pTarget[2 * Pixel + Chroma] = ChromaOf<TComponent>( pSource[2 * Pixel + Chroma] );
+    }
+    if( i_rFrame.Width() % 2 != 0 )
+    {
+      TComponent* const pLast = pTarget + 2 * i_rFrame.Width();
+      pLast[Luma] = 0;
+      pLast[Chroma] = i_rFrame.Width() > 1 ? pLast[static_cast<std::ptrdiff_t>( Chroma ) - 4] : ChromaOf<TComponent>( 128 );
+    }
   }
   return pImage;
 }
@@ -169,7 +192,7 @@ const uint8_t* SpreadTenBits( const VPreparation& i_rFrame )
   return pImage;
 }
 
-VTexels TexelsOf( IPixelFormat::Enum i_Format, EProgram i_Program, bool i_bOpenGLES )
+VTexels TexelsOf( IPixelFormat::Enum i_Format, EProgram i_Program, const VTextureKinds& i_rKinds )
 {
   if( i_Program == EProgram::Bayer || i_Program == EProgram::Luminance )
   {
@@ -177,12 +200,12 @@ VTexels TexelsOf( IPixelFormat::Enum i_Format, EProgram i_Program, bool i_bOpenG
   }
   if( i_Program == EProgram::YUV )
   {
-    return i_Format == IPixelFormat::EU10Y10V10Y10 && !i_bOpenGLES ? FourWords : FourBytes;
+    return i_rKinds.m_b16Bits ? FourWords : FourBytes;
   }
   return i_Format == IPixelFormat::ER8G8B8u8 || i_Format == IPixelFormat::EB8G8R8u8 ? FourBytes : ThreeBytes;
 }
 
-const uint8_t* PixelsOf( const VPreparation& i_rFrame, bool i_bOpenGLES )
+const uint8_t* PixelsOf( const VPreparation& i_rFrame, bool i_b16Bits )
 {
   switch( i_rFrame.m_rInfo.m_PixelFormat )
   {
@@ -192,8 +215,8 @@ const uint8_t* PixelsOf( const VPreparation& i_rFrame, bool i_bOpenGLES )
     case IPixelFormat::EBayerGB6:
     case IPixelFormat::ELuminance6: return SpreadBits( i_rFrame, 6 );
     case IPixelFormat::EU8Y8V8Y8:
-    case IPixelFormat::EY8U8Y8V8: return CompletePairs( i_rFrame );
-    case IPixelFormat::EU10Y10V10Y10: return i_bOpenGLES ? SpreadTenBits<uint8_t>( i_rFrame ) : SpreadTenBits<uint16_t>( i_rFrame );
+    case IPixelFormat::EY8U8Y8V8: return i_b16Bits ? SpreadPairs<uint16_t>( i_rFrame ) : SpreadPairs<uint8_t>( i_rFrame );
+    case IPixelFormat::EU10Y10V10Y10: return i_b16Bits ? SpreadTenBits<uint16_t>( i_rFrame ) : SpreadTenBits<uint8_t>( i_rFrame );
     default: return i_rFrame.m_pSource;
   }
 }
@@ -207,17 +230,19 @@ const VSourceFormat* FindSourceFormat( IPixelFormat::Enum i_Format )
   return pFound != Formats.end() ? pFound : nullptr;
 }
 
-VUpload PrepareUpload( const KVZ::VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, bool i_bOpenGLES, std::vector<uint8_t>& io_rScratch )
+VUpload PrepareUpload( const KVZ::VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, const VTextureKinds& i_rKinds,
+  std::vector<uint8_t>& io_rScratch )
 {
   const VPreparation Frame = { i_rInfo, i_pSource, io_rScratch };
   const EProgram Program = FindSourceFormat( i_rInfo.m_PixelFormat )->m_Program;
-  const VTexels Texels = TexelsOf( i_rInfo.m_PixelFormat, Program, i_bOpenGLES );
+  const VTexels Texels = TexelsOf( i_rInfo.m_PixelFormat, Program, i_rKinds );
   const size_t Columns = Program == EProgram::YUV ? Frame.Pairs() : Frame.Width();
   const size_t Pixels = Program == EProgram::YUV ? 2 * Columns : Columns;
   VUpload Upload;
   Upload.m_Layout = { static_cast<GLsizei>( Columns ), static_cast<GLsizei>( Frame.Height() ),
-    i_bOpenGLES ? static_cast<GLint>( Texels.m_Format ) : Texels.m_InternalFormat, Texels.m_Format, Texels.m_Type };
-  Upload.m_pPixels = PixelsOf( Frame, i_bOpenGLES );
+    i_rKinds.m_bSized || Texels.m_Type == GL_UNSIGNED_SHORT ? Texels.m_InternalFormat : static_cast<GLint>( Texels.m_Format ), Texels.m_Format,
+    Texels.m_Type };
+  Upload.m_pPixels = PixelsOf( Frame, i_rKinds.m_b16Bits );
   Upload.m_Resolution = { static_cast<float>( Pixels ), static_cast<float>( Frame.Height() ) };
   Upload.m_Scale = { static_cast<float>( Frame.Width() ) / static_cast<float>( Pixels ), 1.0f };
   return Upload;

@@ -1,7 +1,8 @@
 // How a frame of each pixel format reaches the texture, and which program draws it.
 //
-// 8-bit formats go as they are. Packed ones of 7, 6 and 5 bits are spread to bytes first, as the software converter does, and ten bits to 16:
-// code 4n stands where code n of eight bits does, and the middle of a colour difference, 512, at exactly one half.
+// 8-bit formats go as they are, but for 4:2:2. Packed ones of 7, 6 and 5 bits are spread to bytes first, as the software converter does, and those
+// with colour differences, of eight and ten bits, to 16: code 4n of ten bits stands where code n of eight does, and the middle of a colour
+// difference, 128 or 512, at one half, where the shader looks for it.
 #pragma once
 
 #include "Core/VideoInterface/FrameRecords.h"
@@ -44,7 +45,16 @@ struct VUpload
   std::array<float, 2> m_Scale = {};        // the part of them that is the image
 };
 
-// i_pSource holds the whole image; its width and height are not 0. Textures of OpenGL ES 2.0 have no more than eight bits.
-VUpload PrepareUpload( const KVZ::VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, bool i_bOpenGLES, std::vector<uint8_t>& io_rScratch );
+// What textures can be here. Those of OpenGL ES have no more than eight bits without an extension: ten are cut to eight then, and 128 lies at
+// 128 / 255.
+struct VTextureKinds
+{
+  bool m_bSized = true;   // internal formats tell the bits
+  bool m_b16Bits = true;
+};
+
+// i_pSource holds the whole image; its width and height are not 0.
+VUpload PrepareUpload( const KVZ::VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, const VTextureKinds& i_rKinds,
+  std::vector<uint8_t>& io_rScratch );
 
 }

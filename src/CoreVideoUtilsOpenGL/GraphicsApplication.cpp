@@ -1,5 +1,6 @@
 #include "CoreVideoUtilsOpenGL/GraphicsApplication.h"
 
+#include "CoreVideoUtilsOpenGL/Surfaceless.h"
 #include "StageCoreRuntime/GlobalLog.h"
 
 #include <QtGui/QGuiApplication>
@@ -27,19 +28,43 @@ bool IsOffscreen() { return HasGraphics() && QGuiApplication::platformName() == 
 class VGraphicsApplication::VOwn
 {
 public:
-  VOwn() : m_pFormerHandler( qInstallMessageHandler( &LogQtMessage ) ), m_Application( m_Count, m_Arguments.data() ) {}
-  ~VOwn() { qInstallMessageHandler( m_pFormerHandler ); }
+  VOwn() : m_pFormerHandler( qInstallMessageHandler( &LogQtMessage ) )
+  {
+    if( !m_Display.WhyUnusable().empty() )
+    {
+      const VSurfacelessEnvironment Environment;
+      if( VSurfacelessEnvironment::HasContext() )
+      {
+        Begin( "eglfs" );
+        return;
+      }
+    }
+    Begin( "offscreen" );
+  }
+  ~VOwn()
+  {
+    m_pApplication.reset();
+    qInstallMessageHandler( m_pFormerHandler );
+  }
 
 private:
+  void Begin( const char* i_pPlatform )
+  {
+    m_Platform = i_pPlatform;
+    m_Arguments[2] = m_Platform.data();
+    m_pApplication = std::make_unique<QGuiApplication>( m_Count, m_Arguments.data() );
+  }
+
   const VXErrorsLogged m_XErrorsLogged;
   const QtMessageHandler m_pFormerHandler;
+  const VXDisplay m_Display;
   // Qt keeps references to its arguments.
   std::string m_Name = "StageCorePluginVideoInput";
   std::string m_Option = "-platform";
-  std::string m_Platform = "offscreen";
-  std::array<char*, 4> m_Arguments = { m_Name.data(), m_Option.data(), m_Platform.data(), nullptr };
+  std::string m_Platform;
+  std::array<char*, 4> m_Arguments = { m_Name.data(), m_Option.data(), nullptr, nullptr };
   int m_Count = 3;
-  QGuiApplication m_Application;
+  std::unique_ptr<QGuiApplication> m_pApplication;
 };
 
 VGraphicsApplication::VGraphicsApplication() : m_pOwn( QCoreApplication::instance() ? nullptr : std::make_unique<VOwn>() ) {}

@@ -9,8 +9,9 @@
 namespace CoreVideoUtilsOpenGL
 {
 
-// One of our own where the process has none, of the platform "offscreen": it opens no window and needs no window manager. Made and destroyed on
-// the thread that makes contexts. While it is there, Qt's messages go to the log, and what the X server refuses ends no program.
+// One of our own where the process has none. Its platform is "offscreen", which opens no window and needs no window manager but an X display, or,
+// without one, "eglfs" led to EGL's platform without displays. Made and destroyed on the thread that makes contexts. While it is there, Qt's messages
+// go to the log, and what the X server refuses ends no program.
 class VGraphicsApplication
 {
 public:

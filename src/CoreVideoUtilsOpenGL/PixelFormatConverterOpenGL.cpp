@@ -47,7 +47,7 @@ bool VPixelFormatConverterOpenGL::Convert( const KVZ::VideoFrameInfo& i_rSourceI
     return ConvertInSoftware( Frame );
   }
   const EResult Result = Draw( Frame );
-  const bool bInstead = Result == EResult::NoOpenGL || ( Result == EResult::Refused && m_Settings.m_Use == EUse::LensAlone );
+  const bool bInstead = Result == EResult::NoOpenGL || ( Result != EResult::Done && m_Settings.m_Use == EUse::LensAlone );
   return bInstead ? ConvertInSoftware( Frame ) : Result == EResult::Done;
 }
 
@@ -88,7 +88,12 @@ void VPixelFormatConverterOpenGL::DrawOnThread( const VFrame& i_rFrame, EResult&
     m_bUnusable = true;
     return;
   }
-  o_rResult = m_pImpl->Convert( i_rFrame ) ? EResult::Done : EResult::Refused;
+  o_rResult = m_pImpl->Convert( i_rFrame );
+  if( o_rResult == EResult::Lost )
+  {
+    KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "The OpenGL context is lost with a frame to convert. The next frame gets a new one." );
+    m_pImpl.reset();
+  }
 }
 
 bool VPixelFormatConverterOpenGL::ConvertInSoftware( const VFrame& i_rFrame )

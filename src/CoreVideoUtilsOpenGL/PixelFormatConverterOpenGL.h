@@ -25,7 +25,7 @@ class VGraphicsThreadUse;
 // software converter does.
 enum class EUse
 {
-  Always,     // every conversion; one that OpenGL cannot do fails
+  Always,     // every conversion; one that OpenGL cannot do fails, as does one that finds its context lost: the next one makes a new context
   LensAlone   // what has a lens to correct, where OpenGL can; all else is done in software, which is faster with its way to memory and back
 };
 

@@ -11,6 +11,9 @@
 #ifndef GL_BGRA
 #define GL_BGRA 0x80E1
 #endif
+#ifndef GL_CONTEXT_LOST
+#define GL_CONTEXT_LOST 0x0507
+#endif
 
 namespace CoreVideoUtilsOpenGL
 {
@@ -22,16 +25,31 @@ using KVZ::IPixelFormat;
 
 constexpr std::array<const char*, ProgramCount> FragmentFiles = { "VideoRaw.glsl", "VideoBayer.glsl", "VideoLuminance.glsl", "VideoYUV.glsl" };
 
-// The largest that OpenGL 2.1 and OpenGL ES 2.0 need, with nothing that a frame has no use for.
-QSurfaceFormat MakeFormat()
+// With nothing that a frame has no use for.
+QSurfaceFormat MakeFormat( QSurfaceFormat::RenderableType i_Type )
 {
   QSurfaceFormat Format = QSurfaceFormat::defaultFormat();
-  Format.setVersion( 2, Format.renderableType() == QSurfaceFormat::OpenGLES ? 0 : 1 );
+  Format.setRenderableType( i_Type );
+  Format.setVersion( 2, i_Type == QSurfaceFormat::OpenGLES ? 0 : 1 );
   Format.setProfile( QSurfaceFormat::NoProfile );
   Format.setDepthBufferSize( 0 );
   Format.setStencilBufferSize( 0 );
   Format.setSamples( 0 );
   return Format;
+}
+
+// As the process's default has it, or else OpenGL ES: some of Qt's platforms have nothing else.
+bool Create( QOpenGLContext& io_rContext )
+{
+  for( const QSurfaceFormat::RenderableType Type : { QSurfaceFormat::defaultFormat().renderableType(), QSurfaceFormat::OpenGLES } )
+  {
+    io_rContext.setFormat( MakeFormat( Type ) );
+    if( io_rContext.create() )
+    {
+      return true;
+    }
+  }
+  return false;
 }
 
 std::array<float, 2> ToFloats( const std::array<double, 2>& i_rValues )
@@ -93,8 +111,7 @@ std::string VPixelFormatConverterOpenGL::VImpl::MakeContext()
   {
     return m_Check.WhyUnusable();
   }
-  m_Context.setFormat( MakeFormat() );
-  if( !m_Context.create() )
+  if( !Create( m_Context ) )
   {
     return "no OpenGL context can be made";
   }
@@ -110,6 +127,7 @@ std::string VPixelFormatConverterOpenGL::VImpl::MakeContext()
   }
   m_pFunctions = m_Context.functions();
   m_pPixelTransfer = reinterpret_cast<void ( * )( GLenum, GLfloat )>( m_Context.getProcAddress( "glPixelTransferf" ) );
+  m_TextureKinds = { !m_Context.isOpenGLES(), !m_Context.isOpenGLES() || m_Context.hasExtension( "GL_EXT_texture_norm16" ) };
   m_pFunctions->glGetIntegerv( GL_MAX_TEXTURE_SIZE, &m_LargestImage );
   m_pFunctions->glDisable( GL_DITHER );
   KVZ_LOG_INFORMATION( "CoreVideoUtilsOpenGL", "OpenGL %1% of \"%2%\"", reinterpret_cast<const char*>( m_pFunctions->glGetString( GL_VERSION ) ),
@@ -117,37 +135,47 @@ std::string VPixelFormatConverterOpenGL::VImpl::MakeContext()
   return {};
 }
 
-bool VPixelFormatConverterOpenGL::VImpl::Convert( const VFrame& i_rFrame )
+VPixelFormatConverterOpenGL::EResult VPixelFormatConverterOpenGL::VImpl::Convert( const VFrame& i_rFrame )
 {
-  const VSourceFormat* const pSource = FindSourceFormat( i_rFrame.m_Source.m_PixelFormat );
   KVZ_ASSERT( boost::this_thread::get_id() == m_Thread );
-  if( !pSource || !m_Context.makeCurrent( &m_Surface ) || !SetUpOutput( i_rFrame ) )
+  const VSourceFormat* const pSource = FindSourceFormat( i_rFrame.m_Source.m_PixelFormat );
+  if( !pSource )
   {
-    return false;
+    return EResult::Refused;
   }
-  CoreGraphics::VShaderProgram& rProgram = Program( pSource->m_Program );
-  if( !rProgram.IsValid() )
+  if( !m_Context.makeCurrent( &m_Surface ) )
   {
-    return false;
+    return EResult::Lost;
   }
-  const VUpload Upload = PrepareUpload( m_Input, i_rFrame.m_pSource, m_Context.isOpenGLES(), m_Scratch );
+  if( !SetUpOutput( i_rFrame ) || !Program( pSource->m_Program ).IsValid() )
+  {
+    return EResult::Refused;
+  }
+  DrawFrame( i_rFrame, *pSource );
+  ReadBack( i_rFrame.m_pTarget );
+  Report( EStep::ReadBack );
+  const GLenum Error = m_pFunctions->glGetError();
+  if( Error == GL_NO_ERROR )
+  {
+    return EResult::Done;
+  }
+  KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "OpenGL error %1% while a frame was converted", Error );
+  return Error == GL_CONTEXT_LOST ? EResult::Lost : EResult::Refused;
+}
+
+void VPixelFormatConverterOpenGL::VImpl::DrawFrame( const VFrame& i_rFrame, const VSourceFormat& i_rSource )
+{
+  const VUpload Upload = PrepareUpload( m_Input, i_rFrame.m_pSource, m_TextureKinds, m_Scratch );
   Report( EStep::Prepared );
   m_pTexture->Update( Upload.m_Layout, Upload.m_pPixels );
   // Shaders that take a texel's components apart look at the middle of one.
-  m_pTexture->SetSmooth( !i_rFrame.m_Lens.IsOff() && ( pSource->m_Program == EProgram::Raw || pSource->m_Program == EProgram::Luminance ) );
+  m_pTexture->SetSmooth( !i_rFrame.m_Lens.IsOff() && ( i_rSource.m_Program == EProgram::Raw || i_rSource.m_Program == EProgram::Luminance ) );
   Report( EStep::Uploaded );
+  CoreGraphics::VShaderProgram& rProgram = Program( i_rSource.m_Program );
   rProgram.Use();
   SetUniforms( rProgram, i_rFrame, Upload );
   DrawMesh( i_rFrame.m_Lens );
   Report( EStep::Drawn );
-  ReadBack( i_rFrame.m_pTarget );
-  Report( EStep::ReadBack );
-  const GLenum Error = m_pFunctions->glGetError();
-  if( Error != GL_NO_ERROR )
-  {
-    KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "OpenGL error %1% while a frame was converted", Error );
-  }
-  return Error == GL_NO_ERROR;
 }
 
 bool VPixelFormatConverterOpenGL::VImpl::SetUpOutput( const VFrame& i_rFrame )

@@ -41,6 +41,7 @@ enum class VPixelFormatConverterOpenGL::EResult
 {
   Done,
   Refused,
+  Lost,   // and so is this context for good
   NoOpenGL
 };
 
@@ -52,8 +53,8 @@ public:
 
   // Why there is no context; empty where there is one.
   const std::string& WhyUnusable() const { return m_WhyUnusable; }
-  // False for formats that are not supported, for images larger than textures can be, and where OpenGL fails.
-  bool Convert( const VFrame& i_rFrame );
+  // Refuses formats that are not supported, images larger than textures can be, and where OpenGL fails.
+  EResult Convert( const VFrame& i_rFrame );
 
 private:
   struct VOutput
@@ -66,6 +67,7 @@ private:
   std::string MakeContext();
   bool SetUpOutput( const VFrame& i_rFrame );
   CoreGraphics::VShaderProgram& Program( EProgram i_Program );
+  void DrawFrame( const VFrame& i_rFrame, const VSourceFormat& i_rSource );
   void SetUniforms( CoreGraphics::VShaderProgram& i_rProgram, const VFrame& i_rFrame, const VUpload& i_rUpload ) const;
   void DrawMesh( const VLens& i_rLens );
   void ReadBack( uint8_t* o_pTarget );
@@ -81,6 +83,7 @@ private:
   QOpenGLFunctions* m_pFunctions = nullptr;
   void ( *m_pPixelTransfer )( GLenum, GLfloat ) = nullptr;   // OpenGL ES has none
   GLint m_LargestImage = 0;
+  VTextureKinds m_TextureKinds;
 
   // Gone before the context
   std::unique_ptr<QOpenGLFramebufferObject> m_pFramebuffer;

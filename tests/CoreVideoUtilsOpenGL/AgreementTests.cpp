@@ -1,4 +1,5 @@
 // What the graphics card makes of a frame is what the processor makes of it.
+#include "CoreVideoUtilsOpenGL/FrameUpload.h"
 #include "tests/CoreVideoUtilsOpenGL/Images.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
@@ -21,17 +22,13 @@ namespace
 
 constexpr std::array Colours = { IPixelFormat::ER8G8B8, IPixelFormat::EB8G8R8, IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8 };
 
-// The shader takes 0.5 for the middle of a colour difference of eight bits, where the integers take 128 / 255: 0.5 levels times 1.77 in blue, and
-// the one rounds where the other cuts off.
-int ToleranceOf( IPixelFormat::Enum i_Source ) { return i_Source == IPixelFormat::EU8Y8V8Y8 || i_Source == IPixelFormat::EY8U8Y8V8 ? 2 : 1; }
-
 void ExpectAgreement( VPixelFormatConverterOpenGL& i_rConverter, const VImage& i_rImage )
 {
   for( const IPixelFormat::Enum Target : Colours )
   {
     EXPECT_LE(
       LargestDifference( InSoftware( i_rImage, Target ), Convert( i_rConverter, i_rImage, Target ).value_or( VBytes() ), HasFourthByte( Target ) ),
-      ToleranceOf( i_rImage.m_Info.m_PixelFormat ) )
+      1 )
       << KVZ::ToName( i_rImage.m_Info.m_PixelFormat ) << " to " << KVZ::ToName( Target ) << ", " << i_rImage.m_Info.m_ImageWidth << " by "
       << i_rImage.m_Info.m_ImageHeight;
   }
@@ -73,6 +70,41 @@ VImage AsBayer( const VImage& i_rPicture )
     Image.m_Bytes[Index] = i_rPicture.m_Bytes[3 * Index + Component];
   }
   return Image;
+}
+
+VBytes DrawnWithLens()
+{
+  VImage Ramp = MakeImage( IPixelFormat::ELuminance8, 1920, 24 );
+  for( size_t Index = 0; Index < Ramp.m_Bytes.size(); ++Index )
+  {
+    Ramp.m_Bytes[Index] = static_cast<uint8_t>( Index % 1920 / 8 );
+  }
+  KVZ::VLensDistortionRecord Lens;
+  Lens.m_RadialModel = KVZ::VLensDistortionRecord::ETarvo2Parameter;
+  Lens.m_Centre = { 960.0, 12.0 };
+  Lens.m_Parameters = { -2e-7, 0.0, 0.0 };
+  VPixelFormatConverterOpenGL Converter( {} );
+  Converter.SetLensCorrection( Lens );
+  Converter.SetLensCorrectionEnabled( true );
+  return Convert( Converter, Ramp, IPixelFormat::ER8G8B8 ).value_or( VBytes() );
+}
+
+// What OpenGL ES draws, of images as wide as video's, and where the lens moves them to.
+void ExpectAgreementOfOpenGLES( const VBytes& i_rWithLens )
+{
+  const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
+  VPixelFormatConverterOpenGL Converter( {} );
+  for( const IPixelFormat::Enum Source :
+    { IPixelFormat::EB8G8R8, IPixelFormat::EBayerGB7, IPixelFormat::ELuminance8, IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10 } )
+  {
+    ExpectAgreement( Converter, MakeNoise( Source, 1920, 16 ) );
+  }
+  const VImage Grey = MakeNoise( IPixelFormat::ELuminance8, 51, 20 );
+  EXPECT_EQ( Grey.m_Bytes, Convert( Converter, Grey, IPixelFormat::ELuminance8 ) );
+  EXPECT_LE( LargestDifference( i_rWithLens, DrawnWithLens() ), 2 );
+  const auto Texts = Log.Texts();
+  EXPECT_EQ( 2,
+    std::count_if( Texts.begin(), Texts.end(), []( const std::string& i_rText ) { return i_rText.compare( 0, 17, "OpenGL OpenGL ES " ) == 0; } ) );
 }
 
 }
@@ -190,7 +222,8 @@ TEST( OpenGLAgreement, KeepsTenBits )
 // A host has an application object of its own, with windows and on another thread, and wants OpenGL ES.
 TEST( OpenGLAgreement, HoldsForOpenGLESInAHostWithWindows )
 {
-  setenv( "QT_XCB_GL_INTEGRATION", "xcb_egl", 1 );
+  const VBytes WithLens = DrawnWithLens();
+  const VOtherVariable Integration( "QT_XCB_GL_INTEGRATION", "xcb_egl" );
   std::string Name = "host";
   std::string Option = "-platform";
   std::string Platform = "xcb";
@@ -202,24 +235,37 @@ TEST( OpenGLAgreement, HoldsForOpenGLESInAHostWithWindows )
   QSurfaceFormat::setDefaultFormat( Format );
   {
     const QGuiApplication Application( Count, Arguments.data() );
-    const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
-    VPixelFormatConverterOpenGL Converter( {} );
-    for( const IPixelFormat::Enum Source : { IPixelFormat::EB8G8R8, IPixelFormat::EBayerGB7, IPixelFormat::ELuminance8, IPixelFormat::EY8U8Y8V8 } )
-    {
-      ExpectAgreement( Converter, MakeNoise( Source, 132, 57 ) );
-    }
-    const VImage TenBits = MakeNoise( IPixelFormat::EU10Y10V10Y10, 132, 57 );   // cut to eight: its textures have no more
-    EXPECT_LE(
-      LargestDifference( InSoftware( TenBits, IPixelFormat::EB8G8R8 ), Convert( Converter, TenBits, IPixelFormat::EB8G8R8 ).value_or( VBytes() ) ),
-      2 );
-    const VImage Grey = MakeNoise( IPixelFormat::ELuminance8, 51, 20 );
-    EXPECT_EQ( Grey.m_Bytes, Convert( Converter, Grey, IPixelFormat::ELuminance8 ) );
-    const auto Texts = Log.Texts();
-    EXPECT_EQ( 1,
-      std::count_if( Texts.begin(), Texts.end(), []( const std::string& i_rText ) { return i_rText.compare( 0, 17, "OpenGL OpenGL ES " ) == 0; } ) );
+    ExpectAgreementOfOpenGLES( WithLens );
   }
   QSurfaceFormat::setDefaultFormat( Former );
-  unsetenv( "QT_XCB_GL_INTEGRATION" );
+}
+
+// The environment that makes it so is gone when it is drawn, and what the host has set is still there.
+TEST( OpenGLAgreement, HoldsWithoutADisplay )
+{
+  const VBytes WithLens = DrawnWithLens();
+  for( const char* pDisplay : { "", ":8765" } )
+  {
+    const VOtherVariable Display( "DISPLAY", pDisplay );
+    ExpectAgreementOfOpenGLES( WithLens );
+    EXPECT_EQ( nullptr, std::getenv( "EGL_PLATFORM" ) );
+    EXPECT_STREQ( pDisplay, std::getenv( "DISPLAY" ) );
+  }
+}
+
+// Eight bits a component are all that some have: the frame's own bytes, and ten bits cut to them.
+TEST( OpenGLAgreement, GivesTexturesOfEightBitsWhatTheyHold )
+{
+  const VImage Eight = MakeNoise( IPixelFormat::EY8U8Y8V8, 6, 1 );
+  std::vector<uint8_t> Scratch;
+  const CoreVideoUtilsOpenGL::VTextureKinds Kinds = { false, false };
+  const auto Upload = PrepareUpload( Eight.m_Info, Eight.m_Bytes.data(), Kinds, Scratch );
+  EXPECT_EQ( Eight.m_Bytes.data(), Upload.m_pPixels );
+  EXPECT_EQ( ( VideoGraphics::VTextureLayout{ 3, 1, GL_RGBA, GL_RGBA, GL_UNSIGNED_BYTE } ), Upload.m_Layout );
+  const VImage Ten = As( IPixelFormat::EU10Y10V10Y10, Eight );
+  const auto Cut = PrepareUpload( Ten.m_Info, Ten.m_Bytes.data(), Kinds, Scratch );
+  EXPECT_EQ( Upload.m_Layout, Cut.m_Layout );
+  EXPECT_LE( LargestDifference( Eight.m_Bytes, VBytes( Cut.m_pPixels, Cut.m_pPixels + 12 ) ), 3 );   // its way to ten bits took two from some
 }
 
 // Frames of several sizes and formats through one converter, from several threads at once: each gets its own back.

@@ -3,34 +3,21 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 
+#include <QtGui/QOffscreenSurface>
+#include <QtGui/QOpenGLContext>
+
 #include <boost/filesystem/operations.hpp>
 
 #include <algorithm>
-#include <cstdlib>
 #include <fstream>
 
 using namespace OpenGLTests;
+using CoreVideoUtilsOpenGL::EStep;
 
 namespace
 {
 
 constexpr char LensText[] = "Lens un-distortion not supported in software conversion.";
-
-// Another display, or none, while it lives.
-class VOtherDisplay
-{
-public:
-  explicit VOtherDisplay( const char* i_pDisplay ) : m_Former( std::getenv( "DISPLAY" ) ? std::getenv( "DISPLAY" ) : "" )
-  {
-    setenv( "DISPLAY", i_pDisplay, 1 );
-  }
-  ~VOtherDisplay() { setenv( "DISPLAY", m_Former.c_str(), 1 ); }
-  VOtherDisplay( const VOtherDisplay& ) = delete;
-  VOtherDisplay& operator=( const VOtherDisplay& ) = delete;
-
-private:
-  const std::string m_Former;
-};
 
 size_t CountBeginningWith( const TestSupport::VLogCapture& i_rLog, const std::string& i_rText )
 {
@@ -88,12 +75,13 @@ TEST( OpenGLFailure, LeavesOtherOutputsToSoftwareWhereItMay )
   EXPECT_EQ( 1u, Log.Count( LensText ) );
 }
 
-// Without a display, and with one that is not there: where Qt is asked for a context it ends the process.
+// Without a display, and with one that is not there: where Qt is asked for a context it ends the process. EGL is told to look for that display too.
 TEST( OpenGLFailure, ConvertsInSoftwareWithoutAContext )
 {
   for( const auto& [Use, pDisplay] : { std::pair{ EUse::Always, "" }, { EUse::LensAlone, "" }, { EUse::Always, ":8765" } } )
   {
-    const VOtherDisplay Other( pDisplay );
+    const VOtherVariable Display( "DISPLAY", pDisplay );
+    const VOtherVariable Platform( "EGL_PLATFORM", "x11" );
     const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
     VPixelFormatConverterOpenGL Converter( { Use } );
     Converter.SetColourCorrection( { 0.5f, 1.5f } );
@@ -106,6 +94,35 @@ TEST( OpenGLFailure, ConvertsInSoftwareWithoutAContext )
     }
     EXPECT_EQ( 1u, Log.Count( "OpenGL cannot be used: there is no X display. Pixel formats are converted in software." ) );
     EXPECT_EQ( 2u, Log.Count( LensText ) );
+  }
+}
+
+// The surface is taken from under a context with frames still to come: one fails, or is done in software, and the next has a new context.
+TEST( OpenGLFailure, GoesOnAfterAContextIsLost )
+{
+  const VImage Image = MakeNoise( IPixelFormat::EB8G8R8, 48, 16 );
+  for( const EUse Use : { EUse::Always, EUse::LensAlone } )
+  {
+    const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
+    bool bLose = true;
+    VPixelFormatConverterOpenGL Converter( { Use, ":",
+      [&]( EStep i_Step )
+      {
+        if( bLose && i_Step == EStep::ReadBack )
+        {
+          dynamic_cast<QOffscreenSurface&>( *QOpenGLContext::currentContext()->surface() ).destroy();
+        }
+      } } );
+    Converter.SetLensCorrection( SomeLens() );
+    Converter.SetLensCorrectionEnabled( true );
+    const std::optional<VBytes> Drawn = Convert( Converter, Image, IPixelFormat::ER8G8B8 );
+    ASSERT_TRUE( Drawn );
+    bLose = false;
+    const std::optional<VBytes> Instead = Use == EUse::Always ? std::nullopt : std::optional( InSoftware( Image, IPixelFormat::ER8G8B8 ) );
+    EXPECT_EQ( Instead, Convert( Converter, Image, IPixelFormat::ER8G8B8 ) );
+    EXPECT_EQ( 1u, Log.Count( "The OpenGL context is lost with a frame to convert. The next frame gets a new one." ) );
+    EXPECT_EQ( Use == EUse::Always ? 0u : 1u, Log.Count( LensText ) );
+    EXPECT_EQ( Drawn, Convert( Converter, Image, IPixelFormat::ER8G8B8 ) );
   }
 }
 

@@ -6,10 +6,12 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <optional>
 #include <random>
+#include <string>
 #include <vector>
 
 namespace OpenGLTests
@@ -19,6 +21,27 @@ using CoreVideoUtilsOpenGL::EUse;
 using CoreVideoUtilsOpenGL::VPixelFormatConverterOpenGL;
 using KVZ::IPixelFormat;
 using VBytes = std::vector<uint8_t>;
+
+// Another value of a variable while it lives.
+class VOtherVariable
+{
+public:
+  VOtherVariable( const char* i_pName, const char* i_pValue ) : m_pName( i_pName )
+  {
+    if( const char* const pFormer = std::getenv( i_pName ) )
+    {
+      m_Former = pFormer;
+    }
+    setenv( i_pName, i_pValue, 1 );
+  }
+  ~VOtherVariable() { m_Former ? setenv( m_pName, m_Former->c_str(), 1 ) : unsetenv( m_pName ); }
+  VOtherVariable( const VOtherVariable& ) = delete;
+  VOtherVariable& operator=( const VOtherVariable& ) = delete;
+
+private:
+  const char* const m_pName;
+  std::optional<std::string> m_Former;
+};
 
 struct VImage
 {
@@ -48,6 +71,10 @@ inline VImage MakeNoise( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t
   for( uint8_t& rByte : Image.m_Bytes )
   {
     rByte = static_cast<uint8_t>( Random() >> 8 );
+  }
+  if( i_Format == IPixelFormat::EU8Y8V8Y8 || i_Format == IPixelFormat::EY8U8Y8V8 )
+  {
+    std::replace( Image.m_Bytes.begin(), Image.m_Bytes.end(), uint8_t{ 0 }, uint8_t{ 1 } );   // the signal's timing, as below
   }
   if( i_Format == IPixelFormat::EU10Y10V10Y10 )
   {

@@ -43,10 +43,10 @@ std::pair<int, int> FourthBytes( const std::vector<uint8_t>& i_rFrame )
 class LensTest : public testing::Test
 {
 protected:
-  VRecordResult RecordOn( const std::string& i_rDisplay, const VArguments& i_rMore )
+  VRecordResult RecordOn( const std::string& i_rDisplay, const VArguments& i_rMore, const std::string& i_rVariable = "LIBGL_ALWAYS_SOFTWARE=1" )
   {
     VRunOptions Options;
-    Options.m_Environment = { "DISPLAY=" + i_rDisplay, "LIBGL_ALWAYS_SOFTWARE=1" };
+    Options.m_Environment = { "DISPLAY=" + i_rDisplay, i_rVariable };
     return Record( m_Folder.File( "recording" ), Card + i_rMore, Options );
   }
 
@@ -74,8 +74,8 @@ TEST_F( LensTest, IsUndoneByOpenGL )
 {
   VBackgroundProgram Server( { "Xvfb", "-displayfd", "1", "-screen", "0", "640x480x24", "-nolisten", "tcp" } );
   ASSERT_TRUE( Server.WaitFor( "\n", 30.0 ) ) << Server.Printed();
-  const std::string Display = DisplayOf( Server.Printed() );
-  for( const char* pConverter : { "opengl", "auto" } )
+  const std::string OnServer = DisplayOf( Server.Printed() );
+  for( const auto& [Display, pConverter] : { std::pair{ OnServer, "opengl" }, { OnServer, "auto" }, { std::string(), "opengl" } } )
   {
     const VRecordResult Result = RecordOn( Display, Colour + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
     ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -93,9 +93,9 @@ TEST_F( LensTest, IsUndoneByOpenGL )
 
 #endif
 
-TEST_F( LensTest, IsLeftAsItIsWithoutADisplay )
+TEST_F( LensTest, IsLeftAsItIsWithoutOpenGL )
 {
-  const VRecordResult Result = RecordOn( "", Colour + Lens );
+  const VRecordResult Result = RecordOn( "", Colour + Lens, "EGL_PLATFORM=x11" );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
   EXPECT_EQ( std::make_pair( 255, 255 ), FourthBytes( FirstFrame( Result ) ) );

@@ -1,5 +1,9 @@
 // Red, green and blue as they are, or the other way round.
 
+#ifdef GL_FRAGMENT_PRECISION_HIGH
+precision highp float;   // half of its bits do not tell pixels apart
+#endif
+
 varying vec2 v_TextureCoordinate;
 
 uniform sampler2D t_DiffuseTexture;

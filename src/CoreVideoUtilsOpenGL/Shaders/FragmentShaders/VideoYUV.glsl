@@ -1,5 +1,9 @@
 // 4:2:2, two pixels a texel: y0 u y1 v, or u y0 v y1.
 
+#ifdef GL_FRAGMENT_PRECISION_HIGH
+precision highp float;   // half of its bits do not tell pixels apart
+#endif
+
 varying vec2 v_TextureCoordinate;
 
 uniform sampler2D t_DiffuseTexture;

@@ -1,6 +1,10 @@
 // Places the image's mesh: undoes the lens, rotates, looks at it through the view. The image itself is sampled in its own coordinates, so a
 // finer mesh gives a finer warp.
 
+#ifdef GL_ES
+precision highp float;   // half of its bits do not hold the square of a distance in pixels
+#endif
+
 attribute vec2 a_Position;   // 0 to 1, from the image's left and first row
 
 uniform bool u_Inverted;
