@@ -116,7 +116,9 @@ TEST_F( Bluefish444Device, FramesOfOneLabelLieAFrameApart )
 {
   m_Card.m_Timecodes[Place::RP188LTC] = 0x01'00'00'00'00'00'00'00;
   MakeCapturing( Mode720p5994 );
+  const TestSupport::VLogCapture Details( "VideoInputDeviceBluefish444", 6 );
   EXPECT_EQ( Next().m_Timecode.m_TickRemainder, 2252250u );
+  EXPECT_TRUE( Details.Has( "Timecode=10:00:00:00, SubFrameCount=1, FramePeriod=2252250" ) );
   m_Card.m_Timecodes[Place::RP188LTC] = 0x01'00'00'00'00'00'00'01;
   const VReceivedFrame First = Next();
   EXPECT_EQ( First.m_Timecode.m_TickRemainder, 0u );
