@@ -176,15 +176,20 @@ std::string VCaptureTargets::WhyRefused( const VCaptureTarget& i_rTarget ) const
   }
   boost::system::error_code Error;
   const std::string Path = TakenPath( i_rTarget );
-  if( !boost::filesystem::exists( Path, Error ) )
+  const boost::filesystem::file_type Type = boost::filesystem::status( Path, Error ).type();
+  if( Type == boost::filesystem::file_not_found )
   {
     return {};
+  }
+  if( Type == boost::filesystem::status_error )
+  {
+    return "The file \"" + Path + "\" cannot be made: " + Error.message() + ".";
   }
   if( !IsSequence( i_rTarget ) )
   {
     return MayOverwrite() ? "" : "The file \"" + Path + "\" is there already; --overwrite replaces it.";
   }
-  if( !boost::filesystem::is_directory( Path, Error ) )
+  if( Type != boost::filesystem::directory_file )
   {
     return "The images need the folder \"" + Path + "\", and a file of that name is there.";
   }

@@ -165,6 +165,26 @@ TEST_F( SettingsTest, WhatIsRefusedLeavesNoTrace )
   EXPECT_EQ( 2, std::count_if( All.begin(), All.end(), []( const nlohmann::json& i_rSetting ) { return i_rSetting.value( "saved", false ); } ) );
 }
 
+TEST_F( SettingsTest, AnOddNameSpoilsNeitherTheListNorARecording )
+{
+  std::string Name = "\x1b[2J\n";
+  for( int Count = 0; Count < 200; ++Count )
+  {
+    Name += "\xc3\xa9";
+  }
+  Set( "Name", Name );
+  const std::string List = Params( { "list" } ).m_Output;
+  EXPECT_EQ( std::string::npos, List.find( '\x1b' ) );
+  EXPECT_NE( std::string::npos, List.find( "RP188_Any, Any" ) ) << "all choices: " << List;
+  const size_t Flags = List.find( "FLAGS" );
+  const size_t Line = List.rfind( '\n', List.find( "\xc3\xa9..." ) ) + 1;
+  EXPECT_EQ( List.find( "saved", Line ) - Line - static_cast<size_t>( std::count( List.begin(), List.end(), '\xc3' ) ), Flags ) << List;
+
+  const VRecordResult Result = RecordMore( "a" );
+  EXPECT_EQ( 0u, Result.m_Devices.size() ) << "refused before it begins";
+  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "cannot be made: File name too long" ) ) << Result.m_Run.m_Error;
+}
+
 TEST_F( SettingsTest, ADamagedFileStopsNobody )
 {
   Set( "AudioChannelCount", "2" );
