@@ -85,7 +85,8 @@ bool TakeOver( int i_Handle, const struct stat& i_rStatus )
 // A new file with the permissions of the one that it is to replace.
 bool WriteNewFile( const std::string& i_rPath, const std::string& i_rLike, const std::string& i_rText )
 {
-  VHandle File( open( i_rPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, AllMayReadAndWrite ) );
+  unlink( i_rPath.c_str() );   // what a killed program has left, or a link that would lead elsewhere
+  VHandle File( open( i_rPath.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, AllMayReadAndWrite ) );
   struct stat Status = {};
   if( !File.IsOpen() || ( stat( i_rLike.c_str(), &Status ) == 0 && !TakeOver( File.Get(), Status ) ) )
   {

@@ -244,6 +244,13 @@ TEST_F( SettingsFile, ALinkStaysALink )
   ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
   EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
   EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
+  // One in the place of the new file leads nowhere.
+  const std::string Other = m_Folder.File( "other" );
+  std::ofstream( Other ) << "mine";
+  boost::filesystem::create_symlink( Other, m_Path + ".new" );
+  Put( "Name", std::string( "C" ) );
+  ASSERT_TRUE( Save( { "Name" } ) ) << m_Error;
+  EXPECT_EQ( ReadFile( Other ), "mine" );
   const std::string Circle = m_Folder.File( "circle.json" );
   boost::filesystem::create_symlink( Circle, Circle );
   EXPECT_FALSE( VSettingsFile( Circle ).Save( m_Store, { m_Device + "Name" }, m_Error ) );
