@@ -15,7 +15,6 @@ namespace VideoInputHAL
 constexpr uint32_t DefaultNoSignalMode = 44;
 
 constexpr uint32_t MostAudioChannels = 16;
-constexpr uint32_t AudioSampleRate = 48000;
 
 // "Unknown card" for a type outside the table.
 std::string CardName( int i_CardType );
