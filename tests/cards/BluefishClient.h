@@ -2,15 +2,12 @@
 #pragma once
 
 #include "VendorInterfaces/BlueVelvetLoader.h"
-#include "cards/common/VirtualCardControl.h"
-
+#include "tests/cards/CardFixture.h"
 #include "tests/support/CounterReader.h"
 #include "tests/support/RampReader.h"
 
 #include <boost/thread/thread.hpp>
-#include <gtest/gtest.h>
 
-#include <dlfcn.h>
 #include <optional>
 #include <string>
 #include <vector>
@@ -27,12 +24,6 @@ inline const VFlatFunctions& Functions()
 {
   static const VRuntimeLibrary s_Library( VIRTUAL_BLUEFISH );
   return *s_Library.Functions();
-}
-
-inline IVirtualCardControl& Control()
-{
-  static void* const s_pLibrary = dlopen( VIRTUAL_BLUEFISH, RTLD_NOW );
-  return *reinterpret_cast<GetVirtualCardControlFunction*>( dlsym( s_pLibrary, GetVirtualCardControlName ) )();
 }
 
 // A card object, detached and freed at its end.
@@ -95,23 +86,15 @@ struct VDecoded
 };
 
 // One card with a clock moved by hand. Whatever a test does, it must leave nothing behind.
-class VBluefishFixture : public testing::Test
+class VBluefishFixture : public VOneCardFixture
 {
 protected:
+  VBluefishFixture() : VOneCardFixture( ControlOf( VIRTUAL_BLUEFISH ) ) {}
+
   void Plug( const std::string& i_rText, int i_Card = 1 )
   {
-    std::string Error;
-    m_Card = Control().AddCard( i_rText.c_str(), { true }, Error );
-    ASSERT_NE( m_Card, 0u ) << Error;
+    AddCard( i_rText );
     ASSERT_TRUE( m_Object.Attach( i_Card ) );
-  }
-
-  void Step( uint64_t i_Frames = 1 ) { ASSERT_TRUE( Control().Step( m_Card, i_Frames ) ); }
-
-  void Event( const char* i_pEvent )
-  {
-    std::string Error;
-    ASSERT_TRUE( Control().RunEvent( m_Card, i_pEvent, Error ) ) << Error;
   }
 
   // A frame passes while the client waits for it.
@@ -126,13 +109,6 @@ protected:
     Step();
     Client.join();
     return Count;
-  }
-
-  VCardCounters Counters()
-  {
-    VCardCounters Counters;
-    EXPECT_TRUE( Control().GetCounters( m_Card, Counters ) );
-    return Counters;
   }
 
   // Names a buffer as drivers do.
@@ -198,7 +174,6 @@ protected:
   }
 
   const int64_t m_ErrorsBefore = Control().ReleaseErrors();
-  VCardId m_Card = 0;
   VObject m_Object;
 };
 

@@ -12,7 +12,7 @@ class BluefishStream : public VBluefishFixture
 
 constexpr uint32_t Mode576i = 0;
 constexpr uint32_t Mode720p50 = 16;
-constexpr uint32_t Mode1080p25 = 11;
+constexpr uint32_t ModeFullHD25 = 11;
 
 constexpr uint32_t AllChannels = 0x3FCFF;   // 1 to 8, and 9 to 16 behind the two analogue ones
 
@@ -158,8 +158,8 @@ TEST_F( BluefishStream, AnotherFormatIsDetectedWithItsFirstFrame )
   Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
   Event( R"({"do": "format", "standard": "HD_1920_1080P_2500"})" );
   Sync();
-  EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode1080p25 );
-  EXPECT_TRUE( CounterIn( 1, Mode1080p25 ) ) << "buffers take the signal as it comes";
+  EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), ModeFullHD25 );
+  EXPECT_TRUE( CounterIn( 1, ModeFullHD25 ) ) << "buffers take the signal as it comes";
 }
 
 TEST_F( BluefishStream, DroppedFramesShowInTheFieldCount )

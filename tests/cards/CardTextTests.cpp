@@ -14,40 +14,29 @@ using KVZ::IVideoStandard;
 namespace
 {
 
-std::string RefusalOf( const std::string& i_rText )
+const VCardKind& DeckLink() { return *FindCardKind( "decklink" ); }
+
+void ExpectWords( const std::string& i_rError, const std::vector<std::string>& i_rWords )
 {
-  std::string Error;
-  EXPECT_FALSE( ParseCardSpec( i_rText, Error ) ) << i_rText;
-  EXPECT_EQ( Error.find( '\n' ), std::string::npos );
-  return Error;
+  EXPECT_EQ( i_rError.find( '\n' ), std::string::npos );
+  for( const std::string& rWord : i_rWords )
+  {
+    EXPECT_NE( i_rError.find( rWord ), std::string::npos ) << i_rError << "\n  lacks: " << rWord;
+  }
 }
 
 void ExpectRefusal( const std::string& i_rText, const std::vector<std::string>& i_rWords )
 {
-  const std::string Error = RefusalOf( i_rText );
-  for( const std::string& rWord : i_rWords )
-  {
-    EXPECT_NE( Error.find( rWord ), std::string::npos ) << Error << "\n  lacks: " << rWord;
-  }
-}
-
-const VCardKind& DeckLink() { return *FindCardKind( "decklink" ); }
-
-std::string ScriptRefusal( const std::string& i_rText )
-{
   std::string Error;
-  EXPECT_FALSE( ParseEvents( DeckLink(), DefaultStandard, i_rText, Error ) ) << i_rText;
-  EXPECT_EQ( Error.find( '\n' ), std::string::npos );
-  return Error;
+  EXPECT_FALSE( ParseCardSpec( i_rText, Error ) ) << i_rText;
+  ExpectWords( Error, i_rWords );
 }
 
 void ExpectScriptRefusal( const std::string& i_rText, const std::vector<std::string>& i_rWords )
 {
-  const std::string Error = ScriptRefusal( i_rText );
-  for( const std::string& rWord : i_rWords )
-  {
-    EXPECT_NE( Error.find( rWord ), std::string::npos ) << Error << "\n  lacks: " << rWord;
-  }
+  std::string Error;
+  EXPECT_FALSE( ParseEvents( DeckLink(), DefaultStandard, i_rText, Error ) ) << i_rText;
+  ExpectWords( Error, i_rWords );
 }
 
 }
@@ -108,14 +97,19 @@ TEST( CardText, RefusalsNameTheKeyTheReasonAndWhatIsAccepted )
   ExpectRefusal( "decklink:loop=2,input=a.mov", { "loop: \"2\"", "accepted: 1, 0" } );
   ExpectRefusal( "decklink:loop=0", { "loop:", "input" } );
   ExpectRefusal( "decklink:pattern=bars,input=a.mov", { "pattern:", "input" } );
+  ExpectRefusal( "bluefish444:inputs=5", { "inputs: \"5\" is not understood; accepted: a whole number from 0 to 4" } );
+  ExpectRefusal( "bluefish444:driver=ancient", { "accepted: new, old" } );
+  ExpectRefusal( "bluefish444:standard=HD_3840_2160P_2500", { "cannot be carried by this kind of card" } );
 }
 
 TEST( CardText, AStandardTheKindCannotCarryIsRefusedWithTheList )
 {
   ExpectRefusal( "decklink:standard=HD_1920_1080P_4800", { "standard:", "cannot be carried", "SD_720_486I_5994", "HD_4096_2160P_2500" } );
   ExpectRefusal( "decklink:standard=PAL", { "standard:", "is no video standard", "SD_720_576I_5000" } );
-  EXPECT_EQ( RefusalOf( "decklink:standard=HD_1920_1080PSF_2500" ).find( "PSF_2500," ), std::string::npos );
   ExpectRefusal( "bluefish444:standard=HD_2048_1556PSF_1500", { "cannot be carried" } );
+  std::string Error;
+  EXPECT_FALSE( ParseCardSpec( "decklink:standard=HD_1920_1080PSF_2500", Error ) );
+  EXPECT_EQ( Error.find( "PSF_2500," ), std::string::npos );
 }
 
 TEST( CardText, ATimecodeMustFitTheRate )

@@ -2,18 +2,15 @@
 #pragma once
 
 #include "VendorInterfaces/DeckLinkAPI.h"
-#include "cards/common/VirtualCardControl.h"
-
+#include "tests/cards/CardFixture.h"
 #include "tests/support/CounterReader.h"
 #include "tests/support/RampReader.h"
 
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
-#include <gtest/gtest.h>
 
 #include <atomic>
 #include <cstdlib>
-#include <dlfcn.h>
 #include <functional>
 #include <memory>
 #include <string>
@@ -37,7 +34,7 @@ TFunction* Exported( const char* i_pName )
   return s_pLibrary ? reinterpret_cast<TFunction*>( dlsym( s_pLibrary, i_pName ) ) : nullptr;
 }
 
-inline IVirtualCardControl& Control() { return *Exported<GetVirtualCardControlFunction>( GetVirtualCardControlName )(); }
+inline IVirtualCardControl& DeckLinkControl() { return ControlOf( VIRTUAL_DECKLINK ); }
 
 template<class TInterface>
 struct VReleaser
@@ -187,28 +184,20 @@ public:
 };
 
 // One card in the machine, found through the iterator. Whatever a test does, it must leave nothing behind.
-class VCardFixture : public testing::Test
+class VCardFixture : public VOneCardFixture
 {
 protected:
+  VCardFixture() : VOneCardFixture( DeckLinkControl() ) {}
+
   void Plug( const std::string& i_rText, bool i_bManualClock = true )
   {
-    std::string Error;
-    m_Card = Control().AddCard( i_rText.c_str(), { i_bManualClock }, Error );
-    ASSERT_NE( m_Card, 0u ) << Error;
+    AddCard( i_rText, i_bManualClock );
     IDeckLink* pCard = nullptr;
     ASSERT_EQ( MakeIterator()->Next( &pCard ), S_OK );
     m_pCard.reset( pCard );
     m_pInput = Query<IDeckLinkInput>( *m_pCard, IID_IDeckLinkInput );
     ASSERT_NE( m_pInput, nullptr );
     ASSERT_EQ( m_pInput->SetCallback( &m_Client ), S_OK );
-  }
-
-  void Step( uint64_t i_Frames = 1 ) { ASSERT_TRUE( Control().Step( m_Card, i_Frames ) ); }
-
-  void Event( const char* i_pEvent )
-  {
-    std::string Error;
-    ASSERT_TRUE( Control().RunEvent( m_Card, i_pEvent, Error ) ) << Error;
   }
 
   void Enable( uint32_t i_Mode = Mode1080p25, uint32_t i_PixelFormat = PixelFormat::YUV8Bit, uint32_t i_Flags = InputFlag::Default )
@@ -230,13 +219,6 @@ protected:
     };
   }
 
-  VCardCounters Counters()
-  {
-    VCardCounters Counters;
-    EXPECT_TRUE( Control().GetCounters( m_Card, Counters ) );
-    return Counters;
-  }
-
   void TearDown() override
   {
     if( m_pInput )
@@ -253,7 +235,6 @@ protected:
   }
 
   VClient m_Client;
-  VCardId m_Card = 0;
   VPointer<IDeckLink> m_pCard;
   VPointer<IDeckLinkInput> m_pInput;
 };

@@ -56,7 +56,7 @@ protected:
   VCardId Add( const std::string& i_rText = "decklink" )
   {
     std::string Error;
-    const VCardId Card = Control().AddCard( i_rText.c_str(), { true }, Error );
+    const VCardId Card = DeckLinkControl().AddCard( i_rText.c_str(), { true }, Error );
     EXPECT_NE( Card, 0u ) << Error;
     m_Cards.push_back( Card );
     return Card;
@@ -68,9 +68,9 @@ protected:
   {
     for( const VCardId Card : m_Cards )
     {
-      Control().RemoveCard( Card );
+      DeckLinkControl().RemoveCard( Card );
     }
-    EXPECT_EQ( Control().ReferencesHeld(), 0 );
+    EXPECT_EQ( DeckLinkControl().ReferencesHeld(), 0 );
     EXPECT_EQ( m_Watcher.m_References, 1 );
   }
 
@@ -90,9 +90,9 @@ TEST_F( DeckLinkDiscovery, ReportsCardsThatAreThereAndThoseThatComeLater )
 
   const VCardId Second = Add();
   EXPECT_EQ( m_Watcher.m_News.back(), NameOf( Second ) );
-  EXPECT_TRUE( Control().RemoveCard( First ) );
+  EXPECT_TRUE( DeckLinkControl().RemoveCard( First ) );
   EXPECT_EQ( m_Watcher.m_News.back(), "-1" ) << "the same pointer that arrived";
-  EXPECT_FALSE( Control().RemoveCard( First ) );
+  EXPECT_FALSE( DeckLinkControl().RemoveCard( First ) );
 
   EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_OK );
   EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_FALSE );
@@ -115,20 +115,20 @@ TEST_F( DeckLinkDiscovery, AScriptTakesACardOutAndPutsItBackAsANewOne )
   pFirst->SetCallback( &Client );
   pFirst->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
   pFirst->StartStreams();
-  EXPECT_TRUE( Control().Step( Card, 5 ) );
+  EXPECT_TRUE( DeckLinkControl().Step( Card, 5 ) );
   EXPECT_EQ( Client.m_FrameCalls, 3 );
   EXPECT_EQ( m_Watcher.m_News.size(), 2u );
   EXPECT_EQ( pFirst->StartStreams(), E_FAIL );
   EXPECT_EQ( pFirst->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 ), E_FAIL );
 
-  EXPECT_TRUE( Control().Step( Card, 1 ) );
+  EXPECT_TRUE( DeckLinkControl().Step( Card, 1 ) );
   ASSERT_NE( pInput, nullptr );
   EXPECT_NE( pInput.get(), pFirst.get() );
   EXPECT_EQ( m_Watcher.m_News.size(), 3u );
   pInput->SetCallback( &Client );
   pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
   pInput->StartStreams();
-  EXPECT_TRUE( Control().Step( Card, 2 ) );
+  EXPECT_TRUE( DeckLinkControl().Step( Card, 2 ) );
   EXPECT_EQ( Client.m_FrameCalls, 5 );
   pInput->SetCallback( nullptr );
   pFirst->SetCallback( nullptr );
@@ -187,12 +187,12 @@ TEST_F( DeckLinkDiscovery, ATextThatCannotBeUnderstoodAddsNothing )
   const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   pDiscovery->InstallDeviceNotifications( &m_Watcher );
   std::string Error;
-  EXPECT_EQ( Control().AddCard( "decklink:pattern=plaid", {}, Error ), 0u );
+  EXPECT_EQ( DeckLinkControl().AddCard( "decklink:pattern=plaid", {}, Error ), 0u );
   EXPECT_NE( Error.find( "pattern" ), std::string::npos );
-  EXPECT_EQ( Control().AddCard( "bluefish444", {}, Error ), 0u );
+  EXPECT_EQ( DeckLinkControl().AddCard( "bluefish444", {}, Error ), 0u );
   EXPECT_NE( Error.find( "accepted: decklink" ), std::string::npos );
-  EXPECT_EQ( Control().AddCard( "decklink:script=/no/such/script.json", {}, Error ), 0u );
+  EXPECT_EQ( DeckLinkControl().AddCard( "decklink:script=/no/such/script.json", {}, Error ), 0u );
   EXPECT_NE( Error.find( "script: \"/no/such/script.json\"" ), std::string::npos ) << Error;
-  EXPECT_FALSE( Control().RunEvent( 4711, "{}", Error ) );
+  EXPECT_FALSE( DeckLinkControl().RunEvent( 4711, "{}", Error ) );
   EXPECT_TRUE( m_Watcher.m_News.empty() );
 }

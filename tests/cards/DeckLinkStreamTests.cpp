@@ -164,30 +164,6 @@ TEST_F( DeckLinkStream, LossOfSignalMarksFramesAndTheClockGoesOn )
   EXPECT_EQ( m_Client.m_Seen[5].m_Counter, 5u );
 }
 
-TEST_F( DeckLinkStream, DroppedFramesLeaveAGapInNumberAndTime )
-{
-  Plug( "decklink:pattern=counter" );
-  m_Client.Record();
-  Enable();
-  Start();
-  Step();
-  Event( R"({ "do": "drop", "frames": 2 })" );
-  Event( R"({ "do": "timecode-jump", "to": "12:00:00:00" })" );
-  Step( 3 );
-  ASSERT_EQ( m_Client.m_Seen.size(), 2u );
-  EXPECT_EQ( m_Client.m_Seen[1].m_Counter, 3u );
-  EXPECT_EQ( m_Client.m_Seen[1].m_HardwareTime - m_Client.m_Seen[0].m_HardwareTime, 3 * 5400000 );
-  EXPECT_EQ( m_Client.m_Seen[1].m_Timecode, "12:00:00:02" );
-  EXPECT_EQ( Counters().m_FramesDropped, 2u );
-  EXPECT_EQ( Counters().m_FramesDelivered, 2u );
-
-  Event( R"({ "do": "timecode-loss", "frames": 1 })" );
-  Step( 2 );
-  EXPECT_EQ( m_Client.m_Seen[2].m_Timecode, "" );
-  EXPECT_TRUE( m_Client.m_Seen[2].m_bSignal );
-  EXPECT_EQ( m_Client.m_Seen[3].m_Timecode, "12:00:00:04" );
-}
-
 TEST_F( DeckLinkStream, PausedStreamsGoOnInTheirOwnTime )
 {
   Plug( "decklink:pattern=counter" );
