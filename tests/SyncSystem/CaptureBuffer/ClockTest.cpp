@@ -1,5 +1,6 @@
 #include "SyncSystem/Clock.h"
 #include "SyncSystem/SourceSyncSession.h"
+#include "tests/SyncSystem/CaptureBuffer/SourceClocks.h"
 
 #include <gtest/gtest.h>
 
@@ -7,10 +8,6 @@ namespace
 {
 
 using namespace KVZ;
-
-const IClock Counter( IClock::CounterFromSessionStart, 0, 5 );
-const IClock Frames( IClock::FrameNumber, 0, 5 );
-const IClock Timecode( IClock::Timecode, 3, 0 );
 
 TEST( Clock, OrderIsTypeThenUnsignedSourceThenIndex )
 {
@@ -30,7 +27,7 @@ TEST( Clock, AbsentClockReadsInvalid )
   Ticks.Set( Counter, VTick( 0 ) );
   Ticks.Set( Timecode, VTick( 10 ) );
   EXPECT_EQ( Ticks.Find( Counter ), VTick( 0 ) );
-  EXPECT_FALSE( Ticks.Find( Frames ).IsValid() );
+  EXPECT_FALSE( Ticks.Find( FrameNumber ).IsValid() );
   EXPECT_EQ( Ticks.m_TickByClock.rbegin()->first, Counter );
   EXPECT_EQ( Shifted( Ticks, VTick( -3 ) ).Find( Timecode ), VTick( 7 ) );
 }
@@ -77,10 +74,10 @@ TEST( SourceSyncSession, SaysWhichRuleFailsFirst )
       },
       "Notice period for starting new global sync session cannot be a negative number of ticks" },
     { []( ISourceSyncSession& io_r ) { io_r.m_StartTime = {}; }, "No clocks specified" },
-    { []( ISourceSyncSession& io_r ) { io_r.m_StartTime.Set( Frames, VTick( 1 ) ); },
+    { []( ISourceSyncSession& io_r ) { io_r.m_StartTime.Set( FrameNumber, VTick( 1 ) ); },
       "Clock continuity information does not correspond to clock start times" },
     { []( ISourceSyncSession& io_r ) {
-       io_r.m_ContinuousSince = { { Counter, 4 }, { Frames, 2 } };
+       io_r.m_ContinuousSince = { { Counter, 4 }, { FrameNumber, 2 } };
      },
       "Clock continuity information does not correspond to clock start times" },
     { []( ISourceSyncSession& io_r )
@@ -93,7 +90,7 @@ TEST( SourceSyncSession, SaysWhichRuleFailsFirst )
       "Source sync sessions cannot refer to the global time clocks" },
     { []( ISourceSyncSession& io_r )
       {
-        const IClock Second( IClock::CounterFromSessionStart, 0, 6 );
+        const IClock Second( IClock::CounterFromSessionStart, 0, 78 );
         io_r.m_StartTime.Set( Second, VTick( 7 ) );
         io_r.m_ContinuousSince[Second] = 4;
       },

@@ -1,5 +1,6 @@
 #include "SyncSystem/TimeBasedCaptureBuffer.h"
 
+#include "tests/SyncSystem/CaptureBuffer/SourceClocks.h"
 #include "tests/support/FrameMemory.h"
 #include "tests/support/LogCapture.h"
 
@@ -15,10 +16,7 @@ using namespace SyncSystem;
 using KVZ::IClock;
 using KVZ::VTick;
 
-const IClock Counter( IClock::CounterFromSessionStart, 0, 77 );
 const IClock OtherCounter( IClock::CounterFromSessionStart, 0, 78 );
-const IClock FrameNumber( IClock::FrameNumber, 0, 77 );
-const IClock Timecode( IClock::Timecode, 3, 0 );
 constexpr VTick Period( 5400000 );
 
 class TimeBasedCaptureBuffer : public testing::Test

@@ -112,34 +112,31 @@ TEST_F( DataSourceCaptures, TakesTheFramesFromStartToBeforeEnd )
   EXPECT_EQ( m_Rig.m_pSource->m_Busy, ( std::vector<bool>{ true, false } ) );
 }
 
-TEST_F( DataSourceCaptures, TicksBetweenFramesGoToTheNextFrame )
+TEST_F( DataSourceCaptures, TakesPastAndFutureFramesBetweenAnyTwoTicks )
 {
-  ASSERT_TRUE( Start( 1, At( 2 ) + VTick( 1 ), At( 6 ) + VTick( 1 ) ) );
-  EXPECT_EQ( Drain(), Range( 3, 7 ) );
-  ASSERT_TRUE( Start( 2, At( 3 ) - VTick( 1 ), At( 7 ) - VTick( 1 ) ) );
-  EXPECT_EQ( Drain(), Range( 3, 7 ) );
-}
-
-TEST_F( DataSourceCaptures, ReachesFromThePastIntoTheFuture )
-{
-  ASSERT_TRUE( Start( 1, At( 5 ), At( 15 ) ) );
-  EXPECT_EQ( Status().m_State, ECaptureState::Capturing );
-  EXPECT_EQ( Drain(), Range( 5, 10 ) );
-  m_Rig.m_pSource->AddMany( 10 );
-  EXPECT_EQ( Drain(), Range( 10, 15 ) );
-  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
-  EXPECT_EQ( Status().m_CapturedDuration, Period * 10 );
-}
-
-TEST_F( DataSourceCaptures, WaitsForAStartInTheFuture )
-{
-  ASSERT_TRUE( Start( 1, At( 12 ), At( 15 ) ) );
-  EXPECT_EQ( Status().m_State, ECaptureState::WaitingForStart );
-  m_Rig.m_pSource->AddMany( 2 );
-  EXPECT_EQ( Drain(), Range( 0, 0 ) );
-  m_Rig.m_pSource->AddMany( 5 );
-  EXPECT_EQ( Drain(), Range( 12, 15 ) );
-  EXPECT_EQ( Status().m_Start, At( 12 ) );
+  const VTick One( 1 );
+  const struct
+  {
+    VTick m_Start;
+    VTick m_End;
+    ECaptureState::Enum m_State;   // before the next ten frames
+    int64_t m_First;
+    int64_t m_Behind;
+  } Cases[] = { { At( 2 ) + One, At( 6 ) + One, ECaptureState::Captured, 3, 7 }, { At( 13 ) - One, At( 17 ) - One, ECaptureState::Captured, 13, 17 },
+    { At( 25 ), At( 35 ), ECaptureState::Capturing, 25, 35 }, { At( 42 ), At( 45 ), ECaptureState::WaitingForStart, 42, 45 } };
+  for( uint32_t Id = 1; const auto& rCase : Cases )
+  {
+    SCOPED_TRACE( Id );
+    ASSERT_TRUE( Start( Id++, rCase.m_Start, rCase.m_End ) );
+    EXPECT_EQ( Status().m_State, rCase.m_State );
+    std::vector<int64_t> Taken = Drain();
+    m_Rig.m_pSource->AddMany( 10 );
+    const std::vector<int64_t> Later = Drain();
+    Taken.insert( Taken.end(), Later.begin(), Later.end() );
+    EXPECT_EQ( Taken, Range( rCase.m_First, rCase.m_Behind ) );
+    EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+    EXPECT_EQ( Status().m_CapturedDuration, Period * ( rCase.m_Behind - rCase.m_First ) );
+  }
 }
 
 TEST_F( DataSourceCaptures, AnOpenEndIsClosedAtTheNewestFrameOrAtATick )

@@ -1,6 +1,5 @@
 #include "SyncSystem/DataSourceFrames.h"
-
-#include <gtest/gtest.h>
+#include "tests/SyncSystem/DataSource/TestSource.h"
 
 #include <algorithm>
 #include <limits>
@@ -9,19 +8,18 @@
 namespace
 {
 
-using KVZ::VTick;
 using SyncSystem::VBeat;
 using SyncSystem::VFrameRecord;
 
-constexpr int64_t Period = 2700000;
+constexpr int64_t Ticks50 = 2700000;   // of a frame
 
 std::vector<VFrameRecord> MakeFrames( int64_t i_FirstTick, size_t i_Count, const VBeat& i_rBeat )
 {
   std::vector<VFrameRecord> Frames( i_Count );
   for( size_t Index = 0; Index < i_Count; ++Index )
   {
-    Frames[Index].m_Tick = VTick( i_FirstTick + static_cast<int64_t>( Index ) * Period );
-    Frames[Index].m_Period = VTick( Period );
+    Frames[Index].m_Tick = VTick( i_FirstTick + static_cast<int64_t>( Index ) * Ticks50 );
+    Frames[Index].m_Period = VTick( Ticks50 );
     SyncSystem::RankFrame( Frames[Index], i_rBeat );
   }
   return Frames;
@@ -48,8 +46,8 @@ std::vector<int64_t> SurvivorsOneByOne( std::vector<int64_t> i_Ticks, size_t i_L
 {
   const auto Merit = [i_BeatPeriod]( int64_t i_Tick )
   {
-    const bool bOnBeat = i_BeatPeriod != 0 && i_Tick % Period == 0;
-    return std::pair( bOnBeat ? Halvings( i_Tick / i_BeatPeriod ) : -1, Halvings( i_Tick / Period ) );
+    const bool bOnBeat = i_BeatPeriod != 0 && i_Tick % Ticks50 == 0;
+    return std::pair( bOnBeat ? Halvings( i_Tick / i_BeatPeriod ) : -1, Halvings( i_Tick / Ticks50 ) );
   };
   while( i_Ticks.size() > std::max<size_t>( i_Limit, 1 ) )
   {
@@ -60,9 +58,9 @@ std::vector<int64_t> SurvivorsOneByOne( std::vector<int64_t> i_Ticks, size_t i_L
 
 TEST( EvenDropping, KeepsWhatIsLeftWhenTheLeastDeservingGoOneByOne )
 {
-  for( const int64_t BeatPeriod : { int64_t( 0 ), Period, 4 * Period } )
+  for( const int64_t BeatPeriod : { int64_t( 0 ), Ticks50, 4 * Ticks50 } )
   {
-    for( const int64_t First : { int64_t( 0 ), 7 * Period, 1000 * Period + 13 } )
+    for( const int64_t First : { int64_t( 0 ), 7 * Ticks50, 1000 * Ticks50 + 13 } )
     {
       for( size_t Count = 1; Count <= 64; ++Count )
       {
@@ -96,7 +94,7 @@ TEST( EvenDropping, ADroppedFrameTellsHowManyGoBeforeTheNextKeptOne )
 {
   for( size_t Limit = 1; Limit <= 40; ++Limit )
   {
-    std::vector<VFrameRecord> Frames = MakeFrames( 3 * Period, 40, {} );
+    std::vector<VFrameRecord> Frames = MakeFrames( 3 * Ticks50, 40, {} );
     SyncSystem::DropEvenly( Frames, Limit );
     for( size_t Index = 0; Index < Frames.size(); ++Index )
     {
@@ -122,10 +120,10 @@ TEST( EvenDropping, HalvesASequenceIntoRegularSpacing )
 
 TEST( EvenDropping, FramesOnTheBeatOutliveAllOthers )
 {
-  const VBeat Beat{ VTick( 5 * Period ), VTick( 5 * Period + 40 ), KVZ::VGlobalSyncSessionId( 1 ) };
+  const VBeat Beat{ VTick( 5 * Ticks50 ), VTick( 5 * Ticks50 + 40 ), KVZ::VGlobalSyncSessionId( 1 ) };
   std::vector<VFrameRecord> Frames = MakeFrames( 1000, 20, Beat );
-  Frames[3].m_Tick = VTick( 3 * Period + 40 );
-  Frames[15].m_Tick = VTick( 15 * Period + 40 );
+  Frames[3].m_Tick = VTick( 3 * Ticks50 + 40 );
+  Frames[15].m_Tick = VTick( 15 * Ticks50 + 40 );
   SyncSystem::RankFrame( Frames[3], Beat );
   SyncSystem::RankFrame( Frames[15], Beat );
   SyncSystem::DropEvenly( Frames, 2 );
