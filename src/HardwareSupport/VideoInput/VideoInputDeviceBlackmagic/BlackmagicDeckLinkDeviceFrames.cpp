@@ -19,8 +19,6 @@ namespace
 
 using namespace DeckLinkAPI;
 
-constexpr const char* LogCategory = "VideoInputDeviceBlackmagic";
-
 KVZ::VideoFrameInfo DescribeImage( IDeckLinkVideoInputFrame& i_rVideo, KVZ::IPixelFormat::Enum i_PixelFormat,
   KVZ::IInterlacedFormat::Enum i_Interlaced )
 {
@@ -38,13 +36,13 @@ bool FindImage( IDeckLinkVideoInputFrame& i_rVideo, uint64_t i_ImageBytes, std::
   void* pBytes = nullptr;
   if( i_rVideo.GetBytes( &pBytes ) < 0 || !pBytes )
   {
-    KVZ_LOG( LogCategory, 2, "Could not get bytes from video frame." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Could not get bytes from video frame." );
     return false;
   }
   const uint64_t FrameBytes = static_cast<uint64_t>( i_rVideo.GetRowBytes() ) * static_cast<uint64_t>( i_rVideo.GetHeight() );
   if( FrameBytes > i_ImageBytes )
   {
-    KVZ_LOG( LogCategory, 2, "Need more memory than was to be requested." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Need more memory than was to be requested." );
     return false;
   }
   o_rImage = { static_cast<const uint8_t*>( pBytes ), FrameBytes };
@@ -155,7 +153,7 @@ VVideoInputDataSourceFrame* VBlackmagicDeckLinkDevice::VImpl::CopyFrame( IDeckLi
   VVideoInputDataSourceFrame* const pFrame = MakeFrame( m_pAllocator.get(), Info, ImageBytes, Audio.size() );
   if( !pFrame )
   {
-    KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Memory allocation failed." );
     return nullptr;
   }
   pFrame->m_DeviceIndex = m_DeviceIndex;
@@ -176,7 +174,7 @@ bool VBlackmagicDeckLinkDevice::VImpl::FindAudio( IDeckLinkAudioInputPacket& i_r
   void* pBytes = nullptr;
   if( i_rAudio.GetBytes( &pBytes ) < 0 || !pBytes )
   {
-    KVZ_LOG( LogCategory, 2, "Could not get bytes from audio packet." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Could not get bytes from audio packet." );
     return false;
   }
   int64_t PacketTime = 0;

@@ -18,6 +18,8 @@
 namespace VideoInputHAL
 {
 
+constexpr const char* BlackmagicLogCategory = "VideoInputDeviceBlackmagic";
+
 // Counted by the vendor and by the device; every callback holds a reference of its own for as long as it runs. The device closes it before
 // letting it go, so a callback that comes late, or has waited for the lock meanwhile, finds it closed and does nothing.
 //

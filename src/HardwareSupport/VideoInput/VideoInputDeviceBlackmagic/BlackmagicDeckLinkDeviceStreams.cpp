@@ -16,8 +16,6 @@ namespace
 
 using namespace DeckLinkAPI;
 
-constexpr const char* LogCategory = "VideoInputDeviceBlackmagic";
-
 constexpr int32_t InitialiseFailed = static_cast<int32_t>( 0x80000000u );
 constexpr int32_t ModeNotFound = static_cast<int32_t>( 0x8000001Cu );
 constexpr int32_t StartFailed = static_cast<int32_t>( 0x80000007u );
@@ -66,7 +64,7 @@ VDeviceResult VBlackmagicDeckLinkDevice::VImpl::Initialise()
   m_pInput = VideoInputHAL::QueryInterface<IDeckLinkInput>( *m_pCard, IID_IDeckLinkInput );
   if( !m_pInput )
   {
-    KVZ_LOG( LogCategory, 2, "Could not query interface." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Could not query interface." );
     return { InitialiseFailed };
   }
   ReadCapabilities();
@@ -76,7 +74,7 @@ VDeviceResult VBlackmagicDeckLinkDevice::VImpl::Initialise()
   }
   if( m_pInput->SetCallback( this ) < 0 )
   {
-    KVZ_LOG( LogCategory, 2, "Could not set callback." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Could not set callback." );
     return { InitialiseFailed };
   }
   return { StartStreaming() ? 0 : InitialiseFailed };
@@ -195,7 +193,7 @@ void VBlackmagicDeckLinkDevice::VImpl::ReadCapabilities()
   m_bDetectsFormat = pAttributes && pAttributes->GetFlag( AttributeId::SupportsInputFormatDetection, &bDetects ) >= 0 && bDetects;
   if( !m_bDetectsFormat )
   {
-    KVZ_LOG( LogCategory, 5, "%1% does not detect the format of its input.", m_DisplayName );
+    KVZ_LOG( BlackmagicLogCategory, 5, "%1% does not detect the format of its input.", m_DisplayName );
   }
 }
 
@@ -225,23 +223,23 @@ VDeviceResult VBlackmagicDeckLinkDevice::VImpl::Restart( const VCaptureSettings&
 {
   if( !HasCurrentMode() )
   {
-    KVZ_LOG( LogCategory, 2, "Could not find requested mode." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Could not find requested mode." );
     return { ModeNotFound };
   }
   if( m_pInput->EnableVideoInput( m_Mode, ToVendorPixelFormat( i_rSettings.m_PixelFormat ), InputFlag::FormatDetection ) < 0 )
   {
-    KVZ_LOG( LogCategory, 2, "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." );
     return { StartFailed };
   }
   m_Audio = { i_rSettings.m_AudioFormat, AudioSampleRate48kHz, i_rSettings.m_AudioChannels };
   if( m_Audio.m_Channels != 0 && !EnableAudio() )
   {
-    KVZ_LOG( LogCategory, 2, "Unable to select the chosen audio mode for capture.  Perhaps the selected device is in use." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Unable to select the chosen audio mode for capture.  Perhaps the selected device is in use." );
     return { StartFailed };
   }
   if( m_pInput->StartStreams() < 0 )
   {
-    KVZ_LOG( LogCategory, 2, "Unable to start the capture. Perhaps the selected device is in use." );
+    KVZ_LOG( BlackmagicLogCategory, 2, "Unable to start the capture. Perhaps the selected device is in use." );
     return { StartFailed };
   }
   return {};

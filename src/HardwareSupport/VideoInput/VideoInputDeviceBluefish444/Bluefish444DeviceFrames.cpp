@@ -17,8 +17,6 @@ namespace
 
 namespace Buffer = BlueVelvet::Buffer;
 
-constexpr const char* LogCategory = "VideoInputDeviceBluefish444";
-
 }
 
 void VBluefish444Device::VImpl::DeliverFrame( uint32_t i_Buffer )
@@ -35,7 +33,7 @@ void VBluefish444Device::VImpl::DeliverFrame( uint32_t i_Buffer )
     Samples * Channels * ToSampleType( m_Command.m_AudioFormat ).m_Bytes );
   if( !pFrame )
   {
-    KVZ_LOG( LogCategory, 2, "Memory allocation failed." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Memory allocation failed." );
     return;
   }
   pFrame->m_DeviceIndex = GetDeviceIndex();
@@ -64,7 +62,7 @@ bool VBluefish444Device::VImpl::ReadFrame( uint32_t i_Buffer, VVideoInputDataSou
   if( ReadBytes == 0 || ReadBytes < m_Setup.m_ImageBytes ||
     !m_pCard->ReadBuffer( io_rFrame.Image(), ReadBytes, i_Buffer | Buffer::ImageHanc | Buffer::DataImage ) )
   {
-    KVZ_LOG( LogCategory, 2, "Could not read a frame of %1% from the card.", m_DisplayName );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Could not read a frame of %1% from the card.", m_DisplayName );
     return false;
   }
   Decode( i_Buffer, io_rFrame );
@@ -119,7 +117,7 @@ void VBluefish444Device::VImpl::ResolveRepeats( KVZ::ITimecode& io_rTimecode )
     bOtherStandard = FollowTimecode( io_rTimecode, Period );
     Repeats = m_Repeats;
   }
-  KVZ_LOG( LogCategory, 6, "Timecode=%1%, SubFrameCount=%2%, FramePeriod=%3%", KVZ::ToText( Read ), Repeats, Period );
+  KVZ_LOG( Bluefish444LogCategory, 6, "Timecode=%1%, SubFrameCount=%2%, FramePeriod=%3%", KVZ::ToText( Read ), Repeats, Period );
   if( bOtherStandard )
   {
     m_TimecodeChanged();

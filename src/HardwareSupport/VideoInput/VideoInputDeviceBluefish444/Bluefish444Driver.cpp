@@ -1,6 +1,7 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Driver.h"
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Device.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Tables.h"
 #include "NotificationSystem/AsioPostalService.h"
 #include "StageCoreRuntime/GlobalLog.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
@@ -20,8 +21,6 @@ namespace
 
 namespace Property = BlueVelvet::Property;
 
-constexpr const char* LogCategory = "VideoInputDeviceBluefish444";
-
 // In the answer about the card's streams
 constexpr uint32_t OutputsMask = 0x0F;
 constexpr uint32_t InputsMask = 0xF0;
@@ -32,7 +31,7 @@ std::optional<uint32_t> QueryFeatures( VBluefish444SDKWrapper& i_rCard, int i_Pr
   const std::optional<uint32_t> Features = i_rCard.Query( i_Property );
   if( !Features )
   {
-    KVZ_LOG( LogCategory, 2, "Querying card features property is not supported, a later driver is required." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Querying card features property is not supported, a later driver is required." );
   }
   return Features;
 }
@@ -49,7 +48,7 @@ uint32_t CountInputs( VBluefish444SDKWrapper& i_rCard )
   const uint32_t Inputs = ( *Streams & InputsMask ) >> InputsShift;
   if( Inputs == 0 )
   {
-    KVZ_LOG( LogCategory, 2, "%1%",
+    KVZ_LOG( Bluefish444LogCategory, 2, "%1%",
       *Streams & OutputsMask ? "Card has output channels but no inputs. The outputs should be reconfigured as inputs."
                              : "Card does not have any input channels" );
     return 0;
@@ -57,7 +56,7 @@ uint32_t CountInputs( VBluefish444SDKWrapper& i_rCard )
   const std::optional<uint32_t> Connectors = QueryFeatures( i_rCard, Property::CardFeatureConnectorInfo );
   if( Connectors && *Connectors == 0 )
   {
-    KVZ_LOG( LogCategory, 2, "Card has no connectors, cannot continue." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Card has no connectors, cannot continue." );
   }
   return Connectors.value_or( 0 ) == 0 ? 0 : Inputs;
 }
@@ -116,7 +115,7 @@ void VBluefish444Driver::VImpl::StartDiscovery()
   const int Cards = pFunctions ? VBluefish444SDKWrapper( *pFunctions ).DeviceCount() : 0;
   if( Cards < 1 )
   {
-    KVZ_LOG( LogCategory, 6, "No Bluefish card detected" );
+    KVZ_LOG( Bluefish444LogCategory, 6, "No Bluefish card detected" );
     return;
   }
   for( int Card = 1; Card <= Cards; ++Card )
@@ -130,7 +129,7 @@ void VBluefish444Driver::VImpl::FindInputs( const BlueVelvet::VFlatFunctions& i_
   VBluefish444SDKWrapper Card( i_rFunctions );
   if( !Card.Attach( i_Card ) )
   {
-    KVZ_LOG( LogCategory, 2, "Error attaching to card %d.", i_Card );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Error attaching to card %d.", i_Card );
     return;
   }
   const int CardType = Card.CardType();
@@ -140,7 +139,7 @@ void VBluefish444Driver::VImpl::FindInputs( const BlueVelvet::VFlatFunctions& i_
     const auto pInput = std::make_shared<VBluefish444SDKWrapper>( i_rFunctions );
     if( !pInput->AttachInput( i_Card, Input ) )
     {
-      KVZ_LOG( LogCategory, 2, "Error attaching input %d to card %d.", Input, i_Card );
+      KVZ_LOG( Bluefish444LogCategory, 2, "Error attaching input %d to card %d.", Input, i_Card );
       continue;
     }
     AddInput( { pInput, CardType, i_Card, BlueVelvet::InputChannelA + Input, 0 } );

@@ -19,8 +19,6 @@ using KVZ::IVideoStandard;
 namespace Format = BlueVelvet::MemoryFormat;
 namespace Flag = BlueVelvet::SampleFlag;
 
-constexpr const char* LogCategory = "VideoInputDeviceBluefish444";
-
 // By card type
 constexpr std::array CardNames = { "Bluedeep LT", "Bluedeep SD", "Bluedeep AV", "Bluedeep IO", "Bluewild AV", "Iridium HD", "Bluewild RT",
   "Bluewild HD", "Reddevil", "Bluedeep HD/Epoch 2K", "Bluedeep HDS", "Envy", "Pride", "Greed", "Ingest", "SD Duallink", "Catalyst", "SD Duallink Pro",
@@ -147,7 +145,7 @@ uint32_t ChannelRouting( uint32_t i_Channel )
   const VChannelRow& rChannel = FindChannel( i_Channel );
   if( &rChannel == &NoChannel )
   {
-    KVZ_LOG( LogCategory, 2, "Unknown channel." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Unknown channel." );
   }
   return rChannel.m_Routing;
 }
@@ -156,12 +154,12 @@ IVideoStandard::Enum StandardOfMode( uint32_t i_Mode )
 {
   if( i_Mode >= Modes.size() )
   {
-    KVZ_LOG( LogCategory, 2, "Invalid video standard." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Invalid video standard." );
     return IVideoStandard::ESD_720_576I_5000;
   }
   if( i_Mode == DvbAsiMode )
   {
-    KVZ_LOG( LogCategory, 2, "Unsupported video standard." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Unsupported video standard." );
   }
   return Modes[i_Mode];
 }
@@ -171,7 +169,7 @@ uint32_t ToMemoryFormat( IPixelFormat::Enum i_PixelFormat )
   const auto Found = std::find_if( Formats.begin(), Formats.end(), [&]( const VFormatRow& i_r ) { return i_r.m_PixelFormat == i_PixelFormat; } );
   if( Found == Formats.end() )
   {
-    KVZ_LOG( LogCategory, 2, "Unsupported pixel format." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Unsupported pixel format." );
     return 0;
   }
   return Found->m_MemoryFormat;

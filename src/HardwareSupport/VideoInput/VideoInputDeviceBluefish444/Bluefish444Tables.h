@@ -11,6 +11,8 @@
 namespace VideoInputHAL
 {
 
+constexpr const char* Bluefish444LogCategory = "VideoInputDeviceBluefish444";
+
 // What a driver gives for "no signal" that does not tell: the value of the 5.x generation.
 constexpr uint32_t DefaultNoSignalMode = 44;
 
