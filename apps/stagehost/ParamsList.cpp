@@ -15,7 +15,7 @@ namespace
 
 // Characters in a cell; --json has it all.
 constexpr size_t LongestValue = 40;
-constexpr size_t LongestChoices = 60;
+constexpr size_t LongestChoices = 80;
 
 bool IsSaved( const VSettingInfo& i_rSetting, const std::vector<VDataPath>& i_rSaved )
 {
