@@ -175,7 +175,7 @@ TEST_F( SettingsTest, AnOddNameSpoilsNeitherTheListNorARecording )
   Set( "Name", Name );
   const std::string List = Params( { "list" } ).m_Output;
   EXPECT_EQ( std::string::npos, List.find( '\x1b' ) );
-  EXPECT_NE( std::string::npos, List.find( "RP188_Any, Any" ) ) << "all choices: " << List;
+  EXPECT_NE( std::string::npos, List.find( "SD NTSC 16:9 (40:33)" ) ) << "all choices: " << List;
   const size_t Flags = List.find( "FLAGS" );
   const size_t Line = List.rfind( '\n', List.find( "\xc3\xa9..." ) ) + 1;
   EXPECT_EQ( List.find( "saved", Line ) - Line - static_cast<size_t>( std::count( List.begin(), List.end(), '\xc3' ) ), Flags ) << List;
