@@ -5,7 +5,8 @@
 
 #include <cstddef>
 
-using namespace BlueVelvet;
+namespace BlueVelvet
+{
 
 TEST( BlueVelvetLoader, AMissingLibraryGivesNoFunctions ) { EXPECT_EQ( VRuntimeLibrary( "libNoSuchVendorRuntime.so" ).Functions(), nullptr ); }
 
@@ -56,4 +57,6 @@ TEST( BlueVelvet, TheDecodeRecordLiesAsTheDecoderExpects )
   EXPECT_EQ( offsetof( VHancDecodeRecord, m_AudioSource ), 92u );
   EXPECT_EQ( offsetof( VHancDecodeRecord, m_SplitMask ), 160u );
   EXPECT_EQ( offsetof( VHancDecodeRecord, m_MostSamples ), 164u );
+}
+
 }

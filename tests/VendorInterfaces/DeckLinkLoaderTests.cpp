@@ -2,7 +2,8 @@
 
 #include <gtest/gtest.h>
 
-using namespace DeckLinkAPI;
+namespace DeckLinkAPI
+{
 
 TEST( DeckLinkLoader, AMissingLibraryGivesNoDiscovery )
 {
@@ -22,4 +23,6 @@ TEST( DeckLinkLoader, TheOldestGenerationThatIsThereWins )
 {
   const VRuntimeLibrary Library( OLD_FACTORIES_LIBRARY );
   EXPECT_EQ( reinterpret_cast<uintptr_t>( Library.CreateDiscovery() ), 2u );
+}
+
 }
