@@ -1,5 +1,7 @@
 #include "tests/support/MovParser.h"
 
+#include "tests/support/ParserCheck.h"
+
 #include <algorithm>
 #include <fstream>
 #include <memory>
@@ -11,14 +13,6 @@ namespace TestSupport
 
 namespace
 {
-
-void Require( bool i_bHolds, const std::string& i_rWhat, uint64_t i_Position )
-{
-  if( !i_bHolds )
-  {
-    throw std::runtime_error( "mov: " + i_rWhat + " at " + std::to_string( i_Position ) );
-  }
-}
 
 // "tmcd" and "hdlr" are none: in a media header the one holds another atom, as a sample format it does not.
 const std::set<std::string> Containers = { "moov", "trak", "tapt", "edts", "tref", "mdia", "minf", "dinf", "gmhd", "stbl" };

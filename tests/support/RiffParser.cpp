@@ -1,5 +1,7 @@
 #include "tests/support/RiffParser.h"
 
+#include "tests/support/ParserCheck.h"
+
 #include <algorithm>
 #include <fstream>
 #include <iterator>
@@ -10,14 +12,6 @@ namespace TestSupport
 
 namespace
 {
-
-void Require( bool i_bHolds, const std::string& i_rWhat, uint64_t i_Position )
-{
-  if( !i_bHolds )
-  {
-    throw std::runtime_error( "riff: " + i_rWhat + " at " + std::to_string( i_Position ) );
-  }
-}
 
 bool IsNamed( const VRiffChunk& i_rChunk, const std::string& i_rIdOrForm )
 {

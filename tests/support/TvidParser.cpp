@@ -1,5 +1,7 @@
 #include "tests/support/TvidParser.h"
 
+#include "tests/support/ParserCheck.h"
+
 #include <cstring>
 #include <stdexcept>
 
@@ -8,14 +10,6 @@ namespace TestSupport
 
 namespace
 {
-
-void Require( bool i_bHolds, const std::string& i_rWhat, uint64_t i_Position )
-{
-  if( !i_bHolds )
-  {
-    throw std::runtime_error( "tvid: " + i_rWhat + " at " + std::to_string( i_Position ) );
-  }
-}
 
 uint64_t ImageSize( const std::string& i_rFormat, uint64_t i_Width, uint64_t i_Height )
 {

@@ -1,5 +1,6 @@
 #include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
 
+#include "tests/support/FakeVideoInputDevice.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/ManualPostalService.h"
 
@@ -12,41 +13,7 @@ namespace
 {
 
 using namespace VideoInputHAL;
-
-// Only its index and identifier matter to the manager.
-class VPlainDevice : public IVideoInputDevice
-{
-public:
-  void SetDeviceIndex( int32_t i_Index ) override { m_Index = i_Index; }
-  VCountCallback& GetDroppedFramesCallback() override { return m_Dropped; }
-  VEventCallback& GetStatusChangedCallback() override { return m_Event; }
-  VEventCallback& GetPixelFormatsChangedCallback() override { return m_Event; }
-  VEventCallback& GetVideoStandardChangedCallback() override { return m_Event; }
-  VEventCallback& GetTimecodeChangedCallback() override { return m_Event; }
-  void SetDataCallback( std::shared_ptr<IVideoInputDataCallback> ) override {}
-  void SetAllocator( std::shared_ptr<IVideoInputAllocator> ) override {}
-  std::string GetManufacturerName() const override { return {}; }
-  std::string GetDriverName() const override { return {}; }
-  std::string GetDeviceName() const override { return {}; }
-  std::string GetDeviceURN() const override { return MakeDeviceURN( m_Index ); }
-  KVZ::IVideoStandard::Enum GetVideoStandard() const override { return KVZ::IVideoStandard::EUnspecified; }
-  KVZ::IPixelFormat::Enum GetPixelFormat() const override { return KVZ::IPixelFormat::EUnspecified; }
-  KVZ::ITimecode GetTimecode() const override { return {}; }
-  void GetSupportedPixelFormats( std::set<KVZ::IPixelFormat::Enum>& ) const override {}
-  void GetSupportedTimecodeSources( std::set<KVZ::ITimecodeSource::Enum>& ) const override {}
-  void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& ) const override {}
-  void GetSupportedAudioSampleRates( std::set<uint32_t>& ) const override {}
-  void GetSupportedAudioChannelCounts( std::set<uint32_t>& ) const override {}
-  VDeviceResult StartCapture( KVZ::IPixelFormat::Enum, KVZ::ITimecodeSource::Enum, KVZ::IAudioSampleFormat::Enum, uint32_t ) override { return {}; }
-  bool StopCapture() override { return true; }
-  EStatus::Enum GetStatus() const override { return EStatus::EReady; }
-  int32_t GetDeviceIndex() const override { return m_Index; }
-
-private:
-  int32_t m_Index = -1;
-  NotificationSystem::VMultiCallbackPostal<void( unsigned int )> m_Dropped;
-  NotificationSystem::VMultiCallbackPostal<void()> m_Event;
-};
+using TestSupport::VFakeVideoInputDevice;
 
 // Announces on the caller's thread. The service of its own, which nothing runs here, must not come between it and the manager: devices of the first
 // driver have their places before the second begins.
@@ -106,11 +73,11 @@ TEST_F( VideoInputDeviceManager, WithoutCardsThereAreNoDevices )
 
 TEST_F( VideoInputDeviceManager, DriversShareOneIndexSpaceInOrderOfArrival )
 {
-  m_pFirst->m_OnDiscovery = { std::make_shared<VPlainDevice>() };
-  m_pSecond->m_OnDiscovery = { std::make_shared<VPlainDevice>(), std::make_shared<VPlainDevice>() };
+  m_pFirst->m_OnDiscovery = { std::make_shared<VFakeVideoInputDevice>() };
+  m_pSecond->m_OnDiscovery = { std::make_shared<VFakeVideoInputDevice>(), std::make_shared<VFakeVideoInputDevice>() };
   Listen();
   m_pManager->StartDiscovery();
-  const auto pLate = std::make_shared<VPlainDevice>();
+  const auto pLate = std::make_shared<VFakeVideoInputDevice>();
   m_pFirst->m_DeviceArrived( pLate );
 
   EXPECT_EQ( Devices(), ( VDevices{ m_pFirst->m_OnDiscovery[0], m_pSecond->m_OnDiscovery[0], m_pSecond->m_OnDiscovery[1], pLate } ) );
@@ -131,7 +98,7 @@ TEST_F( VideoInputDeviceManager, AnnouncesADeviceWithItsIndexBeforeItJoinsTheLis
       ListedThen = Devices().size();
       URNThen = i_pDevice->GetDeviceURN();
     } );
-  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  m_pFirst->m_DeviceArrived( std::make_shared<VFakeVideoInputDevice>() );
   EXPECT_EQ( ListedThen, 0u );
   EXPECT_EQ( URNThen, "vi:0" );
   EXPECT_EQ( Devices().size(), 1u );
@@ -139,7 +106,7 @@ TEST_F( VideoInputDeviceManager, AnnouncesADeviceWithItsIndexBeforeItJoinsTheLis
 
 TEST_F( VideoInputDeviceManager, ALateListenerGetsNoReplay )
 {
-  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  m_pFirst->m_DeviceArrived( std::make_shared<VFakeVideoInputDevice>() );
   Listen();
   m_pListenerService->RunAll();
   EXPECT_TRUE( m_Announced.empty() );
@@ -149,14 +116,14 @@ TEST_F( VideoInputDeviceManager, ListenersAreCalledOnTheManagersOwnThreadUnlessT
 {
   std::promise<boost::thread::id> Thread;
   m_pManager->GetDeviceAddedCallback().Add( [&]( const auto& ) { Thread.set_value( boost::this_thread::get_id() ); } );
-  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  m_pFirst->m_DeviceArrived( std::make_shared<VFakeVideoInputDevice>() );
   EXPECT_NE( Thread.get_future().get(), boost::this_thread::get_id() );
 }
 
 TEST_F( VideoInputDeviceManager, ShutdownLetsDevicesAndDriversGoAndKeepsTheIndices )
 {
   Listen();
-  auto pDevice = std::make_shared<VPlainDevice>();
+  auto pDevice = std::make_shared<VFakeVideoInputDevice>();
   m_pFirst->m_DeviceArrived( pDevice );
   m_pManager->Shutdown();
 
@@ -178,7 +145,7 @@ TEST_F( VideoInputDeviceManager, ShutdownLetsDevicesAndDriversGoAndKeepsTheIndic
 TEST_F( VideoInputDeviceManager, AnArrivalAfterTheManagersEndDoesNothing )
 {
   m_pManager.reset();
-  m_pFirst->m_DeviceArrived( std::make_shared<VPlainDevice>() );
+  m_pFirst->m_DeviceArrived( std::make_shared<VFakeVideoInputDevice>() );
   EXPECT_EQ( m_pFirst->m_DeviceArrived.Count(), 0u );
 }
 
@@ -189,7 +156,7 @@ TEST_F( VideoInputDeviceManager, ArrivalsOnSeveralThreadsWhileOthersReadGetIndic
   {
     for( int Count = 0; Count < PerDriver; ++Count )
     {
-      i_rDriver.m_DeviceArrived( std::make_shared<VPlainDevice>() );
+      i_rDriver.m_DeviceArrived( std::make_shared<VFakeVideoInputDevice>() );
     }
   };
   boost::thread First( Announce, boost::ref( *m_pFirst ) );
