@@ -109,29 +109,6 @@ TEST( Vocabulary, PackedImagesRoundUpWhereTheirLayoutDoes )
   EXPECT_EQ( GetImageSize( IPixelFormat::ER8G8B8u8, 65536, 65536 ), uint64_t{ 1 } << 34 );
 }
 
-// The sets are irregular on purpose; what is checked is where an obvious set would differ.
-TEST( WriterCapabilities, KeepTheirIrregularities )
-{
-  const auto& rMkv = GetVideoWriterCapabilities( IVideoContainer::EMKV );
-  EXPECT_TRUE( rMkv.IsPixelFormatSupported( IPixelFormat::EBayerGB8 ) );
-  EXPECT_FALSE( rMkv.IsPixelFormatSupported( IPixelFormat::EBayerRG8 ) );
-  EXPECT_FALSE( rMkv.IsPixelFormatSupported( IPixelFormat::EUnspecified ) );
-  const auto& rAvi = GetVideoWriterCapabilities( IVideoContainer::EAVI );
-  EXPECT_FALSE( rAvi.IsChannelCountSupported( 0 ) );
-  EXPECT_FALSE( rAvi.IsChannelCountSupported( 5 ) );
-  EXPECT_TRUE( rAvi.IsChannelCountSupported( 8 ) );
-  const auto& rImages = GetVideoWriterCapabilities( IVideoContainer::EIMAGES );
-  EXPECT_TRUE( rImages.IsPixelFormatSupported( IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_FALSE( rImages.IsVideoPayloadSupported( IVideoPayload::EUncompressed ) );
-  EXPECT_FALSE( rImages.IsChannelCountSupported( 0 ) );
-  EXPECT_FALSE( rImages.IsAudioSampleFormatSupported( IAudioSampleFormat::EInt16 ) );
-  const auto& rTvid = GetVideoWriterCapabilities( IVideoContainer::ETVID );
-  EXPECT_TRUE( rTvid.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( 99 ) ) );
-  EXPECT_FALSE( rTvid.IsVideoPayloadSupported( IVideoPayload::EImageJPEG ) );
-  EXPECT_TRUE( rTvid.IsChannelCountSupported( 16 ) );
-  EXPECT_FALSE( rTvid.IsChannelCountSupported( 17 ) );
-}
-
 TEST( WriterCapabilities, MovAndMp4AnswerAlikeAndNobodyTakesFlac )
 {
   const auto& rMov = GetVideoWriterCapabilities( IVideoContainer::EMOV );

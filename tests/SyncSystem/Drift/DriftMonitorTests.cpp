@@ -266,18 +266,4 @@ TEST( DriftMonitor, HistoryDropsItsOldestSegmentAtTheLimit )
   EXPECT_NEAR( Time, 1000.08, 0.02 );   // the oldest line reaches back
 }
 
-TEST( DriftMonitor, DumpNamesItsSettingsInOrder )
-{
-  VDriftMonitor Monitor( {} );
-  Add( Monitor, 0, 1.0 );
-  const std::string Text = Monitor.Dump();
-  size_t Position = 0;
-  for( const char* pName : { "NominalSampleRateInTicks = 5400000", "ObservationModel = ", "SystemModel = ((1, 1), (0, 1))",
-         "MeasurementNoise = ", "ProcessNoise = ", "MinUncertaintyToUpdateStartTime = 1000000000" } )
-  {
-    Position = Text.find( pName, Position );
-    ASSERT_NE( Position, std::string::npos ) << pName << "\n" << Text;
-  }
-}
-
 }
