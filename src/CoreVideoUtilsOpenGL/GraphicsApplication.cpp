@@ -80,4 +80,14 @@ VGraphicsCheck::VGraphicsCheck()
 {
 }
 
+void VGraphicsCheck::OutliveDisplay() const
+{
+  if( m_pDisplay )
+  {
+    VXDisplay::OutliveServer();
+  }
+}
+
+bool VGraphicsCheck::HasDisplayEnded() const { return m_pDisplay && VXDisplay::HasServerEnded(); }
+
 }

@@ -34,6 +34,10 @@ public:
   // Why there can be no context; empty where nothing is known to stand against it.
   const std::string& WhyUnusable() const { return m_WhyUnusable; }
 
+  // With a context current: the end of its display ends the process no more.
+  void OutliveDisplay() const;
+  bool HasDisplayEnded() const;
+
 private:
   const std::unique_ptr<VXDisplay> m_pDisplay;   // kept open beside Qt's own; empty where Qt needs none
   const std::string m_WhyUnusable;

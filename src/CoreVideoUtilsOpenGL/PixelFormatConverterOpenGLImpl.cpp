@@ -121,6 +121,7 @@ std::string VPixelFormatConverterOpenGL::VImpl::MakeContext()
   {
     return "the OpenGL context has no surface to draw on";
   }
+  m_Check.OutliveDisplay();
   if( !QOpenGLFramebufferObject::hasOpenGLFramebufferObjects() )
   {
     return "this OpenGL has no framebuffer objects";
@@ -143,7 +144,7 @@ VPixelFormatConverterOpenGL::EResult VPixelFormatConverterOpenGL::VImpl::Convert
   {
     return EResult::Refused;
   }
-  if( !m_Context.makeCurrent( &m_Surface ) )
+  if( !m_Context.makeCurrent( &m_Surface ) || m_Check.HasDisplayEnded() )
   {
     return EResult::Lost;
   }

@@ -5,6 +5,7 @@
 #include <GL/glx.h>
 #include <X11/Xlib.h>
 
+#include <atomic>
 #include <memory>
 
 namespace CoreVideoUtilsOpenGL
@@ -20,6 +21,17 @@ int LogXError( Display*, XErrorEvent* i_pError )
   return 0;
 }
 
+// What follows is up to the connection's own function: to end the process, or the one below.
+int LogXEnd( Display* )
+{
+  KVZ_LOG_ERROR( "CoreVideoUtilsOpenGL", "The X server has ended" );
+  return 0;
+}
+
+std::atomic<bool> s_bServerEnded{ false };
+
+void NoteXEnd( Display*, void* ) { s_bServerEnded = true; }
+
 }
 
 struct VXDisplay::VConnection
@@ -32,7 +44,12 @@ struct VXDisplay::VConnection
   static std::unique_ptr<VConnection> Open()
   {
     Display* const pDisplay = XOpenDisplay( nullptr );
-    return pDisplay ? std::make_unique<VConnection>( pDisplay ) : nullptr;
+    if( !pDisplay )
+    {
+      return nullptr;
+    }
+    XSetIOErrorExitHandler( pDisplay, &NoteXEnd, nullptr );
+    return std::make_unique<VConnection>( pDisplay );
   }
 
   Display* const m_pDisplay;
@@ -44,6 +61,10 @@ VXDisplay::~VXDisplay() = default;
 
 std::string VXDisplay::WhyUnusable() const
 {
+  if( HasServerEnded() )
+  {
+    return "the X server has ended";
+  }
   if( !m_pConnection )
   {
     return "there is no X display";
@@ -60,8 +81,27 @@ std::string VXDisplay::WhyUnusable() const
   return pFormats && Count > 0 ? "" : "the X display has no format of pixels for OpenGL";
 }
 
-VXErrorsLogged::VXErrorsLogged() : m_pFormer( reinterpret_cast<void ( * )()>( XSetErrorHandler( &LogXError ) ) ) {}
+void VXDisplay::OutliveServer()
+{
+  if( Display* const pDisplay = glXGetCurrentDisplay() )
+  {
+    XSetIOErrorExitHandler( pDisplay, &NoteXEnd, nullptr );
+  }
+}
 
-VXErrorsLogged::~VXErrorsLogged() { XSetErrorHandler( reinterpret_cast<XErrorHandler>( m_pFormer ) ); }
+bool VXDisplay::HasServerEnded() { return s_bServerEnded; }
+
+VXErrorsLogged::VXErrorsLogged()
+  : m_pFormer( reinterpret_cast<void ( * )()>( XSetErrorHandler( &LogXError ) ) ),
+    m_pFormerEnd( reinterpret_cast<void ( * )()>( XSetIOErrorHandler( &LogXEnd ) ) )
+{
+  s_bServerEnded = false;
+}
+
+VXErrorsLogged::~VXErrorsLogged()
+{
+  XSetErrorHandler( reinterpret_cast<XErrorHandler>( m_pFormer ) );
+  XSetIOErrorHandler( reinterpret_cast<XIOErrorHandler>( m_pFormerEnd ) );
+}
 
 }
