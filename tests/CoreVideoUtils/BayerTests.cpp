@@ -1,9 +1,9 @@
 #include "CoreVideoUtils/PixelFormatConverter.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <random>
 #include <vector>
 
 using KVZ::IPixelFormat;
@@ -11,7 +11,7 @@ using KVZ::IPixelFormat;
 namespace
 {
 
-using VBytes = std::vector<uint8_t>;
+using TestSupport::VBytes;
 
 // How the patterns are moved against one that begins with red, in the words of the shader that does the same on the graphics card
 struct VPattern
@@ -42,25 +42,13 @@ VBytes Convert( const VImage& i_rImage, IPixelFormat::Enum i_Source, IPixelForma
 {
   CoreVideoUtils::VPixelFormatConverter Converter;
   Converter.SetColourCorrection( i_rColour );
-  KVZ::VideoFrameInfo Info;
-  Info.m_PixelFormat = i_Source;
-  Info.m_ImageWidth = static_cast<uint32_t>( i_rImage.m_Width );
-  Info.m_ImageHeight = static_cast<uint32_t>( i_rImage.m_Height );
+  const auto Info = TestSupport::VideoInfo( i_Source, static_cast<uint32_t>( i_rImage.m_Width ), static_cast<uint32_t>( i_rImage.m_Height ) );
   VBytes Target( static_cast<size_t>( KVZ::GetImageSize( i_Target, Info.m_ImageWidth, Info.m_ImageHeight ) ) );
   EXPECT_TRUE( Converter.Convert( Info, i_rImage.m_Bytes.data(), i_rImage.m_Bytes.size(), i_Target, Target.data(), Target.size() ) );
   return Target;
 }
 
-VImage MakeNoise( int i_Width, int i_Height )
-{
-  std::mt19937 Random( 5 );
-  VImage Image = { i_Width, i_Height, VBytes( static_cast<size_t>( i_Width * i_Height ) ) };
-  for( uint8_t& rByte : Image.m_Bytes )
-  {
-    rByte = static_cast<uint8_t>( Random() >> 8 );
-  }
-  return Image;
-}
+VImage MakeNoise( int i_Width, int i_Height ) { return { i_Width, i_Height, TestSupport::Noise( static_cast<size_t>( i_Width * i_Height ), 5 ) }; }
 
 // What a pixel of the pattern shows: 0 red, 1 green, 2 blue.
 int ChannelAt( const VPattern& i_rPattern, int i_X, int i_Y )

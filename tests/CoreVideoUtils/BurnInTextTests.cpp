@@ -1,6 +1,7 @@
 #include "CoreVideoUtils/BurnInText.h"
 #include "CoreVideoUtils/PixelFormatConverter.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
@@ -9,20 +10,12 @@
 
 using namespace CoreVideoUtils;
 using KVZ::IPixelFormat;
+using TestSupport::VideoInfo;
 
 namespace
 {
 
 constexpr const char* Category = "CoreVideoUtils";
-
-KVZ::VideoFrameInfo Info( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
-{
-  KVZ::VideoFrameInfo Result;
-  Result.m_ImageWidth = i_Width;
-  Result.m_ImageHeight = i_Height;
-  Result.m_PixelFormat = i_Format;
-  return Result;
-}
 
 // Byte k of a pixel of grey g is g + 3 k; knows a single target, straight from grey.
 class VCountingConverter : public KVZ::IPixelFormatConverter
@@ -118,7 +111,7 @@ TEST_P( BurnInTextDraws, EachGlyphOnItsBox )
   const std::vector<uint8_t> Expected = Drawn( Image, Width, rCase.m_PixelBytes, rCase.m_Place, Text );
   Image.resize( Size + Guard, 0xEE );
   VCountingConverter Converter( rCase.m_Format );
-  const KVZ::VideoFrameInfo Frame = Info( rCase.m_Format, Width, Height );
+  const KVZ::VideoFrameInfo Frame = VideoInfo( rCase.m_Format, Width, Height );
   ASSERT_TRUE( BurnInText( Converter, Frame, rCase.m_Place.m_SizeIndex, rCase.m_Place.m_X, rCase.m_Place.m_Y, Text, Image.data(), Size ) );
   EXPECT_TRUE( std::equal( Expected.begin(), Expected.end(), Image.begin() ) );
   EXPECT_EQ( std::count( Image.begin() + static_cast<long>( Size ), Image.end(), 0xEE ), static_cast<long>( Guard ) );
@@ -141,7 +134,7 @@ std::vector<uint8_t> ImageOf( IPixelFormat::Enum i_Format, uint8_t i_Byte )
 bool Draw( IPixelFormat::Enum i_Format, std::vector<uint8_t>& io_rImage, const std::string& i_rText, uint32_t i_SizeIndex = 0 )
 {
   VPixelFormatConverter Converter;
-  return BurnInText( Converter, Info( i_Format, Width, Height ), i_SizeIndex, 9, 4, i_rText, io_rImage.data(), io_rImage.size() );
+  return BurnInText( Converter, VideoInfo( i_Format, Width, Height ), i_SizeIndex, 9, 4, i_rText, io_rImage.data(), io_rImage.size() );
 }
 
 // The sample of a ten-bit image: of six pixels in four words the samples are U0 Y0 V0, Y1 U1 Y2, V1 Y3 U2, Y4 V2 Y5.
@@ -205,7 +198,7 @@ TEST( BurnInText, FindsTheWayThroughColour )
   std::vector<uint8_t> Image = ImageOf( IPixelFormat::EU8Y8V8Y8, 77 );
   std::vector<uint8_t> Straight = Image;
   ASSERT_TRUE( Draw( IPixelFormat::EU8Y8V8Y8, Straight, "8" ) );
-  ASSERT_TRUE( BurnInText( Converter, Info( IPixelFormat::EU8Y8V8Y8, Width, Height ), 0, 9, 4, "8", Image.data(), Image.size() ) );
+  ASSERT_TRUE( BurnInText( Converter, VideoInfo( IPixelFormat::EU8Y8V8Y8, Width, Height ), 0, 9, 4, "8", Image.data(), Image.size() ) );
   for( size_t Byte = 0; Byte < Image.size(); ++Byte )
   {
     ASSERT_NEAR( Image[Byte], Straight[Byte], 1 ) << Byte;
@@ -218,7 +211,7 @@ TEST( BurnInText, AConversionThatFailsDrawsNothing )
   VCountingConverter Converter( IPixelFormat::ER8G8B8 );
   Converter.m_Refused = 200;
   std::vector<uint8_t> Image = ImageOf( IPixelFormat::ER8G8B8, 1 );
-  EXPECT_FALSE( BurnInText( Converter, Info( IPixelFormat::ER8G8B8, Width, Height ), 0, 0, 0, "1", Image.data(), Image.size() ) );
+  EXPECT_FALSE( BurnInText( Converter, VideoInfo( IPixelFormat::ER8G8B8, Width, Height ), 0, 0, 0, "1", Image.data(), Image.size() ) );
   EXPECT_EQ( Image, ImageOf( IPixelFormat::ER8G8B8, 1 ) );
   for( const auto Packed : { IPixelFormat::ELuminance7, IPixelFormat::EBayerGB6 } )
   {
@@ -227,7 +220,7 @@ TEST( BurnInText, AConversionThatFailsDrawsNothing )
     EXPECT_EQ( Image, ImageOf( Packed, 1 ) );
   }
   EXPECT_TRUE( Log.Has( "Text cannot be drawn into frames of the pixel format 'Luminance7'." ) );
-  EXPECT_TRUE( BurnInText( Converter, Info( IPixelFormat::EUnspecified, 0, 0 ), 0, 0, 0, "", nullptr, 0 ) ) << "nothing to draw";
+  EXPECT_TRUE( BurnInText( Converter, VideoInfo( IPixelFormat::EUnspecified, 0, 0 ), 0, 0, 0, "", nullptr, 0 ) ) << "nothing to draw";
 }
 
 TEST( BurnInText, AnUnknownSizeIsTheMiddleOne )

@@ -1,4 +1,5 @@
 #include "CoreVideoUtils/ColourCorrector.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
@@ -11,7 +12,7 @@ using CoreVideoUtils::VColourCorrector;
 namespace
 {
 
-using VBytes = std::vector<uint8_t>;
+using TestSupport::VBytes;
 
 VBytes Apply( const VColourCorrector& i_rCorrector, VBytes i_Pixels, size_t i_BytesPerPixel )
 {

@@ -4,6 +4,7 @@
 #include "tests/CoreVideoUtils/GuardedBytes.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
@@ -20,7 +21,8 @@ using KVZ::IPixelFormat;
 namespace
 {
 
-using VBytes = std::vector<uint8_t>;
+using TestSupport::Noise;
+using TestSupport::VBytes;
 
 struct VSize
 {
@@ -30,11 +32,7 @@ struct VSize
 
 KVZ::VideoFrameInfo MakeInfo( IPixelFormat::Enum i_Format, VSize i_Size )
 {
-  KVZ::VideoFrameInfo Info;
-  Info.m_PixelFormat = i_Format;
-  Info.m_ImageWidth = i_Size.m_Width;
-  Info.m_ImageHeight = i_Size.m_Height;
-  return Info;
+  return TestSupport::VideoInfo( i_Format, i_Size.m_Width, i_Size.m_Height );
 }
 
 size_t SizeOf( IPixelFormat::Enum i_Format, VSize i_Size )
@@ -56,17 +54,6 @@ VBytes Convert( IPixelFormat::Enum i_Source, const VBytes& i_rSource, IPixelForm
 {
   VPixelFormatConverter Converter;
   return Convert( Converter, i_Source, i_rSource, i_Target, i_Size );
-}
-
-VBytes Noise( size_t i_Size, unsigned i_Seed )
-{
-  std::mt19937 Random( i_Seed );
-  VBytes Bytes( i_Size );
-  for( uint8_t& rByte : Bytes )
-  {
-    rByte = static_cast<uint8_t>( Random() >> 8 );
-  }
-  return Bytes;
 }
 
 std::set<std::string> Names( const std::string& i_rNames )
@@ -294,21 +281,6 @@ TEST( PixelFormatConverter, AssertsPairsOfTenBitPixels )
   EXPECT_TRUE( Assertions.Expressions().empty() );
   EXPECT_FALSE( Convert( IPixelFormat::EU10Y10V10Y10, VBytes( 3 * 128 ), IPixelFormat::ER8G8B8, { 3, 3 } ).empty() );
   EXPECT_EQ( std::vector<std::string>{ "( ( i_Width * i_Height ) % 2 ) == 0" }, Assertions.Expressions() );
-}
-
-TEST( PixelFormatConverter, PacksHighBitsWithoutGaps )
-{
-  const VBytes Nine = { 0xFF, 0x01, 0xFF, 0x80, 0x02, 0xAB, 0xFE, 0x7E, 0xC3 };
-  // 1111111 0000000 1111111 1000000 0000001 1010101 1111111 0111111, 1100001
-  const VBytes Seven = { 0xFE, 0x03, 0xFC, 0x00, 0x35, 0x7F, 0xBF, 0xC2 };
-  // 111111 000000 111111 100000, 000000 101010 111111 011111, 110000
-  const VBytes Six = { 0xFC, 0x0F, 0xE0, 0x02, 0xAF, 0xDF, 0xC0 };
-  EXPECT_EQ( Seven, Convert( IPixelFormat::ELuminance8, Nine, IPixelFormat::ELuminance7, { 9, 1 } ) );
-  EXPECT_EQ( Six, Convert( IPixelFormat::EBayerGB8, Nine, IPixelFormat::EBayerGB6, { 3, 3 } ) );
-  EXPECT_EQ( ( VBytes{ 0xFE, 0x00, 0xFE, 0x80, 0x02, 0xAA, 0xFE, 0x7E, 0xC2 } ),
-    Convert( IPixelFormat::ELuminance7, Seven, IPixelFormat::ELuminance8, { 9, 1 } ) );
-  EXPECT_EQ( ( VBytes{ 0xFC, 0x00, 0xFC, 0x80, 0x00, 0xA8, 0xFC, 0x7C, 0xC0 } ),
-    Convert( IPixelFormat::EBayerGB6, Six, IPixelFormat::EBayerGB8, { 3, 3 } ) );
 }
 
 // The bits of each value from its highest one on, one after another.

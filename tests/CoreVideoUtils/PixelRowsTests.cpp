@@ -117,6 +117,15 @@ void CompareRow( VRowFormats i_Formats, size_t i_Width, std::mt19937& io_rRandom
   ASSERT_TRUE( Target.IsFrontWhole() && Source.IsFrontWhole() );
 }
 
+void CompareAll( VRowFormats i_Formats, const VBytes& i_rSource, size_t i_Pixels )
+{
+  VBytes Target( i_Pixels * 4 );
+  VBytes Expected( i_Pixels * 4 );
+  ASSERT_TRUE( ConvertRow( i_Formats, i_rSource.data(), Target.data(), i_Pixels ) );
+  ASSERT_TRUE( Reference::ConvertRow( i_Formats, i_rSource.data(), Expected.data(), i_Pixels ) );
+  EXPECT_TRUE( Target == Expected ) << i_Formats.m_Target;
+}
+
 TEST_P( PixelRows, EqualTheReferenceAtEveryWidth )
 {
   std::mt19937 Random( 1 );
@@ -145,13 +154,7 @@ TEST_P( PixelRows, EqualTheReferenceForAllChroma )
       Pairs.insert( Pairs.end(), { static_cast<uint8_t>( Value ), Luma, static_cast<uint8_t>( Value >> 8 ), static_cast<uint8_t>( Value + Luma ) } );
     }
   }
-  const size_t Pixels = Pairs.size() / 2;
-  VBytes Target( Pixels * 4 );
-  VBytes Expected( Pixels * 4 );
-  const VRowFormats Formats = { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EB8G8R8u8 };
-  ASSERT_TRUE( ConvertRow( Formats, Pairs.data(), Target.data(), Pixels ) );
-  ASSERT_TRUE( Reference::ConvertRow( Formats, Pairs.data(), Expected.data(), Pixels ) );
-  EXPECT_TRUE( Target == Expected );
+  CompareAll( { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EB8G8R8u8 }, Pairs, Pairs.size() / 2 );
 }
 
 TEST_P( PixelRows, EqualTheReferenceForAllColours )
@@ -167,15 +170,8 @@ TEST_P( PixelRows, EqualTheReferenceForAllColours )
       Colours.insert( Colours.end(), Colour.begin(), Colour.end() );
     }
   }
-  const size_t Pixels = Colours.size() / 3;
-  VBytes Target( Pixels * 2 );
-  VBytes Expected( Pixels * 2 );
-  for( const IPixelFormat::Enum Format : { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ELuminance8 } )
-  {
-    ASSERT_TRUE( ConvertRow( { IPixelFormat::ER8G8B8, Format }, Colours.data(), Target.data(), Pixels ) );
-    ASSERT_TRUE( Reference::ConvertRow( { IPixelFormat::ER8G8B8, Format }, Colours.data(), Expected.data(), Pixels ) );
-    EXPECT_TRUE( Target == Expected ) << Format;
-  }
+  CompareAll( { IPixelFormat::ER8G8B8, IPixelFormat::EU8Y8V8Y8 }, Colours, Colours.size() / 3 );
+  CompareAll( { IPixelFormat::ER8G8B8, IPixelFormat::ELuminance8 }, Colours, Colours.size() / 3 );
 }
 
 TEST_P( PixelRows, EqualTheReferenceForAllTenBitChroma )
@@ -196,13 +192,7 @@ TEST_P( PixelRows, EqualTheReferenceForAllTenBitChroma )
     }
   }
   Words.resize( Words.size() / 128 * 128 );
-  const size_t Pixels = Words.size() / 128 * 48;
-  VBytes Target( Pixels * 4 );
-  VBytes Expected( Pixels * 4 );
-  const VRowFormats Formats = { IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8u8 };
-  ASSERT_TRUE( ConvertRow( Formats, Words.data(), Target.data(), Pixels ) );
-  ASSERT_TRUE( Reference::ConvertRow( Formats, Words.data(), Expected.data(), Pixels ) );
-  EXPECT_TRUE( Target == Expected );
+  CompareAll( { IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8u8 }, Words, Words.size() / 128 * 48 );
 }
 
 // Five rows with their borders, and behind them what may be read

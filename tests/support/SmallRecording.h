@@ -6,6 +6,8 @@
 #include "tests/support/MemoryFile.h"
 #include "tests/support/TestFrames.h"
 
+#include <optional>
+
 namespace TestSupport
 {
 
@@ -21,13 +23,14 @@ struct VHeader
   KVZ::VColourRecord m_Colour{};
   KVZ::IVideoAttributes m_Attributes{};
   KVZ::IVideoPayload::Enum m_Payload = KVZ::IVideoPayload::EUncompressed;
+  std::optional<KVZ::IAudioPayload::Enum> m_AudioPayload{};   // otherwise uncompressed where there is sound
 
   size_t ImageBytes() const { return KVZ::GetImageSize( m_Video.m_PixelFormat, m_Video.m_ImageWidth, m_Video.m_ImageHeight ); }
   size_t SampleBytes() const { return m_Audio.m_Channels * KVZ::GetBytesPerSample( m_Audio.m_SampleFormat ); }   // of all channels
 
   bool WriteTo( KVZ::IVideoWriter& io_rWriter ) const
   {
-    const auto AudioPayload = m_Audio.IsEmpty() ? KVZ::IAudioPayload::ENone : KVZ::IAudioPayload::EUncompressed;
+    const auto AudioPayload = m_AudioPayload.value_or( m_Audio.IsEmpty() ? KVZ::IAudioPayload::ENone : KVZ::IAudioPayload::EUncompressed );
     return io_rWriter.WriteHeader( m_Video, m_Audio, m_Timing, m_Timecode, m_Colour, m_Attributes, m_Payload, AudioPayload );
   }
 

@@ -9,18 +9,7 @@ using KVZ::ITimecodeStandard;
 namespace
 {
 
-ITimecode Timecode( int32_t i_Standard, uint8_t i_Hours, uint8_t i_Minutes, uint8_t i_Seconds, uint8_t i_Frames )
-{
-  ITimecode Result;
-  Result.m_Standard = i_Standard;
-  Result.m_Hours = i_Hours;
-  Result.m_Minutes = i_Minutes;
-  Result.m_Seconds = i_Seconds;
-  Result.m_Frames = i_Frames;
-  return Result;
-}
-
-const ITimecode Start25 = Timecode( ITimecodeStandard::ETimecode25, 1, 2, 3, 4 );
+const ITimecode Start25 = ITimecode{ ITimecodeStandard::ETimecode25, 1, 2, 3, 4 };
 
 }
 
@@ -30,7 +19,7 @@ TEST( ImageFileNames, KeywordsGiveWayToNumberAndTimecode )
   EXPECT_EQ( MakeFileName( "%FRAME%-%FRAME%", { 7, 3 } ), "007-007" );
   EXPECT_EQ( MakeFileName( "%FRAME%", { 123456789012 } ), "123456789012" ) << "more digits than the pad";
   EXPECT_EQ( MakeFileName( "%TIMECODE%", { 0, 8, Start25 } ), "01020304" );
-  EXPECT_EQ( MakeFileName( "%TIMECODE%", { 0, 8, Timecode( ITimecodeStandard::ETimecode30Drop, 1, 2, 3, 4 ) } ), "01020304" );
+  EXPECT_EQ( MakeFileName( "%TIMECODE%", { 0, 8, ITimecode{ ITimecodeStandard::ETimecode30Drop, 1, 2, 3, 4 } } ), "01020304" );
   EXPECT_EQ( MakeFileName( "%TIMECODE%", { 0, 8, {} } ), "none" );
   EXPECT_EQ( MakeFileName( "still", { 12 } ), "still" );
 }
@@ -50,7 +39,7 @@ TEST( ImageFileNames, TheTimecodeGoesOnWithTheFrames )
   EXPECT_EQ( KVZ::ToText( TimecodeOfFrame( Start25, { 25000, 1000, 0 }, 3 ) ), "01:02:03:07" ) << "another tick rate";
   EXPECT_EQ( KVZ::ToText( TimecodeOfFrame( Start25, { 0, 1000, 0 }, 3 ) ), "01:02:03:04" );
   EXPECT_EQ( KVZ::ToText( TimecodeOfFrame( Start25, { 7, 3, 0 }, 3 ) ), "01:02:03:04" ) << "no whole number of ticks";
-  const ITimecode Drop = Timecode( ITimecodeStandard::ETimecode30Drop, 0, 0, 59, 29 );
+  const ITimecode Drop = ITimecode{ ITimecodeStandard::ETimecode30Drop, 0, 0, 59, 29 };
   EXPECT_EQ( KVZ::ToText( TimecodeOfFrame( Drop, { 135000000, 4504500, 0 }, 1 ) ), "00:01:00;02" );
 }
 

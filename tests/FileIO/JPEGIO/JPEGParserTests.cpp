@@ -5,6 +5,7 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/MemoryFile.h"
 #include "tests/support/SlowJPEGParser.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 #include <turbojpeg.h>
@@ -18,7 +19,7 @@ using JPEGIO::VJPEGSegment;
 namespace
 {
 
-using VBytes = std::vector<uint8_t>;
+using TestSupport::VBytes;
 
 VBytes operator+( VBytes i_Front, const VBytes& i_rBack )
 {
@@ -34,9 +35,7 @@ const VBytes Scan = { 0xFF, 0xDA, 0x00, 0x03, 0x01 };
 // A noisy image as TurboJPEG makes it.
 VBytes MakeJPEG( int i_Width, int i_Height, int i_Subsampling, int i_Flags )
 {
-  VBytes Pixels( static_cast<size_t>( i_Width * i_Height ) * 3 );
-  std::mt19937 Random( 7 );
-  std::generate( Pixels.begin(), Pixels.end(), [&] { return static_cast<uint8_t>( Random() ); } );
+  const VBytes Pixels = TestSupport::Noise( static_cast<size_t>( i_Width * i_Height ) * 3, 7 );
   const tjhandle Handle = tjInitCompress();
   unsigned char* pImage = nullptr;
   unsigned long Size = 0;

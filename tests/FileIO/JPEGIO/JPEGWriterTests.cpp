@@ -1,16 +1,16 @@
 #include "FileIO/JPEGIO/JPEGWriter.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 #include <turbojpeg.h>
 
 #include <dlfcn.h>
 
-#include <random>
-
 using KVZ::IPixelFormat;
 using UtilsMemory::VByteVector;
+using namespace TestSupport;
 
 namespace
 {
@@ -46,23 +46,6 @@ extern "C" int tjCompressFromYUV( tjhandle i_Handle, const unsigned char* i_pPla
 
 namespace
 {
-
-KVZ::VideoFrameInfo Info( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
-{
-  KVZ::VideoFrameInfo Result;
-  Result.m_ImageWidth = i_Width;
-  Result.m_ImageHeight = i_Height;
-  Result.m_PixelFormat = i_Format;
-  return Result;
-}
-
-std::vector<uint8_t> Noise( size_t i_Size )
-{
-  std::vector<uint8_t> Bytes( i_Size );
-  std::mt19937 Random( 3 );
-  std::generate( Bytes.begin(), Bytes.end(), [&] { return static_cast<uint8_t>( Random() ); } );
-  return Bytes;
-}
 
 // Every i_Step-th byte from i_First on.
 std::vector<uint8_t> Plane( const std::vector<uint8_t>& i_rBytes, size_t i_First, size_t i_Step )
@@ -136,14 +119,14 @@ TEST( JPEGWriter, GivesTheBytesOfTurboJPEG )
   for( const VCase& rCase : Cases )
   {
     SCOPED_TRACE( rCase.m_Format );
-    const KVZ::VideoFrameInfo Image = Info( rCase.m_Format, 67, 35 );
-    const std::vector<uint8_t> Pixels = Noise( 67 * 35 * rCase.m_PixelBytes );
+    const KVZ::VideoFrameInfo Image = VideoInfo( rCase.m_Format, 67, 35 );
+    const std::vector<uint8_t> Pixels = Noise( 67 * 35 * rCase.m_PixelBytes, 3 );
     EXPECT_EQ( Write( Pixels, Image ), VTurboJPEG().Packed( Pixels, Image, rCase.m_TurboFormat, rCase.m_Subsampling ) );
   }
   // Two pixels in four bytes: U Y V Y and Y U Y V
-  const std::vector<uint8_t> Pixels = Noise( 66 * 35 * 2 );
-  const KVZ::VideoFrameInfo UYVY = Info( IPixelFormat::EU8Y8V8Y8, 66, 35 );
-  const KVZ::VideoFrameInfo YUYV = Info( IPixelFormat::EY8U8Y8V8, 66, 35 );
+  const std::vector<uint8_t> Pixels = Noise( 66 * 35 * 2, 3 );
+  const KVZ::VideoFrameInfo UYVY = VideoInfo( IPixelFormat::EU8Y8V8Y8, 66, 35 );
+  const KVZ::VideoFrameInfo YUYV = VideoInfo( IPixelFormat::EY8U8Y8V8, 66, 35 );
   EXPECT_EQ( Write( Pixels, UYVY ), VTurboJPEG().Planar( { Plane( Pixels, 1, 2 ), Plane( Pixels, 0, 4 ), Plane( Pixels, 2, 4 ) }, UYVY ) );
   EXPECT_EQ( Write( Pixels, YUYV ), VTurboJPEG().Planar( { Plane( Pixels, 0, 2 ), Plane( Pixels, 1, 4 ), Plane( Pixels, 3, 4 ) }, YUYV ) );
 }
@@ -153,35 +136,35 @@ TEST( JPEGWriter, KeepsTurboJPEGFromReallocating )
   for( const IPixelFormat::Enum Format : { IPixelFormat::ELuminance8, IPixelFormat::ER8G8B8, IPixelFormat::EU8Y8V8Y8 } )
   {
     s_Flags = 0;
-    Write( Noise( 8 * 8 * 3 ), Info( Format, 8, 8 ) );
+    Write( Noise( 8 * 8 * 3, 3 ), VideoInfo( Format, 8, 8 ) );
     EXPECT_EQ( s_Flags, 0x400 ) << Format;
   }
 }
 
 TEST( JPEGWriter, RefusesWhatItCannotTake )
 {
-  const TestSupport::VAssertionCapture Assertions;
-  const std::vector<uint8_t> Pixels = Noise( 64 * 4 );
+  const VAssertionCapture Assertions;
+  const std::vector<uint8_t> Pixels = Noise( 64 * 4, 3 );
   VByteVector Output;
   VByteVector Scratch;
   const auto bWritten = [&]( const KVZ::VideoFrameInfo& i_rInfo, size_t i_Size )
   { return JPEGIO::JPEGWriter( Pixels.data(), i_Size, i_rInfo, Quality, Output, Scratch ); };
-  EXPECT_TRUE( bWritten( Info( IPixelFormat::ELuminance8, 8, 8 ), 64 ) );
-  EXPECT_FALSE( bWritten( Info( IPixelFormat::ELuminance8, 8, 8 ), 63 ) );
-  EXPECT_FALSE( bWritten( Info( IPixelFormat::ELuminance8, 0, 8 ), 64 ) );
-  EXPECT_FALSE( bWritten( Info( IPixelFormat::EU8Y8V8Y8, 7, 8 ), 256 ) );
-  EXPECT_FALSE( bWritten( Info( IPixelFormat::EU10Y10V10Y10, 8, 1 ), 256 ) );
+  EXPECT_TRUE( bWritten( VideoInfo( IPixelFormat::ELuminance8, 8, 8 ), 64 ) );
+  EXPECT_FALSE( bWritten( VideoInfo( IPixelFormat::ELuminance8, 8, 8 ), 63 ) );
+  EXPECT_FALSE( bWritten( VideoInfo( IPixelFormat::ELuminance8, 0, 8 ), 64 ) );
+  EXPECT_FALSE( bWritten( VideoInfo( IPixelFormat::EU8Y8V8Y8, 7, 8 ), 256 ) );
+  EXPECT_FALSE( bWritten( VideoInfo( IPixelFormat::EU10Y10V10Y10, 8, 1 ), 256 ) );
   EXPECT_TRUE( Assertions.Expressions().empty() );
 }
 
 TEST( JPEGWriter, AssertsThatTurboJPEGSucceeds )
 {
-  const TestSupport::VAssertionCapture Assertions;
-  const TestSupport::VLogCapture Log( "JPEGIO" );
-  const std::vector<uint8_t> Pixels = Noise( 64 );
+  const VAssertionCapture Assertions;
+  const VLogCapture Log( "JPEGIO" );
+  const std::vector<uint8_t> Pixels = Noise( 64, 3 );
   VByteVector Output;
   VByteVector Scratch;
-  EXPECT_FALSE( JPEGIO::JPEGWriter( Pixels.data(), Pixels.size(), Info( IPixelFormat::ELuminance8, 8, 8 ), 101, Output, Scratch ) );
+  EXPECT_FALSE( JPEGIO::JPEGWriter( Pixels.data(), Pixels.size(), VideoInfo( IPixelFormat::ELuminance8, 8, 8 ), 101, Output, Scratch ) );
   EXPECT_EQ( Assertions.Expressions(), std::vector<std::string>{ "Result == 0" } );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "TurboJPEG: tjCompress2(): Invalid argument" } );
   EXPECT_TRUE( Output.empty() );

@@ -1,9 +1,6 @@
 // What the writer says, and what it leaves behind, when the disk fails or the process ends.
 #include "tests/FileIO/MkvIO/SmallMovie.h"
 #include "tests/support/EbmlParser.h"
-#include "tests/support/FileSizeLimit.h"
-#include "tests/support/ProgramRun.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
@@ -99,34 +96,4 @@ TEST( MkvWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
     // The frames before a failed frame still get their tables.
     EXPECT_TRUE( bFinished || Operation < HeaderOperations || Result.m_Written == std::size( Pictures ) );
   }
-}
-
-TEST( MkvWriterFailures, OnARealDisk )
-{
-  VMkvWriter Full;
-  ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( VDescription().WriteTo( Full ) );
-  EXPECT_FALSE( Full.Close() );
-  VMkvWriter Nowhere;
-  EXPECT_FALSE( Nowhere.Open( "/no such folder/file.mkv" ) );
-
-  const VTemporaryFolder Folder;
-  const VFileSizeLimit Limit( 10000 );
-  VDescription Description;
-  Description.m_Video = VideoInfo( IPixelFormat::ELuminance8, 40, 30 );
-  Description.m_Audio = {};
-  VMkvWriter Writer;
-  ASSERT_TRUE( Writer.Open( Folder.File( "cut.mkv" ) ) && Description.WriteTo( Writer ) );
-  uint64_t Written = 0;
-  while( Description.WriteFrame( Writer, VBytes( 1200, 'x' ) ) )
-  {
-    ++Written;
-  }
-  EXPECT_GT( Written, 2u );
-  EXPECT_LT( Written, 7u );
-  EXPECT_FALSE( Writer.Close() );
-  const VRunResult Probe = RunProgram( { "ffprobe", "-v", "warning", "-count_frames", "-show_entries", "stream=nb_read_frames:format=duration", "-of",
-    "csv=p=0", Folder.File( "cut.mkv" ) } );
-  EXPECT_EQ( Probe.m_Error, "" );
-  EXPECT_EQ( Probe.m_Output.substr( 0, 4 ), std::to_string( Written ) + "\n0." ) << "as many frames, and a duration";
 }

@@ -53,22 +53,6 @@ TEST( MkvTracks, EveryPixelFormatHasItsBitmapHeader )
   }
 }
 
-TEST( MkvTracks, VideoIsDescribed )
-{
-  VDescription Description;
-  Description.m_Video = VideoInfo( IPixelFormat::EU8Y8V8Y8, 720, 486 );
-  const VEbmlParser File = HeaderOf( Description );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::TrackNumber } ) ), 1u );
-  EXPECT_NE( File.Number( InTrack( { Ebml::TrackUID } ) ), 0u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::TrackType } ) ), 1u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::FlagLacing } ) ), 0u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::DefaultDuration } ) ), 33366666u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::Video, Ebml::PixelWidth } ) ), 720u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::Video, Ebml::PixelHeight } ) ), 486u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::Video, Ebml::DisplayWidth } ) ), 720u );
-  EXPECT_EQ( File.Number( InTrack( { Ebml::Video, Ebml::DisplayHeight } ) ), 486u );
-}
-
 TEST( MkvTracks, AJPEGTrackHasNoPrivateData )
 {
   VDescription Description;
@@ -78,39 +62,6 @@ TEST( MkvTracks, AJPEGTrackHasNoPrivateData )
   EXPECT_EQ( File.Text( InTrack( { Ebml::CodecID } ) ), "V_MJPEG" );
   EXPECT_TRUE( File.FindAll( InTrack( { Ebml::CodecPrivate } ) ).empty() );
   EXPECT_EQ( ReadTags( File ).at( "Tarvo.Internal.VideoFrameInfo.PixelFormat" ), "R8G8B8" ) << "the format that is compressed";
-}
-
-TEST( MkvTracks, EverySampleFormatHasItsCodec )
-{
-  struct VCase
-  {
-    IAudioSampleFormat::Enum m_Format;
-    const char* m_pCodec;
-    uint64_t m_Bits;
-  };
-  for( const VCase& rCase : { VCase{ IAudioSampleFormat::EInt16, "A_PCM/INT/LIT", 16 }, VCase{ IAudioSampleFormat::EInt24, "A_PCM/INT/LIT", 24 },
-         VCase{ IAudioSampleFormat::EInt32, "A_PCM/INT/LIT", 32 }, VCase{ IAudioSampleFormat::EFloat32, "A_PCM/FLOAT/IEEE", 32 } } )
-  {
-    SCOPED_TRACE( ToName( rCase.m_Format ) );
-    VDescription Description;
-    Description.m_Audio = { rCase.m_Format, 44100, 16 };
-    const VEbmlParser File = HeaderOf( Description );
-    const VEbmlElement* pTrack = File.FindAll( { Ebml::Segment, Ebml::Tracks, Ebml::TrackEntry } ).at( 1 );
-    const auto Find = [&]( const VEbmlParser::VPath& i_rPath ) -> const VEbmlElement&
-    { return *VEbmlParser::FindIn( pTrack->m_Children, i_rPath ).at( 0 ); };
-    EXPECT_EQ( File.TextOf( Find( { Ebml::CodecID } ) ), rCase.m_pCodec );
-    EXPECT_EQ( File.TextOf( Find( { Ebml::Language } ) ), "eng" );
-    const std::map<uint32_t, uint64_t> Numbers = { { Ebml::TrackNumber, 2 }, { Ebml::TrackType, 2 }, { Ebml::FlagEnabled, 1 },
-      { Ebml::FlagDefault, 1 }, { Ebml::FlagForced, 1 }, { Ebml::FlagLacing, 0 }, { Ebml::MinCache, 100000 }, { Ebml::MaxBlockAdditionID, 0 } };
-    for( const auto& [Id, Value] : Numbers )
-    {
-      EXPECT_EQ( File.NumberOf( Find( { Id } ) ), Value ) << std::hex << Id;
-    }
-    EXPECT_EQ( File.NumberOf( Find( { Ebml::Audio, Ebml::Channels } ) ), 16u );
-    EXPECT_EQ( File.NumberOf( Find( { Ebml::Audio, Ebml::BitDepth } ) ), rCase.m_Bits );
-    EXPECT_EQ( File.Real( { Ebml::Segment, Ebml::Tracks, Ebml::TrackEntry, Ebml::Audio, Ebml::SamplingFrequency } ), 44100.0 );
-    EXPECT_EQ( File.Real( { Ebml::Segment, Ebml::Tracks, Ebml::TrackEntry, Ebml::Audio, Ebml::OutputSamplingFrequency } ), 44100.0 );
-  }
 }
 
 // A codec that no payload of ours selects so far.

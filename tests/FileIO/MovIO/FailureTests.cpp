@@ -1,8 +1,6 @@
 // What the writer says, and what it leaves behind, when the disk fails.
 #include "tests/FileIO/MovIO/SmallMovie.h"
-#include "tests/support/FileSizeLimit.h"
 #include "tests/support/LogCapture.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
@@ -118,37 +116,6 @@ TEST( MovWriterFailures, OneBadWriteIsTracedThroughTheAtomsAroundIt )
     Expected.push_back( "Could not write the '" + std::string( pAtom ) + "' atom." );
   }
   EXPECT_EQ( Log.Texts(), Expected );
-}
-
-TEST( MovWriterFailures, OnARealDisk )
-{
-  const VMovieSettings Settings = VMovieSettings::Silent();
-  VMovWriter Full( IVideoContainer::EMOV );
-  ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( Settings.WriteTo( Full ) );
-  EXPECT_FALSE( Full.Close() );
-
-  // The tables find room where the last frame could not be finished.
-  const VTemporaryFolder Folder;
-  VMovieSettings Large = Settings;
-  Large.m_Video = VideoInfo( IPixelFormat::EU8Y8V8Y8, 100, 100 );
-  {
-    const VFileSizeLimit Limit( 75000 );
-    VMovWriter Writer( IVideoContainer::EMOV );
-    ASSERT_TRUE( Writer.Open( Folder.File( "cut.mov" ) ) && Large.WriteTo( Writer ) );
-    size_t Written = 0;
-    while( Large.WriteFrame( Writer, VBytes( 20000, static_cast<uint8_t>( 'a' + Written ) ) ) )
-    {
-      ++Written;
-    }
-    EXPECT_EQ( Written, 3u );
-    EXPECT_FALSE( Writer.Close() );
-  }
-  const auto Parser = VMovParser::OfFile( Folder.File( "cut.mov" ) );
-  EXPECT_EQ( Parser.Root().Child( "free" ).m_End, 75000u );
-  const auto& rVideo = Parser.Track( "vide" );
-  ASSERT_EQ( rVideo.m_Samples.size(), 3u );
-  EXPECT_EQ( Parser.Bytes( rVideo.m_Samples[2] ), VBytes( 20000, 'c' ) );
 }
 
 // A stream that has run out of memory, and one that throws.

@@ -1,12 +1,9 @@
 // What the writer says, and what it leaves behind, when the disk fails.
 #include "tests/FileIO/RapidAVI/AviFile.h"
-#include "tests/support/FileSizeLimit.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
 #include <set>
-#include <string_view>
 
 using namespace KVZ;
 using namespace RapidAVI;
@@ -147,37 +144,4 @@ TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
   }
   EXPECT_GT( InFrames, 50u );
   EXPECT_EQ( Consistent, InFrames );
-}
-
-TEST( AviWriterFailures, OnARealDisk )
-{
-  VSettings Settings( VideoInfo( IPixelFormat::EU8Y8V8Y8, 100, 100 ) );
-  Settings.m_Audio = {};
-  VRapidAVIWriter Full;
-  ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( Settings.WriteTo( Full ) );
-  EXPECT_FALSE( Full.Close() );
-
-  const VTemporaryFolder Folder;
-  const VFileSizeLimit Limit( 90000 );
-  VRapidAVIWriter Writer;
-  ASSERT_TRUE( Writer.Open( Folder.File( "cut.avi" ) ) );
-  ASSERT_TRUE( Settings.WriteTo( Writer ) );
-  uint32_t Written = 0;
-  while( Settings.WriteFrame( Writer, Noise( 20000, Written ) ) )
-  {
-    ++Written;
-  }
-  EXPECT_EQ( Written, 3u );
-  EXPECT_FALSE( Writer.Close() );
-
-  // The indexes have taken the place of the frame that was cut off.
-  VBytes File = VRiffParser::ReadFile( Folder.File( "cut.avi" ) );
-  constexpr std::string_view AttributesName = "TMSL";
-  const auto Attributes = std::search( File.begin(), File.end(), AttributesName.begin(), AttributesName.end() );
-  ASSERT_NE( Attributes, File.end() );
-  File.erase( Attributes - 8, File.end() );
-  const VAviParser Parser( File );
-  EXPECT_EQ( Parser.TotalFrames(), 3u );
-  EXPECT_EQ( Parser.CountIndexed( 0 ), 3u );
 }

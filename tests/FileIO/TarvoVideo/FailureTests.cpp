@@ -1,7 +1,5 @@
 // What the writer says, and what it leaves behind, when the disk fails.
 #include "tests/FileIO/TarvoVideo/SmallFile.h"
-#include "tests/support/FileSizeLimit.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
@@ -93,35 +91,4 @@ TEST( TarvoWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
   }
   // The frames before the failure are still brought into an index.
   EXPECT_GT( Finished, Operations / 2 );
-}
-
-TEST( TarvoWriterFailures, OnARealDisk )
-{
-  VWriter Full;
-  ASSERT_TRUE( Full.Open( "/dev/full" ) );
-  EXPECT_FALSE( VSmallHeader().WriteTo( Full ) );
-  EXPECT_FALSE( Full.Close() );
-
-  const VTemporaryFolder Folder;
-  const VFileSizeLimit Limit( 2000 );
-  VSmallHeader Header;
-  Header.m_Video.m_ImageHeight = 100;
-  Header.m_Audio = {};
-  VWriter Writer;
-  ASSERT_TRUE( Writer.Open( Folder.File( "cut.tvid" ) ) );
-  ASSERT_TRUE( Header.WriteTo( Writer ) );
-  uint64_t Written = 0;
-  while( Header.WriteFrame( Writer, VBytes( 400, 'x' ), {}, Written ) )
-  {
-    ++Written;
-  }
-  EXPECT_EQ( Written, 3u );
-  EXPECT_FALSE( Writer.Close() );
-
-  VReader Reader;
-  ASSERT_TRUE( Reader.Open( Folder.File( "cut.tvid" ) ) ) << Reader.GetError();
-  EXPECT_FALSE( Reader.IsFinished() );
-  uint64_t Count = 0;
-  EXPECT_TRUE( Reader.CountFrames( Count ) );
-  EXPECT_EQ( Count, Written );
 }

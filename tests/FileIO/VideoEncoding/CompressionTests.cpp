@@ -8,38 +8,27 @@
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 #include <turbojpeg.h>
 
 #include <atomic>
-#include <random>
 
 using namespace KVZ;
 using namespace VideoEncoding;
+using namespace TestSupport;
 
 namespace
 {
 
-VideoFrameInfo Info( IPixelFormat::Enum i_Format )
-{
-  VideoFrameInfo Result;
-  Result.m_ImageWidth = 64;
-  Result.m_ImageHeight = 40;
-  Result.m_PixelFormat = i_Format;
-  return Result;
-}
+VideoFrameInfo Picture( IPixelFormat::Enum i_Format ) { return VideoInfo( i_Format, 64, 40 ); }
 
-VBufferList Noise( const VideoFrameInfo& i_rInfo, uint32_t i_Seed = 1 )
+VBufferList NoisyFrame( IPixelFormat::Enum i_Format, uint32_t i_Seed = 1 )
 {
-  auto pBuffer = std::make_shared<IStandardBuffer>( CoreVideoUtils::GetFrameSize( i_rInfo ) );
-  std::mt19937 Random( i_Seed );
-  std::generate( pBuffer->Bytes().begin(), pBuffer->Bytes().end(), [&] { return static_cast<uint8_t>( Random() ); } );
-  return { pBuffer };
+  return { Buffer( TestSupport::Noise( CoreVideoUtils::GetFrameSize( Picture( i_Format ) ), i_Seed ) ) };
 }
-
-std::vector<uint8_t> BytesOf( const VBufferList& i_rList ) { return { i_rList.at( 0 )->Data(), i_rList.at( 0 )->Data() + i_rList.at( 0 )->Size() }; }
 
 // TurboJPEG's own bytes for an R8G8B8 image.
 std::vector<uint8_t> TurboJPEG( const VBufferList& i_rPixels, int i_Quality )
@@ -77,7 +66,7 @@ class Compression : public testing::Test
 protected:
   bool Encode( const VVideoFrameEncoder& i_rEncoder, VBufferList& io_rVideo, IVideoPayload::Enum i_Payload )
   {
-    return i_rEncoder.Encode( m_Allocator, io_rVideo, Info( IPixelFormat::ER8G8B8 ), i_Payload, IPixelFormat::EUnspecified );
+    return i_rEncoder.Encode( m_Allocator, io_rVideo, Picture( IPixelFormat::ER8G8B8 ), i_Payload, IPixelFormat::EUnspecified );
   }
 
   KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
@@ -88,7 +77,7 @@ protected:
 TEST_F( Compression, EachPayloadHasItsCompressor )
 {
   VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors() ) );
-  const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ) );
+  const VBufferList Pixels = NoisyFrame( IPixelFormat::ER8G8B8 );
   VBufferList Video = Pixels;
   ASSERT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageJPEG ) );
   EXPECT_EQ( BytesOf( Video ), TurboJPEG( Pixels, 90 ) );   // the quality where nobody has set one
@@ -113,10 +102,10 @@ TEST_F( Compression, EachPayloadHasItsCompressor )
 
 TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
 {
-  const TestSupport::VLogCapture Log;
+  const VLogCapture Log;
   const ImageMagickWrapper::VLibrary Missing( { { "libNoMagickWand.so.1" } }, PNGIO::Category );
   const VVideoFrameEncoder Encoder( EConverter::Software, Parts( ImageCompressors( Missing ) ) );
-  const VBufferList Pixels = Noise( Info( IPixelFormat::ER8G8B8 ) );
+  const VBufferList Pixels = NoisyFrame( IPixelFormat::ER8G8B8 );
   for( const IVideoPayload::Enum Payload : { IVideoPayload::EImagePNG, IVideoPayload::EImageTIFF, IVideoPayload::EImagePNG } )
   {
     VBufferList Video = Pixels;
@@ -126,7 +115,7 @@ TEST_F( Compression, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
   VBufferList Video = Pixels;
   EXPECT_TRUE( Encode( Encoder, Video, IVideoPayload::EImageJPEG ) );
   Video = Pixels;
-  const VideoFrameInfo RGB = Info( IPixelFormat::ER8G8B8 );
+  const VideoFrameInfo RGB = Picture( IPixelFormat::ER8G8B8 );
   EXPECT_TRUE( Encoder.Encode( m_Allocator, Video, RGB, IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
   EXPECT_EQ( Log.Texts(),
     ( std::vector<std::string>{ "Could not load MagickWand DLL", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'.",
@@ -142,29 +131,22 @@ TEST_F( Compression, AFrameGoesThroughAllSteps )
   Encoder.SetBurnIn( { "01:02", 5, 3, 0 } );
   CoreVideoUtils::VPixelFormatConverter Converter;
   Converter.SetColourCorrection( Colour );
-  const VideoFrameInfo RGB = Info( IPixelFormat::ER8G8B8 );
+  const VideoFrameInfo RGB = Picture( IPixelFormat::ER8G8B8 );
   for( const IPixelFormat::Enum Format : { IPixelFormat::EBayerGB8, IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 } )
   {
     SCOPED_TRACE( ToName( Format ) );
-    const std::vector<uint8_t> Pixels = BytesOf( Noise( Info( Format ) ) );
+    const std::vector<uint8_t> Pixels = BytesOf( NoisyFrame( Format ) );
     const auto pDrawn = std::make_shared<IStandardBuffer>( CoreVideoUtils::GetFrameSize( RGB ) );
     std::vector<uint8_t>& rDrawn = pDrawn->Bytes();
-    ASSERT_TRUE( Converter.Convert( Info( Format ), Pixels.data(), Pixels.size(), RGB.m_PixelFormat, rDrawn.data(), rDrawn.size() ) );
+    ASSERT_TRUE( Converter.Convert( Picture( Format ), Pixels.data(), Pixels.size(), RGB.m_PixelFormat, rDrawn.data(), rDrawn.size() ) );
     ASSERT_TRUE( CoreVideoUtils::BurnInText( Converter, RGB, 0, 5, 3, "01:02", rDrawn.data(), rDrawn.size() ) );
 
-    const auto Halves = [&]() -> VBufferList
-    {
-      const auto pFirst = std::make_shared<IStandardBuffer>( 1000 );
-      const auto pSecond = std::make_shared<IStandardBuffer>( Pixels.size() - 1000 );
-      std::copy_n( Pixels.begin(), 1000, pFirst->Bytes().begin() );
-      std::copy( Pixels.begin() + 1000, Pixels.end(), pSecond->Bytes().begin() );
-      return { pFirst, pSecond };
-    };
-    VBufferList Video = Halves();
-    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
+    const VBufferList Halves = { Buffer( { Pixels.begin(), Pixels.begin() + 1000 } ), Buffer( { Pixels.begin() + 1000, Pixels.end() } ) };
+    VBufferList Video = Halves;
+    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Picture( Format ), IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ) );
     EXPECT_EQ( BytesOf( Video ), rDrawn );
-    Video = Halves();
-    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
+    Video = Halves;
+    ASSERT_TRUE( Encoder.Encode( m_Allocator, Video, Picture( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
     EXPECT_EQ( BytesOf( Video ), TurboJPEG( { pDrawn }, 90 ) );
   }
 }
@@ -177,8 +159,8 @@ TEST_F( Compression, OneEncoderServesSeveralThreads )
   const auto Compressed = [&]( uint32_t i_Seed )
   {
     const IPixelFormat::Enum Format = i_Seed % 2 ? IPixelFormat::EBayerGB8 : IPixelFormat::EU8Y8V8Y8;
-    VBufferList Video = Noise( Info( Format ), i_Seed );
-    EXPECT_TRUE( Encoder.Encode( m_Allocator, Video, Info( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
+    VBufferList Video = NoisyFrame( Format, i_Seed );
+    EXPECT_TRUE( Encoder.Encode( m_Allocator, Video, Picture( Format ), IVideoPayload::EImageJPEG, IPixelFormat::EUnspecified ) );
     return BytesOf( Video );
   };
   constexpr uint32_t Frames = 40;

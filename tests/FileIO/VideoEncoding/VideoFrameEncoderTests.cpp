@@ -1,6 +1,7 @@
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
@@ -8,37 +9,18 @@
 
 using namespace KVZ;
 using namespace VideoEncoding;
+using namespace TestSupport;
 
 namespace
 {
 
-constexpr uint32_t Width = 4;
-constexpr uint32_t Height = 2;
-
-VideoFrameInfo Info( IPixelFormat::Enum i_Format )
-{
-  VideoFrameInfo Result;
-  Result.m_ImageWidth = Width;
-  Result.m_ImageHeight = Height;
-  Result.m_PixelFormat = i_Format;
-  return Result;
-}
+VideoFrameInfo Small( IPixelFormat::Enum i_Format ) { return VideoInfo( i_Format, 4, 2 ); }
 
 std::shared_ptr<IStandardBuffer> Counting( uint8_t i_First, size_t i_Size )
 {
   auto pBuffer = std::make_shared<IStandardBuffer>( i_Size );
   std::iota( pBuffer->Bytes().begin(), pBuffer->Bytes().end(), i_First );
   return pBuffer;
-}
-
-std::vector<uint8_t> BytesOf( const VBufferList& i_rList )
-{
-  std::vector<uint8_t> Bytes;
-  for( const auto& rpBuffer : i_rList )
-  {
-    Bytes.insert( Bytes.end(), rpBuffer->Data(), rpBuffer->Data() + rpBuffer->Size() );
-  }
-  return Bytes;
 }
 
 // Grey from any format: fills the target with the source's first byte plus one.
@@ -56,12 +38,11 @@ public:
     std::fill_n( o_pTarget, i_TargetSize, static_cast<uint8_t>( *i_pSource + 1 ) );
     return true;
   }
-  void SetColourCorrection( const VColourRecord& i_rColour ) override { m_Colour = i_rColour; }
+  void SetColourCorrection( const VColourRecord& ) override {}
   void SetLensCorrection( const VLensDistortionRecord& i_rLens ) override { m_Lens = i_rLens; }
   void SetLensCorrectionEnabled( bool i_bEnabled ) override { m_bLens = i_bEnabled; }
 
   IPixelFormat::Enum m_Target = IPixelFormat::EUnspecified;
-  VColourRecord m_Colour;
   VLensDistortionRecord m_Lens;
   bool m_bLens = false;
 };
@@ -89,7 +70,7 @@ protected:
 
   bool Encode( IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Target )
   {
-    return m_Encoder->Encode( m_Allocator, m_Video, Info( i_Source ), i_Payload, i_Target );
+    return m_Encoder->Encode( m_Allocator, m_Video, Small( i_Source ), i_Payload, i_Target );
   }
 
   void MakeEncoder() { m_Encoder.emplace( EConverter::Software, m_Parts ); }
@@ -103,7 +84,7 @@ protected:
   int m_Quality = 0;
   bool m_bCompressorWorks = true;
   bool m_bDrawerWorks = true;
-  const TestSupport::VLogCapture m_Log{ "VideoEncoding" };
+  const VLogCapture m_Log{ "VideoEncoding" };
 };
 
 }
@@ -116,16 +97,6 @@ TEST_F( VideoFrameEncoder, AnUncompressedFrameInItsFormatPassesWithoutACopy )
   EXPECT_EQ( m_Video, Before );
   m_Video.clear();
   EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
-}
-
-TEST_F( VideoFrameEncoder, ConversionJoinsFirstAndHandsTheSettingsOver )
-{
-  MakeEncoder();
-  m_Encoder->SetColour( { 0.5f, 2.0f } );
-  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
-  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 8, 11 ) );
-  EXPECT_EQ( m_pConverter->m_Colour, ( VColourRecord{ 0.5f, 2.0f } ) );
-  EXPECT_FALSE( m_pConverter->m_bLens );
 }
 
 TEST_F( VideoFrameEncoder, LensCorrectionConvertsEvenBetweenEqualFormats )
@@ -255,7 +226,7 @@ TEST( PixelFormatForPayload, EachKeepsWhatItsCompressorTakes )
     EXPECT_EQ( Stored( IVideoPayload::EImagePNG ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
     EXPECT_EQ( Stored( IVideoPayload::EImageTIFF ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
   }
-  const TestSupport::VLogCapture Log( "VideoEncoding" );
+  const VLogCapture Log( "VideoEncoding" );
   auto Kept = IPixelFormat::ER5G6B5;
   EXPECT_FALSE( PixelFormatForPayloadFormat( IVideoPayload::EVideoH264, IPixelFormat::ER8G8B8, Kept ) );
   EXPECT_EQ( Kept, IPixelFormat::ER5G6B5 );

@@ -31,6 +31,17 @@ std::shared_ptr<KVZ::IVideoWriter> MakeMovie( VEncoder i_pEncoder, WriterSupport
   return std::make_shared<MovIO::VMovWriter>( Container, std::move( i_pEncoder ), std::move( i_StreamMaker ) );
 }
 
+// Of a width that suits every pixel format
+VHeader HeaderOf( const VWriterRow& i_rRow )
+{
+  VHeader Header;
+  Header.m_Video = VideoInfo( i_rRow.m_PixelFormat, 48, 4 );
+  Header.m_Audio = i_rRow.m_bAudio ? KVZ::AudioFrameInfo{ KVZ::IAudioSampleFormat::EInt16, 48000, 2 } : KVZ::AudioFrameInfo();
+  Header.m_Timecode = { KVZ::ITimecodeStandard::ETimecode25, 1, 2, 3, 4 };
+  Header.m_Payload = i_rRow.m_Payload;
+  return Header;
+}
+
 VEncoder MakeEncoder()
 {
   VideoEncoding::VEncoderParts Parts;
@@ -52,25 +63,8 @@ const std::vector<VWriterRow> Writers = {
 
 void PrintTo( const VWriterRow& i_rRow, std::ostream* o_pText ) { *o_pText << i_rRow.m_pName; }
 
-// Of a width that suits every pixel format
-VHeaderArguments::VHeaderArguments( const VWriterRow& i_rRow )
-  : m_VideoPayload( i_rRow.m_Payload ), m_AudioPayload( i_rRow.m_bAudio ? KVZ::IAudioPayload::EUncompressed : KVZ::IAudioPayload::ENone )
-{
-  m_Video = VideoInfo( i_rRow.m_PixelFormat, 48, 4 );
-  if( i_rRow.m_bAudio )
-  {
-    m_Audio = { KVZ::IAudioSampleFormat::EInt16, 48000, 2 };
-  }
-}
-
-bool VHeaderArguments::WriteTo( KVZ::IVideoWriter& io_rWriter ) const
-{
-  return io_rWriter.WriteHeader( m_Video, m_Audio, Rate25, { KVZ::ITimecodeStandard::ETimecode25, 1, 2, 3, 4 }, {}, {}, m_VideoPayload,
-    m_AudioPayload );
-}
-
 VContractWriter::VContractWriter( const VWriterRow& i_rRow, const VFault& i_rFault )
-  : m_Header( i_rRow ),
+  : m_Header( HeaderOf( i_rRow ) ),
     m_pWriter( i_rRow.m_Make( MakeEncoder(),
       [this, i_rFault]( const std::string& i_rPath )
       {
@@ -83,7 +77,7 @@ VContractWriter::VContractWriter( const VWriterRow& i_rRow, const VFault& i_rFau
 
 VBytes VContractWriter::Picture( uint64_t i_Frame ) const
 {
-  VBytes Bytes( KVZ::GetImageSize( m_Header.m_Video.m_PixelFormat, m_Header.m_Video.m_ImageWidth, m_Header.m_Video.m_ImageHeight ) );
+  VBytes Bytes( m_Header.ImageBytes() );
   for( size_t Byte = 0; Byte < Bytes.size(); ++Byte )
   {
     Bytes[Byte] = static_cast<uint8_t>( Byte * ( i_Frame + 3 ) + i_Frame );

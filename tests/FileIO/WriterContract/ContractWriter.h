@@ -46,19 +46,6 @@ extern const std::vector<VWriterRow> Writers;
 
 void PrintTo( const VWriterRow& i_rRow, std::ostream* o_pText );
 
-// What WriteHeader is given.
-struct VHeaderArguments
-{
-  explicit VHeaderArguments( const VWriterRow& i_rRow );
-
-  bool WriteTo( KVZ::IVideoWriter& io_rWriter ) const;
-
-  KVZ::VideoFrameInfo m_Video;
-  KVZ::AudioFrameInfo m_Audio;
-  KVZ::IVideoPayload::Enum m_VideoPayload;
-  KVZ::IAudioPayload::Enum m_AudioPayload;
-};
-
 // A writer of a row. All its files are in memory, each with its name, and all fail together where the fault is.
 class VContractWriter
 {
@@ -68,7 +55,7 @@ public:
   KVZ::IVideoWriter& Writer() { return *m_pWriter; }
   const std::map<std::string, std::shared_ptr<VBytes>>& Files() const { return m_Files; }
   uint64_t Operations() const { return m_Operations; }
-  const VHeaderArguments& Header() const { return m_Header; }
+  const VHeader& Header() const { return m_Header; }
 
   bool Open() { return m_pWriter->Open( m_Folder.File( m_pFileName ) ); }
   bool Begin() { return Open() && m_Header.WriteTo( *m_pWriter ); }
@@ -85,7 +72,7 @@ public:
 private:
   const char* const m_pFileName = "movie%FRAME%";
   const VTemporaryFolder m_Folder;
-  const VHeaderArguments m_Header;
+  const VHeader m_Header;
   std::map<std::string, std::shared_ptr<VBytes>> m_Files;
   uint64_t m_Operations = 0;
   std::shared_ptr<KVZ::IVideoWriter> m_pWriter;

@@ -1,4 +1,4 @@
-// Frames: their keys, their pieces, their sound, and what becomes of them when the stream fails.
+// Frames: their keys, their pieces and their sound.
 #include "tests/FileIO/WriterContract/ContractWriter.h"
 
 using namespace KVZ;
@@ -39,7 +39,7 @@ TEST_P( WriterContract, PiecesMakeTheSameFrame )
   VContractWriter Contract( GetParam() );
   VContractWriter InOne( GetParam() );
   ASSERT_TRUE( Contract.Begin() && InOne.Begin() );
-  const VHeaderArguments& rHeader = Contract.Header();
+  const VHeader& rHeader = Contract.Header();
   for( uint64_t Frame = 0; Frame < Frames; ++Frame )
   {
     VBufferList Video = Pieces( Contract.Picture( Frame ) );
@@ -106,61 +106,6 @@ TEST_P( WriterContract, SoundHasTheHeadersChannels )
   EXPECT_TRUE( Write( 4, { 0xA1, 0xA2, 0xB1, 0xB2, 9, 9, 9, 9, 0xA3, 0xA4, 0xB3, 0xB4, 9, 9, 9, 9 } ) );
   EXPECT_TRUE( Contract.Writer().Close() );
   EXPECT_TRUE( Contract.Holds( { 0xA1, 0xA2, 0xB1, 0xB2, 0xA3, 0xA4, 0xB3, 0xB4 } ) );
-}
-
-TEST_P( WriterContract, NoFailureOfTheStreamIsForgotten )
-{
-  struct VResult
-  {
-    bool m_bFailed = false;
-    bool m_bWrittenLater = false;
-    bool m_bClosed = false;
-  };
-  const auto Run = []( VContractWriter& io_rContract )
-  {
-    VResult Result;
-    Result.m_bFailed = !io_rContract.Begin();
-    for( uint64_t Frame = 0; Frame < Frames; ++Frame )
-    {
-      const bool bWritten = io_rContract.WriteFrame( Frame );
-      Result.m_bWrittenLater = Result.m_bWrittenLater || ( Result.m_bFailed && bWritten );
-      Result.m_bFailed = Result.m_bFailed || !bWritten;
-    }
-    Result.m_bClosed = io_rContract.Writer().Close();
-    return Result;
-  };
-  VContractWriter Whole( GetParam() );
-  ASSERT_TRUE( Run( Whole ).m_bClosed );
-  for( uint64_t Operation = 0; Operation < Whole.Operations(); ++Operation )
-  {
-    SCOPED_TRACE( Operation );
-    VContractWriter Contract( GetParam(), { .m_Operation = Operation } );
-    const VResult Result = Run( Contract );
-    EXPECT_TRUE( Result.m_bFailed || !Result.m_bClosed );
-    EXPECT_FALSE( Contract.Writer().IsOpen() );
-    EXPECT_TRUE( !GetParam().m_bOneFile || ( !Result.m_bWrittenLater && !Result.m_bClosed ) );
-  }
-}
-
-TEST_P( WriterContract, AFullDiskIsReported )
-{
-  VContractWriter Whole( GetParam() );
-  ASSERT_TRUE( Whole.Begin() && Whole.WriteFrame( 0 ) && Whole.WriteFrame( 1 ) && Whole.Writer().Close() );
-  size_t Longest = 0;
-  for( const auto& rFile : Whole.Files() )
-  {
-    Longest = std::max( Longest, rFile.second->size() );
-  }
-  constexpr size_t Places = 200;
-  for( uint64_t Offset = 0; Offset < Longest; Offset += Longest / Places + 1 )
-  {
-    SCOPED_TRACE( Offset );
-    VContractWriter Contract( GetParam(), { .m_Offset = Offset } );
-    const bool bWritten = Contract.Begin() && Contract.WriteFrame( 0 ) && Contract.WriteFrame( 1 );
-    const bool bClosed = Contract.Writer().Close();
-    EXPECT_FALSE( bWritten && bClosed );
-    EXPECT_TRUE( !GetParam().m_bOneFile || !bClosed );
-  }
 }
 
 }

@@ -85,7 +85,7 @@ TEST_P( WriterContract, AHeaderIsCheckedInOrder )
   IVideoWriter& rWriter = Contract.Writer();
   const IVideoWriterCapabilities& rCapabilities = rWriter.GetCapabilities();
   ASSERT_TRUE( Contract.Open() );
-  VHeaderArguments Header = Contract.Header();
+  VHeader Header = Contract.Header();
   const auto IsRefused = [&]( const std::string& i_rMessage )
   {
     const size_t Lines = m_Log.Lines().size();
@@ -105,9 +105,9 @@ TEST_P( WriterContract, AHeaderIsCheckedInOrder )
   for( int Payload = 0; Payload < AudioPayloads; ++Payload )
   {
     Header.m_AudioPayload = static_cast<IAudioPayload::Enum>( Payload );
-    if( !rCapabilities.IsAudioPayloadSupported( Header.m_AudioPayload ) )
+    if( !rCapabilities.IsAudioPayloadSupported( *Header.m_AudioPayload ) )
     {
-      IsRefused( "Audio payload format '" + ToName( Header.m_AudioPayload ) + "' is not supported." );
+      IsRefused( "Audio payload format '" + ToName( *Header.m_AudioPayload ) + "' is not supported." );
     }
   }
   Header.m_AudioPayload = IAudioPayload::ELosslessFLAC;
@@ -115,19 +115,19 @@ TEST_P( WriterContract, AHeaderIsCheckedInOrder )
     [&]( auto i_Format ) { return rCapabilities.IsPixelFormatSupported( i_Format ); } );
   if( Pixel && rCapabilities.IsVideoPayloadSupported( IVideoPayload::EUncompressed ) )
   {
-    Header.m_VideoPayload = IVideoPayload::EUncompressed;
+    Header.m_Payload = IVideoPayload::EUncompressed;
     Header.m_Video.m_PixelFormat = *Pixel;
     IsRefused( "Pixel format '" + ToName( *Pixel ) + "' is not supported for uncompressed video." );
   }
   for( int Payload = 0; Payload < VideoPayloads; ++Payload )
   {
-    Header.m_VideoPayload = static_cast<IVideoPayload::Enum>( Payload );
-    if( !rCapabilities.IsVideoPayloadSupported( Header.m_VideoPayload ) )
+    Header.m_Payload = static_cast<IVideoPayload::Enum>( Payload );
+    if( !rCapabilities.IsVideoPayloadSupported( Header.m_Payload ) )
     {
-      IsRefused( "Video payload format '" + ToName( Header.m_VideoPayload ) + "' is not supported." );
+      IsRefused( "Video payload format '" + ToName( Header.m_Payload ) + "' is not supported." );
     }
   }
-  Header.m_VideoPayload = static_cast<IVideoPayload::Enum>( 77 );
+  Header.m_Payload = static_cast<IVideoPayload::Enum>( 77 );
   IsRefused( "Video payload format 'Unspecified' is not supported." );
 
   EXPECT_TRUE( Contract.Header().WriteTo( rWriter ) ) << "what was refused has spoilt nothing";
@@ -136,7 +136,7 @@ TEST_P( WriterContract, AHeaderIsCheckedInOrder )
 
 TEST_P( WriterContract, AHeaderIsTakenOfExactlyWhatIsSupported )
 {
-  const auto IsTaken = [&]( const VHeaderArguments& i_rHeader )
+  const auto IsTaken = [&]( const VHeader& i_rHeader )
   {
     VContractWriter Contract( GetParam() );
     return Contract.Open() && i_rHeader.WriteTo( Contract.Writer() );
@@ -146,27 +146,28 @@ TEST_P( WriterContract, AHeaderIsTakenOfExactlyWhatIsSupported )
   const IVideoWriterCapabilities& rCapabilities = pWriter->GetCapabilities();
   for( int Value = 0; Value < VideoPayloads; ++Value )
   {
-    VHeaderArguments Header = Contract.Header();
-    Header.m_VideoPayload = static_cast<IVideoPayload::Enum>( Value );
-    EXPECT_EQ( IsTaken( Header ), rCapabilities.IsVideoPayloadSupported( Header.m_VideoPayload ) ) << ToName( Header.m_VideoPayload );
+    VHeader Header = Contract.Header();
+    Header.m_Payload = static_cast<IVideoPayload::Enum>( Value );
+    EXPECT_EQ( IsTaken( Header ), rCapabilities.IsVideoPayloadSupported( Header.m_Payload ) ) << ToName( Header.m_Payload );
   }
   for( int Value = 1; Value < PixelFormatCount && GetParam().m_Payload == IVideoPayload::EUncompressed; ++Value )
   {
-    VHeaderArguments Header = Contract.Header();
+    VHeader Header = Contract.Header();
     Header.m_Video.m_PixelFormat = static_cast<IPixelFormat::Enum>( Value );
     EXPECT_EQ( IsTaken( Header ), rCapabilities.IsPixelFormatSupported( Header.m_Video.m_PixelFormat ) ) << ToName( Header.m_Video.m_PixelFormat );
   }
   for( int Value = 1; Value < SampleFormats && GetParam().m_bAudio; ++Value )
   {
-    VHeaderArguments Header = Contract.Header();
+    VHeader Header = Contract.Header();
     Header.m_Audio.m_SampleFormat = static_cast<IAudioSampleFormat::Enum>( Value );
     EXPECT_EQ( IsTaken( Header ), rCapabilities.IsAudioSampleFormatSupported( Header.m_Audio.m_SampleFormat ) )
       << ToName( Header.m_Audio.m_SampleFormat );
   }
   if( GetParam().m_bAudio )
   {
-    VHeaderArguments Silent = Contract.Header();
+    VHeader Silent = Contract.Header();
     Silent.m_Audio = {};
+    Silent.m_AudioPayload = IAudioPayload::EUncompressed;
     EXPECT_TRUE( IsTaken( Silent ) ) << "a payload without any sound";
   }
 }

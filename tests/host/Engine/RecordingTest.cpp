@@ -1,7 +1,9 @@
 #include "host/Recording.h"
 
 #include "host/DataStore.h"
+#include "tests/host/Engine/SourceTimes.h"
 #include "tests/support/FakeSource.h"
+#include "tests/support/HandTime.h"
 #include "tests/support/ManualPostalService.h"
 
 #include <gtest/gtest.h>
@@ -14,22 +16,11 @@ using TestSupport::VManualPostalService;
 namespace
 {
 
-class VManualTime : public StageCorePluginInterface::ITimeService
-{
-public:
-  double Now() override { return m_Now; }
-  double m_Now = 1000.0;
-};
-
 class VNoDelays : public IDelayedCalls
 {
 public:
   void CallAfter( double, std::function<void()> ) override {}
 };
-
-constexpr int64_t Period25 = 5400000;
-constexpr int64_t Period5994 = 2252250;
-const VTick OneHour = KVZ::SecondsToTick135( 3600 );
 
 constexpr uint32_t Capturing = 4;
 constexpr uint32_t Complete = 32;
@@ -60,7 +51,7 @@ protected:
   const std::shared_ptr<VManualPostalService> m_pStrand = std::make_shared<VManualPostalService>();
   const std::shared_ptr<VSyncEngine> m_pEngine = std::make_shared<VSyncEngine>( m_pStrand, std::make_shared<VNoDelays>() );
   const std::shared_ptr<VCaptureTargets> m_pTargets = std::make_shared<VCaptureTargets>( std::make_shared<VDataStore>() );
-  VManualTime m_Time;
+  TestSupport::VHandTime m_Time;
   VRecording m_Recording{ *m_pEngine, *m_pTargets, m_Time };
   std::string m_Error;
 };
@@ -136,10 +127,15 @@ TEST_F( RecordingTest, LossesAreToldByTheirCause )
   pSource->m_Dropped = 7;   // before the recording
   ASSERT_TRUE( m_Recording.Start( Frames( { "vi:0" }, 50, KVZ::SecondsToTick135( 2 ) ), m_Error ) );
   pSource->m_Dropped = 10;
+  pSource->SetNewest( 110 );
   pSource->m_Status.m_Start = pSource->m_CaptureStart + VTick( 4 * Period25 );   // four frames had been evicted
   pSource->m_Status.m_State = Capturing;
   m_Recording.Poll();
   EXPECT_FALSE( m_Recording.IsFinished() );
+  pSource->SetNewest( 111 );
+  m_Recording.Poll();
+  pSource->m_Dropped = 30;   // an absence: no frame of the range comes after it
+  m_Recording.Poll();
   pSource->m_Status.m_State = Complete;
   pSource->m_Status.m_CapturedDuration = VTick( Period25 * 40 );
   m_Recording.Poll();

@@ -1,5 +1,6 @@
 #include "host/SyncEngine.h"
 
+#include "tests/host/Engine/SourceTimes.h"
 #include "tests/support/FakeSource.h"
 #include "tests/support/ManualPostalService.h"
 
@@ -35,9 +36,6 @@ private:
   std::vector<std::function<void()>> m_Calls;
 };
 
-constexpr int64_t Period25 = 5400000;
-constexpr int64_t Period5994 = 2252250;
-const VTick OneHour = KVZ::SecondsToTick135( 3600 );
 const IClock GlobalTime( IClock::GlobalTime, 0, 0 );
 
 class SyncEngineTest : public ::testing::Test

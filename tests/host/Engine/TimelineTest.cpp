@@ -1,5 +1,7 @@
 #include "host/Timeline.h"
 
+#include "tests/host/Engine/SourceTimes.h"
+
 #include <gtest/gtest.h>
 
 using namespace StageHost;
@@ -28,8 +30,6 @@ VTimelineSource MakeSource( VTick i_Timecode, double i_StartTime, bool i_bTimed 
   }
   return Source;
 }
-
-const VTick OneHour = KVZ::SecondsToTick135( 3600 );
 
 }
 

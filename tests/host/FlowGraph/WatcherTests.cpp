@@ -3,6 +3,7 @@
 
 #include "host/FlowGraphState.h"
 #include "tests/support/FakeFlowServices.h"
+#include "tests/support/HandTime.h"
 
 #include <gtest/gtest.h>
 
@@ -13,13 +14,6 @@ using StageHost::VFlowWatcher;
 using StageHost::VWatchFigures;
 
 constexpr int64_t Period = 5400000;
-
-class VHandTime : public StageCorePluginInterface::ITimeService
-{
-public:
-  double Now() override { return m_Now; }
-  double m_Now = 100.0;
-};
 
 class VOneStateServices : public TestSupport::VFakeFlowServices
 {
@@ -81,7 +75,7 @@ protected:
     return m_Watcher.GetFigures();
   }
 
-  const std::shared_ptr<VHandTime> m_pTime = std::make_shared<VHandTime>();
+  const std::shared_ptr<TestSupport::VHandTime> m_pTime = std::make_shared<TestSupport::VHandTime>();
   const std::shared_ptr<VOneStateServices> m_pServices = std::make_shared<VOneStateServices>();
   VFlowWatcher m_Watcher{ m_pTime };
 };

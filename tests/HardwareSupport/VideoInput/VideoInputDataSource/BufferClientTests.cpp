@@ -279,22 +279,4 @@ TEST_F( BufferClient, ASourceThatGoesClosesItsFile )
   EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
 }
 
-TEST_F( BufferClient, MemoryThatRunsOutEndsTheCaptureAtItsLastFrame )
-{
-  Start( 1, 0, 4000 );
-  int Stored = 10;
-  while( m_Rig.Deliver() )
-  {
-    ASSERT_LT( ++Stored, 1000 );
-  }
-  EXPECT_EQ( Status().m_Failure, ECaptureFailure::MemoryExhausted );
-  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
-  EXPECT_FALSE( m_Rig.Deliver() );
-  Write();
-  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
-  EXPECT_EQ( File().m_Frames.size(), static_cast<size_t>( Stored ) );
-  EXPECT_EQ( Status().m_CapturedDuration, Period * Stored );
-  EXPECT_TRUE( m_Rig.Deliver() );
-}
-
 }

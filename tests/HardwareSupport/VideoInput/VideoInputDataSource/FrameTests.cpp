@@ -6,17 +6,6 @@
 namespace
 {
 
-KVZ::ITimecode Timecode( int32_t i_Standard, uint8_t i_Hours, uint8_t i_Minutes, uint8_t i_Seconds, uint8_t i_Frames )
-{
-  KVZ::ITimecode Timecode;
-  Timecode.m_Standard = i_Standard;
-  Timecode.m_Hours = i_Hours;
-  Timecode.m_Minutes = i_Minutes;
-  Timecode.m_Seconds = i_Seconds;
-  Timecode.m_Frames = i_Frames;
-  return Timecode;
-}
-
 class VideoFrames : public ::testing::Test
 {
 protected:
@@ -45,7 +34,7 @@ TEST_F( VideoFrames, CarryTheirNumberAndASharedTimecode )
   EXPECT_EQ( m_pSource->GetSourceName(), "vi:0" );
   EXPECT_EQ( m_Rig.m_pService->m_Releases, 2 );
   m_Rig.m_NextIndex = 17;
-  m_Rig.m_Timecode = Timecode( KVZ::ITimecodeStandard::ETimecode25, 1, 0, 0, 5 );
+  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 1, 0, 0, 5 };
   m_Rig.DeliverMany( 10 );
   EXPECT_EQ( SessionId(), 1u );
   const KVZ::ITickInClocks Clocks = StartClocks();
@@ -62,11 +51,11 @@ TEST_F( VideoFrames, AnImpossibleTimecodeIsNoClock )
     KVZ::ITimecode m_Timecode;
     bool m_bValid;
   } Cases[] = {
-    { Timecode( KVZ::ITimecodeStandard::ETimecode25, 23, 59, 59, 24 ), true },
-    { Timecode( KVZ::ITimecodeStandard::ETimecode25, 24, 0, 0, 0 ), false },
-    { Timecode( KVZ::ITimecodeStandard::ETimecode30Drop, 0, 1, 0, 0 ), false },
-    { Timecode( KVZ::ITimecodeStandard::ETimecode30Drop, 0, 10, 0, 0 ), true },
-    { Timecode( 6, 0, 0, 0, 0 ), false },
+    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 23, 59, 59, 24 }, true },
+    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 24, 0, 0, 0 }, false },
+    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode30Drop, 0, 1, 0, 0 }, false },
+    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode30Drop, 0, 10, 0, 0 }, true },
+    { KVZ::ITimecode{ 6, 0, 0, 0, 0 }, false },
   };
   for( const auto& rCase : Cases )
   {
@@ -75,7 +64,7 @@ TEST_F( VideoFrames, AnImpossibleTimecodeIsNoClock )
     ASSERT_TRUE( m_Rig.Deliver() );
     EXPECT_EQ( StartClocks().m_TickByClock.size() == 3, rCase.m_bValid ) << KVZ::ToText( rCase.m_Timecode );
   }
-  m_Rig.m_Timecode = Timecode( KVZ::ITimecodeStandard::ETimecode25, 10, 0, 0, 0 );
+  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 10, 0, 0, 0 };
   m_Rig.DeliverMany( 3 );
   m_Rig.m_Timecode = {};
   const TestSupport::VLogCapture Log( "CaptureBuffer" );
@@ -85,7 +74,7 @@ TEST_F( VideoFrames, AnImpossibleTimecodeIsNoClock )
 
 TEST_F( VideoFrames, TimecodeSettingsBeginAnew )
 {
-  m_Rig.m_Timecode = Timecode( KVZ::ITimecodeStandard::ETimecode25, 1, 0, 0, 0 );
+  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 1, 0, 0, 0 };
   m_Rig.DeliverMany( 2 );
   const TestSupport::VLogCapture Log( "Hal.vi:0" );
   m_pSource->SetTimecodeAdjustment( -Period * 2 );
@@ -118,18 +107,6 @@ TEST_F( VideoFrames, TakeThePixelAspectRatioFromTheNextOneOn )
   EXPECT_EQ( Newest().m_FrameScale, 1.0 );
 }
 
-TEST_F( VideoFrames, AreTimedByTheHost )
-{
-  for( int Count = 0; Count < 10; ++Count )
-  {
-    m_Rig.m_pTime->m_Now = 100.0 + 0.04 * Count;
-    ASSERT_TRUE( m_Rig.Deliver() );
-  }
-  const auto Info = m_pSource->GetSourceTimingInfo();
-  ASSERT_TRUE( Info );
-  EXPECT_NEAR( Info->m_StartTime, 100.0, 1e-9 );
-}
-
 TEST_F( VideoFrames, WithoutAPeriodAreRefused )
 {
   VVideoInputDataSourceFrame* pFrame = m_Rig.MakeFrame( 0 );
@@ -160,36 +137,6 @@ TEST_F( VideoFrames, LostByTheCardAreCountedButNotItsFirstCount )
   m_Rig.DeliverMany( 1 );   // no count: no time has been lost
   m_Rig.m_pDevice->LoseFrames( 1 );
   EXPECT_EQ( Dropped(), 6u );
-}
-
-TEST_F( VideoFrames, GiveTheirMemoryBack )
-{
-  m_Rig.DeliverMany( 300 );
-  double Total = 0.0;
-  double Used = 0.0;
-  m_Pinned.Clear();
-  m_Rig.m_pSource.reset();
-  m_pSource.reset();
-  m_Rig.m_pStrand->RunAll();
-  m_Rig.m_Memory.m_pAllocator->GetMemoryStats( Total, Used );
-  EXPECT_EQ( Used, 0.0 );
-}
-
-TEST_F( VideoFrames, AFlowNodeGetsTenAtMostAndIsWoken )
-{
-  m_Rig.DeliverMany( 1 );
-  m_Rig.Join( *m_pSource, 1 );
-  m_Rig.DeliverMany( 24 );
-  SyncSystem::VReadFrames Read;
-  ASSERT_EQ( m_pSource->GetFrames( 7, Read ), SyncSystem::EReadResult::Frames );
-  EXPECT_EQ( Read.m_Frames.size(), 25u );
-  EXPECT_EQ( std::count_if( Read.m_Frames.begin(), Read.m_Frames.end(), []( const auto& i_rFrame ) { return i_rFrame.m_DropRun == 0; } ), 10 );
-  std::vector<uint64_t> Woken;
-  m_pSource->OnNewFramesCallback().Set( [&]( uint64_t i_Token ) { Woken.push_back( i_Token ); } );
-  EXPECT_EQ( m_pSource->GetFrames( 7, Read ), SyncSystem::EReadResult::Asleep );
-  m_Rig.DeliverMany( 1 );
-  m_Rig.m_pStrand->RunAll();
-  EXPECT_EQ( Woken, ( std::vector<uint64_t>{ 7 } ) );
 }
 
 }

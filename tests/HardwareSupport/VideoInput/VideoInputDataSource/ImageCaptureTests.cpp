@@ -266,19 +266,6 @@ TEST_F( ImageCapture, AnotherFilesFailureWaitsForTheWorkers )
   EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 2u );
 }
 
-TEST_F( ImageCapture, ThreadsWriteEveryFrameAndFinishBeforeTheFileIsClosed )
-{
-  Make( true );
-  Start( 40 );
-  while( Status().m_State != ECaptureState::Complete )
-  {
-    m_pAwaited->RunOne();
-  }
-  ExpectFrames( 40 );
-  EXPECT_EQ( m_pSequence->m_Closes, 1 );
-  EXPECT_FALSE( m_pSequence->m_bClosedWithAFrameInHand );
-}
-
 TEST_F( ImageCapture, AStopFromAnotherThreadWaitsForTheFramesInHand )
 {
   Make( true );
@@ -361,7 +348,7 @@ TEST_F( ConvertedCapture, EachFrameCarriesItsOwnTimecode )
   EXPECT_EQ( std::count( pFrame->Image(), pFrame->Image() + pFrame->m_ImageBytes, pFrame->Image()[0] ), pFrame->m_ImageBytes ) << "only in the file";
 }
 
-TEST_F( ConvertedCapture, WorkersDrawToo )
+TEST_F( ConvertedCapture, ThreadsWriteAndDrawEveryFrameBeforeTheFileIsClosed )
 {
   UsePicture( 140, 60, KVZ::IPixelFormat::ELuminance8 );
   m_Rig.m_pTargets->m_bBurnInTimecode = true;
@@ -371,6 +358,8 @@ TEST_F( ConvertedCapture, WorkersDrawToo )
   {
     m_pAwaited->RunOne();
   }
+  EXPECT_EQ( m_pSequence->m_Closes, 1 );
+  EXPECT_FALSE( m_pSequence->m_bClosedWithAFrameInHand );
   const auto Frames = m_pSequence->Frames();
   ASSERT_EQ( Frames.size(), 30u );
   for( int Frame = 0; Frame < 30; ++Frame )

@@ -7,6 +7,7 @@
 #include "tests/HardwareSupport/VideoInput/VideoInputDataSource/FakeWriter.h"
 #include "tests/support/FakeVideoInputDevice.h"
 #include "tests/support/FrameMemory.h"
+#include "tests/support/HandTime.h"
 #include "tests/support/ManualPostalService.h"
 #include "tests/support/TemporaryFolder.h"
 
@@ -27,13 +28,6 @@ const VTick CounterStart( 987654321 );
 
 // The global tick of frame i_Index of the first session.
 inline VTick At( int64_t i_Index ) { return CounterStart + Period * i_Index; }
-
-class VHandTime : public StageCorePluginInterface::ITimeService
-{
-public:
-  double Now() override { return m_Now; }
-  double m_Now = 0.0;
-};
 
 class VCountedService : public StageCorePluginInterface::IServiceObject
 {
@@ -219,7 +213,7 @@ public:
   const std::shared_ptr<TestSupport::VManualPostalService> m_pStrand = std::make_shared<TestSupport::VManualPostalService>();
   const std::shared_ptr<TestSupport::VManualPostalService> m_pWriterService = std::make_shared<TestSupport::VManualPostalService>();
   const std::shared_ptr<VFakeCaptureTargets> m_pTargets = std::make_shared<VFakeCaptureTargets>();
-  const std::shared_ptr<VHandTime> m_pTime = std::make_shared<VHandTime>();
+  const std::shared_ptr<TestSupport::VHandTime> m_pTime = std::make_shared<TestSupport::VHandTime>();
   const std::shared_ptr<VCountedService> m_pService = std::make_shared<VCountedService>();
   const std::shared_ptr<VFakeDisk> m_pDisk = std::make_shared<VFakeDisk>();
   std::shared_ptr<VideoInputHAL::VVideoInputDataSourceAllocator> m_pFrames;
