@@ -65,6 +65,17 @@ protected:
     };
   }
 
+  // Four pictures.
+  void PlayOnce( double i_SoundSeconds, const std::string& i_rText )
+  {
+    MakeClip( File( "clip.mkv" ), "720x576", "25", 4, i_SoundSeconds );
+    Plug( i_rText + File( "clip.mkv" ) );
+    KeepContent();
+    Enable( FourCharacterCode( "pal " ) );
+    ASSERT_EQ( m_pInput->EnableAudioInput( 48000, AudioSampleType::Int32, 2 ), S_OK );
+    Start();
+  }
+
   // The card's pictures from i_First on, against a file of raw ones
   void ExpectPictures( size_t i_First, const VBytes& i_rExpected )
   {
@@ -144,12 +155,7 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
 
 TEST_F( DeckLinkClip, WithoutALoopTheSignalIsLostAtTheEndAndMissingSoundIsSilent )
 {
-  MakeClip( File( "clip.mkv" ), "720x576", "25", 4, 0.08 );
-  Plug( "decklink:loop=0,audio=ramp,input=" + File( "clip.mkv" ) );
-  KeepContent();
-  Enable( FourCharacterCode( "pal " ) );
-  ASSERT_EQ( m_pInput->EnableAudioInput( 48000, AudioSampleType::Int32, 2 ), S_OK );
-  Start();
+  PlayOnce( 0.08, "decklink:loop=0,audio=ramp,input=" );
   Step( 6 );
   ASSERT_EQ( m_Client.m_Seen.size(), 6u );
   EXPECT_TRUE( m_Client.m_Seen[3].m_bSignal );
@@ -164,12 +170,7 @@ TEST_F( DeckLinkClip, WithoutALoopTheSignalIsLostAtTheEndAndMissingSoundIsSilent
 
 TEST_F( DeckLinkClip, SoundShorterThanThePicturesEndsInSilence )
 {
-  MakeClip( File( "clip.mkv" ), "720x576", "25", 4, 0.06 );
-  Plug( "decklink:loop=0,input=" + File( "clip.mkv" ) );
-  KeepContent();
-  Enable( FourCharacterCode( "pal " ) );
-  ASSERT_EQ( m_pInput->EnableAudioInput( 48000, AudioSampleType::Int32, 2 ), S_OK );
-  Start();
+  PlayOnce( 0.06, "decklink:loop=0,input=" );
   Step( 4 );
   ASSERT_EQ( m_Sound.size(), 4u * 1920 * 8 );
   const auto LastSound = std::find_if( m_Sound.rbegin(), m_Sound.rend(), []( uint8_t i_Byte ) { return i_Byte != 0; } );

@@ -207,6 +207,15 @@ protected:
 
   void Start() { ASSERT_EQ( m_pInput->StartStreams(), S_OK ); }
 
+  // A card that streams its signal, and a client that keeps what it sees of it.
+  void Play( const std::string& i_rText )
+  {
+    Plug( i_rText );
+    m_Client.Record();
+    Enable();
+    Start();
+  }
+
   // What drivers do with a new format, inside the callback
   void RestartOnFormat( uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
   {

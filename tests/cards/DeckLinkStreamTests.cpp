@@ -166,10 +166,7 @@ TEST_F( DeckLinkStream, LossOfSignalMarksFramesAndTheClockGoesOn )
 
 TEST_F( DeckLinkStream, PausedStreamsGoOnInTheirOwnTime )
 {
-  Plug( "decklink:pattern=counter" );
-  m_Client.Record();
-  Enable();
-  Start();
+  Play( "decklink:pattern=counter" );
   Step();
   EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
   Step( 2 );
@@ -229,10 +226,7 @@ TEST_F( DeckLinkStream, TimecodeAnswersByTheSignalsPlaces )
 
 TEST_F( DeckLinkStream, PacketsComeOnlyWithSoundThatIsEnabledAndThere )
 {
-  Plug( "decklink:audio=none" );
-  m_Client.Record();
-  Enable();
-  Start();
+  Play( "decklink:audio=none" );
   Step();
   EXPECT_FALSE( m_Client.m_Seen[0].m_bPacket );
   m_pInput->StopStreams();

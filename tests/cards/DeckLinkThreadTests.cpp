@@ -79,7 +79,6 @@ TEST_F( DeckLinkThreads, AStopFromOutsideWinsOverARestartInsideACallback )
 TEST_F( DeckLinkThreads, NoCallbackBeginsAfterAStopInAStormOfStartsAndStops )
 {
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
-  RestartOnFormat();
   m_Client.m_OnFormat = [&]( uint32_t i_Mode )
   {
     m_pInput->PauseStreams();

@@ -66,6 +66,12 @@ protected:
     Make();
     m_pEngine->Start();
   }
+  // Cards that are there are found on this thread.
+  void MakeAndFindCards()
+  {
+    MakeAndStart();
+    m_pHost->m_pHardwareStart->Fire();
+  }
   // As a host ends a module that it has started: nothing waits in between.
   void End()
   {
@@ -159,8 +165,7 @@ TEST_F( VideoInputEngine, ShutdownObjectsOfALivingEngineEndNothing )
 
 TEST_F( VideoInputEngine, WithoutCardsNothingComesAndNothingGoes )
 {
-  MakeAndStart();
-  m_pHost->m_pHardwareStart->Fire();
+  MakeAndFindCards();
   EXPECT_FALSE( m_pEngine->StartCapture( "vi:0" ) );
   EXPECT_FALSE( m_pEngine->StopCapture( "vi:0" ) );
   m_pHost->m_pHappenings->Clear();
@@ -198,8 +203,7 @@ TEST_F( VideoInputEngine, WiresADeviceOnItsOwnThreadAndRegistersItsSourceLast )
 TEST_F( VideoInputEngine, FramesReachTheSourceOnceTheSignalIsThere )
 {
   const auto Card = AddCard();
-  MakeAndStart();
-  m_pHost->m_pHardwareStart->Fire();
+  MakeAndFindCards();
   StartCard( Card, "vi:0" );
   Control().Step( Card, 6 );
   EXPECT_EQ( FramesOf( "vi:0" ), 6u );
@@ -238,8 +242,7 @@ TEST_F( VideoInputEngine, FlowNodesFindTheSourcesOfTheMoment )
 TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )
 {
   AddCard();
-  MakeAndStart();
-  m_pHost->m_pHardwareStart->Fire();
+  MakeAndFindCards();
   AddCard();
   AddCard();
   WaitFor( "AddSource vi:2" );
@@ -265,8 +268,7 @@ TEST_F( VideoInputEngine, NoFrameComesAnyMoreWhenSourcesAreTakenOut )
     EXPECT_TRUE( Control().Step( Card, 3 ) );
     EXPECT_EQ( Delivered( Card ), Before );
   };
-  MakeAndStart();
-  m_pHost->m_pHardwareStart->Fire();
+  MakeAndFindCards();
   StartCard( Card, "vi:0" );
   m_pEngine.reset();
   EXPECT_TRUE( m_pHost->m_pHappenings->Has( "RemoveSource vi:0" ) );
@@ -284,8 +286,7 @@ TEST_F( VideoInputEngine, ADeviceThatTheHostRefusesCostsThatDeviceOnly )
   };
   AddCard();
   AddCard();
-  MakeAndStart();
-  m_pHost->m_pHardwareStart->Fire();
+  MakeAndFindCards();
   WaitFor( "AddSource vi:1" );
   m_pEngine.reset();
   EXPECT_EQ( Log.Texts(), ( VTexts{ "A posted function ended with an exception: no room" } ) );
@@ -299,8 +300,7 @@ TEST_F( VideoInputEngine, MayEndInMidStream )
     SCOPED_TRACE( Round );
     SetUp();
     const auto Card = AddCard();
-    MakeAndStart();
-    m_pHost->m_pHardwareStart->Fire();
+    MakeAndFindCards();
     StartCard( Card, "vi:0" );
     std::promise<void> Streaming;
     std::atomic<bool> bEnd{ false };
@@ -342,8 +342,7 @@ TEST_F( VideoInputEngine, MayEndWhileADeviceArrives )
       Reached.set_value();
       Opened.get_future().wait();
     };
-    MakeAndStart();
-    m_pHost->m_pHardwareStart->Fire();
+    MakeAndFindCards();
     Reached.get_future().wait();
     const auto pSources = m_pHost->m_pSources;
     std::promise<void> Ending;
@@ -373,8 +372,7 @@ TEST_F( VideoInputEngine, MayEndWhileCardsAreAnnounced )
   {
     SCOPED_TRACE( Round );
     SetUp();
-    MakeAndStart();
-    m_pHost->m_pHardwareStart->Fire();
+    MakeAndFindCards();
     boost::thread Vendor( [&] { AddCard(); } );
     if( Round % 2 == 0 )
     {
