@@ -123,6 +123,10 @@ int ApplySettings( VHostSession& i_rSession, const VRecordOptions& i_rOptions, c
     Complain( Refusal );
     return ExitUsage;
   }
+  if( const std::string Change = Format.WhatGaveWay(); !Change.empty() )
+  {
+    Complain( Change );
+  }
   if( !SetEnabled( i_rSession, i_rDevice.m_URN, false ) )
   {
     Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );

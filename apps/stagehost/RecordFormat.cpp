@@ -266,15 +266,43 @@ std::string VRecordFormat::WhyAudioRefused() const
   return {};
 }
 
-bool VRecordFormat::IsCaptured() const
+bool VRecordFormat::IsCaptured( const std::string& i_rPixelFormat ) const
 {
-  return std::count( m_Device.m_PixelFormats.begin(), m_Device.m_PixelFormats.end(), m_Options.m_PixelFormat ) > 0;
+  return std::count( m_Device.m_PixelFormats.begin(), m_Device.m_PixelFormats.end(), i_rPixelFormat ) > 0;
+}
+
+bool VRecordFormat::IsStored( const std::string& i_rPixelFormat ) const
+{
+  auto Format = IPixelFormat::EUnspecified;
+  KVZ::FromName( i_rPixelFormat, Format );
+  return m_Video != IVideoPayload::EUncompressed || Capabilities().IsPixelFormatSupported( Format );
+}
+
+std::string VRecordFormat::CapturedPixelFormat() const
+{
+  if( !m_Options.m_PixelFormat.empty() )
+  {
+    return IsCaptured( m_Options.m_PixelFormat ) ? m_Options.m_PixelFormat : m_Device.m_PixelFormat;
+  }
+  std::vector<std::string> Choice = { m_Device.m_PixelFormat, KVZ::ToName( IPixelFormat::EU8Y8V8Y8 ) };
+  Choice.insert( Choice.end(), m_Device.m_PixelFormats.begin(), m_Device.m_PixelFormats.end() );
+  const auto Found = std::find_if( Choice.begin(), Choice.end(),
+    [this]( const std::string& i_rName ) { return IsCaptured( i_rName ) && IsStored( i_rName ); } );
+  return Found != Choice.end() ? *Found : m_Device.m_PixelFormat;
+}
+
+std::string VRecordFormat::WhatGaveWay() const
+{
+  const std::string Captured = CapturedPixelFormat();
+  return !m_Options.m_PixelFormat.empty() || Captured == m_Device.m_PixelFormat ? ""
+                                                                                : m_Device.m_URN + ": Uncompressed video in the container " +
+      WordOf( Containers, m_Container ) + " does not take " + m_Device.m_PixelFormat + "; " + Captured + " is captured instead.";
 }
 
 // A format that the device cannot capture is made of the one that it has.
 std::string VRecordFormat::WhyNotCaptured() const
 {
-  if( m_Options.m_PixelFormat.empty() || IsCaptured() )
+  if( m_Options.m_PixelFormat.empty() || IsCaptured( m_Options.m_PixelFormat ) )
   {
     return {};
   }
@@ -312,9 +340,10 @@ std::vector<std::string> VRecordFormat::OfferedVideoPayloads() const
 std::vector<VWantedSetting> VRecordFormat::Settings() const
 {
   std::vector<VWantedSetting> Wanted;
-  if( !m_Options.m_PixelFormat.empty() && IsCaptured() )
+  const std::string PixelFormat = CapturedPixelFormat();
+  if( PixelFormat != m_Device.m_PixelFormat )
   {
-    Wanted.push_back( { "PixelFormat", m_Options.m_PixelFormat, "--pixel-format " + m_Options.m_PixelFormat } );
+    Wanted.push_back( { "PixelFormat", PixelFormat, "--pixel-format " + PixelFormat } );
   }
   if( m_Options.m_bAudioChannels )
   {

@@ -21,7 +21,7 @@ inline constexpr uint32_t MostChannels = 16;
 struct VFormatOptions
 {
   // Empty words leave the choice to the device's settings. A payload that the container does not take gives way to the first that it takes,
-  // uncompressed before all else.
+  // uncompressed before all else; so does a pixel format that it does not take uncompressed, U8Y8V8Y8 before the device's others.
   std::string m_Container;
   std::string m_Video;
   std::string m_Audio;
@@ -56,6 +56,9 @@ public:
   // The same as far as it can be said without a device.
   static std::string WhyRefused( const VFormatOptions& i_rOptions );
 
+  // A line for the user where the device's own pixel format cannot be stored, and another is captured that nobody asked for. Empty otherwise.
+  std::string WhatGaveWay() const;
+
   // The container comes first: it says which payloads the device offers.
   VWantedSetting Container() const;
   std::vector<VWantedSetting> Settings() const;
@@ -68,7 +71,9 @@ private:
   std::string WhyVideoRefused() const;
   std::string WhyPixelFormatRefused() const;
   std::string WhyAudioRefused() const;
-  bool IsCaptured() const;
+  bool IsCaptured( const std::string& i_rPixelFormat ) const;
+  bool IsStored( const std::string& i_rPixelFormat ) const;
+  std::string CapturedPixelFormat() const;
   const KVZ::IVideoWriterCapabilities& Capabilities() const;
 
   const VFormatOptions m_Options;
