@@ -2,13 +2,11 @@
 #include "apps/stagehost/Commands.h"
 #include "apps/stagehost/ExitCode.h"
 #include "apps/stagehost/HostSession.h"
-#include "apps/stagehost/Interrupt.h"
 #include "apps/stagehost/TextTable.h"
 
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
 
-#include <algorithm>
 #include <cstdlib>
 #include <iostream>
 
@@ -16,9 +14,6 @@ using StageHost::VDeviceInfo;
 
 namespace
 {
-
-constexpr double RateSeconds = 2.0;
-constexpr double ReactionSeconds = 0.1;
 
 struct VDevicesOptions
 {
@@ -60,24 +55,6 @@ void PrintTable( const std::vector<VDeviceInfo>& i_rDevices )
   }
 }
 
-// The host takes its rate from the first of the sources that deliver; until it has, and the devices have compared theirs with it, their
-// warnings tell nothing.
-void WaitForRate( VHostSession& i_rSession, const std::vector<VDeviceInfo>& i_rDevices )
-{
-  const auto Delivering = static_cast<size_t>( std::count_if( i_rDevices.begin(), i_rDevices.end(),
-    []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal() && i_rDevice.m_bEnabled; } ) );
-  const auto IsRateKnown = [&]
-  {
-    const auto pSession = i_rSession.Host().Engine().GetStarted();
-    return pSession && pSession->m_Sources.size() >= Delivering;
-  };
-  const double Until = i_rSession.Host().Time().Now() + RateSeconds;
-  while( Delivering != 0 && !IsRateKnown() && i_rSession.Host().Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
-  {
-  }
-  WaitUninterrupted( ReactionSeconds );
-}
-
 int Run( const VDevicesOptions& i_rOptions )
 {
   VHostSession Session;
@@ -90,7 +67,7 @@ int Run( const VDevicesOptions& i_rOptions )
   {
     return VHostSession::ExitWithoutDevices();
   }
-  WaitForRate( Session, Devices );
+  Session.WaitForDelivery( Devices );
   Devices = Session.Settings().GetDevices();
   if( i_rOptions.m_bJson )
   {

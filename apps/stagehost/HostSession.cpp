@@ -19,6 +19,8 @@ namespace
 // Real drivers announce their cards within this time.
 constexpr double ArrivalSeconds = 1.5;
 constexpr double SignalSeconds = 5.0;
+constexpr double DeliverySeconds = 2.0;
+constexpr double ReactionSeconds = 0.1;
 
 constexpr const char* NoSettings = "none";
 
@@ -177,6 +179,24 @@ std::vector<VDeviceInfo> VHostSession::WaitForDevices( bool i_bNeedSignal )
     }
   }
   return Devices;
+}
+
+// The host takes its rate from the first of the sources that deliver; until it has, and the devices have compared theirs with it, their
+// warnings tell nothing.
+void VHostSession::WaitForDelivery( const std::vector<VDeviceInfo>& i_rDevices )
+{
+  const auto Delivering = static_cast<size_t>( std::count_if( i_rDevices.begin(), i_rDevices.end(),
+    []( const VDeviceInfo& i_rDevice ) { return i_rDevice.HasSignal() && i_rDevice.m_bEnabled; } ) );
+  const auto IsRateKnown = [&]
+  {
+    const auto pSession = m_pHost->Engine().GetStarted();
+    return pSession && pSession->m_Sources.size() >= Delivering;
+  };
+  const double Until = m_pHost->Time().Now() + DeliverySeconds;
+  while( Delivering != 0 && !IsRateKnown() && m_pHost->Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
+  {
+  }
+  WaitUninterrupted( ReactionSeconds );
 }
 
 int VHostSession::ExitWithoutDevices() { return IsInterrupted() ? ExitFailed : ExitNoDevice; }

@@ -39,6 +39,8 @@ public:
   // Waits until the devices are there and have a signal, for as long as that may take. The devices asked for, in the order of their indices;
   // empty, with the reason on standard error, where there are none, one is unknown or, if a signal is needed, one has none.
   std::vector<StageHost::VDeviceInfo> WaitForDevices( bool i_bNeedSignal );
+  // Waits a moment more, until those that have a signal deliver it: only then do their settings tell its timecode and what is wrong with it.
+  void WaitForDelivery( const std::vector<StageHost::VDeviceInfo>& i_rDevices );
   // The exit code for an empty answer.
   static int ExitWithoutDevices();
 

@@ -174,9 +174,14 @@ int Run( const VParamsOptions& i_rOptions, VVerb i_pVerb )
   {
     return Result;
   }
-  if( Session.WaitForDevices( false ).empty() )
+  const std::vector<StageHost::VDeviceInfo> Devices = Session.WaitForDevices( false );
+  if( Devices.empty() )
   {
     return VHostSession::ExitWithoutDevices();
+  }
+  if( i_pVerb == &List || i_pVerb == &Get )
+  {
+    Session.WaitForDelivery( Devices );
   }
   const int Result = i_pVerb( Session, i_rOptions );
   return std::cout.flush() ? Result : ExitFailed;
