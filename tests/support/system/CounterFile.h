@@ -1,6 +1,8 @@
 // A recording of a card with pattern=counter and audio=ramp, read frame by frame from the file.
 #pragma once
 
+#include "tests/support/system/StageHost.h"
+
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -24,7 +26,14 @@ struct VSignalRate
   uint32_t m_FramesPerLabel = 1;
   bool m_bDropFrame = false;
   std::vector<uint32_t> m_SampleCadence;   // samples of the frames 0, 1, ... of the card, over and over
+  const char* m_pKind = "decklink";        // of the card
+  uint32_t m_SamplesLeftOut = 0;           // at the end of a frame, at most
 };
+
+// A card with this signal that counts in picture and sound, and more keys behind a comma each.
+std::string CounterCardText( const VSignalRate& i_rRate, const std::string& i_rMore = {} );
+// The same as arguments, with the pixel format that is read here: by itself a Bluefish444 card delivers luma alone.
+VArguments CounterCard( const VSignalRate& i_rRate, const std::string& i_rMore = {} );
 
 // All frames of the file in the order of their keys, in U8Y8V8Y8 with Int16 sound or none. Reports, as a failed check, a picture that is not whole:
 // an unreadable counter, a background that differs from the first frame's, a ramp that is not one, keys that do not count from 0.

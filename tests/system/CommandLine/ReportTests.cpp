@@ -1,6 +1,7 @@
 // What people and scripts are told about devices, settings and files.
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/TvidParser.h"
+#include "tests/support/system/Rates.h"
 #include "tests/support/system/StageHost.h"
 
 #include <gtest/gtest.h>
@@ -71,26 +72,35 @@ TEST_F( ReportTest, DevicesAreATableForPeopleAndADocumentForScripts )
 {
   const std::string Script = WriteScript( m_Folder.File( "script.json" ), { { { "frame", 0 }, { "do", "signal-loss" }, { "frames", 100000 } } } );
   const VArguments Cards = { "--card", "decklink:standard=HD_1920_1080P_2500", "--card", "decklink:standard=HD_1920_1080P_5000,timecode=none",
-    "--card", "decklink:standard=HD_1920_1080P_2500,script=" + Script };
+    "--card", "decklink:standard=HD_1920_1080P_2500,script=" + Script, "--card", "bluefish444:standard=HD_1280_720P_5000" };
   const VRunResult Run = TestSupport::RunStageHost( VArguments{ "devices" } + Cards );
   EXPECT_EQ( 0, Run.m_ExitCode ) << Describe( Run );
   EXPECT_EQ( "", Run.m_Error ) << "warnings where nothing is wrong";
   const std::vector<std::string> Rows = Lines( Run.m_Output );
-  ASSERT_EQ( 4u, Rows.size() ) << Run.m_Output;
+  ASSERT_EQ( 5u, Rows.size() ) << Run.m_Output;
   EXPECT_TRUE( HasCells( Rows[0], { "URN", "NAME", "DRIVER", "STANDARD", "SIGNAL", "TIMECODE", "PIXEL FORMATS", "CHANNELS" } ) ) << Run.m_Output;
-  EXPECT_TRUE( HasCells( Rows[1], { "vi:0", "DeckLink C1", "HD_1920_1080P_2500", "yes", "25 fps", "U8Y8V8Y8", "16" } ) ) << Run.m_Output;
-  EXPECT_TRUE( HasCells( Rows[2], { "vi:1", "DeckLink C2", "HD_1920_1080P_5000", "yes", "Not Detected" } ) ) << Run.m_Output;
-  EXPECT_TRUE( HasCells( Rows[3], { "vi:2", "DeckLink C3", "no" } ) ) << Run.m_Output;
-  EXPECT_EQ( Rows[0].find( "STANDARD" ), Rows[1].find( "HD_1920" ) ) << "columns stand under their heads";
+  EXPECT_TRUE( HasCells( Rows[1], { "vi:0", "Super Nova C1:ChA", "Bluefish 444", "HD_1280_720P_5000", "yes", "25 fps", "Luminance8", "0 1 2 3" } ) )
+    << Run.m_Output;
+  EXPECT_TRUE( HasCells( Rows[2], { "vi:1", "DeckLink C1", "HD_1920_1080P_2500", "yes", "25 fps", "U8Y8V8Y8", "16" } ) ) << Run.m_Output;
+  EXPECT_TRUE( HasCells( Rows[3], { "vi:2", "DeckLink C2", "HD_1920_1080P_5000", "yes", "Not Detected" } ) ) << Run.m_Output;
+  EXPECT_TRUE( HasCells( Rows[4], { "vi:3", "DeckLink C3", "no" } ) ) << Run.m_Output;
+  EXPECT_EQ( Rows[0].find( "STANDARD" ), Rows[2].find( "HD_1920" ) ) << "columns stand under their heads";
 
   const nlohmann::json Devices = RunJson( VArguments{ "devices", "--json" } + Cards );
-  ASSERT_EQ( 3u, Devices.size() );
+  ASSERT_EQ( 4u, Devices.size() );
   EXPECT_EQ( "vi:0", Devices[0].value( "urn", "" ) );
-  EXPECT_EQ( "HD_1920_1080P_5000", Devices[1].value( "standard", "" ) );
+  EXPECT_EQ( "HD_1920_1080P_5000", Devices[2].value( "standard", "" ) );
   EXPECT_TRUE( Devices[0].value( "signal", false ) );
-  EXPECT_FALSE( Devices[2].value( "signal", true ) );
-  EXPECT_EQ( ( nlohmann::json{ 0, 2, 8, 16 } ), Devices[0].value( "channel_counts", nlohmann::json() ) );
+  EXPECT_FALSE( Devices[3].value( "signal", true ) );
+  EXPECT_EQ( ( nlohmann::json{ 0, 2, 8, 16 } ), Devices[1].value( "channel_counts", nlohmann::json() ) );
   EXPECT_EQ( 16, Devices[0].value( "channels", 0 ) );
+}
+
+TEST_F( ReportTest, CardsWithoutUsableInputsGiveNoDevice )
+{
+  const VRunResult Run = TestSupport::RunStageHost( { "devices", "--card", "bluefish444:inputs=0,outputs=2" } );
+  EXPECT_EQ( 4, Run.m_ExitCode );
+  EXPECT_NE( Run.m_Error.find( "Card has output channels but no inputs." ), std::string::npos ) << Describe( Run );
 }
 
 // Two rates that no common base has: recorded all the same, and told.
@@ -104,15 +114,22 @@ TEST_F( ReportTest, RatesThatDoNotFitAreWarnedOf )
   EXPECT_EQ( std::string::npos, Run.m_Error.find( "(0.00 Hz)" ) ) << Describe( Run );
 }
 
-TEST_F( ReportTest, SettingsCanBeListedReadAndChanged )
+class SettingsReportTest : public testing::TestWithParam<VSignalRate>
 {
-  const VArguments Card = { "params", "--card", "decklink" };
+};
+
+TEST_P( SettingsReportTest, SettingsCanBeListedReadAndChanged )
+{
+  const VArguments Card = { "params", "--card", std::string( GetParam().m_pKind ) + ":standard=" + GetParam().m_pStandard };
   const VRunResult List = TestSupport::RunStageHost( Card + VArguments{ "list" } );
   EXPECT_EQ( 0, List.m_ExitCode ) << Describe( List );
   const std::vector<std::string> Tree = Lines( List.m_Output );
   const auto Group = std::find( Tree.begin(), Tree.end(), "VideoInput.vi:0.Settings" );
-  const auto IsFormat = []( const std::string& i_rLine ) {
-    return HasCells( i_rLine, { "PixelFormat", "U8Y8V8Y8", "U8Y8V8Y8, U10Y10V10Y10", "The chosen pixel format" } );
+  const auto IsFormat = []( const std::string& i_rLine )
+  {
+    const bool bLuma = i_rLine.find( "Luminance8" ) != std::string::npos;
+    return bLuma == ( GetParam().m_pKind == std::string( "bluefish444" ) ) &&
+      HasCells( i_rLine, { "PixelFormat", "8", "U8Y8V8Y8, ", "U10Y10V10Y10", "The chosen pixel format" } );
   };
   EXPECT_EQ( 1, std::count_if( Group, Tree.end(), IsFormat ) ) << List.m_Output;
   for( const nlohmann::json& rSetting : RunJson( Card + VArguments{ "--json", "list" } ) )
@@ -123,9 +140,13 @@ TEST_F( ReportTest, SettingsCanBeListedReadAndChanged )
   const VRunResult Set = TestSupport::RunStageHost( Card + VArguments{ "set", "VideoInput.vi:0.Settings.PixelFormat", "U10Y10V10Y10" } );
   EXPECT_EQ( 0, Set.m_ExitCode ) << Describe( Set );
   EXPECT_EQ( "U10Y10V10Y10\n", Set.m_Output );
+  const VRunResult Timecode = TestSupport::RunStageHost( Card + VArguments{ "get", "VideoInput.vi:0.Hardware.TimecodeStandard" } );
+  EXPECT_EQ( "Receiving 25 fps\n", Timecode.m_Output ) << Describe( Timecode );
   const VRunResult Get = TestSupport::RunStageHost( Card + VArguments{ "get", "VideoInput.vi:0.Hardware.VideoStandard" } );
-  EXPECT_EQ( "HD_1920_1080P_2500\n", Get.m_Output ) << Describe( Get );
+  EXPECT_EQ( GetParam().m_pStandard + std::string( "\n" ), Get.m_Output ) << Describe( Get );
 }
+
+INSTANTIATE_TEST_SUITE_P( Kinds, SettingsReportTest, BothKinds, KindName );
 
 // Every sum and position is checked against a reader that shares no code with it.
 TEST_F( ReportTest, InspectTellsWhatTheFileHolds )

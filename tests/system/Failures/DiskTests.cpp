@@ -16,7 +16,7 @@ namespace
 
 constexpr uint64_t FrameCount = 4;
 
-VArguments SmallCard() { return { "--card", std::string( "decklink:pattern=counter,audio=ramp,speed=4,standard=" ) + Rate2398.m_pStandard }; }
+VArguments SmallCard() { return CounterCard( Rate2398, "speed=4" ); }
 
 // Where the parts of such a recording lie; all recordings of the card are laid out the same.
 struct VLayout
@@ -134,18 +134,19 @@ TEST_F( DiskTest, AFileThatFitsExactlyIsComplete )
   EXPECT_EQ( FrameCount, ReadCounterFile( Result.Path() ).size() );
 }
 
-// One card's failure is its own: the other file is whole.
+// One card's failure is its own, of whatever kind it is: the other file is whole.
 TEST_F( DiskTest, TheOtherCardGoesOn )
 {
   VRunOptions Options;
   Options.m_FileSizeLimit = 20'000'000;   // 25 small frames fit, 25 large ones do not
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", "decklink:pattern=counter,audio=ramp,speed=2,standard=HD_1280_720P_6000", "--card",
-      std::string( "decklink:pattern=counter,audio=ramp,speed=2,standard=" ) + Rate2398.m_pStandard, "--frames", "25" },
-    Options );
+    CounterCard( Bluefish60, "speed=2" ) + VArguments{ "--card", CounterCardText( Rate2398, "speed=2" ), "--frames", "25" }, Options );
   EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   ASSERT_EQ( 2u, Result.m_Devices.size() ) << Describe( Result.m_Run );
   EXPECT_NE( 0u, Result.Device( 0 ).value( "failure", 0u ) & 8 );
+  const std::vector<VCounterFrame> Kept = ReadCounterFile( Result.Path( 0 ) );
+  EXPECT_EQ( 10u, Kept.size() );
+  ExpectUnbroken( Kept, Bluefish60 );
   EXPECT_EQ( 0u, Result.Device( 1 ).value( "failure", 1u ) );
   const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path( 1 ) );
   EXPECT_EQ( 25u, Frames.size() );

@@ -34,73 +34,64 @@ VRunOptions SignalAfter( int64_t i_Frames, std::vector<int> i_Signals )
   return Options;
 }
 
-const VArguments LongRecording = { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_576I_5000,speed=4", "--frames", "100000",
-  "--progress" };
 constexpr int64_t EnoughFrames = 30;
 
 }
 
-class EndTest : public testing::TestWithParam<int>
+class EndTest : public testing::TestWithParam<VSignalRate>
 {
 protected:
+  VRecordResult RecordUntil( const std::vector<int>& i_rSignals ) const
+  {
+    return Record( m_Folder.File( "out" ), CounterCard( GetParam(), "speed=4" ) + VArguments{ "--frames", "100000", "--progress" },
+      SignalAfter( EnoughFrames, i_rSignals ) );
+  }
+
   const TestSupport::VTemporaryFolder m_Folder;
 };
 
 TEST_P( EndTest, OneSignalFinishesTheFile )
 {
-  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { GetParam() } ) );
+  const VRecordResult Result = RecordUntil( { std::string( "decklink" ) == GetParam().m_pKind ? SIGINT : SIGTERM } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
   EXPECT_GE( Frames.size(), static_cast<size_t>( EnoughFrames ) );
-  ExpectUnbroken( Frames, Rate25 );
+  ExpectUnbroken( Frames, GetParam() );
   EXPECT_TRUE( TestSupport::VTvidParser( Result.Path() ).IsFinished() );
   EXPECT_EQ( Frames.size(), Result.Device().value( "frames_written", 0u ) );
   EXPECT_EQ( Frames.size(), Result.Device().value( "frames_requested", 0u ) );
   EXPECT_EQ( "Complete", Result.Device().value( "state", "" ) );
 }
 
-INSTANTIATE_TEST_SUITE_P( Signals, EndTest, testing::Values( SIGINT, SIGTERM ) );
-
-class SuddenEndTest : public testing::Test
-{
-protected:
-  const TestSupport::VTemporaryFolder m_Folder;
-  const std::string m_Path = m_Folder.File( "out" ) + "/take_vi0.tvid";
-
-  void ExpectWholeFramesOfAnUnclosedFile()
-  {
-    const nlohmann::json Told = Inspect( m_Path, true );
-    EXPECT_EQ( false, Told.value( "finished", true ) ) << Told;
-    const std::vector<VCounterFrame> Frames = ReadCounterFile( m_Path );
-    EXPECT_FALSE( Frames.empty() );
-    EXPECT_EQ( Frames.size(), Told.value( "frame_count", 0u ) );
-    EXPECT_EQ( Frames.size(), Told.value( "frames", nlohmann::json::array() ).size() );
-    ExpectUnbroken( Frames, Rate25 );
-    const VRunResult Text = TestSupport::RunStageHost( { "inspect", m_Path } );
-    EXPECT_EQ( 0, Text.m_ExitCode );
-    EXPECT_NE( std::string::npos, Text.m_Output.find( "never closed" ) ) << Describe( Text );
-  }
-};
-
 // A sanitizer hands signals to their handler when it sees fit, which may be after the program's own end.
 #if !defined( STAGECORE_SANITIZER_BUILD )
-TEST_F( SuddenEndTest, TwoSignalsEndTheProgramAtOnce )
+TEST_P( EndTest, TwoSignalsEndTheProgramAtOnce )
 {
-  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { SIGINT, SIGTERM } ) );
+  const VRecordResult Result = RecordUntil( { SIGINT, SIGTERM } );
   EXPECT_EQ( 130, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( "", Result.m_Run.m_Output );
 }
 #endif
 
-TEST_F( SuddenEndTest, AKilledRecordingCanBeRead )
+TEST_P( EndTest, AKilledRecordingCanBeRead )
 {
-  const VRecordResult Result = Record( m_Folder.File( "out" ), LongRecording, SignalAfter( EnoughFrames, { SIGKILL } ) );
+  const VRecordResult Result = RecordUntil( { SIGKILL } );
   EXPECT_EQ( SIGKILL, Result.m_Run.m_Signal ) << Describe( Result.m_Run );
-  ExpectWholeFramesOfAnUnclosedFile();
+  const std::string Path = m_Folder.File( "out" ) + "/take_vi0.tvid";
+  const nlohmann::json Told = Inspect( Path, true );
+  EXPECT_EQ( false, Told.value( "finished", true ) ) << Told;
+  const std::vector<VCounterFrame> Frames = ReadCounterFile( Path );
+  EXPECT_FALSE( Frames.empty() );
+  EXPECT_EQ( Frames.size(), Told.value( "frame_count", 0u ) );
+  EXPECT_EQ( Frames.size(), Told.value( "frames", nlohmann::json::array() ).size() );
+  ExpectUnbroken( Frames, GetParam() );
+  const VRunResult Text = TestSupport::RunStageHost( { "inspect", Path } );
+  EXPECT_EQ( 0, Text.m_ExitCode );
+  EXPECT_NE( std::string::npos, Text.m_Output.find( "never closed" ) ) << Describe( Text );
 }
 
 // A signal before there is anything to finish.
-TEST_F( SuddenEndTest, AnEndBeforeTheBeginning )
+TEST_P( EndTest, AnEndBeforeTheBeginning )
 {
   VRunOptions Options;
   Options.m_OnErrorText = [bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
@@ -114,8 +105,10 @@ TEST_F( SuddenEndTest, AnEndBeforeTheBeginning )
   // A card with no signal for a long time: the program waits.
   const std::string Script = WriteScript( m_Folder.File( "script.json" ), { { { "frame", 0 }, { "do", "signal-loss" }, { "frames", 100000 } } } );
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", "decklink:standard=SD_720_576I_5000,script=" + Script, "--frames", "10", "--verbose" }, Options );
+    CounterCard( GetParam(), "script=" + Script ) + VArguments{ "--frames", "10", "--verbose" }, Options );
   EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( "", Result.m_Run.m_Output );
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: Interrupted " ) ) << Describe( Result.m_Run );
 }
+
+INSTANTIATE_TEST_SUITE_P( Kinds, EndTest, BothKinds, KindName );

@@ -60,9 +60,14 @@ std::vector<std::string> RecordedSums( const std::string& i_rPath )
 
 }
 
-class ClipTest : public testing::Test
+class ClipTest : public testing::TestWithParam<const char*>
 {
 protected:
+  static VArguments Card( const std::string& i_rKeys )
+  {
+    return { "--card", std::string( GetParam() ) + ":" + i_rKeys, "--pixel-format", "U8Y8V8Y8" };
+  }
+
   std::string MakeClip( const VArguments& i_rMore = {} )
   {
     const std::string Path = m_Folder.File( "clip.mkv" );
@@ -80,7 +85,7 @@ protected:
   const TestSupport::VTemporaryFolder m_Folder;
 };
 
-TEST_F( ClipTest, EveryPictureAndSampleIsThatOfTheClip )
+TEST_P( ClipTest, EveryPictureAndSampleIsThatOfTheClip )
 {
   const std::string Clip = MakeClip();
   const std::vector<std::string> Expected = DecodedSums( Clip );
@@ -89,7 +94,7 @@ TEST_F( ClipTest, EveryPictureAndSampleIsThatOfTheClip )
 
   // Longer than the clip: it begins again.
   constexpr size_t FrameCount = ClipFrames + ClipFrames / 2;
-  const VRecordResult Result = Record( m_Folder.File( "out" ), { "--card", "decklink:input=" + Clip, "--frames", std::to_string( FrameCount ) } );
+  const VRecordResult Result = Record( m_Folder.File( "out" ), Card( "input=" + Clip ) + VArguments{ "--frames", std::to_string( FrameCount ) } );
   ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   TestSupport::VTvidParser File( Result.Path() );
   EXPECT_EQ( 1280u, File.Width() );
@@ -122,14 +127,18 @@ TEST_F( ClipTest, EveryPictureAndSampleIsThatOfTheClip )
 }
 
 // A clip that is not begun again is a signal that goes away.
-TEST_F( ClipTest, AnEndOfTheClipIsALossOfSignal )
+TEST_P( ClipTest, AnEndOfTheClipIsALossOfSignal )
 {
   const std::string Clip = MakeClip();
-  const VRecordResult Result = Record( m_Folder.File( "out" ), { "--card", "decklink:loop=0,input=" + Clip, "--frames", "500" } );
+  const VRecordResult Result = Record( m_Folder.File( "out" ), Card( "loop=0,input=" + Clip ) + VArguments{ "--frames", "500" } );
   EXPECT_EQ( 3, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  EXPECT_EQ( 0, Result.Device().value( "lost", nlohmann::json::object() ).value( "card", -1 ) ) << "what has ended is not dropped";
   const std::vector<std::string> Expected = DecodedSums( Clip );
   const std::vector<std::string> Recorded = RecordedSums( Result.Path() );
   ASSERT_FALSE( Recorded.empty() );
   ASSERT_LE( Recorded.size(), Expected.size() );
   EXPECT_TRUE( std::equal( Recorded.rbegin(), Recorded.rend(), Expected.rbegin() ) ) << "the last pictures are not the clip's last";
 }
+
+INSTANTIATE_TEST_SUITE_P( Kinds, ClipTest, testing::Values( "decklink", "bluefish444" ),
+  []( const auto& i_rInfo ) { return std::string( i_rInfo.param ); } );

@@ -18,17 +18,14 @@ constexpr int FailureEndMoved = 2;
 
 }
 
-class EventTest : public testing::Test
+class EventTest : public testing::TestWithParam<VSignalRate>
 {
 protected:
-  VRecordResult RecordEvents( const nlohmann::json& i_rEvents, uint64_t i_Frames, const VArguments& i_rMore = {} )
+  VRecordResult RecordEvents( const nlohmann::json& i_rEvents, uint64_t i_Frames )
   {
     const std::string Script = WriteScript( m_Folder.File( "script.json" ), i_rEvents );
     return Record( m_Folder.File( "out" ),
-      VArguments{ "--card",
-        std::string( "decklink:pattern=counter,audio=ramp,timecode=01:00:00:00,speed=8,standard=" ) + m_Rate.m_pStandard + ",script=" + Script,
-        "--frames", std::to_string( i_Frames ), "--verbose" } +
-        i_rMore );
+      CounterCard( m_Rate, "timecode=01:00:00:00,speed=8,script=" + Script ) + VArguments{ "--frames", std::to_string( i_Frames ), "--verbose" } );
   }
 
   // Gaps between neighbouring counters, as "from which card frame, how many are missing". Sound is checked within the frames, and
@@ -83,12 +80,12 @@ protected:
   }
 
   const TestSupport::VTemporaryFolder m_Folder;
-  const VSignalRate m_Rate = Rate25;
+  const VSignalRate m_Rate = GetParam();
 };
 
-TEST_F( EventTest, SignalLostAndBackEndsTheCaptureAtItsLastFrame )
+TEST_P( EventTest, SignalLostAndBackEndsTheCaptureAtItsLastFrame )
 {
-  const VRecordResult Result = RecordEvents( EveryFrames( Every, { { "do", "signal-loss" }, { "frames", 10 } } ), 1000 );
+  const VRecordResult Result = RecordEvents( { { { "frame", 3 * Every }, { "do", "signal-loss" }, { "frames", 10 } } }, 1000 );
   ExpectEndedEarly( Result, FailureEndMoved, 10 );
   EXPECT_TRUE( Says( Result, "stagehost: vi:0: The signal was interrupted or changed after " ) ) << Describe( Result.m_Run );
   EXPECT_TRUE( Says( Result, "SetSourceEnabled: Source disabled - will request new global session" ) ) << Describe( Result.m_Run );
@@ -97,20 +94,20 @@ TEST_F( EventTest, SignalLostAndBackEndsTheCaptureAtItsLastFrame )
 }
 
 // A signal that stays away gives the buffer no reason to end anything: the host ends the capture when nothing has come for a while.
-TEST_F( EventTest, SignalLostForGoodEndsAfterASilence )
+TEST_P( EventTest, SignalLostForGoodEndsAfterASilence )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", 3 * Every }, { "do", "signal-loss" }, { "frames", 1000000 } } }, 1000 );
   ExpectEndedEarly( Result, 0 );
   EXPECT_TRUE( Says( Result, "stagehost: vi:0: No more frames came after " ) ) << Describe( Result.m_Run );
 }
 
-TEST_F( EventTest, RemovedCardEndsAfterASilence )
+TEST_P( EventTest, RemovedCardEndsAfterASilence )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", 3 * Every }, { "do", "remove" } } }, 1000 );
   ExpectEndedEarly( Result, 0 );
 }
 
-TEST_F( EventTest, FormatOfAnotherRateEndsTheCapture )
+TEST_P( EventTest, FormatOfAnotherRateEndsTheCapture )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", 3 * Every }, { "do", "format" }, { "standard", "SD_720_486I_5994" } } }, 1000 );
   ExpectEndedEarly( Result, FailureEndMoved );
@@ -118,7 +115,7 @@ TEST_F( EventTest, FormatOfAnotherRateEndsTheCapture )
 }
 
 // A picture of another size at the same rate changes no clock. No file may hold both.
-TEST_F( EventTest, FormatOfTheSameRateLeavesAWholeFile )
+TEST_P( EventTest, FormatOfTheSameRateLeavesAWholeFile )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", 3 * Every }, { "do", "format" }, { "standard", "HD_1920_1080P_2500" } } }, 400 );
   EXPECT_NE( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -131,7 +128,7 @@ TEST_F( EventTest, FormatOfTheSameRateLeavesAWholeFile )
   EXPECT_TRUE( Says( Result, "the format of the frames changed from 720 x 576" ) ) << Describe( Result.m_Run );
 }
 
-TEST_F( EventTest, DroppedFramesAreCountedAndTheRecordingGoesOn )
+TEST_P( EventTest, DroppedFramesAreCountedAndTheRecordingGoesOn )
 {
   constexpr uint32_t Dropped = 3;
   const VRecordResult Result = RecordEvents( EveryFrames( Every, { { "do", "drop" }, { "frames", Dropped } } ), 250 );
@@ -150,7 +147,7 @@ TEST_F( EventTest, DroppedFramesAreCountedAndTheRecordingGoesOn )
   EXPECT_EQ( 0, Result.Device().value( "failure", -1 ) );
 }
 
-TEST_F( EventTest, TimecodeJumpGoesOnInTheSameFile )
+TEST_P( EventTest, TimecodeJumpGoesOnInTheSameFile )
 {
   nlohmann::json Events = nlohmann::json::array();
   for( uint32_t Jump = 1; Jump < 20; ++Jump )
@@ -168,7 +165,7 @@ TEST_F( EventTest, TimecodeJumpGoesOnInTheSameFile )
   EXPECT_EQ( 0, Result.Device().value( "failure", -1 ) );
 }
 
-TEST_F( EventTest, TimecodeLossGoesOnInTheSameFile )
+TEST_P( EventTest, TimecodeLossGoesOnInTheSameFile )
 {
   const VRecordResult Result = RecordEvents( EveryFrames( Every, { { "do", "timecode-loss" }, { "frames", 30 } } ), 250 );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -179,7 +176,7 @@ TEST_F( EventTest, TimecodeLossGoesOnInTheSameFile )
   EXPECT_TRUE( Says( Result, "Timecode Added, " ) );
 }
 
-TEST_F( EventTest, MidnightGoesOnInTheSameFile )
+TEST_P( EventTest, MidnightGoesOnInTheSameFile )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", 150 }, { "do", "timecode-jump" }, { "to", "23:59:58:00" } } }, 300 );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -188,7 +185,7 @@ TEST_F( EventTest, MidnightGoesOnInTheSameFile )
   ExpectUnbroken( Frames, m_Rate );
 }
 
-TEST_F( EventTest, LateFramesAreFramesAllTheSame )
+TEST_P( EventTest, LateFramesAreFramesAllTheSame )
 {
   const VRecordResult Result = RecordEvents( EveryFrames( Every, { { "do", "late" }, { "milliseconds", 400 } } ), 250 );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -198,8 +195,14 @@ TEST_F( EventTest, LateFramesAreFramesAllTheSame )
   EXPECT_EQ( 0, Result.Device().value( "lost", nlohmann::json::object() ).value( "card", -1 ) );
 }
 
-// A card that arrives after the program has begun is waited for.
-TEST_F( EventTest, ACardMayArriveLater )
+INSTANTIATE_TEST_SUITE_P( Kinds, EventTest, BothKinds, KindName );
+
+// A card that arrives after the program has begun is waited for. Of the other kind nobody is told.
+class ArrivalTest : public EventTest
+{
+};
+
+TEST_P( ArrivalTest, ACardMayArriveLater )
 {
   const VRecordResult Result = RecordEvents( { { { "frame", Every }, { "do", "arrive" } } }, 20 );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -208,3 +211,5 @@ TEST_F( EventTest, ACardMayArriveLater )
   EXPECT_GE( Frames.front().m_Counter, Every );
   ExpectUnbroken( Frames, m_Rate );
 }
+
+INSTANTIATE_TEST_SUITE_P( DeckLink, ArrivalTest, testing::Values( Rate25 ), KindName );

@@ -29,12 +29,19 @@ const VRangeCase RangeCases[] = {
   { "5994", Rate5994, "01:00:00:00" },
   { "5994Drop", Rate5994Drop, "00:00:59;29" },
   { "60", Rate60, "10:00:00:00" },
+  { "Bluefish2398", Bluefish2398, "01:00:00:23" },
+  { "Bluefish24", Bluefish24, "01:00:00:23" },
+  { "Bluefish25", Bluefish25, "23:59:59:24" },
+  { "Bluefish2997Drop", Bluefish2997Drop, "00:00:59;29" },
+  { "Bluefish30", Bluefish30, "00:00:59:29" },
+  { "Bluefish50", Bluefish50, "09:59:59:24" },
+  { "Bluefish5994Drop", Bluefish5994Drop, "00:09:59;29" },
+  { "Bluefish60", Bluefish60, "10:00:00:00" },
 };
 
-std::string CardText( const VRangeCase& i_rCase, const std::string& i_rSpeed )
+VArguments Card( const VRangeCase& i_rCase, const std::string& i_rSpeed )
 {
-  return std::string( "decklink:pattern=counter,audio=ramp,standard=" ) + i_rCase.m_Rate.m_pStandard + ",timecode=" + i_rCase.m_pStartLabel +
-    ",speed=" + i_rSpeed;
+  return CounterCard( i_rCase.m_Rate, std::string( "timecode=" ) + i_rCase.m_pStartLabel + ",speed=" + i_rSpeed );
 }
 
 void ExpectAllWritten( const VRecordResult& i_rRecord, uint64_t i_Frames )
@@ -67,7 +74,7 @@ TEST_P( RangeTest, HoldsTheFramesAskedForWithTheirSoundAndTimecode )
 {
   constexpr uint64_t FrameCount = 67;
   const VRangeCase& rCase = GetParam();
-  const VRecordResult Result = Record( m_Folder.File( "out" ), { "--card", CardText( rCase, "2" ), "--frames", std::to_string( FrameCount ) } );
+  const VRecordResult Result = Record( m_Folder.File( "out" ), Card( rCase, "2" ) + VArguments{ "--frames", std::to_string( FrameCount ) } );
   ExpectAllWritten( Result, FrameCount );
 
   const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
@@ -107,7 +114,7 @@ TEST_P( PreRollTest, BeginsThatLongBeforeTheRequest )
   const int64_t Period = rCase.m_Rate.m_Period;
   const int64_t FrameCount = PreRoll / Period + 40;   // the file reaches from before the request to after it
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", CardText( rCase, "4" ), "--frames", std::to_string( FrameCount ), "--pre-roll", std::to_string( PreRollSeconds ), "--verbose" } );
+    Card( rCase, "4" ) + VArguments{ "--frames", std::to_string( FrameCount ), "--pre-roll", std::to_string( PreRollSeconds ), "--verbose" } );
   ExpectAllWritten( Result, static_cast<uint64_t>( FrameCount ) );
 
   const std::vector<int64_t> Starts = NumbersBehind( "StartCapture: Local Start Tick is ", Result.m_Run.m_Error );
@@ -128,21 +135,21 @@ TEST_P( PreRollTest, BeginsThatLongBeforeTheRequest )
 
 INSTANTIATE_TEST_SUITE_P( Rates, PreRollTest,
   testing::Values( VRangeCase{ "2398", Rate2398, "01:00:00:00" }, VRangeCase{ "25", Rate25, "10:00:00:00" },
-    VRangeCase{ "2997Drop", Rate2997Drop, "00:00:59;00" }, VRangeCase{ "50", Rate50, "10:00:00:00" }, VRangeCase{ "5994", Rate5994, "01:00:00:00" } ),
+    VRangeCase{ "2997Drop", Rate2997Drop, "00:00:59;00" }, VRangeCase{ "50", Rate50, "10:00:00:00" }, VRangeCase{ "5994", Rate5994, "01:00:00:00" },
+    VRangeCase{ "Bluefish25", Bluefish25, "10:00:00:00" }, VRangeCase{ "Bluefish5994Drop", Bluefish5994Drop, "00:00:59;00" } ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pName ); } );
 
-class RangeFormTest : public testing::Test
+class RangeFormTest : public testing::TestWithParam<VSignalRate>
 {
 protected:
   const TestSupport::VTemporaryFolder m_Folder;
 };
 
 // Seconds become whole frames: 1.5 s hold 90 frame starts at 59.94 and 37 or 38 at 25, whichever way the range lies on the grid.
-TEST_F( RangeFormTest, SecondsHoldAllFramesThatBeginInTheSpan )
+TEST_P( RangeFormTest, SecondsHoldAllFramesThatBeginInTheSpan )
 {
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", "decklink:pattern=counter,audio=none,standard=SD_720_576I_5000,speed=4", "--card",
-      "decklink:pattern=counter,audio=none,standard=SD_720_486P_5994,speed=4", "--seconds", "1.5" } );
+    CounterCard( GetParam(), "speed=4" ) + VArguments{ "--card", CounterCardText( Rate5994, "speed=4" ), "--seconds", "1.5" } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   const size_t Slow = ReadCounterFile( Result.Path( 0 ) ).size();
   const size_t Fast = ReadCounterFile( Result.Path( 1 ) ).size();
@@ -153,9 +160,10 @@ TEST_F( RangeFormTest, SecondsHoldAllFramesThatBeginInTheSpan )
 }
 
 // Other forms of a frame go the same road: 10 bit, fewer channels, 32 bit sound, none at all.
-TEST_F( RangeFormTest, FormatsAskedForAreInTheFile )
+TEST_P( RangeFormTest, FormatsAskedForAreInTheFile )
 {
-  const VArguments Card = { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_486I_5994,speed=4", "--frames", "10" };
+  const std::string Kind = GetParam().m_pKind;
+  const VArguments Card = { "--card", Kind + ":pattern=counter,audio=ramp,standard=SD_720_486I_5994,speed=4", "--frames", "10" };
   const VRecordResult Wide = Record( m_Folder.File( "wide" ),
     Card + VArguments{ "--pixel-format", "U10Y10V10Y10", "--audio-format", "Int32", "--audio-channels", "8" } );
   EXPECT_EQ( 0, Wide.m_Run.m_ExitCode ) << Describe( Wide.m_Run );
@@ -168,8 +176,16 @@ TEST_F( RangeFormTest, FormatsAskedForAreInTheFile )
   const uint64_t Samples = WideFile.Frames().front().m_AudioSize / 8 / 4;
   EXPECT_TRUE( Samples == 1601 || Samples == 1602 ) << Samples;
 
-  const VRecordResult Silent = Record( m_Folder.File( "silent" ), Card + VArguments{ "--audio", "none" } );
+  const VRecordResult Silent = Record( m_Folder.File( "silent" ), Card + VArguments{ "--audio", "none", "--pixel-format", "U8Y8V8Y8" } );
   EXPECT_EQ( 0, Silent.m_Run.m_ExitCode ) << Describe( Silent.m_Run );
   EXPECT_EQ( 0u, TestSupport::VTvidParser( Silent.Path() ).Channels() );
   EXPECT_EQ( 10u, ReadCounterFile( Silent.Path() ).size() );
+
+  // A format that the container does not take gives way, and that is said.
+  const VRecordResult Movie = Record( m_Folder.File( "movie" ), Card + VArguments{ "--container", "mov" } );
+  EXPECT_EQ( 0, Movie.m_Run.m_ExitCode ) << Describe( Movie.m_Run );
+  EXPECT_EQ( Kind != "decklink", Movie.m_Run.m_Error.find( "does not take Luminance8; U8Y8V8Y8 is captured" ) != std::string::npos )
+    << Describe( Movie.m_Run );
 }
+
+INSTANTIATE_TEST_SUITE_P( Kinds, RangeFormTest, BothKinds, KindName );

@@ -33,6 +33,9 @@ const VPairCase PairCases[] = {
   { "OtherTimecode", { { Rate25, "01:00:00:00" }, { Rate5994, "07:00:00:00" } } },
   { "NoTimecode", { { Rate50, "none" }, { Rate2398, "none" } } },
   { "OneTimecode", { { Rate25, "10:00:00:00" }, { Rate60, "none" } } },
+  { "Bluefish", { { Bluefish25, "10:00:00:00" }, { Bluefish5994Drop, "10:00:00;00" } } },
+  { "BothKinds", { { Bluefish50, "10:00:00:00" }, { Rate5994Drop, "10:00:00;00" } } },
+  { "BothKindsNoTimecode", { { Bluefish25, "none" }, { Rate50, "none" } } },
 };
 
 // The cards of one program are made one after another; their first frames are that far apart, at most.
@@ -48,12 +51,10 @@ protected:
 
 TEST_P( TwoCardsTest, FirstFramesLieWithinOneFrameOfEachOther )
 {
-  VArguments Arguments = { "--seconds", "1", "--pre-roll", "0.5" };
+  VArguments Arguments = { "--seconds", "1", "--pre-roll", "0.5", "--pixel-format", "U8Y8V8Y8" };
   for( const VCard& rCard : GetParam().m_Cards )
   {
-    Arguments = Arguments +
-      VArguments{ "--card",
-        std::string( "decklink:pattern=counter,audio=ramp,standard=" ) + rCard.m_Rate.m_pStandard + ",timecode=" + rCard.m_pTimecode };
+    Arguments = Arguments + VArguments{ "--card", CounterCardText( rCard.m_Rate, std::string( "timecode=" ) + rCard.m_pTimecode ) };
   }
   const VRecordResult Result = Record( m_Folder.File( "out" ), Arguments );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -78,6 +79,24 @@ TEST_P( TwoCardsTest, FirstFramesLieWithinOneFrameOfEachOther )
 
 INSTANTIATE_TEST_SUITE_P( Pairs, TwoCardsTest, testing::ValuesIn( PairCases ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pName ); } );
+
+// Whatever the order on the command line, inputs of Bluefish444 cards come first.
+TEST( TwoCards, BothKindsRecordBesideEachOther )
+{
+  const TestSupport::VTemporaryFolder Folder;
+  const VRecordResult Result = Record( Folder.File( "out" ),
+    VArguments{ "--card", CounterCardText( Rate25, "speed=2" ), "--frames", "40" } + CounterCard( Bluefish25, "speed=2,inputs=2" ) );
+  EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
+  ASSERT_EQ( 3u, Result.m_Devices.size() );
+  const char* const Names[] = { "Super Nova C1:ChA", "Super Nova C1:ChB", "DeckLink C1" };
+  for( size_t Device = 0; Device < 3; ++Device )
+  {
+    EXPECT_EQ( Names[Device], Result.Device( Device ).value( "name", "" ) );
+    const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path( Device ) );
+    EXPECT_EQ( 40u, Frames.size() );
+    ExpectUnbroken( Frames, Rate25 );
+  }
+}
 
 // A card that is told to be left out is left out.
 TEST( TwoCards, OnlyTheDevicesAskedForAreRecorded )
