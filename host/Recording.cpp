@@ -52,6 +52,12 @@ uint64_t FramesOf( KVZ::VTick i_Duration, KVZ::VTick i_Period )
   return i_Duration.IsOpen() || i_Duration.Count() <= 0 ? 0 : static_cast<uint64_t>( i_Duration.Count() / i_Period.Count() );
 }
 
+// Changes with each frame, whatever session it belongs to.
+uint64_t NewestFrame( const KVZ::ISourceTemporal::ISourceSyncStatus& i_rStatus )
+{
+  return ( static_cast<uint64_t>( i_rStatus.m_Session.m_Id ) << 40 ) + i_rStatus.m_LatestCounterFrames;
+}
+
 uint64_t LessOrZero( uint64_t i_A, uint64_t i_B ) { return i_A > i_B ? i_A - i_B : 0; }
 
 }
@@ -168,10 +174,11 @@ void VRecording::PollDevice( VDevice& io_rDevice )
   io_rDevice.m_Status = io_rDevice.m_pSource->Capture().GetCaptureStatus();
   CountArrivals( io_rDevice, Sync );
   const auto Before = std::exchange( io_rDevice.m_Sync, Sync );
-  // A signal that comes back makes the card count its absence just before its first frame ends the capture: what is counted while the capture goes on
-  // belongs to the range if it still goes on at the next look.
+  // A signal that comes back makes the card count its absence some time before its first frame ends the capture: what is counted belongs to the range
+  // once a later frame has come and the capture goes on, or has ended as it was to.
   const bool bEnded = HasEnded( io_rDevice.m_Status );
-  if( !bHadEnded && !( bEnded && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0 ) )
+  const bool bEndMoved = bEnded && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0;
+  if( !bHadEnded && !bEndMoved && NewestFrame( Sync ) != NewestFrame( Before ) )
   {
     io_rDevice.m_Dropped = ( bEnded ? Sync : Before ).m_DroppedFrames - io_rDevice.m_DroppedAtStart;
   }
@@ -189,7 +196,7 @@ void VRecording::CountArrivals( VDevice& io_rDevice, const KVZ::ISourceTemporal:
 
 void VRecording::EndStalled( VDevice& io_rDevice, double i_Now )
 {
-  const uint64_t Newest = ( static_cast<uint64_t>( io_rDevice.m_Sync.m_Session.m_Id ) << 40 ) + io_rDevice.m_Sync.m_LatestCounterFrames;
+  const uint64_t Newest = NewestFrame( io_rDevice.m_Sync );
   if( Newest != io_rDevice.m_NewestFrame )
   {
     io_rDevice.m_NewestFrame = Newest;
