@@ -6,6 +6,8 @@
 #include "tests/support/MemoryFile.h"
 #include "tests/support/TestFrames.h"
 
+#include <gtest/gtest.h>
+
 #include <optional>
 
 namespace TestSupport
@@ -96,6 +98,27 @@ VFaultyRun RunIntoFault( TRecording& io_rRecording, size_t i_Frames, TWriteFrame
   }
   Run.m_bClosed = io_rRecording.m_Writer.Close();
   return Run;
+}
+
+// Meets a fault at each place of a recording, one after the other: i_pPlace is the offset of a full disk or the operation that fails. i_Make
+// gives a recording for a fault, i_Write writes it, and i_Check looks at what is left behind.
+template<class TMake, class TWrite, class TCheck>
+void MeetEachFault( uint64_t VFault::*i_pPlace, TMake i_Make, TWrite i_Write, TCheck i_Check )
+{
+  auto Whole = i_Make( VFault() );
+  ASSERT_TRUE( i_Write( Whole ).m_bClosed );
+  const uint64_t Places = i_pPlace == &VFault::m_Offset ? Whole.m_pBytes->size() : Whole.m_Operations;
+  ASSERT_GT( Places, 10u );
+  for( uint64_t Place = 0; Place < Places; ++Place )
+  {
+    SCOPED_TRACE( Place );
+    VFault Fault;
+    Fault.*i_pPlace = Place;
+    auto Recording = i_Make( Fault );
+    const VFaultyRun Run = i_Write( Recording );
+    EXPECT_LE( Recording.m_pBytes->size(), Fault.m_Offset );
+    i_Check( Recording, Run, Place );
+  }
 }
 
 }

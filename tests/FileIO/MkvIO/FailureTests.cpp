@@ -13,6 +13,8 @@ namespace
 
 const std::string Pictures[] = { "AAAA", "BBBB", "CCCC", "DDDD" };
 
+VSmallMovie MakeSmallMovie( const VFault& i_rFault ) { return VSmallMovie( {}, i_rFault ); }
+
 VFaultyRun WriteSmallMovie( VSmallMovie& io_rMovie )
 {
   return RunIntoFault( io_rMovie, std::size( Pictures ),
@@ -64,36 +66,20 @@ bool CheckLeftBehind( const VSmallMovie& i_rMovie, const VFaultyRun& i_rResult )
 
 TEST( MkvWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesTheWholeFrames )
 {
-  VSmallMovie Whole;
-  ASSERT_TRUE( WriteSmallMovie( Whole ).m_bClosed );
-  ASSERT_GT( Whole.m_pBytes->size(), 600u );
-  RecordProperty( "offsets", static_cast<int>( Whole.m_pBytes->size() ) );
-  for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
-  {
-    SCOPED_TRACE( Offset );
-    VSmallMovie Movie( {}, { .m_Offset = Offset } );
-    const VFaultyRun Result = WriteSmallMovie( Movie );
-    EXPECT_LE( Movie.m_pBytes->size(), Offset );
-    CheckLeftBehind( Movie, Result );
-  }
+  MeetEachFault( &VFault::m_Offset, MakeSmallMovie, WriteSmallMovie,
+    []( const VSmallMovie& i_rMovie, const VFaultyRun& i_rRun, uint64_t ) { CheckLeftBehind( i_rMovie, i_rRun ); } );
 }
 
 // Here the stream works again after the failure, so that only the writer's own memory keeps it.
 TEST( MkvWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 {
-  VSmallMovie Whole;
-  ASSERT_TRUE( WriteSmallMovie( Whole ).m_bClosed );
-  const uint64_t Operations = Whole.m_Operations;
   VSmallMovie HeaderAlone;
   ASSERT_TRUE( HeaderAlone.Begin() );
-  const uint64_t HeaderOperations = HeaderAlone.m_Operations;
-  for( uint64_t Operation = 0; Operation < Operations; ++Operation )
+  const auto Check = [&]( const VSmallMovie& i_rMovie, const VFaultyRun& i_rRun, uint64_t i_Operation )
   {
-    SCOPED_TRACE( Operation );
-    VSmallMovie Movie( {}, { .m_Operation = Operation } );
-    const VFaultyRun Result = WriteSmallMovie( Movie );
-    const bool bFinished = CheckLeftBehind( Movie, Result );
+    const bool bFinished = CheckLeftBehind( i_rMovie, i_rRun );
     // The frames before a failed frame still get their tables.
-    EXPECT_TRUE( bFinished || Operation < HeaderOperations || Result.m_Written == std::size( Pictures ) );
-  }
+    EXPECT_TRUE( bFinished || i_Operation < HeaderAlone.m_Operations || i_rRun.m_Written == std::size( Pictures ) );
+  };
+  MeetEachFault( &VFault::m_Operation, MakeSmallMovie, WriteSmallMovie, Check );
 }

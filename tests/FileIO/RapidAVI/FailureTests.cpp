@@ -123,25 +123,20 @@ TEST( AviWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFrame
 // Here the stream works again after the failure, so that only the writer's own memory keeps it.
 TEST( AviWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 {
-  VAviFile Whole( VSettings(), ThreeRiffs );
-  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
-  const uint64_t Operations = Whole.m_Operations;
-  ASSERT_GT( Operations, 50u );
   size_t Consistent = 0;
   size_t InFrames = 0;
-  for( uint64_t Operation = 0; Operation < Operations; ++Operation )
+  const auto Check = [&]( const VAviFile& i_rFile, const VFaultyRun& i_rRun, uint64_t )
   {
-    SCOPED_TRACE( Operation );
-    VAviFile File( VSettings(), ThreeRiffs, { .m_Operation = Operation } );
-    const VFaultyRun Result = WriteSmallFile( File );
-    CheckLeftBehind( File, Result );
-    if( Result.m_bHeader && Result.m_Written < Frames )
+    CheckLeftBehind( i_rFile, i_rRun );
+    if( i_rRun.m_bHeader && i_rRun.m_Written < Frames )
     {
       // What was written before is brought into the indexes all the same.
       ++InFrames;
-      Consistent += IsConsistent( File, Result ) ? 1 : 0;
+      Consistent += IsConsistent( i_rFile, i_rRun ) ? 1 : 0;
     }
-  }
+  };
+  const auto Make = []( const VFault& i_rFault ) { return VAviFile( VSettings(), ThreeRiffs, i_rFault ); };
+  MeetEachFault( &VFault::m_Operation, Make, WriteSmallFile, Check );
   EXPECT_GT( InFrames, 50u );
   EXPECT_EQ( Consistent, InFrames );
 }

@@ -18,6 +18,8 @@ VFrameContent Content( uint64_t i_Key, uint8_t i_Version = 0 )
   return { VBytes( 4, Byte ), VBytes( 6, static_cast<uint8_t>( Byte + 1 ) ) };
 }
 
+VSmallFile MakeSmallFile( const VFault& i_rFault ) { return VSmallFile( i_rFault ); }
+
 // Four frames, and the second one once more.
 VFaultyRun WriteSmallFile( VSmallFile& io_rFile )
 {
@@ -63,32 +65,22 @@ TEST( TarvoWriterFailures, ADiskThatIsFullAtAnyByteIsReportedAndLeavesNoWrongFra
   VSmallFile Whole;
   ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
   EXPECT_EQ( ReadAll( *Whole.m_pBytes ).m_Frames.size(), std::size( Keys ) );
-  for( uint64_t Offset = 0; Offset < Whole.m_pBytes->size(); ++Offset )
-  {
-    SCOPED_TRACE( Offset );
-    VSmallFile File( { .m_Offset = Offset } );
-    const VFaultyRun Result = WriteSmallFile( File );
-    EXPECT_LE( File.m_pBytes->size(), Offset );
-    CheckLeftBehind( File, Result );
-  }
+  MeetEachFault( &VFault::m_Offset, MakeSmallFile, WriteSmallFile,
+    []( const VSmallFile& i_rFile, const VFaultyRun& i_rRun, uint64_t ) { CheckLeftBehind( i_rFile, i_rRun ); } );
 }
 
 // Here the stream works again after the failure, so that only the writer's own memory keeps it.
 TEST( TarvoWriterFailures, AnyOperationThatFailsOnceIsNeverForgotten )
 {
-  VSmallFile Whole;
-  ASSERT_TRUE( WriteSmallFile( Whole ).m_bClosed );
-  const uint64_t Operations = Whole.m_Operations;
-  ASSERT_GT( Operations, 10u );
-  size_t Finished = 0;
-  for( uint64_t Operation = 0; Operation < Operations; ++Operation )
+  uint64_t Operations = 0;
+  uint64_t Finished = 0;
+  const auto Check = [&]( const VSmallFile& i_rFile, const VFaultyRun& i_rRun, uint64_t )
   {
-    SCOPED_TRACE( Operation );
-    VSmallFile File( { .m_Operation = Operation } );
-    const VFaultyRun Result = WriteSmallFile( File );
-    CheckLeftBehind( File, Result );
-    Finished += ReadAll( *File.m_pBytes ).m_bFinished;
-  }
+    CheckLeftBehind( i_rFile, i_rRun );
+    ++Operations;
+    Finished += ReadAll( *i_rFile.m_pBytes ).m_bFinished;
+  };
+  MeetEachFault( &VFault::m_Operation, MakeSmallFile, WriteSmallFile, Check );
   // The frames before the failure are still brought into an index.
   EXPECT_GT( Finished, Operations / 2 );
 }
