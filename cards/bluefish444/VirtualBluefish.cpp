@@ -124,11 +124,12 @@ VCardCounters VVirtualBluefish::Counters() const
   return Sum;
 }
 
-// The vendor's users count on the features: without an answer, and without connectors, the inputs are of no use.
+// The vendor's users count on the features: without an answer, and without connectors, the inputs are of no use. Nobody finds a card that
+// comes later.
 uint32_t VVirtualBluefish::CountDevices() const
 {
   uint32_t Connectors = 0;
-  return Query( Property::CardFeatureConnectorInfo, Connectors ) && Connectors != 0 ? m_Spec.m_Inputs : 0;
+  return IsPresent() && Query( Property::CardFeatureConnectorInfo, Connectors ) && Connectors != 0 ? m_Spec.m_Inputs : 0;
 }
 
 // The inputs come and go with the card, each at the same frame of its own.

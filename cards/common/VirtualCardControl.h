@@ -50,7 +50,8 @@ public:
   // The card is in use by another program: it cannot be enabled.
   virtual bool SetBusy( VCardId i_Card, bool i_bBusy ) = 0;
 
-  // Devices that a driver finds in this card while it is in the machine; 0 for an unknown card.
+  // Devices that a driver finds in this card while it is in the machine; 0 for an unknown card, and for one that is away and
+  // would not be found when it comes.
   virtual uint32_t CountDevices( VCardId i_Card ) const = 0;
 
   // False for an unknown card.
