@@ -19,7 +19,10 @@
 #include <algorithm>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <stdexcept>
+
+#include <sched.h>
 
 using StageHost::VFlowNodeId;
 using StageHost::VFlowWatcher;
@@ -74,6 +77,27 @@ private:
   mutable boost::condition_variable_any m_Changed;
   uint64_t m_Count GUARDED_BY( m_Mutex ) = 0;
   double m_Seconds GUARDED_BY( m_Mutex ) = 0.0;
+};
+
+// While it lives, the threads that are made stay on one processor with the one that makes them: a wake-up across processors costs what the machine
+// makes of it, and the system puts threads elsewhere from second to second.
+class VOneProcessor
+{
+public:
+  VOneProcessor()
+  {
+    cpu_set_t One;
+    CPU_ZERO( &One );
+    CPU_SET( static_cast<size_t>( sched_getcpu() ), &One );
+    sched_getaffinity( 0, sizeof( m_Former ), &m_Former );
+    sched_setaffinity( 0, sizeof( One ), &One );
+  }
+  ~VOneProcessor() { sched_setaffinity( 0, sizeof( m_Former ), &m_Former ); }
+  VOneProcessor( const VOneProcessor& ) = delete;
+  VOneProcessor& operator=( const VOneProcessor& ) = delete;
+
+private:
+  cpu_set_t m_Former = {};
 };
 
 // Microseconds of processor time a state.
@@ -270,10 +294,14 @@ std::vector<VFigure> MeasureFourCards( const VBenchOptions& i_rOptions )
 
 std::vector<VFigure> MeasureFlow( const VBenchOptions& i_rOptions )
 {
+  std::optional<VOneProcessor> One( std::in_place );
   const VStateCost Cost = MeasureCost( i_rOptions.m_bQuick );
+  One.reset();
+  const VStateCost Spread = MeasureCost( i_rOptions.m_bQuick );
   std::vector<VFigure> Figures = {
     { "flow, processor time to wake the node, make a state and write it", Cost.m_Supply, "us", CostBoundMicroseconds },
     { "flow, processor time a state with the consumer's thread", Cost.m_All, "us", {} },
+    { "flow, processor time to wake, make and write, threads on any processor", Spread.m_Supply, "us", {} },
   };
   for( const auto& rMore : { MeasureLatency( i_rOptions.m_bQuick ), MeasureFourCards( i_rOptions ) } )
   {
