@@ -17,7 +17,10 @@
 #   A GoogleTest program that runs whole programs: built after them all, run alone, label "system". The environment variable
 #   STAGECORE_BIN names the folder of programs, module and cards. The user's own settings are out of reach.
 # stagecore_fuzzer( NAME SOURCE file... [DEPENDS target...] )
-#   A libFuzzer program with its corpus in the folder corpus/NAME; built in the preset `fuzz` alone.
+#   A libFuzzer program with its corpus in the folder corpus/NAME; built where STAGECORE_SANITIZE is address.
+#
+# The presets asan and tsan compile several *.cpp of a target as one (CMAKE_UNITY_BUILD), which halves their time: what is local to a file needs a
+# name that its folder has once, or the target UNITY_BUILD OFF.
 #
 # The target stagecore_programs is all of bin/, stagecore_unit_tests all tests but the system tests, stagecore_fuzzers all fuzzers.
 
@@ -139,7 +142,7 @@ function( stagecore_system_test name )
 endfunction()
 
 function( stagecore_fuzzer name )
-  if( NOT STAGECORE_SANITIZE STREQUAL "fuzzer" )
+  if( NOT STAGECORE_SANITIZE STREQUAL "address" )
     return()
   endif()
   cmake_parse_arguments( ARG "" "" "SOURCE;DEPENDS" ${ARGN} )

@@ -14,7 +14,7 @@ using TestSupport::VTvidParser;
 namespace
 {
 
-constexpr uint64_t FrameCount = 8;
+constexpr uint64_t BurnInFrames = 8;
 
 // Where the text stands in a picture of 720 x 486, and in the small font's cells of 19 x 32.
 constexpr uint32_t SizeIndex = 1;
@@ -66,7 +66,7 @@ protected:
     const VBurnInCase& rCase = GetParam();
     const std::string Card = std::string( "decklink:pattern=counter,speed=2,standard=" ) + rCase.m_Rate.m_pStandard + ",timecode=" + rCase.m_pStart;
     VRecordResult Result = Record( m_Folder.File( i_rFolder ),
-      VArguments{ "--card", Card, "--pixel-format", KVZ::ToName( rCase.m_Format ), "--frames", std::to_string( FrameCount ) } + i_rMore );
+      VArguments{ "--card", Card, "--pixel-format", KVZ::ToName( rCase.m_Format ), "--frames", std::to_string( BurnInFrames ) } + i_rMore );
     EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
     return Result;
   }
@@ -86,14 +86,14 @@ TEST_P( BurnInTest, EachFrameCarriesItsLabel )
 
   const VRecordResult Result = RecordCard( "drawn", { "--burn-in", "timecode" } );
   VTvidParser File( Result.Path() );
-  ASSERT_EQ( FrameCount, File.Frames().size() );
+  ASSERT_EQ( BurnInFrames, File.Frames().size() );
   const std::string Start = Result.Device().value( "start_timecode", "" );
   const size_t RowBytes = Background.size() / 486;
   const uint32_t PerLabel = rCase.m_Rate.m_FramesPerLabel;
   const std::vector<uint8_t> FirstFrame = WithoutCounter( File.Video( File.Frames()[0] ), RowBytes );
   // The first frame of the recording may be the second of its label.
   const uint32_t Ahead = PerLabel == 1 || FirstFrame == WithoutCounter( Drawn( Background, rCase.m_Format, Start + ".0" ), RowBytes ) ? 0 : 1;
-  for( uint32_t Frame = 0; Frame < FrameCount; ++Frame )
+  for( uint32_t Frame = 0; Frame < BurnInFrames; ++Frame )
   {
     const uint32_t Within = ( Frame + Ahead ) % PerLabel;
     const std::string Label = LabelOfFrame( Start, rCase.m_Rate, Frame + Ahead ) + ( PerLabel == 1 ? "" : "." + std::to_string( Within ) );

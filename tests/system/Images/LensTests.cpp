@@ -14,12 +14,12 @@ using TestSupport::VTvidParser;
 namespace
 {
 
-constexpr size_t Width = 720;
-constexpr size_t Height = 576;
+constexpr size_t LensWidth = 720;
+constexpr size_t LensHeight = 576;
 constexpr uint64_t Frames = 4;
 
 const VArguments Card = { "--card", "decklink:standard=SD_720_576I_5000", "--frames", std::to_string( Frames ) };
-const VArguments Colour = { "--pixel-format", "B8G8R8u8" };
+const VArguments Packed = { "--pixel-format", "B8G8R8u8" };
 // A corner is drawn a quarter of its way nearer to the middle.
 const VArguments Lens = { "--lens", "360,288,-1.2e-6,0" };
 
@@ -110,16 +110,16 @@ TEST_F( LensTest, IsUndoneByOpenGL )
   const std::string OnServer = DisplayOf( Server.Printed() );
   for( const auto& [Display, pConverter] : { std::pair{ OnServer, "opengl" }, { OnServer, "auto" }, { std::string(), "opengl" } } )
   {
-    const VRecordResult Result = RecordOn( Display, Colour + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
+    const VRecordResult Result = RecordOn( Display, Packed + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
     ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
     EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
     const std::vector<uint8_t> Frame = FirstFrame( Result );
-    ASSERT_EQ( Width * Height * 4, Frame.size() );
+    ASSERT_EQ( LensWidth * LensHeight * 4, Frame.size() );
     const auto [Lowest, Highest] = FourthBytes( Frame );
     EXPECT_TRUE( Lowest >= 127 && Highest <= 128 ) << Lowest << " to " << Highest;
     EXPECT_EQ( 0, Frame[0] + Frame[1] + Frame[2] );
     // The bars' left one is grey, at a point that comes from the image's left edge, where nothing moves up or down.
-    const size_t Left = ( Height / 2 * Width + 80 ) * 4;
+    const size_t Left = ( LensHeight / 2 * LensWidth + 80 ) * 4;
     EXPECT_GT( Frame[Left], 100 );
   }
 }
@@ -128,7 +128,7 @@ TEST_F( LensTest, IsUndoneByOpenGL )
 
 TEST_F( LensTest, IsLeftAsItIsWithoutOpenGL )
 {
-  const VRecordResult Result = RecordOn( "", Colour + Lens, "EGL_PLATFORM=x11" );
+  const VRecordResult Result = RecordOn( "", Packed + Lens, "EGL_PLATFORM=x11" );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
   EXPECT_EQ( std::make_pair( 255, 255 ), FourthBytes( FirstFrame( Result ) ) );
@@ -138,6 +138,6 @@ TEST_F( LensTest, IsLeftAsItIsWithoutOpenGL )
 TEST_F( LensTest, IsRefusedWhereItCannotBeUndone )
 {
   EXPECT_EQ( 2, RecordOn( "", Lens ).m_Run.m_ExitCode );   // the card's own 4:2:2, uncompressed
-  EXPECT_EQ( 2, RecordOn( "", Colour + Lens + VArguments{ "--converter", "software" } ).m_Run.m_ExitCode );
-  EXPECT_EQ( 2, RecordOn( "", Colour + VArguments{ "--lens", "360,288" } ).m_Run.m_ExitCode );
+  EXPECT_EQ( 2, RecordOn( "", Packed + Lens + VArguments{ "--converter", "software" } ).m_Run.m_ExitCode );
+  EXPECT_EQ( 2, RecordOn( "", Packed + VArguments{ "--lens", "360,288" } ).m_Run.m_ExitCode );
 }
