@@ -166,6 +166,11 @@ std::string PictureFilter( const VClipInput& i_rInput, const VPictureFormat& i_r
     Filter += ( Filter.empty() ? "fps=" : ",fps=" ) + std::to_string( i_rFormat.m_pStandard->m_RateNumerator ) + "/" +
       std::to_string( i_rFormat.m_pStandard->m_RateDenominator );
   }
+  if( i_rFormat.m_PixelFormat == KVZ::IPixelFormat::ELuminance8 )
+  {
+    // FFmpeg's own grey has the whole range of a byte; a signal's luma has not.
+    Filter += ( Filter.empty() ? "" : "," ) + std::string( "format=yuv422p,extractplanes=y" );
+  }
   return Filter;
 }
 

@@ -13,6 +13,10 @@ namespace
 
 uint64_t ImageSize( const std::string& i_rFormat, uint64_t i_Width, uint64_t i_Height )
 {
+  if( i_rFormat == "Luminance8" )
+  {
+    return i_Width * i_Height;
+  }
   if( i_rFormat == "U8Y8V8Y8" )
   {
     return 2 * i_Width * i_Height;
