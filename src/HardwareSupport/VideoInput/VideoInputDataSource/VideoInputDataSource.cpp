@@ -86,7 +86,7 @@ VVideoInputDataSource::~VVideoInputDataSource() { StopClient(); }
 void VVideoInputDataSource::PostConstruct()
 {
   VDataSource::PostConstruct();
-  // Both come with the device's lock held.
+  // Either may come with the device's lock held.
   m_pDevice->GetDroppedFramesCallback().AddImmediate(
     NotificationSystem::BindWeak( KVZ::WeakFrom( this ), &VVideoInputDataSource::OnDroppedFrames ) );
   m_pDevice->GetStatusChangedCallback().AddImmediate(

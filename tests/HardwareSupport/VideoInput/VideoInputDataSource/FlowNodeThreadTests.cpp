@@ -10,7 +10,6 @@
 
 #include <atomic>
 #include <future>
-#include <utility>
 
 namespace
 {
@@ -60,7 +59,6 @@ struct VLiveGraph
 class VSlowAllocator : public VideoInputHAL::IVideoInputAllocator
 {
 public:
-  explicit VSlowAllocator( std::shared_ptr<VideoInputHAL::IVideoInputAllocator> i_pFrames ) : m_pFrames( std::move( i_pFrames ) ) {}
   void* Allocate( uint64_t i_Bytes ) override
   {
     if( m_bSlow )
@@ -72,12 +70,10 @@ public:
   }
   void Free( void* i_pBlock ) override { m_pFrames->Free( i_pBlock ); }
 
+  std::shared_ptr<VideoInputHAL::IVideoInputAllocator> m_pFrames;
   std::atomic<bool> m_bSlow{ false };
   std::promise<void> m_Reached;
   std::promise<void> m_Opened;
-
-private:
-  const std::shared_ptr<VideoInputHAL::IVideoInputAllocator> m_pFrames;
 };
 
 // The next frame is delivered as soon as the state of the last one has been written, and no other one comes to help: a wake-up that is lost
@@ -104,11 +100,12 @@ TEST( FlowNodeThreads, NoFrameComesUnnoticedWhileTheNodeGoesToSleep )
 TEST( FlowNodeThreads, StatesAreMadeAndCapturesStartedWhileTheDeviceIsBusy )
 {
   namespace Fake = TestSupport::FakeDeckLink;
+  const auto pAllocator = std::make_shared<VSlowAllocator>();   // frames name it, so it outlives them
   VFlowRig Rig;
   auto* const pCard = new Fake::VCard;
   const auto pDevice = KVZ::MakeShared<VideoInputHAL::VBlackmagicDeckLinkDevice>( pCard, 1, Rig.m_pStrand );
   const auto pSource = Rig.MakeManaged( pDevice );
-  const auto pAllocator = std::make_shared<VSlowAllocator>( Rig.m_pFrames );
+  pAllocator->m_pFrames = Rig.m_pFrames;
   ASSERT_TRUE( pDevice->Initialise().Succeeded() );
   pDevice->SetAllocator( pAllocator );
   pDevice->SetDataCallback( pSource );
