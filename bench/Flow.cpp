@@ -12,7 +12,6 @@
 #include "host/StandAloneHost.h"
 #include "host/VirtualCards.h"
 
-#include <boost/format.hpp>
 #include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
 

@@ -4,8 +4,6 @@
 #include "bench/FrameFeed.h"
 #include "bench/Measuring.h"
 
-#include <boost/format.hpp>
-
 #include <atomic>
 #include <stdexcept>
 #include <thread>

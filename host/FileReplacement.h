@@ -17,8 +17,9 @@ enum class EFileRead
 
 EFileRead ReadWholeFile( const std::string& i_rPath, std::string& o_rText, std::string& o_rReason );
 
-// The file is the old one or the new one at any time, whatever ends the program or the machine; it is on the disk when this returns true. One
-// process at a time: what it writes first goes to the path and ".new".
+// The file is the old one or the new one at any time, whatever ends the program or the machine; it is on the disk when this returns true. The new one
+// has the permissions of the old one, and its owner and group where the system lets this user give them away. One process at a time: what it writes
+// first goes to the path and ".new".
 bool ReplaceFile( const std::string& i_rPath, const std::string& i_rText, std::string& o_rReason );
 
 // Gives the file a name that is free: the path and ".damaged", with a number behind it from the second one on. Empty, with the reason, where

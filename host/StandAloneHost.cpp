@@ -95,7 +95,8 @@ bool VStandAloneHost::StartModule( const std::string& i_rPath, std::string& o_rE
   return true;
 }
 
-// Nodes use the module's sources until they have ended. Then the shutdown objects go: what nobody owns any more ends there. Then every owner of the module's engine lets go.
+// Nodes use the module's sources until they have ended. Then the shutdown objects go: what nobody owns any more ends there. Then every owner of the
+// module's engine lets go.
 void VStandAloneHost::StopModule()
 {
   m_Flow.Clear();

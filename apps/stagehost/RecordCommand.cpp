@@ -14,11 +14,8 @@
 
 #include <CLI/CLI.hpp>
 #include <boost/filesystem/operations.hpp>
-#include <boost/filesystem/path.hpp>
 
 #include <algorithm>
-#include <cmath>
-#include <cstdlib>
 
 using StageHost::VDeviceInfo;
 using StageHost::VDeviceSettings;

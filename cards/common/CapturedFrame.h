@@ -3,7 +3,6 @@
 // So a client that looks at the flags alone, as drivers do while nothing is captured, costs next to nothing.
 #pragma once
 
-#include "StageCoreRuntime/ThreadAnnotations.h"
 #include "cards/common/Painter.h"
 #include "cards/common/Sound.h"
 

@@ -102,8 +102,6 @@ VColour MakeColour( uint8_t i_Red, uint8_t i_Green, uint8_t i_Blue, uint32_t i_L
   return Colour;
 }
 
-bool CanDraw( IPixelFormat::Enum i_Format ) { return BytesOf( i_Format, 1 ) > 0; }
-
 uint32_t BytesOf( IPixelFormat::Enum i_Format, uint32_t i_Pixels )
 {
   switch( i_Format )

@@ -26,10 +26,8 @@ VColour MakeColour( uint8_t i_Red, uint8_t i_Green, uint8_t i_Blue, uint32_t i_L
 constexpr VColour Black{ 0, 0, 0, 16, 128, 128 };
 constexpr VColour White{ 255, 255, 255, 235, 128, 128 };
 
-// The layouts that can be drawn: those that cards deliver, in 4:2:2, RGB and luma alone.
-bool CanDraw( KVZ::IPixelFormat::Enum i_Format );
-
-// Bytes of i_Pixels neighbouring pixels. For a whole row of U10Y10V10Y10 this is without the padding to 128 bytes.
+// Bytes of i_Pixels neighbouring pixels; 0 for a layout that no card delivers: they have 4:2:2, RGB and luma alone. For a whole row of
+// U10Y10V10Y10 this is without the padding to 128 bytes.
 uint32_t BytesOf( KVZ::IPixelFormat::Enum i_Format, uint32_t i_Pixels );
 
 // Bytes from one row to the next.

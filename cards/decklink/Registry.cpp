@@ -4,8 +4,6 @@
 
 #include <boost/thread/lock_guard.hpp>
 
-#include <algorithm>
-
 namespace VirtualCards
 {
 

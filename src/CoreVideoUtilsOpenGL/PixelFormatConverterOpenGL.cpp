@@ -6,7 +6,6 @@
 
 #include <boost/thread/lock_guard.hpp>
 
-#include <exception>
 #include <utility>
 
 // Outside of any namespace, as the macro wants it. The shaders lie in a static library, which nothing else would take them from.

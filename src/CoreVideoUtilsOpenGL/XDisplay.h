@@ -30,8 +30,8 @@ private:
   const std::unique_ptr<VConnection> m_pConnection;   // empty where there is no display
 };
 
-// While it lives, errors that the X server reports and its end go to the log. Else errors end the process. Whoever else in the process speaks to an X server
-// is meant too, so this is for processes that have no windows of their own.
+// While it lives, errors that the X server reports and its end go to the log. Else errors end the process. Whoever else in the process speaks to an X
+// server is meant too, so this is for processes that have no windows of their own.
 class VXErrorsLogged
 {
 public:

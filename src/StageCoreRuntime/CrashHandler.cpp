@@ -1,7 +1,6 @@
 #include "StageCoreRuntime/DebugServices.h"
 #include "StageCoreRuntime/SanitizerBuild.h"
 
-#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cstring>

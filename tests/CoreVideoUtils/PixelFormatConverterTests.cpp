@@ -9,7 +9,6 @@
 #include <gtest/gtest.h>
 
 #include <map>
-#include <random>
 #include <set>
 #include <sstream>
 #include <thread>

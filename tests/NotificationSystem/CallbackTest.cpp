@@ -4,8 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include <stdexcept>
-
 namespace
 {
 using NotificationSystem::BindWeak;

@@ -6,8 +6,6 @@
 
 #include <boost/thread/thread.hpp>
 
-#include <stdexcept>
-
 namespace
 {
 using NotificationSystem::BindWeak;

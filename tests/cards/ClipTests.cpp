@@ -6,8 +6,6 @@
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
 
-#include <boost/thread/condition_variable.hpp>
-
 #include <fstream>
 #include <iterator>
 

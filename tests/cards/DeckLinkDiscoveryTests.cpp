@@ -5,7 +5,6 @@
 
 #include <boost/thread/latch.hpp>
 
-#include <chrono>
 #include <fstream>
 
 using namespace CardsTests;

@@ -3,8 +3,6 @@
 #include "Utils/UtilsIO/StreamAdapters.h"
 #include "tests/fuzz/Fuzzing.h"
 
-#include <algorithm>
-
 using Fuzzing::Require;
 using TarvoVideo::VExtent;
 

@@ -6,7 +6,6 @@
 
 #include <matroska/KaxSemantic.h>
 
-#include <algorithm>
 #include <cstring>
 #include <string>
 

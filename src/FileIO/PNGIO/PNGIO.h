@@ -8,7 +8,8 @@ namespace PNGIO
 
 constexpr const char* Category = "PNGIO";   // of the log
 
-// Luminance8 and R8G8B8 alone, sides of 1 to 8192 pixels. False leaves the output as it is; what the library did not like is in the log, category "PNGIO".
+// Luminance8 and R8G8B8 alone, sides of 1 to 8192 pixels. False leaves the output as it is; what the library did not like is in the log,
+// category "PNGIO".
 bool PNGWriter( const uint8_t* i_pPixels, size_t i_Size, const KVZ::VideoFrameInfo& i_rInfo, UtilsMemory::VByteVector& o_rBuffer,
   const ImageMagickWrapper::VLibrary& i_rLibrary = ImageMagickWrapper::Instance( Category ) );
 

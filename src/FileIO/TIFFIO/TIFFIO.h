@@ -8,7 +8,8 @@ namespace TIFFIO
 
 constexpr const char* Category = "TIFFIO";   // of the log
 
-// Luminance8 and R8G8B8 alone, sides of 1 to 8192 pixels. False leaves the output as it is; what the library did not like is in the log, category "TIFFIO".
+// Luminance8 and R8G8B8 alone, sides of 1 to 8192 pixels. False leaves the output as it is; what the library did not like is in the log,
+// category "TIFFIO".
 bool TIFFWriter( const uint8_t* i_pPixels, size_t i_Size, const KVZ::VideoFrameInfo& i_rInfo, UtilsMemory::VByteVector& o_rBuffer,
   const ImageMagickWrapper::VLibrary& i_rLibrary = ImageMagickWrapper::Instance( Category ) );
 

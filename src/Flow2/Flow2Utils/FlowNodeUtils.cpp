@@ -3,8 +3,6 @@
 #include "Flow2/Flow2Utils/FlowException.h"
 #include "StageCoreRuntime/GlobalLog.h"
 
-#include <iterator>
-
 namespace Flow2Utils
 {
 

@@ -66,7 +66,6 @@ private:
   // Blocks the client could hold at most, as things stand. No lock.
   size_t Attainable( const VBalancedClientAllocator& i_rClient ) const;
 
-  void EnterGrantLocked( VBalancedClientAllocator& i_rClient ) REQUIRES( m_Mutex );
   void TrimLocked() REQUIRES( m_Mutex );
   size_t WithheldLocked() const REQUIRES( m_Mutex );
   void DropOldestGrantLocked() REQUIRES( m_Mutex );

@@ -1,6 +1,5 @@
 // A process is killed while it writes as fast as it can. What it had told to be written must be readable.
 #include "tests/FileIO/Containers/MovieWriters.h"
-#include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
 

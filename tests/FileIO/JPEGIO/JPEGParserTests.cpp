@@ -10,7 +10,6 @@
 #include <gtest/gtest.h>
 #include <turbojpeg.h>
 
-#include <numeric>
 #include <random>
 
 using JPEGIO::ParseJPEGSegments;

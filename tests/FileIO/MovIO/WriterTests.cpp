@@ -6,8 +6,6 @@
 
 #include <gtest/gtest.h>
 
-#include <limits>
-
 using namespace KVZ;
 using namespace MovIO;
 using namespace TestSupport;

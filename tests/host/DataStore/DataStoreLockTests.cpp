@@ -2,7 +2,6 @@
 
 #include "StageCoreDataStore/DataVerifyWriter.h"
 #include "host/DataStore.h"
-#include "tests/support/AssertionCapture.h"
 
 #include <gtest/gtest.h>
 

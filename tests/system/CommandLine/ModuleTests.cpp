@@ -1,7 +1,6 @@
 // What the built files show to the loader.
 #include "tests/support/ProgramRun.h"
 
-#include <boost/filesystem/operations.hpp>
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -1,4 +1,5 @@
-// What happens to a signal while it is recorded. Events come again every so many frames of the card, so that a recording meets them wherever it began.
+// What happens to a signal while it is recorded. Events come again every so many frames of the card, so that a recording meets them wherever it
+// began.
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/TvidParser.h"
 #include "tests/support/system/CounterFile.h"
@@ -49,8 +50,8 @@ protected:
     return i_rResult.m_Run.m_Error.find( i_rText ) != std::string::npos;
   }
 
-  // Ended by an event: whole up to the frame before one, and told as such. The news of a returning signal runs beside its frames, so that a few of those
-  // may still belong to the old session.
+  // Ended by an event: whole up to the frame before one, and told as such. The news of a returning signal runs beside its frames, so that a few of
+  // those may still belong to the old session.
   void ExpectEndedEarly( const VRecordResult& i_rResult, int i_Failure, uint32_t i_FramesMissing = 0 )
   {
     constexpr size_t MostStragglers = 10;

@@ -3,7 +3,6 @@
 #include "tests/support/system/Rates.h"
 #include "tests/support/system/StageHost.h"
 
-#include <boost/filesystem/operations.hpp>
 #include <gtest/gtest.h>
 
 #include <array>

@@ -1,8 +1,13 @@
 #include "HardwareSupport/VideoInput/VideoInputDataSource/FrameWorkers.h"
 
+#include "StageCoreRuntime/ThreadAnnotations.h"
+
+#include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/lock_types.hpp>
+#include <boost/thread/mutex.hpp>
 
+#include <deque>
 #include <utility>
 
 namespace VideoInputHAL

@@ -5,14 +5,9 @@
 #pragma once
 
 #include "NotificationSystem/IPostalService.h"
-#include "StageCoreRuntime/ThreadAnnotations.h"
-
-#include <boost/thread/condition_variable.hpp>
-#include <boost/thread/mutex.hpp>
 
 #include <cstddef>
 #include <cstdint>
-#include <deque>
 #include <functional>
 #include <memory>
 #include <string>

@@ -1,6 +1,7 @@
 // The road of a frame from the vendor's thread to the data callback.
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceImpl.h"
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceModes.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceTimecode.h"
 
 #include "StageCoreRuntime/GlobalLog.h"
 #include "SyncSystem/Tick.h"
@@ -9,7 +10,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <utility>
 
 namespace VideoInputHAL
 {

@@ -2,7 +2,6 @@
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDevice.h"
-#include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDeviceTimecode.h"
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputFrame.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
@@ -12,7 +11,6 @@
 #include <atomic>
 #include <set>
 #include <span>
-#include <string>
 #include <vector>
 
 namespace VideoInputHAL

@@ -10,7 +10,6 @@
 
 #include <atomic>
 #include <map>
-#include <utility>
 
 namespace VideoInputHAL
 {

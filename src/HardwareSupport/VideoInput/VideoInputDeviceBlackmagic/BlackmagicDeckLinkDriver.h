@@ -12,8 +12,8 @@
 namespace VideoInputHAL
 {
 
-// Devices are announced through a postal service of the driver's, which also serves the listeners of its devices. The driver keeps each
-// device as long as its card is there, and closes those that it still has when it ends.
+// Devices are announced on a thread of the vendor's. Listeners that bring no postal service of their own, those of its devices too, are called on one
+// of the driver's. The driver keeps each device as long as its card is there, and closes those that it still has when it ends.
 class VBlackmagicDeckLinkDriver : public KVZ::VShared, public IVideoInputDriver
 {
 public:

@@ -141,7 +141,7 @@ bool VBluefish444Device::VImpl::IsOrderedToCapture() const
 bool VBluefish444Device::VImpl::IsCapturing() const
 {
   boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_InForce.m_bStart;
+  return m_bCapturing;
 }
 
 bool VBluefish444Device::VImpl::IsStopping() const

@@ -41,7 +41,7 @@ void VBluefish444Device::VImpl::Run()
   m_pHanc = static_cast<uint8_t*>( UtilsMemory::AllocateLocked( BlueVelvet::HancBytes ) );
   if( !m_pHanc )
   {
-    KVZ_LOG( "VideoInputDeviceBluefish444", 2, "Memory allocation failed." );
+    KVZ_LOG( Bluefish444LogCategory, 2, "Memory allocation failed." );
   }
   while( m_pHanc && !IsStopping() )
   {
@@ -100,9 +100,9 @@ void VBluefish444Device::VImpl::TakeCommand()
     {
       return;
     }
-    m_InForce = m_Commands.front();
+    m_Command = m_Commands.front();
     m_Commands.pop_front();
-    m_Command = m_InForce;
+    m_bCapturing = m_Command.m_bStart;
   }
   m_bSetUpDue = true;
   if( bFormerStart != m_Command.m_bStart )

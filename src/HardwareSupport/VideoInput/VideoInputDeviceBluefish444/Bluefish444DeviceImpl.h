@@ -6,7 +6,6 @@
 #include "StageCoreRuntime/ThreadAnnotations.h"
 
 #include <boost/thread/condition_variable.hpp>
-#include <boost/thread/mutex.hpp>
 #include <boost/thread/thread.hpp>
 
 #include <atomic>
@@ -88,8 +87,8 @@ private:
   boost::condition_variable m_Stopping;
   bool m_bStop GUARDED_BY( m_Mutex ) = false;
   std::deque<VCaptureCommand> m_Commands GUARDED_BY( m_Mutex );
-  bool m_bOrdered GUARDED_BY( m_Mutex ) = false;   // the last order's start flag
-  VCaptureCommand m_InForce GUARDED_BY( m_Mutex );
+  bool m_bOrdered GUARDED_BY( m_Mutex ) = false;     // the last order's start flag
+  bool m_bCapturing GUARDED_BY( m_Mutex ) = false;   // that of the order in force
 
   // Capture thread
   std::shared_ptr<VBluefish444SDKWrapper> m_pCard;   // let go at the thread's end

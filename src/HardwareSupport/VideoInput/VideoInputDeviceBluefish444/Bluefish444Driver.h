@@ -11,8 +11,8 @@
 namespace VideoInputHAL
 {
 
-// Devices are announced from StartDiscovery, through a postal service of the driver's, which also serves the listeners of its devices. The driver keeps
-// its devices and closes them when it ends. Cards that come later are not looked for: the vendor's library tells of none.
+// Devices are announced from StartDiscovery. Listeners that bring no postal service of their own, those of its devices too, are called on one of the
+// driver's. The driver keeps its devices and closes them when it ends. Cards that come later are not looked for: the vendor's library tells of none.
 class VBluefish444Driver : public KVZ::VShared, public IVideoInputDriver
 {
 public:

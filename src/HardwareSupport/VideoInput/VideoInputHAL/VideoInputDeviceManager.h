@@ -22,8 +22,8 @@ namespace VideoInputHAL
 {
 
 // Made through MakeShared. Indices are never reused while the manager lives: a device that goes away keeps its place.
-// Any thread may call. Drivers announce on threads of their own, so the two lists have a lock, which is never held while a listener, a
-// driver or a device is called.
+// Any thread may call. Drivers announce from StartDiscovery or on a vendor's thread, so the two lists have a lock, which is never held while a
+// listener, a driver or a device is called.
 class VVideoInputDeviceManager : public KVZ::VShared
 {
 public:

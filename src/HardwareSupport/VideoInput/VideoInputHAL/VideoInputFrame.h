@@ -46,8 +46,8 @@ struct VVideoInputDataSourceFrame
 
 static_assert( sizeof( VVideoInputDataSourceFrame ) <= VVideoInputDataSourceFrame::HeaderSize );
 
-// A block with what is known before its bytes are there; the device adds its index, what the audio is, and the timecode. Null without an allocator, and
-// where memory has run out. Delivery thread.
+// A block with what is known before its bytes are there; the device adds its index, what the audio is, and the timecode. Null without an allocator,
+// and where memory has run out. Delivery thread.
 VVideoInputDataSourceFrame* MakeFrame( IVideoInputAllocator* i_pAllocator, const KVZ::VideoFrameInfo& i_rInfo, uint64_t i_ImageBytes,
   uint64_t i_AudioBytes );
 
