@@ -106,14 +106,28 @@ bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, cons
     } );
 }
 
+// What the device offers depends on its signal, whose news may come one after the other: what a stopped device says stays.
+VDeviceInfo ReadAgain( VHostSession& i_rSession, const VDeviceInfo& i_rDevice )
+{
+  const std::vector<VDeviceInfo> Devices = i_rSession.Settings().GetDevices();
+  const auto Found = std::find_if( Devices.begin(), Devices.end(), [&]( const VDeviceInfo& i_rOther ) { return i_rOther.m_URN == i_rDevice.m_URN; } );
+  return Found != Devices.end() ? *Found : i_rDevice;
+}
+
 // While the device is stopped, so that the next buffer session holds frames of these settings alone.
 int ApplySettings( VHostSession& i_rSession, const VRecordOptions& i_rOptions, const VDeviceInfo& i_rDevice )
 {
-  const VRecordFormat Format( i_rOptions.m_Format, i_rDevice );
+  if( !SetEnabled( i_rSession, i_rDevice.m_URN, false ) )
+  {
+    Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
+    return ExitFailed;
+  }
+  const VDeviceInfo Device = ReadAgain( i_rSession, i_rDevice );
+  const VRecordFormat Format( i_rOptions.m_Format, Device );
   std::string Refusal = Format.WhyRefused();
   if( Refusal.empty() )
   {
-    Refusal = WhyRefused( i_rOptions.m_Converter, i_rOptions.m_Format, i_rDevice );
+    Refusal = WhyRefused( i_rOptions.m_Converter, i_rOptions.m_Format, Device );
   }
   if( !Refusal.empty() )
   {
@@ -123,11 +137,6 @@ int ApplySettings( VHostSession& i_rSession, const VRecordOptions& i_rOptions, c
   if( const std::string Change = Format.WhatGaveWay(); !Change.empty() )
   {
     Complain( Change );
-  }
-  if( !SetEnabled( i_rSession, i_rDevice.m_URN, false ) )
-  {
-    Complain( "Device " + i_rDevice.m_URN + " cannot be stopped to change its settings." );
-    return ExitFailed;
   }
   if( !Set( i_rSession, i_rDevice, Format.Container() ) )
   {
