@@ -127,44 +127,6 @@ void VHardwareRegistry::UnregisterManager( const std::shared_ptr<IHardwareManage
   m_Managers.erase( std::remove( m_Managers.begin(), m_Managers.end(), i_pManager ), m_Managers.end() );
 }
 
-void VHardwareRegistry::SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Sections[i_rSection].m_Root = i_rPath;
-}
-
-void VHardwareRegistry::AddSection( const std::string& i_rSection, VSectionPredicate i_Predicate, int i_SortPosition )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Sections[i_rSection].m_Predicate = std::move( i_Predicate );
-  m_Sections[i_rSection].m_SortPosition = i_SortPosition;
-}
-
-void VHardwareRegistry::AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
-  const std::string& i_rShortcut )
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  m_Commands.push_back( { i_rKey, i_rSections, i_rText, i_rShortcut } );
-}
-
-size_t VHardwareRegistry::ManagerCount() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_Managers.size();
-}
-
-std::map<std::string, VHardwareSection> VHardwareRegistry::GetSections() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_Sections;
-}
-
-std::vector<VHardwareCommand> VHardwareRegistry::GetCommands() const
-{
-  boost::lock_guard<boost::mutex> Lock( m_Mutex );
-  return m_Commands;
-}
-
 void VHardwareRegistry::ReleaseManagers()
 {
   std::vector<std::shared_ptr<IHardwareManager>> Managers;   // destroyed without the lock

@@ -8,7 +8,6 @@
 #include <boost/thread/mutex.hpp>
 
 #include <functional>
-#include <map>
 #include <memory>
 #include <string>
 #include <vector>
@@ -80,41 +79,21 @@ private:
   bool m_bFired GUARDED_BY( m_Mutex ) = false;
 };
 
-struct VHardwareSection
-{
-  StageCorePluginInterface::IHardwareRegistry::VSectionPredicate m_Predicate;
-  int m_SortPosition = 0;
-  VDataPath m_Root;
-};
-
-struct VHardwareCommand
-{
-  std::string m_Key;
-  std::vector<std::string> m_Sections;
-  std::string m_Text;
-  std::string m_Shortcut;
-};
-
 class VHardwareRegistry : public StageCorePluginInterface::IHardwareRegistry
 {
 public:
   void RegisterManager( std::shared_ptr<StageCorePluginInterface::IHardwareManager> i_pManager ) override;
   void UnregisterManager( const std::shared_ptr<StageCorePluginInterface::IHardwareManager>& i_pManager ) override;
-  void SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath ) override;
-  void AddSection( const std::string& i_rSection, VSectionPredicate i_Predicate, int i_SortPosition ) override;
-  void AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
-    const std::string& i_rShortcut ) override;
+  // Sections and commands are for a window, and this host has none.
+  void SetSectionRoot( const std::string&, const VDataPath& ) override {}
+  void AddSection( const std::string&, VSectionPredicate, int ) override {}
+  void AddCommand( const std::string&, const std::vector<std::string>&, const std::string&, const std::string& ) override {}
 
-  size_t ManagerCount() const;
-  std::map<std::string, VHardwareSection> GetSections() const;
-  std::vector<VHardwareCommand> GetCommands() const;
   void ReleaseManagers();
 
 private:
-  mutable boost::mutex m_Mutex;
+  boost::mutex m_Mutex;
   std::vector<std::shared_ptr<StageCorePluginInterface::IHardwareManager>> m_Managers GUARDED_BY( m_Mutex );
-  std::map<std::string, VHardwareSection> m_Sections GUARDED_BY( m_Mutex );
-  std::vector<VHardwareCommand> m_Commands GUARDED_BY( m_Mutex );
 };
 
 class VHardwareHost : public StageCorePluginInterface::IHardwareHost

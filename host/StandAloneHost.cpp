@@ -108,6 +108,4 @@ void VStandAloneHost::StopModule()
   WaitFor( *m_pEngineService );   // the sync engine may be in the middle of a session with sources that have just been removed
 }
 
-void VStandAloneHost::SetFileFilters( int i_Kind, const std::vector<std::string>& i_rFilters ) { m_FileFilters[i_Kind] = i_rFilters; }
-
 }

@@ -74,11 +74,8 @@ public:
   std::shared_ptr<StageCorePluginInterface::ICaptureTargets> GetCaptureTargetService() override { return m_pTargets; }
   std::shared_ptr<StageCorePluginInterface::ISourceRegistry> GetSourceRegistry() override { return m_pEngine; }
   std::shared_ptr<StageCorePluginInterface::ICaptureTargets> GetCaptureTargets() override { return m_pTargets; }
-  void SetFileFilters( int i_Kind, const std::vector<std::string>& i_rFilters ) override;
-
-  // What the module offers to open, by kind.
-  const std::map<int, std::vector<std::string>>& GetFileFilters() const { return m_FileFilters; }
-  const VHardwareRegistry& Hardware() const { return *m_pHardware; }
+  // What files the module offers to open is for a window, and this host has none.
+  void SetFileFilters( int, const std::vector<std::string>& ) override {}
 
 private:
   const std::shared_ptr<IDataStore> m_pDataStore;
@@ -97,7 +94,6 @@ private:
   const std::shared_ptr<StageCorePluginInterface::IServiceObject> m_pSecondService;
   const std::shared_ptr<NotificationSystem::VAsioPostalService> m_pEngineService;   // ends after the engine, whose calls it runs
   const std::shared_ptr<VSyncEngine> m_pEngine;
-  std::map<int, std::vector<std::string>> m_FileFilters;
   std::unique_ptr<VLoadedModule> m_pModule;
   VFlowGraph m_Flow;   // ends before the module whose nodes it runs
 };

@@ -17,16 +17,6 @@ constexpr uint32_t Every = 100;   // frames from event to event
 
 constexpr int FailureEndMoved = 2;
 
-// Under the thread sanitizer a program keeps up with little more than life.
-#if defined( __has_feature )
-#if __has_feature( thread_sanitizer )
-#define EVENT_TESTS_SPEED "2"
-#endif
-#endif
-#ifndef EVENT_TESTS_SPEED
-#define EVENT_TESTS_SPEED "8"
-#endif
-
 }
 
 class EventTest : public testing::TestWithParam<VSignalRate>
