@@ -6,7 +6,6 @@
 #include <cerrno>
 #include <system_error>
 
-#include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -17,59 +16,25 @@ namespace StageHost
 namespace
 {
 
-constexpr mode_t AllMayReadAndWrite = 0666;   // less what the user's mask takes
+using UtilsIO::EOpenMode;
+using UtilsIO::VDescriptor;
+
 constexpr mode_t Permissions = 07777;
 
 std::string LastReason() { return std::generic_category().message( errno ); }
 
-class VHandle
-{
-public:
-  explicit VHandle( int i_Handle ) : m_Handle( i_Handle ) {}
-  ~VHandle() { Close(); }
-  VHandle( const VHandle& ) = delete;
-  VHandle& operator=( const VHandle& ) = delete;
-
-  bool IsOpen() const { return m_Handle >= 0; }
-  int Get() const { return m_Handle; }
-  bool Close()
-  {
-    const int Handle = m_Handle;
-    m_Handle = -1;
-    return Handle < 0 || close( Handle ) == 0;
-  }
-
-private:
-  int m_Handle;
-};
-
-bool WriteAll( int i_Handle, const std::string& i_rText )
-{
-  for( size_t Written = 0; Written < i_rText.size(); )
-  {
-    const ssize_t Count = write( i_Handle, i_rText.data() + Written, i_rText.size() - Written );
-    if( Count < 0 && errno != EINTR )
-    {
-      return false;
-    }
-    Written += static_cast<size_t>( Count > 0 ? Count : 0 );
-  }
-  return true;
-}
-
-bool ReadAll( int i_Handle, std::string& o_rText )
+bool ReadAll( VDescriptor& io_rFile, std::string& o_rText )
 {
   char Bytes[65536];
+  size_t Count = 0;
   o_rText.clear();
-  for( ssize_t Count = 1; Count != 0; )
-  {
-    Count = read( i_Handle, Bytes, sizeof( Bytes ) );
-    if( Count < 0 && errno != EINTR )
+  do {
+    if( !io_rFile.Read( Bytes, sizeof( Bytes ), Count ) )
     {
       return false;
     }
-    o_rText.append( Bytes, static_cast<size_t>( Count > 0 ? Count : 0 ) );
-  }
+    o_rText.append( Bytes, Count );
+  } while( Count == sizeof( Bytes ) );
   return true;
 }
 
@@ -86,23 +51,23 @@ bool TakeOver( int i_Handle, const struct stat& i_rStatus )
 bool WriteNewFile( const std::string& i_rPath, const std::string& i_rLike, const std::string& i_rText )
 {
   unlink( i_rPath.c_str() );   // what a killed program has left, or a link that would lead elsewhere
-  VHandle File( open( i_rPath.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, AllMayReadAndWrite ) );
+  VDescriptor File;
   struct stat Status = {};
-  if( !File.IsOpen() || ( stat( i_rLike.c_str(), &Status ) == 0 && !TakeOver( File.Get(), Status ) ) )
+  if( !File.Open( i_rPath, EOpenMode::CreateNew ) || ( stat( i_rLike.c_str(), &Status ) == 0 && !TakeOver( File.Handle(), Status ) ) )
   {
     return false;
   }
-  return WriteAll( File.Get(), i_rText ) && fsync( File.Get() ) == 0 && File.Close();
+  return File.Write( i_rText.data(), i_rText.size() ) && fsync( File.Handle() ) == 0 && File.Close();
 }
 
 // So that the name is on the disk too. Not every file system can do that for a folder.
 void SynchroniseFolder( const std::string& i_rPath )
 {
   const std::string Folder = boost::filesystem::path( i_rPath ).parent_path().string();
-  const VHandle Handle( open( Folder.empty() ? "." : Folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC ) );
-  if( Handle.IsOpen() )
+  VDescriptor Names;
+  if( Names.Open( Folder.empty() ? "." : Folder, EOpenMode::Read ) )
   {
-    fsync( Handle.Get() );
+    fsync( Names.Handle() );
   }
 }
 
@@ -121,8 +86,8 @@ EFileRead ReadWholeFile( const std::string& i_rPath, std::string& o_rText, std::
     o_rReason = "Not a plain file";
     return EFileRead::Failed;
   }
-  const VHandle File( open( i_rPath.c_str(), O_RDONLY | O_CLOEXEC ) );
-  if( !File.IsOpen() || !ReadAll( File.Get(), o_rText ) )
+  VDescriptor File;
+  if( !File.Open( i_rPath, EOpenMode::Read ) || !ReadAll( File, o_rText ) )
   {
     o_rReason = LastReason();
     return EFileRead::Failed;
@@ -159,18 +124,9 @@ std::string SetFileAside( const std::string& i_rPath, std::string& o_rReason )
   return Free;
 }
 
-VFileLock::~VFileLock()
-{
-  if( m_Handle >= 0 )
-  {
-    close( m_Handle );
-  }
-}
-
 bool VFileLock::Acquire( const std::string& i_rPath, std::string& o_rReason )
 {
-  m_Handle = open( i_rPath.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, AllMayReadAndWrite );
-  if( m_Handle < 0 || flock( m_Handle, LOCK_EX ) != 0 )
+  if( !m_File.Open( i_rPath, UtilsIO::EOpenMode::CreateReadWrite ) || flock( m_File.Handle(), LOCK_EX ) != 0 )
   {
     o_rReason = LastReason();
     return false;

@@ -3,6 +3,8 @@
 // Reasons are the system's own words. One thread at a time.
 #pragma once
 
+#include "Utils/UtilsIO/Descriptor.h"
+
 #include <string>
 
 namespace StageHost
@@ -30,16 +32,11 @@ std::string SetFileAside( const std::string& i_rPath, std::string& o_rReason );
 class VFileLock
 {
 public:
-  VFileLock() = default;
-  ~VFileLock();
-  VFileLock( const VFileLock& ) = delete;
-  VFileLock& operator=( const VFileLock& ) = delete;
-
   // Makes the file if it is missing, and leaves it there for good. Waits; false at a signal that is handled, or where there can be no lock.
   bool Acquire( const std::string& i_rPath, std::string& o_rReason );
 
 private:
-  int m_Handle = -1;
+  UtilsIO::VDescriptor m_File;
 };
 
 }

@@ -192,11 +192,21 @@ void VHostSession::WaitForDelivery( const std::vector<VDeviceInfo>& i_rDevices )
     const auto pSession = m_pHost->Engine().GetStarted();
     return pSession && pSession->m_Sources.size() >= Delivering;
   };
-  const double Until = m_pHost->Time().Now() + DeliverySeconds;
-  while( Delivering != 0 && !IsRateKnown() && m_pHost->Time().Now() < Until && WaitUninterrupted( PollSeconds ) )
-  {
-  }
+  WaitUntil( DeliverySeconds, [&] { return Delivering == 0 || IsRateKnown(); } );
   WaitUninterrupted( ReactionSeconds );
+}
+
+bool VHostSession::WaitUntil( double i_Seconds, const std::function<bool()>& i_Condition ) const
+{
+  const double Until = m_pHost->Time().Now() + i_Seconds;
+  while( !i_Condition() )
+  {
+    if( m_pHost->Time().Now() > Until || !WaitUninterrupted( PollSeconds ) )
+    {
+      return i_Condition();
+    }
+  }
+  return true;
 }
 
 int VHostSession::ExitWithoutDevices() { return IsInterrupted() ? ExitFailed : ExitNoDevice; }

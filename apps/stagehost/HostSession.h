@@ -6,6 +6,7 @@
 #include "host/VirtualCards.h"
 
 #include <cstddef>
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -41,6 +42,8 @@ public:
   std::vector<StageHost::VDeviceInfo> WaitForDevices( bool i_bNeedSignal );
   // Waits a moment more, until those that have a signal deliver it: only then do their settings tell its timecode and what is wrong with it.
   void WaitForDelivery( const std::vector<StageHost::VDeviceInfo>& i_rDevices );
+  // Waits at most so long, and no longer than to the first signal. True if the condition holds at the end.
+  bool WaitUntil( double i_Seconds, const std::function<bool()>& i_Condition ) const;
   // The exit code for an empty answer.
   static int ExitWithoutDevices();
 

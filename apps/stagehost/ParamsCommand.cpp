@@ -64,20 +64,12 @@ int Get( VHostSession& i_rSession, const VParamsOptions& i_rOptions )
 // False where the owner of a value has not answered in time.
 bool AwaitAnswer( VHostSession& i_rSession, const std::string& i_rPath )
 {
-  const double Until = i_rSession.Host().Time().Now() + AnswerSeconds;
-  const auto IsAnswered = [&]
-  {
-    const auto Setting = i_rSession.Settings().Find( i_rPath );
-    return !Setting || Setting->m_Value.empty() || i_rSession.Settings().IsSettled( i_rPath );
-  };
-  while( !IsAnswered() )
-  {
-    if( i_rSession.Host().Time().Now() > Until || !WaitUninterrupted( PollSeconds ) )
+  return i_rSession.WaitUntil( AnswerSeconds,
+    [&]
     {
-      return IsAnswered();
-    }
-  }
-  return true;
+      const auto Setting = i_rSession.Settings().Find( i_rPath );
+      return !Setting || Setting->m_Value.empty() || i_rSession.Settings().IsSettled( i_rPath );
+    } );
 }
 
 // Shows the value as its owner has settled it, once it is in the file.

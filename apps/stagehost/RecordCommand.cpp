@@ -57,25 +57,12 @@ int CheckOutput( const VRecordOptions& i_rOptions )
   return ExitComplete;
 }
 
-bool WaitUntil( VHostSession& i_rSession, double i_Seconds, const std::function<bool()>& i_Condition )
-{
-  const double Until = i_rSession.Host().Time().Now() + i_Seconds;
-  while( !i_Condition() )
-  {
-    if( i_rSession.Host().Time().Now() > Until || !WaitUninterrupted( PollSeconds ) )
-    {
-      return i_Condition();
-    }
-  }
-  return true;
-}
-
 bool SetEnabled( VHostSession& i_rSession, const std::string& i_rURN, bool i_bEnabled )
 {
   const std::string Path = VDeviceSettings::SettingPath( i_rURN, "Enabled" );
   std::string Error;
   return i_rSession.Settings().Set( Path, i_bEnabled ? "true" : "false", Error ) &&
-    WaitUntil( i_rSession, SettleSeconds,
+    i_rSession.WaitUntil( SettleSeconds,
       [&]
       {
         const bool bReady = i_rSession.Settings().Find( "VideoInput." + i_rURN + ".Hardware.Status" )->m_Value == "Ready";
@@ -97,7 +84,7 @@ bool Set( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, const VWantedS
 // The device offers other payloads with another container, and changes one that it no longer offers: both have happened when this is true.
 bool AwaitPayloads( VHostSession& i_rSession, const VDeviceInfo& i_rDevice, const VRecordFormat& i_rFormat )
 {
-  return WaitUntil( i_rSession, SettleSeconds,
+  return i_rSession.WaitUntil( SettleSeconds,
     [&]
     {
       const auto Payload = i_rSession.Settings().Find( VDeviceSettings::SettingPath( i_rDevice.m_URN, "VideoPayload" ) );
@@ -237,7 +224,7 @@ int RunRecording( VHostSession& i_rSession, const VRecordOptions& i_rOptions, co
 {
   StageHost::VRecording Recording( i_rSession.Host().Engine(), i_rSession.Host().Targets(), i_rSession.Host().Time() );
   const StageHost::VRecordingRequest Request = MakeRequest( i_rOptions, i_rDevices );
-  if( !WaitUntil( i_rSession, ReadySeconds + i_rOptions.m_PreRoll, [&] { return Recording.IsReady( Request ); } ) )
+  if( !i_rSession.WaitUntil( ReadySeconds + i_rOptions.m_PreRoll, [&] { return Recording.IsReady( Request ); } ) )
   {
     Complain( IsInterrupted() ? "Interrupted before the recording began." : "The devices deliver no steady signal to record." );
     return IsInterrupted() ? ExitFailed : ExitNoDevice;

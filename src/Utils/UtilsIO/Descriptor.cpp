@@ -26,6 +26,7 @@ int SystemFlags( EOpenMode i_Mode )
     case EOpenMode::TruncateReadWrite: return O_RDWR | O_CREAT | O_TRUNC;
     case EOpenMode::Truncate: return O_WRONLY | O_CREAT | O_TRUNC;
     case EOpenMode::CreateReadWrite: return O_RDWR | O_CREAT;
+    case EOpenMode::CreateNew: return O_WRONLY | O_CREAT | O_EXCL;
   }
   return O_RDONLY;
 }

@@ -21,6 +21,7 @@ enum class EOpenMode : int32_t
   TruncateReadWrite = 2,   // "w+b"
   Truncate = 3,            // "wb"
   CreateReadWrite = 4,     // made if it is missing, kept as it is otherwise
+  CreateNew = 5,           // "wbx": nothing, not even a link, may have the name
 };
 
 class VDescriptor
@@ -34,6 +35,8 @@ public:
   // UTF-8. False if a file is open already; that one stays open.
   bool Open( const std::string& i_rPath, EOpenMode i_Mode );
   bool IsOpen() const { return m_Handle >= 0; }
+  // The system's own, for calls that are not here; -1 if none is open. It stays the descriptor's.
+  int Handle() const { return m_Handle; }
   // False if none was open, or if the system reports only now that it could not store what was written. The descriptor is free either way.
   bool Close();
 
