@@ -218,6 +218,7 @@ bool VBluefishInput::Read( uint8_t* o_pTarget, uint64_t i_Size, uint32_t i_Buffe
 
 void VBluefishInput::OnPresence( bool i_bPresent )
 {
+  HoldForClient();
   {
     const boost::lock_guard<boost::mutex> Lock( m_Mutex );
     m_bPresent = i_bPresent;

@@ -5,8 +5,8 @@
 // filled again and again. So what is named after one sync can be read after the next but one. Without a signal nothing is filled, while the syncs
 // go on at the card's own pace.
 //
-// A client that polls is given up to two seconds a frame before the next one passes, as any virtual card waits for a slow client; after that the
-// frame is lost to it. It is not waited for where it captures nothing or there is no signal.
+// A client that polls is given up to two seconds a frame before the next one passes or the card is taken out, as any virtual card waits for a slow
+// client; after that the frame is lost to it. It is not waited for where it captures nothing or there is no signal.
 //
 // Any thread may call.
 #pragma once

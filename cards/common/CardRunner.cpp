@@ -177,11 +177,12 @@ void VCardRunner::Pass( const VSignalFrame& i_rFrame )
   {
     const boost::lock_guard<boost::mutex> Lock( m_Mutex );
     bChanged = m_bPresent != i_rFrame.m_bPresent;
-    m_bPresent = i_rFrame.m_bPresent;
   }
   if( bChanged )
   {
     m_rFrames.OnPresence( i_rFrame.m_bPresent );
+    const boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_bPresent = i_rFrame.m_bPresent;
   }
   if( i_rFrame.m_bPresent && i_rFrame.m_bDropped )
   {

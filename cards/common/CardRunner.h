@@ -20,7 +20,8 @@ class ICardFrames
 {
 public:
   virtual ~ICardFrames() = default;
-  // The card comes into the machine or goes out of it, right before the frame of that number. Not called for the state at the start.
+  // The card comes into the machine or goes out of it, right before the frame of that number: it counts as being there, or as gone, once this has
+  // returned. Not called for the state at the start.
   virtual void OnPresence( bool i_bPresent ) = 0;
   // Every frame that the card does not drop, while it is in the machine.
   virtual void OnFrame( const VSignalFrame& i_rFrame ) = 0;

@@ -192,6 +192,28 @@ TEST_F( BluefishStream, AClientThatIsBusyIsWaitedFor )
   EXPECT_EQ( Counters().m_FramesWithoutBuffer, 0u );
 }
 
+// So is a removal: the last frame before it is not lost to a client that has yet to read it.
+TEST_F( BluefishStream, ACardIsNotTakenOutUnderABusyClient )
+{
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
+  Name( 0 );
+  const auto First = CounterIn( 0, Mode576i );
+  Sync();
+  Event( R"({"do": "remove"})" );
+  const uint64_t Passed = Counters().m_FramesPassed;
+  boost::thread Card( [&] { EXPECT_TRUE( Control().Step( m_Card, 1 ) ); } );
+  while( Counters().m_FramesPassed == Passed )
+  {
+    boost::this_thread::yield();
+  }
+  for( int Reading = 0; Reading < 20; ++Reading )
+  {
+    EXPECT_EQ( CounterIn( 1, Mode576i ), *First + 1 );
+  }
+  EXPECT_FALSE( m_Object.Wait() );
+  Card.join();
+}
+
 TEST_F( BluefishStream, InputsWorkOnTheirOwn )
 {
   Plug( "bluefish444:inputs=4,standard=SD_720_576I_5000,pattern=counter" );
