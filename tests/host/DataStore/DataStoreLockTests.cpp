@@ -87,55 +87,39 @@ TEST_F( DataStoreLock, IsExclusiveUntilTheWritersLastNestedLockEndsInWhateverOrd
   EXPECT_TRUE( m_Lock.AcquireExclusive() );
   EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Exclusive );
   EXPECT_TRUE( m_Lock.AcquireExclusive() );
+  VOtherThread Writer( *this, true );
+  WaitUntilWaiting( Writer );
   Release();
   Release();
   EXPECT_EQ( m_LastReleases, 0 );
   EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::Exclusive );
+  EXPECT_FALSE( Writer.HasTaken() );
   Release();
-  EXPECT_EQ( m_LastReleases, 1 );
   EXPECT_EQ( m_Lock.HeldByThisThread(), EHeld::None );
+  Writer.WaitUntilTaken();
+  Writer.End();
+  EXPECT_EQ( m_LastReleases, 2 );
 }
 
-TEST_F( DataStoreLock, ReadersShareAndAWriterWaitsForThemAll )
+TEST_F( DataStoreLock, AWriterWaitsForAllReadersAndLetsOnlyNestedOnesPass )
 {
   m_Lock.AcquireShared();
   VOtherThread Reader( *this, false );
   Reader.WaitUntilTaken();
   VOtherThread Writer( *this, true );
   WaitUntilWaiting( Writer );
-  Release();
-  WaitUntilWaiting( Writer );
-  Reader.End();
-  Writer.WaitUntilTaken();
-  Writer.End();
-  EXPECT_EQ( m_LastReleases, 1 );
-}
-
-TEST_F( DataStoreLock, ANestedReaderPassesAWaitingWriterAndANewOneDoesNot )
-{
-  m_Lock.AcquireShared();
-  VOtherThread Writer( *this, true );
-  WaitUntilWaiting( Writer );
   EXPECT_EQ( m_Lock.AcquireShared(), EHeld::Shared );
   VOtherThread Newcomer( *this, false );
   Release();
   Release();
+  WaitUntilWaiting( Writer );
+  Reader.End();
   Writer.WaitUntilTaken();
   EXPECT_FALSE( Newcomer.HasTaken() );
   Writer.End();
   Newcomer.WaitUntilTaken();
   Newcomer.End();
-}
-
-TEST_F( DataStoreLock, AWriterKeepsOtherWritersOut )
-{
-  m_Lock.AcquireExclusive();
-  VOtherThread Writer( *this, true );
-  WaitUntilWaiting( Writer );
-  Release();
-  Writer.WaitUntilTaken();
-  Writer.End();
-  EXPECT_EQ( m_LastReleases, 2 );
+  EXPECT_EQ( m_LastReleases, 1 );
 }
 
 TEST( DataStoreThreads, ReadersNeverSeeHalfAWrite )

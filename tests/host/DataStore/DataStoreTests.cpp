@@ -53,30 +53,55 @@ protected:
   }
 
   bool Set( const VDataPath& i_rPath, int i_Value ) { return VDataWriter( m_Store ).SetValue( i_rPath, Variant::Make( i_Value ) ); }
-  bool Propose( const VDataPath& i_rPath, int i_Value ) { return VDataVerifyWriter( m_Store ).SetProposedValue( i_rPath, Variant::Make( i_Value ) ); }
-  bool Verify( const VDataPath& i_rPath, int i_Value ) { return VDataVerifyWriter( m_Store ).SetVerifiedValue( i_rPath, Variant::Make( i_Value ) ); }
   void RequireVerification() { VDataWriter( m_Store ).SetValueFlags( m_Path, DataFlags::VerifyRequired ); }
 
   // Proposed, verified and counting value, 0 where there is none.
-  std::array<int, 3> Forms()
+  using VForms = std::array<int, 3>;
+  VForms Forms()
   {
-    const VDataVerifyReader Reader( m_Store );
-    Variant Proposed;
-    Variant Verified;
-    std::array<int, 3> Forms{};
-    Reader.GetProposedValue( m_Path, Proposed );
-    Reader.GetVerifiedValue( m_Path, Verified );
-    Proposed.Get( Forms[0] );
-    Verified.Get( Forms[1] );
-    GetTyped( Reader, m_Path, Forms[2] );
+    const VDataReader Lock( m_Store );
+    VForms Forms{};
+    for( size_t Index = 0; Index < Forms.size(); ++Index )
+    {
+      Variant Value;
+      m_Store.GetValue( m_Path, Value, std::array{ EDataForm::Proposed, EDataForm::Verified, EDataForm::Both }[Index] );
+      Value.Get( Forms[Index] );
+    }
     return Forms;
   }
 
+  // A write, and all that is to be seen and heard of it
+  struct VStep
+  {
+    EDataForm m_Form;
+    int m_Value;
+    VForms m_Forms;
+    bool m_bSettled;
+    const char* m_pHeard;
+  };
+  void Follow( const std::vector<VStep>& i_rSteps )
+  {
+    Listen( m_Path, m_Heard );
+    for( const VStep& rStep : i_rSteps )
+    {
+      SCOPED_TRACE( &rStep - i_rSteps.data() );
+      {
+        const VDataWriter Lock( m_Store );
+        EXPECT_TRUE( m_Store.SetValue( m_Path, Variant::Make( rStep.m_Value ), rStep.m_Form ) );
+      }
+      EXPECT_EQ( Forms(), rStep.m_Forms );
+      EXPECT_EQ( VDataReader( m_Store ).IsSettled( m_Path ), rStep.m_bSettled );
+      EXPECT_TRUE( IsHeard( m_Heard, rStep.m_pHeard ) );
+    }
+  }
+
+  std::string m_Heard;
   VDataStore m_Store;
   const VDataPath m_Path{ "VideoInput", "vi:0", "Settings", "Enabled" };
 };
 
-using VForms = std::array<int, 3>;
+constexpr bool Settled = true;
+constexpr bool Waiting = false;
 
 }
 
@@ -140,76 +165,39 @@ TEST_F( DataStore, ListsWhatItHolds )
   EXPECT_FALSE( Writer.GetChildNames( VDataPath{ "VideoInput", "vi:0" }, Names ) );
 }
 
-TEST_F( DataStore, ChangeStampsTellWhetherAnythingBelowHasChanged )
-{
-  Set( m_Path, 1 );
-  const auto Stamp = [this]( const VDataPath& i_rPath ) { return VDataReader( m_Store ).GetChangeStamp( i_rPath ); };
-  const uint64_t Device = Stamp( { "VideoInput", "vi:0" } );
-  EXPECT_GT( Device, 0u );
-  Set( { "VideoInput", "vi:1", "Settings", "Enabled" }, 1 );
-  EXPECT_EQ( Stamp( { "VideoInput", "vi:0" } ), Device );
-  EXPECT_GT( Stamp( { "VideoInput" } ), Device );
-  VDataWriter( m_Store ).SetValueFlags( m_Path, DataFlags::ReadOnly );
-  EXPECT_GT( Stamp( { "VideoInput", "vi:0" } ), Device );
-}
-
 TEST_F( DataStore, APlainValueSettlesAsItIsWritten )
 {
-  std::string Heard;
-  Listen( m_Path, Heard );
-  Set( m_Path, 1 );
-  EXPECT_EQ( Forms(), ( VForms{ 1, 1, 1 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "pcab" ) );
-  Set( m_Path, 1 );
-  EXPECT_TRUE( IsHeard( Heard, "pb" ) );
-  Propose( m_Path, 2 );
-  EXPECT_EQ( Forms(), ( VForms{ 2, 2, 2 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "pcb" ) );
-  Verify( m_Path, 3 );
-  EXPECT_EQ( Forms(), ( VForms{ 2, 3, 3 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "cb" ) );
-  EXPECT_TRUE( VDataReader( m_Store ).IsSettled( m_Path ) );
+  Follow( {
+    { EDataForm::Both, 1, { 1, 1, 1 }, Settled, "pcab" },
+    { EDataForm::Both, 1, { 1, 1, 1 }, Settled, "pb" },
+    { EDataForm::Proposed, 2, { 2, 2, 2 }, Settled, "pcb" },
+    { EDataForm::Verified, 3, { 2, 3, 3 }, Settled, "cb" },
+  } );
 }
 
-TEST_F( DataStore, AProposalWaitsForItsOwner )
+// A write of both forms is a proposal too.
+TEST_F( DataStore, AProposalWaitsForItsOwnerOrIsGivenUp )
 {
   RequireVerification();
-  std::string Heard;
-  Listen( m_Path, Heard );
-  Propose( m_Path, 1 );
-  EXPECT_EQ( Forms(), ( VForms{ 1, 0, 1 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "pab" ) );
-  EXPECT_FALSE( VDataReader( m_Store ).IsSettled( m_Path ) );
-  Verify( m_Path, 1 );
-  EXPECT_TRUE( IsHeard( Heard, "cb" ) );
-  EXPECT_TRUE( VDataReader( m_Store ).IsSettled( m_Path ) );
-
-  Propose( m_Path, 2 );
-  EXPECT_EQ( Forms(), ( VForms{ 2, 1, 1 } ) );
-  Verify( m_Path, 3 );
-  EXPECT_EQ( Forms(), ( VForms{ 2, 3, 3 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "pbcb" ) );
-  Verify( m_Path, 3 );
-  EXPECT_TRUE( IsHeard( Heard, "" ) );
-}
-
-TEST_F( DataStore, AWriteOfBothFormsIsAProposalToo )
-{
-  RequireVerification();
-  std::string Heard;
-  Listen( m_Path, Heard );
-  for( const int Value : { 1, 1, 2 } )
-  {
-    SCOPED_TRACE( Value );
-    Set( m_Path, Value );
-    EXPECT_EQ( Forms(), ( VForms{ Value, Value, Value } ) );
-    EXPECT_FALSE( VDataReader( m_Store ).IsSettled( m_Path ) );
-    EXPECT_EQ( Heard.find( 'c' ), std::string::npos );
-    Verify( m_Path, Value );
-    EXPECT_EQ( std::count( Heard.begin(), Heard.end(), 'p' ), 1 );
-    EXPECT_EQ( std::count( Heard.begin(), Heard.end(), 'c' ), 1 );
-    Heard.clear();
-  }
+  EXPECT_FALSE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
+  Follow( {
+    { EDataForm::Proposed, 1, { 1, 0, 1 }, Waiting, "pab" },
+    { EDataForm::Verified, 1, { 1, 1, 1 }, Settled, "cb" },
+    { EDataForm::Proposed, 2, { 2, 1, 1 }, Waiting, "pb" },
+    { EDataForm::Verified, 3, { 2, 3, 3 }, Settled, "cb" },
+    { EDataForm::Verified, 3, { 2, 3, 3 }, Settled, "" },
+    { EDataForm::Both, 4, { 4, 4, 4 }, Waiting, "pb" },
+    { EDataForm::Verified, 4, { 4, 4, 4 }, Settled, "cb" },
+    { EDataForm::Both, 4, { 4, 4, 4 }, Waiting, "pb" },
+    { EDataForm::Verified, 4, { 4, 4, 4 }, Settled, "cb" },
+    { EDataForm::Proposed, 5, { 5, 4, 4 }, Waiting, "pb" },
+  } );
+  EXPECT_TRUE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
+  EXPECT_EQ( Forms(), ( VForms{ 4, 4, 4 } ) );
+  EXPECT_TRUE( IsHeard( m_Heard, "cb" ) );
+  VDataVerifyWriter( m_Store ).SetProposedValue( m_Path, Variant::Make( 6 ) );
+  VDataWriter( m_Store ).SetValueFlags( m_Path, 0 );
+  EXPECT_EQ( Forms(), ( VForms{ 6, 6, 6 } ) ) << "without an owner a proposal settles itself";
 }
 
 TEST_F( DataStore, AWriteOfBothFormsSettlesAtOnceWhereNobodyWouldAnswer )
@@ -220,40 +208,23 @@ TEST_F( DataStore, AWriteOfBothFormsSettlesAtOnceWhereNobodyWouldAnswer )
   Set( m_Path, 1 );
   EXPECT_EQ( Changed, 1 );
   EXPECT_TRUE( VDataReader( m_Store ).IsSettled( m_Path ) );
-  Propose( m_Path, 2 );
+  VDataVerifyWriter( m_Store ).SetProposedValue( m_Path, Variant::Make( 2 ) );
   EXPECT_FALSE( VDataReader( m_Store ).IsSettled( m_Path ) );
-}
-
-TEST_F( DataStore, AProposalCanBeGivenUp )
-{
-  RequireVerification();
-  EXPECT_FALSE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
-  Verify( m_Path, 1 );
-  Propose( m_Path, 2 );
-  std::string Heard;
-  Listen( m_Path, Heard );
-  EXPECT_TRUE( VDataWriter( m_Store ).DiscardProposal( m_Path ) );
-  EXPECT_EQ( Forms(), ( VForms{ 1, 1, 1 } ) );
-  EXPECT_TRUE( IsHeard( Heard, "cb" ) );
-  Propose( m_Path, 3 );
-  VDataWriter( m_Store ).SetValueFlags( m_Path, 0 );
-  EXPECT_EQ( Forms(), ( VForms{ 3, 3, 3 } ) ) << "without an owner a proposal settles itself";
 }
 
 TEST_F( DataStore, FlagsStandByThemselves )
 {
-  std::string Heard;
-  Listen( m_Path, Heard );
+  Listen( m_Path, m_Heard );
   uint32_t Flags = 77;
   EXPECT_FALSE( VDataReader( m_Store ).GetValueFlags( m_Path, Flags ) );
   RequireVerification();
-  EXPECT_TRUE( IsHeard( Heard, "fb" ) );
+  EXPECT_TRUE( IsHeard( m_Heard, "fb" ) );
   RequireVerification();
-  EXPECT_TRUE( IsHeard( Heard, "" ) );
+  EXPECT_TRUE( IsHeard( m_Heard, "" ) );
   Set( m_Path, 1 );
-  Heard.clear();
+  m_Heard.clear();
   VDataWriter( m_Store ).RemoveValue( m_Path );
-  EXPECT_TRUE( IsHeard( Heard, "rcb" ) );
+  EXPECT_TRUE( IsHeard( m_Heard, "rcb" ) );
   EXPECT_TRUE( VDataReader( m_Store ).GetValueFlags( m_Path, Flags ) );
   EXPECT_EQ( Flags, DataFlags::VerifyRequired );
   VDataWriter Writer( m_Store );
@@ -286,17 +257,16 @@ TEST_F( DataStore, WildcardPlacesHearOfAllTheyStandFor )
 
 TEST_F( DataStore, EventsGoOutOnceWhenTheOutermostWriterEnds )
 {
-  std::string Heard;
-  Listen( m_Path, Heard );
+  Listen( m_Path, m_Heard );
   {
     VDataWriter Outer( m_Store );
     for( const int Value : { 1, 2, 3 } )
     {
       Set( m_Path, Value );
     }
-    EXPECT_TRUE( Heard.empty() );
+    EXPECT_TRUE( m_Heard.empty() );
   }
-  EXPECT_TRUE( IsHeard( Heard, "pacb" ) );
+  EXPECT_TRUE( IsHeard( m_Heard, "pacb" ) );
 }
 
 TEST_F( DataStore, ASubscriberHearsOnlyOfWhatIsWrittenAfterwards )
@@ -350,13 +320,4 @@ TEST_F( DataStore, WritesWithoutTheLockAreRefused )
   EXPECT_FALSE( m_Store.SetValue( m_Path, Variant::Make( 1 ), EDataForm::Both ) );
   EXPECT_EQ( m_Store.GetNode( m_Path ), nullptr );
   EXPECT_EQ( Assertions.Expressions().size(), 2u );
-}
-
-TEST_F( DataStore, FindNodeGivesOnlyWhatGetNodeHasMade )
-{
-  Set( m_Path, 1 );
-  EXPECT_EQ( VDataReader( m_Store ).FindNode( m_Path ), nullptr );
-  IDataNode* pNode = VDataWriter( m_Store ).GetNode( m_Path );
-  EXPECT_EQ( VDataReader( m_Store ).FindNode( m_Path ), pNode );
-  EXPECT_EQ( VDataReader( m_Store ).GetSchema( m_Path ), KVZ::VSchemaOf<int32_t>::Get() );
 }
