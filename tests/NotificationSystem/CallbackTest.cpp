@@ -50,25 +50,13 @@ TEST( Callback, RemovesADeadSubscriberOnItsFirstCall )
 {
   VCallback<void( uint64_t )> Callback;
   auto pSubscriber = std::make_shared<VSubscriber>();
-  const auto pWatched = pSubscriber;
   Callback.Set( BindWeak( std::weak_ptr<VSubscriber>( pSubscriber ), &VSubscriberBase::OnNumber ) );
   EXPECT_TRUE( Callback( 5 ) );
-  EXPECT_EQ( pWatched->m_Last, 5u );
-  auto pDying = std::make_shared<VSubscriber>();
-  uint64_t Seen = 0;
-  Callback.Set( BindWeak( pDying,
-    [&Seen]( VSubscriber& i_rSubscriber, uint64_t i_Number )
-    {
-      i_rSubscriber.OnNumber( i_Number );
-      Seen = i_rSubscriber.m_Last;
-    } ) );
-  EXPECT_TRUE( Callback( 6 ) );
-  EXPECT_EQ( Seen, 6u );
-  pDying.reset();
+  EXPECT_EQ( pSubscriber->m_Last, 5u );
+  pSubscriber.reset();
   EXPECT_TRUE( Callback.IsSet() );
   EXPECT_FALSE( Callback( 7 ) );
   EXPECT_FALSE( Callback.IsSet() );
-  EXPECT_EQ( Seen, 6u );
 }
 
 TEST( Callback, KeepsItsSubscriberAliveDuringACall )
@@ -125,15 +113,11 @@ TEST( CallbackPostal, RunsOnItsServiceWithCopiesOfTheArguments )
   std::vector<bool> Last;
   const auto Store = [&]( std::vector<bool> i_Bits ) { Last = std::move( i_Bits ); };
   Callback.Set( Store );
-  {
-    const std::vector<bool> Bits{ true, false };
-    EXPECT_TRUE( Callback( Bits ) );
-    EXPECT_TRUE( Callback( {} ) );
-  }
-  EXPECT_TRUE( pDefault->RunOne() );
+  std::vector<bool> Bits{ true, false };
+  EXPECT_TRUE( Callback( Bits ) );
+  Bits.clear();
+  EXPECT_EQ( pDefault->RunAll(), 1u );
   EXPECT_EQ( Last, ( std::vector<bool>{ true, false } ) );
-  EXPECT_TRUE( pDefault->RunOne() );
-  EXPECT_TRUE( Last.empty() );
   Callback.Set( Store, pOther );
   EXPECT_TRUE( Callback( { true } ) );
   EXPECT_EQ( pDefault->Pending(), 0u );

@@ -27,7 +27,7 @@ enum class EColour : uint8_t
   Red = 7
 };
 
-TEST( LogFormat, TakesPlaceholdersAndPrintfForms )
+TEST( LogFormat, TakesPlaceholdersAndPrintfFormsAndEveryTypeOfArgument )
 {
   EXPECT_EQ( Format( "%1% Buffer:Session %2% of %1%", std::string( "vi:0" ), 3u ), "vi:0 Buffer:Session 3 of vi:0" );
   EXPECT_EQ( Format( "Client '%s' wrote %.2f seconds, %d frames, %i more", "a", 1.005e1, 250, -3 ),
@@ -36,10 +36,6 @@ TEST( LogFormat, TakesPlaceholdersAndPrintfForms )
   EXPECT_EQ( Format( "Failed (= 0x%x), 0x%08X", int32_t( -2147467259 ), 0xabcu ), "Failed (= 0x80004005), 0x00000ABC" );
   EXPECT_EQ( Format( "100%% of %1%", std::string_view( "it" ) ), "100% of it" );
   EXPECT_EQ( Format( "Nothing to fill in." ), "Nothing to fill in." );
-}
-
-TEST( LogFormat, TakesCharactersAsNumbersAndEveryOtherArgumentType )
-{
   EXPECT_EQ( Format( "%1%:%2%:%3%", uint8_t( 9 ), int8_t( -1 ), 'A' ), "9:-1:65" );
   EXPECT_EQ( Format( "%1% %2% %3%", true, EColour::Red, 29.97f ), "1 7 29.97" );
   EXPECT_EQ( Format( "%1% %2%", std::numeric_limits<int64_t>::min(), std::numeric_limits<uint64_t>::max() ),
@@ -113,23 +109,27 @@ protected:
   const TestSupport::VTemporaryFolder m_Folder;
 };
 
-TEST_F( LogFile, HoldsWhatItsLevelsAllow )
+TEST_F( LogFile, HoldsWhatItsLevelsAllowWithRepeatsFolded )
 {
   ASSERT_TRUE( KVZ::ConfigureLog( { .m_ConsoleLevel = 0,
     .m_FilePath = m_Folder.File( "host.log" ),
     .m_FileLevel = 3,
     .m_CategoryLevels = { { "GlobalLogTest.Detailed", 6 }, { "GlobalLogTest.Silent", 0 } } } ) );
   testing::internal::CaptureStderr();
-  KVZ_LOG( "GlobalLogTest.Plain", 3, "a plain warning" );
+  for( int Repeat = 0; Repeat < 4; ++Repeat )
+  {
+    KVZ_LOG( "GlobalLogTest.Plain", 3, "a plain warning" );
+  }
   KVZ_LOG( "GlobalLogTest.Plain", 5, "a plain information" );
   KVZ_LOG( "GlobalLogTest.Detailed", 6, "a wanted detail" );
   KVZ_LOG( "GlobalLogTest.Silent", 2, "an unwanted error" );
   const std::string Console = testing::internal::GetCapturedStderr();
   KVZ::ConfigureLog( {} );
-  EXPECT_NE( Content().find( "[GlobalLogTest.Plain:warning] a plain warning (GlobalLogTest.cpp:" ), std::string::npos ) << Content();
-  EXPECT_NE( Content().find( "a wanted detail" ), std::string::npos );
-  EXPECT_EQ( Content().find( "a plain information" ), std::string::npos );
-  EXPECT_EQ( Content().find( "an unwanted error" ), std::string::npos );
+  const std::string Found = Content();
+  EXPECT_EQ( std::count( Found.begin(), Found.end(), '\n' ), 3 ) << Found;
+  EXPECT_NE( Found.find( "[GlobalLogTest.Plain:warning] a plain warning (GlobalLogTest.cpp:" ), std::string::npos ) << Found;
+  EXPECT_NE( Found.find( "[GlobalLogTest.Plain:warning] a plain warning (repeated 3 times) (GlobalLogTest.cpp:" ), std::string::npos ) << Found;
+  EXPECT_NE( Found.find( "a wanted detail" ), std::string::npos ) << Found;
   EXPECT_EQ( Console.find( "a plain warning" ), std::string::npos );
   EXPECT_NE( Console.find( "a wanted detail" ), std::string::npos ) << Console;
 }
@@ -143,19 +143,6 @@ TEST_F( LogFile, ThatCannotBeOpenedIsReportedAndTheConsoleGoesOn )
   KVZ_LOG( "GlobalLogTest.Plain", 2, "still here" );
   EXPECT_NE( testing::internal::GetCapturedStderr().find( "still here" ), std::string::npos );
   EXPECT_EQ( Capture.Texts().size(), 1u );
-}
-
-TEST_F( LogFile, FoldsALineThatRepeats )
-{
-  ASSERT_TRUE( KVZ::ConfigureLog( { .m_ConsoleLevel = 0, .m_FilePath = m_Folder.File( "host.log" ), .m_FileLevel = 3 } ) );
-  for( int Line = 0; Line < 4; ++Line )
-  {
-    KVZ_LOG( "GlobalLogTest.Plain", 2, "no memory" );
-  }
-  KVZ::ConfigureLog( {} );
-  const std::string Found = Content();
-  EXPECT_EQ( std::count( Found.begin(), Found.end(), '\n' ), 2 ) << Found;
-  EXPECT_NE( Found.find( "[GlobalLogTest.Plain:error] no memory (repeated 3 times) (GlobalLogTest.cpp:" ), std::string::npos ) << Found;
 }
 
 TEST( LogRepeats, CountUntilAnotherLineComesOrTheirTimeIsOver )

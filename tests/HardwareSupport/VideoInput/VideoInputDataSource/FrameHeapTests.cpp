@@ -39,6 +39,8 @@ TEST( VideoFrameHeap, DeliveringTimedFramesWithTimecodeAllocatesNothing )
   VVideoRig Rig;
   const auto pSource = Rig.Make<VTestVideoSource>();
   Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
+  uint64_t Notified = 0;   // as a client that records is
+  pSource->Buffer()->NewDataCallback().AddImmediate( [&Notified]( KVZ::VBufferSessionId ) { ++Notified; } );
   const auto DeliverTimed = [&]( int i_Frames )
   {
     for( int Frame = 0; Frame < i_Frames; ++Frame )
@@ -55,6 +57,7 @@ TEST( VideoFrameHeap, DeliveringTimedFramesWithTimecodeAllocatesNothing )
   const size_t Before = t_Allocations;
   DeliverTimed( 20000 );
   EXPECT_EQ( t_Allocations - Before, 0u );
+  EXPECT_EQ( Notified, 21000u );
   EXPECT_GT( Rig.m_Memory.m_pAllocator->GetReleasedBlocks(), BlocksBefore + 1000 );
   Rig.OnStrand( *pSource, [&] { EXPECT_EQ( pSource->GetSourceSyncStatus().m_LatestCounterFrames, 20999u ); } );
 }
