@@ -104,28 +104,4 @@ TEST( CaptureBufferAllocator, LinkedAllocationsHaveOneLast )
   for( void* pMemory : { pData, pMore, pEntry, pNotLinkedYet } ) Memory.m_Allocator.Free( pMemory );
 }
 
-TEST( CaptureBufferAllocator, RecoveryMakesRoom )
-{
-  VMemory Memory( 3 );
-  std::vector<void*> Frames;
-  size_t Next = 0;
-  Memory.m_Allocator.SetRecovery(
-    [&]
-    {
-      const uint64_t Before = Memory.m_Allocator.GetReleasedBlocks();
-      while( Next < Frames.size() && Memory.m_Allocator.GetReleasedBlocks() == Before ) Memory.m_Allocator.Free( Frames[Next++] );
-      return Memory.m_Allocator.GetReleasedBlocks() != Before;
-    } );
-  for( int Frame = 0; Frame < 1000; ++Frame )
-  {
-    void* pFrame = Memory.m_Allocator.Allocate( 200 );   // four to a block
-    ASSERT_NE( pFrame, nullptr );
-    std::memset( pFrame, Frame & 0xFF, 200 );
-    Frames.push_back( pFrame );
-    ASSERT_LE( Frames.size() - Next, 12u );
-  }
-  EXPECT_GE( Frames.size() - Next, 9u );   // no more was freed than was needed
-  while( Next < Frames.size() ) Memory.m_Allocator.Free( Frames[Next++] );
-}
-
 }

@@ -1,11 +1,10 @@
 // A source, two writers, a browser and somebody who starts, ends and cancels captures, each on a thread of its own and with too little memory.
 #include "SyncSystem/CaptureBuffer.h"
 
+#include "NotificationSystem/AsioPostalService.h"
 #include "tests/support/FrameMemory.h"
 
 #include <gtest/gtest.h>
-
-#include <boost/thread/condition_variable.hpp>
 
 #include <atomic>
 #include <map>
@@ -35,16 +34,14 @@ class VWriter
 {
 public:
   explicit VWriter( VCaptureBuffer& i_rBuffer )
-    : m_rBuffer( i_rBuffer ), m_Id( i_rBuffer.RegisterClient( [this] { Notify(); } ) ), m_Thread( [this] { Run(); } )
+    : m_rBuffer( i_rBuffer ), m_Id( i_rBuffer.RegisterClient( [this] { m_Service.Post( [this] { Run(); } ); } ) )
   {
   }
 
   void Stop()
   {
     m_rBuffer.UnregisterClient( m_Id );
-    m_bStop = true;
-    Notify();
-    m_Thread.join();
+    m_Service.Stop();
   }
 
   VRange RangeOf( uint32_t i_Capture )
@@ -57,28 +54,10 @@ public:
   std::atomic<size_t> m_Wrong{ 0 };
 
 private:
-  void Notify()
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    ++m_Notifications;
-    m_Condition.notify_one();
-  }
-
-  bool Wait()
-  {
-    boost::unique_lock<boost::mutex> Lock( m_Mutex );
-    while( m_Notifications == 0 ) m_Condition.wait( Lock );
-    --m_Notifications;
-    return !m_bStop;
-  }
-
   void Run()
   {
-    while( Wait() )
-    {
-      EClientResult::Enum Result = EClientResult::MoreToCome;
-      while( Result == EClientResult::MoreToCome || Result == EClientResult::Finished ) Result = ReadOne();
-    }
+    EClientResult::Enum Result = EClientResult::MoreToCome;
+    while( Result == EClientResult::MoreToCome || Result == EClientResult::Finished ) Result = ReadOne();
   }
 
   EClientResult::Enum ReadOne()
@@ -109,12 +88,9 @@ private:
 
   VCaptureBuffer& m_rBuffer;
   boost::mutex m_Mutex;
-  boost::condition_variable m_Condition;
-  size_t m_Notifications = 0;
-  std::atomic<bool> m_bStop{ false };
-  std::map<uint32_t, VRange> m_Ranges;
+  std::map<uint32_t, VRange> m_Ranges GUARDED_BY( m_Mutex );
+  NotificationSystem::VAsioPostalService m_Service{ "Writer" };
   const uint32_t m_Id;
-  std::thread m_Thread;
 };
 
 class VStress
@@ -138,7 +114,6 @@ public:
   {
     EXPECT_EQ( m_First.m_Wrong + m_Second.m_Wrong + m_BrowsedWrong, 0u );
     EXPECT_GT( m_Completed, 0u );
-    EXPECT_FALSE( m_Cancelled.empty() );
     size_t Told = 0;
     for( uint32_t Capture = 1; Capture <= Captures; ++Capture )
     {
@@ -255,13 +230,12 @@ private:
     {
       const VRange Range = pWriter->RangeOf( i_Id );
       ASSERT_TRUE( Range.m_bGapless );
-      if( Range.m_First != 0 )
+      if( Range.m_First != 0 || bComplete )
       {
         ASSERT_EQ( Range.m_First, Status.m_Start.m_FrameNumber );
       }
       if( bComplete )
       {
-        ASSERT_EQ( Range.m_First, Status.m_Start.m_FrameNumber );
         ASSERT_EQ( Range.m_Last, Status.m_End.m_FrameNumber );
         ASSERT_EQ( Status.m_CapturedFrames, static_cast<uint64_t>( Range.m_Last - Range.m_First + 1 ) );
       }

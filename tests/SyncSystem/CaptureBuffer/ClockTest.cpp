@@ -32,90 +32,48 @@ TEST( Clock, AbsentClockReadsInvalid )
   EXPECT_EQ( Shifted( Ticks, VTick( -3 ) ).Find( Timecode ), VTick( 7 ) );
 }
 
-ISourceSyncSession ValidSession()
-{
-  ISourceSyncSession Session;
-  Session.m_Id = 4;
-  Session.m_StartTime.Set( Counter, VTick( 0 ) );
-  Session.m_StartTime.Set( Timecode, VTick( 12345 ) );
-  Session.m_ContinuousSince = { { Counter, 4 }, { Timecode, 2 } };
-  Session.m_Period = VTick( 1 );
-  return Session;
-}
-
+// Every fault at once; they are taken away, and the last ones put in, in the order in which they are told.
 TEST( SourceSyncSession, SaysWhichRuleFailsFirst )
 {
-  using VChange = void ( * )( ISourceSyncSession& );
-  const std::pair<VChange, const char*> Cases[] = {
-    { []( ISourceSyncSession& ) {}, "" },
-    { []( ISourceSyncSession& io_r ) { io_r.m_BeatOffset = VTick( -5 ); }, "" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_Id = 0;
-        io_r.m_Period = VTick( 0 );
-      },
-      "Invalid Id" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_Period = VTick( 0 );
-        io_r.m_BeatPeriod = VTick( -1 );
-      },
-      "Period must be a positive number of ticks" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_BeatPeriod = VTick( -1 );
-        io_r.m_NoticePeriod = VTick( -1 );
-      },
-      "Beat period cannot be a negative number of ticks" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_NoticePeriod = VTick( -1 );
-        io_r.m_StartTime = {};
-      },
-      "Notice period for starting new global sync session cannot be a negative number of ticks" },
-    { []( ISourceSyncSession& io_r ) { io_r.m_StartTime = {}; }, "No clocks specified" },
-    { []( ISourceSyncSession& io_r ) { io_r.m_StartTime.Set( FrameNumber, VTick( 1 ) ); },
-      "Clock continuity information does not correspond to clock start times" },
-    { []( ISourceSyncSession& io_r ) {
-       io_r.m_ContinuousSince = { { Counter, 4 }, { FrameNumber, 2 } };
-     },
-      "Clock continuity information does not correspond to clock start times" },
-    { []( ISourceSyncSession& io_r )
-      {
-        const IClock Global( IClock::GlobalTime, 0, 0 );
-        io_r.m_StartTime.Set( Global, VTick( 1 ) );
-        io_r.m_ContinuousSince[Global] = 4;
-        io_r.m_StartTime.Set( Counter, VTick( 9 ) );
-      },
-      "Source sync sessions cannot refer to the global time clocks" },
-    { []( ISourceSyncSession& io_r )
-      {
-        const IClock Second( IClock::CounterFromSessionStart, 0, 78 );
-        io_r.m_StartTime.Set( Second, VTick( 7 ) );
-        io_r.m_ContinuousSince[Second] = 4;
-      },
-      "Multiple counter from session start clocks are not permitted" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_StartTime.Set( Counter, VTick( 1 ) );
-        io_r.m_ContinuousSince[Counter] = 3;
-      },
-      "Counter from session start clock should always have a start tick of zero" },
-    { []( ISourceSyncSession& io_r ) { io_r.m_ContinuousSince[Counter] = 3; },
-      "Counter from session start clocks should never be continuous from a previous source sync session" },
-    { []( ISourceSyncSession& io_r )
-      {
-        io_r.m_StartTime.m_TickByClock.erase( Counter );
-        io_r.m_ContinuousSince.erase( Counter );
-      },
-      "A counter from session start clock must be provided" },
-  };
-  for( const auto& [Change, pText] : Cases )
+  const char* const NotContinuous = "Clock continuity information does not correspond to clock start times";
+  ISourceSyncSession Session;
+  Session.m_BeatPeriod = Session.m_NoticePeriod = VTick( -1 );
+  Session.m_BeatOffset = VTick( -5 );   // any will do
+  EXPECT_EQ( Session.Validate(), "Invalid Id" );
+  Session.m_Id = 4;
+  EXPECT_EQ( Session.Validate(), "Period must be a positive number of ticks" );
+  Session.m_Period = VTick( 1 );
+  EXPECT_EQ( Session.Validate(), "Beat period cannot be a negative number of ticks" );
+  Session.m_BeatPeriod = VTick( 0 );
+  EXPECT_EQ( Session.Validate(), "Notice period for starting new global sync session cannot be a negative number of ticks" );
+  Session.m_NoticePeriod = VTick( 0 );
+  EXPECT_EQ( Session.Validate(), "No clocks specified" );
+  Session.m_StartTime.Set( Counter, VTick( 1 ) );
+  EXPECT_EQ( Session.Validate(), NotContinuous );
+  Session.m_ContinuousSince = { { FrameNumber, 2 } };
+  EXPECT_EQ( Session.Validate(), NotContinuous );
+  Session.m_ContinuousSince = { { Counter, 3 } };
+  EXPECT_EQ( Session.Validate(), "Counter from session start clock should always have a start tick of zero" );
+  Session.m_StartTime.Set( Counter, VTick( 0 ) );
+  EXPECT_EQ( Session.Validate(), "Counter from session start clocks should never be continuous from a previous source sync session" );
+  Session.m_ContinuousSince[Counter] = 4;
+  EXPECT_EQ( Session.Validate(), "" );
+
+  const auto Add = [&Session]( const IClock& i_rClock )
   {
-    ISourceSyncSession Session = ValidSession();
-    Change( Session );
-    EXPECT_EQ( Session.Validate(), pText );
-  }
+    Session.m_StartTime.Set( i_rClock, VTick( 7 ) );
+    Session.m_ContinuousSince[i_rClock] = 2;
+  };
+  Add( Timecode );
+  EXPECT_EQ( Session.Validate(), "" );
+  Add( { IClock::CounterFromSessionStart, 0, 78 } );
+  EXPECT_EQ( Session.Validate(), "Multiple counter from session start clocks are not permitted" );
+  Add( { IClock::GlobalTime, 0, 0 } );
+  EXPECT_EQ( Session.Validate(), "Source sync sessions cannot refer to the global time clocks" );
+  Session.m_StartTime = {};
+  Session.m_ContinuousSince = {};
+  Add( Timecode );
+  EXPECT_EQ( Session.Validate(), "A counter from session start clock must be provided" );
 }
 
 }

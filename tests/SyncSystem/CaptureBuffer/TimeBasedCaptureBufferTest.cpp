@@ -98,14 +98,6 @@ TEST_F( TimeBasedCaptureBuffer, FirstFrameOpensTheFirstSessions )
   EXPECT_EQ( Session.m_StartTime.Find( Timecode ), VTick( 1000 ) );
 }
 
-TEST_F( TimeBasedCaptureBuffer, LogsWhatTheNewSessionIsLike )
-{
-  m_Timing.m_BeatPeriod = Period;
-  m_Timing.m_BeatOffset = VTick( 3 );
-  Add();
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session Created: Id = 1. Period = 5400000 (25Hz), Beat = 5400000:3" ) );
-}
-
 TEST_F( TimeBasedCaptureBuffer, OneTickOffIsADiscontinuity )
 {
   Add( 5 );
@@ -165,6 +157,7 @@ TEST_F( TimeBasedCaptureBuffer, PeriodBeatAndCounterClock )
   Add();
   EXPECT_EQ( m_Id, 2u );
   EXPECT_EQ( BufferSession(), 1u );
+  EXPECT_TRUE( m_Log.Has( "Buffer Test: New Sync Session Created: Id = 2. Period = 5400000 (25Hz), Beat = 5400000:1" ) );
   EXPECT_TRUE( Logged( "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 0:0 -> 5400000:1)" ) );
   EXPECT_EQ( Record( 2 ).m_ContinuousSince.at( Timecode ), 1u );
   m_Timing.m_BeatOffset = VTick( 2 );
@@ -293,6 +286,7 @@ TEST_F( TimeBasedCaptureBuffer, RecordsLeaveWithTheirFrames )
   m_pBuffer->RequestNewBufferSession();
   Add( 30 );   // memory holds 24
   EXPECT_EQ( m_pBuffer->OldestSessionId(), 2u );
+  EXPECT_TRUE( Logged( "Test Buffer:Session 1 has been removed from buffer. There are 1 sessions remaining" ) );
   VToken Token;
   KVZ::ITickInClocks Clocks;
   EXPECT_FALSE( m_pBuffer->FirstPosition( 1, Token, Clocks ) );
