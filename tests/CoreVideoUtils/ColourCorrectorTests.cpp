@@ -13,7 +13,7 @@ namespace
 
 using TestSupport::VBytes;
 
-VBytes Apply( const VColourCorrector& i_rCorrector, VBytes i_Pixels, size_t i_BytesPerPixel )
+VBytes Apply( const VColourCorrector& i_rCorrector, VBytes i_Pixels, size_t i_BytesPerPixel = 3 )
 {
   i_rCorrector.Apply( i_Pixels.data(), i_Pixels.size() / i_BytesPerPixel, i_BytesPerPixel );
   return i_Pixels;
@@ -51,24 +51,18 @@ TEST( ColourCorrector, SaturationMovesChannelsToAndFromTheirMean )
   EXPECT_EQ( ( VBytes{ 100, 100, 100 } ), Apply( { -5.0f, 1.0f }, { 50, 100, 150 } ) );         // no further than grey
 }
 
-TEST( ColourCorrector, GammaComesFirst )
-{
-  const VBytes Bright = Apply( { 1.0f, 2.0f }, { 10, 60, 200 } );
-  EXPECT_EQ( Apply( { 0.3f, 1.0f }, Bright ), Apply( { 0.3f, 2.0f }, { 10, 60, 200 } ) );
-}
-
-// A gamma of 1 in between turns the table off, not out.
+// A gamma of 1 in between turns the table off, not out; gamma comes before saturation.
 TEST( ColourCorrector, SettingsFollowOneAnother )
 {
+  const VBytes Plain = { 10, 60, 200 };
   VColourCorrector Corrector;
-  EXPECT_TRUE( Corrector.IsNeutral() );
   Corrector.SetColourCorrection( { 1.0f, 2.0f } );
-  const VBytes Corrected = Apply( Corrector, { 10, 60, 200 }, 3 );
+  const VBytes Bright = Apply( Corrector, Plain );
   Corrector.SetColourCorrection( { 1.0f, 1.0f } );
   EXPECT_TRUE( Corrector.IsNeutral() );
-  EXPECT_EQ( ( VBytes{ 10, 60, 200 } ), Apply( Corrector, { 10, 60, 200 }, 3 ) );
-  Corrector.SetColourCorrection( { 1.0f, 2.0f } );
-  EXPECT_EQ( Corrected, Apply( Corrector, { 10, 60, 200 }, 3 ) );
+  EXPECT_EQ( Plain, Apply( Corrector, Plain ) );
+  Corrector.SetColourCorrection( { 0.3f, 2.0f } );
+  EXPECT_EQ( Apply( { 0.3f, 1.0f }, Bright ), Apply( Corrector, Plain ) );
 }
 
 TEST( ColourCorrector, SenselessSettingsStayInRange )

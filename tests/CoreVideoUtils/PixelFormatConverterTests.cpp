@@ -1,92 +1,56 @@
 #include "CoreVideoUtils/PixelConversions.h"
-#include "CoreVideoUtils/PixelFormatConverter.h"
 #include "CoreVideoUtils/ReferencePixels.h"
+#include "tests/CoreVideoUtils/Conversions.h"
 #include "tests/CoreVideoUtils/GuardedBytes.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
-#include "tests/support/TestFrames.h"
 
+#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <map>
-#include <set>
 #include <sstream>
-#include <thread>
-#include <vector>
+#include <string>
 
 using namespace CoreVideoUtils;
-using KVZ::IPixelFormat;
+using namespace SoftwareTests;
+using TestSupport::Noise;
 
 namespace
 {
 
-using TestSupport::Noise;
-using TestSupport::VBytes;
-
-struct VSize
-{
-  uint32_t m_Width;
-  uint32_t m_Height;
-};
-
-KVZ::VideoFrameInfo MakeInfo( IPixelFormat::Enum i_Format, VSize i_Size )
-{
-  return TestSupport::VideoInfo( i_Format, i_Size.m_Width, i_Size.m_Height );
-}
-
-size_t SizeOf( IPixelFormat::Enum i_Format, VSize i_Size )
-{
-  return static_cast<size_t>( KVZ::GetImageSize( i_Format, i_Size.m_Width, i_Size.m_Height ) );
-}
-
-// The target's bytes; empty where the conversion was refused.
-VBytes Convert( VPixelFormatConverter& io_rConverter, IPixelFormat::Enum i_Source, const VBytes& i_rSource, IPixelFormat::Enum i_Target,
-  VSize i_Size )
-{
-  VBytes Target( SizeOf( i_Target, i_Size ), 0xA5 );
-  const bool bDone = io_rConverter.Convert( MakeInfo( i_Source, i_Size ), i_rSource.data(), i_rSource.size(), i_Target, Target.data(),
-    Target.size() );
-  return bDone ? Target : VBytes();
-}
-
-VBytes Convert( IPixelFormat::Enum i_Source, const VBytes& i_rSource, IPixelFormat::Enum i_Target, VSize i_Size )
-{
-  VPixelFormatConverter Converter;
-  return Convert( Converter, i_Source, i_rSource, i_Target, i_Size );
-}
-
-std::set<std::string> Names( const std::string& i_rNames )
-{
-  std::istringstream Stream( i_rNames );
-  return { std::istream_iterator<std::string>( Stream ), std::istream_iterator<std::string>() };
-}
-
-const std::string Rgb = "R8G8B8 B8G8R8 R8G8B8u8 B8G8R8u8 ";
-const std::string AllButPackedColour = Rgb +
-  "U8Y8V8Y8 Y8U8Y8V8 U10Y10V10Y10 BayerRG8 BayerGB8 BayerGR8 BayerBG8 BayerGB7 BayerGB6 Luminance8 Luminance7 Luminance6 ";
+const std::string AllButPackedColour = "R8G8B8 B8G8R8 R8G8B8u8 B8G8R8u8 U8Y8V8Y8 Y8U8Y8V8 U10Y10V10Y10 BayerRG8 BayerGB8 BayerGR8 BayerBG8 BayerGB7 "
+                                       "BayerGB6 Luminance8 Luminance7 Luminance6 ";
 const std::string All = AllButPackedColour + "R5G6B5 ";
 
-// What each format can be made of
-const std::map<std::string, std::set<std::string>> SourcesOf = {
-  { "Luminance8", Names( AllButPackedColour ) },
-  { "BayerGB8", Names( "BayerGB8 BayerGB7 BayerGB6" ) },
-  { "R8G8B8", Names( All ) },
-  { "B8G8R8", Names( All ) },
-  { "R8G8B8u8", Names( All ) },
-  { "B8G8R8u8", Names( All ) },
-  { "U8Y8V8Y8", Names( All ) },
-  { "Y8U8Y8V8", Names( "Y8U8Y8V8 R8G8B8 U8Y8V8Y8" ) },
-  { "U10Y10V10Y10", Names( "U10Y10V10Y10 U8Y8V8Y8 Y8U8Y8V8" ) },
-  { "BayerGB7", Names( "BayerGB7 BayerGB8" ) },
-  { "BayerGB6", Names( "BayerGB6 BayerGB8" ) },
-  { "Luminance7", Names( "Luminance7 Luminance8" ) },
-  { "Luminance6", Names( "Luminance6 Luminance8" ) },
+// What each format can be made of, beside itself
+const std::map<std::string, std::string> SourcesOf = {
+  { "Luminance8", AllButPackedColour },
+  { "BayerGB8", "BayerGB7 BayerGB6" },
+  { "R8G8B8", All },
+  { "B8G8R8", All },
+  { "R8G8B8u8", All },
+  { "B8G8R8u8", All },
+  { "U8Y8V8Y8", All },
+  { "Y8U8Y8V8", "R8G8B8 U8Y8V8Y8" },
+  { "U10Y10V10Y10", "U8Y8V8Y8 Y8U8Y8V8" },
+  { "BayerGB7", "BayerGB8" },
+  { "BayerGB6", "BayerGB8" },
+  { "Luminance7", "Luminance8" },
+  { "Luminance6", "Luminance8" },
 };
 
 bool IsPossible( IPixelFormat::Enum i_Source, IPixelFormat::Enum i_Target )
 {
   const auto Found = SourcesOf.find( KVZ::ToName( i_Target ) );
-  return i_Source == i_Target || ( Found != SourcesOf.end() && Found->second.count( KVZ::ToName( i_Source ) ) != 0 );
+  std::istringstream Names( Found == SourcesOf.end() ? "" : Found->second );
+  bool bPossible = i_Source == i_Target;
+  for( std::string Name; !bPossible && Names >> Name; )
+  {
+    bPossible = Name == KVZ::ToName( i_Source );
+  }
+  return bPossible;
 }
 
 // With nothing readable after either image, and one byte less of each.
@@ -115,31 +79,16 @@ void CheckPair( IPixelFormat::Enum i_Source, IPixelFormat::Enum i_Target, VSize 
 TEST( PixelFormatConverter, ConvertsWhatTheTableHasAndRefusesTheRest )
 {
   const TestSupport::VAssertionCapture Assertions;
-  for( const VSize Size : { VSize{ 1, 1 }, VSize{ 2, 1 }, VSize{ 1, 3 }, VSize{ 5, 3 }, VSize{ 49, 5 }, VSize{ 96, 2 }, VSize{ 131, 7 } } )
+  for( const VSize Size : { VSize{ 0, 0 }, { 0, 4 }, { 4, 0 }, { 1, 1 }, { 2, 1 }, { 1, 3 }, { 5, 3 }, { 49, 5 }, { 96, 2 }, { 131, 7 } } )
   {
-    for( int32_t Source = 0; Source < KVZ::PixelFormatCount; ++Source )
+    for( int32_t Source = -1; Source <= KVZ::PixelFormatCount; ++Source )
     {
-      for( int32_t Target = 0; Target < KVZ::PixelFormatCount; ++Target )
+      for( int32_t Target = -1; Target <= KVZ::PixelFormatCount; ++Target )
       {
         CheckPair( static_cast<IPixelFormat::Enum>( Source ), static_cast<IPixelFormat::Enum>( Target ), Size );
       }
     }
   }
-}
-
-TEST( PixelFormatConverter, TakesEmptyImagesAndUnknownFormats )
-{
-  VPixelFormatConverter Converter;
-  for( const VSize Size : { VSize{ 0, 0 }, VSize{ 0, 4 }, VSize{ 4, 0 } } )
-  {
-    for( const IPixelFormat::Enum Source : { IPixelFormat::EBayerRG8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::ELuminance7 } )
-    {
-      EXPECT_TRUE( Converter.Convert( MakeInfo( Source, Size ), nullptr, 0, IPixelFormat::ER8G8B8, nullptr, 0 ) );
-    }
-  }
-  uint8_t Byte = 0;
-  EXPECT_FALSE( Converter.Convert( MakeInfo( static_cast<IPixelFormat::Enum>( 77 ), { 1, 1 } ), &Byte, 1, IPixelFormat::ELuminance8, &Byte, 1 ) );
-  EXPECT_FALSE( Converter.Convert( MakeInfo( IPixelFormat::ELuminance8, { 1, 1 } ), &Byte, 1, static_cast<IPixelFormat::Enum>( -1 ), &Byte, 1 ) );
 }
 
 TEST( PixelFormatConverter, CopiesEqualFormatsFromLongerBuffers )
@@ -176,6 +125,15 @@ TEST( PixelFormatConverter, ConvertsEachRowAsTheReferenceDoes )
   }
 }
 
+VBytes SwappedBytes( VBytes i_Pairs )
+{
+  for( size_t Byte = 0; Byte < i_Pairs.size(); Byte += 2 )
+  {
+    std::swap( i_Pairs[Byte], i_Pairs[Byte + 1] );
+  }
+  return i_Pairs;
+}
+
 TEST( PixelFormatConverter, MakesYuvOfColours )
 {
   const VBytes Colours = {
@@ -190,7 +148,7 @@ TEST( PixelFormatConverter, MakesYuvOfColours )
   };
   const VBytes Expected = { 128, 254, 128, 254, 90, 76, 255, 76, 54, 149, 0, 149, 239, 29, 102, 29 };
   EXPECT_EQ( Expected, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EU8Y8V8Y8, { 8, 1 } ) );
-  const VBytes Swapped = { 254, 128, 254, 128, 76, 90, 76, 255, 149, 54, 149, 0, 29, 239, 29, 102 };
+  const VBytes Swapped = SwappedBytes( Expected );
   EXPECT_EQ( Swapped, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
   EXPECT_EQ( Swapped, Convert( IPixelFormat::EU8Y8V8Y8, Expected, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
 }
@@ -242,30 +200,17 @@ TEST( PixelFormatConverter, PacksTenBits )
   Expected.resize( 128 );
   EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
 
-  VBytes Swapped = Pairs;
-  for( size_t Byte = 0; Byte < Swapped.size(); Byte += 2 )
-  {
-    std::swap( Swapped[Byte], Swapped[Byte + 1] );
-  }
-  EXPECT_EQ( Expected, Convert( IPixelFormat::EY8U8Y8V8, Swapped, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EY8U8Y8V8, SwappedBytes( Pairs ), IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
 
-  VBytes Kept = Pairs;
-  Kept[2] = Kept[11] = 0xFC;
-  Kept[5] = 0xFC;
-  Kept[8] = 0x84;
+  const VBytes Kept = { 0xFF, 0x01, 0xFC, 0x02, 0x03, 0xFC, 0x04, 0x05, 0x84, 0x06, 0x08, 0xFC, 0x10, 0x20 };
   EXPECT_EQ( Kept, Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::EU8Y8V8Y8, { 7, 1 } ) );
   EXPECT_EQ( ( VBytes{ 1, 2, 0xFC, 5, 6, 0xFC, 0x20 } ), Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::ELuminance8, { 7, 1 } ) );
 }
 
 TEST( PixelFormatConverter, MakesColoursOfTenBits )
 {
-  VBytes Row( 128 );
-  // U 1023, Y 512, V 0; Y 1023
-  Row[0] = 0xFF;
-  Row[1] = 0x03;
-  Row[2] = 0x08;
-  Row[4] = 0xFF;
-  Row[5] = 0x03;
+  VBytes Row = { 0xFF, 0x03, 0x08, 0x00, 0xFF, 0x03 };   // U 1023, Y 512, V 0; Y 1023
+  Row.resize( 128 );
   const VBytes Expected = {
     0, 175, 255,    // R: (8388608 - 22986 * 512) / 65536; G: 11497988 / 65536; B: 128 + 28999 * 511 / 65536
     76, 255, 255,   // R: (16760832 - 22986 * 512) / 65536
@@ -361,38 +306,29 @@ TEST( PixelFormatConverter, ConvertsOnSeveralThreads )
 {
   const VSize Size = { 62, 40 };
   const VBytes Source = Noise( SizeOf( IPixelFormat::EBayerRG8, Size ), 4 );
-  const KVZ::VColourRecord Plain;
   const KVZ::VColourRecord Strong = { 0.25f, 2.2f };
-  const auto ConvertWith = [&]( const KVZ::VColourRecord& i_rColour )
-  {
-    VPixelFormatConverter Converter;
-    Converter.SetColourCorrection( i_rColour );
-    return Convert( Converter, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
-  };
-  const VBytes Expected[] = { ConvertWith( Plain ), ConvertWith( Strong ) };
+  const VBytes Expected[] = { Convert( IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size ),
+    Convert( IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size, Strong ) };
   ASSERT_NE( Expected[0], Expected[1] );
 
   VPixelFormatConverter Shared;
-  std::vector<std::thread> Threads;
-  std::array<int, 3> Wrong{};
-  for( int& rWrong : Wrong )
+  std::atomic<int> Wrong{ 0 };
+  boost::thread_group Threads;
+  for( int Thread = 0; Thread < 3; ++Thread )
   {
-    Threads.emplace_back(
+    Threads.create_thread(
       [&]
       {
         for( int Round = 0; Round < 50; ++Round )
         {
-          Shared.SetColourCorrection( Round % 2 == 0 ? Plain : Strong );
+          Shared.SetColourCorrection( Round % 2 == 0 ? KVZ::VColourRecord() : Strong );
           const VBytes Result = Convert( Shared, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
-          rWrong += Result != Expected[0] && Result != Expected[1] ? 1 : 0;
+          Wrong += Result != Expected[0] && Result != Expected[1];
         }
       } );
   }
-  for( std::thread& rThread : Threads )
-  {
-    rThread.join();
-  }
-  EXPECT_EQ( ( std::array<int, 3>{} ), Wrong );
+  Threads.join_all();
+  EXPECT_EQ( 0, Wrong );
 }
 
 }
