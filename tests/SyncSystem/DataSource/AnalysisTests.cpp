@@ -17,17 +17,13 @@ double NumberOf( const KVZ::VFlowStatePtr& i_pState, const char* i_pName )
 
 TEST( DeliveryAnalysis, PublishesAStateForEachTimedFrame )
 {
-  VSourceRig Rig;
+  const TestSupport::VFrameMemory Memory( 50, 4 );
   std::vector<KVZ::VFlowStatePtr> Published;
   bool bStates = true;
-  SyncSystem::VDataSourceSettings Settings;
-  Settings.m_Name = "Analysed";
-  Settings.m_pAllocator = Rig.m_Memory.m_pAllocator;
-  Settings.m_DeleteFrame = &TestSupport::VNumberedCaptureBuffer::DestroyPayload;
+  SyncSystem::VDataSourceSettings Settings = SourceSettings( Memory, nullptr );
   Settings.m_pAnalysis = std::make_shared<SyncSystem::VDriftMonitorAnalysis>( [&]() -> KVZ::VFlowStatePtr
     { return bStates ? std::make_shared<StageHost::VFlowState>() : nullptr; },
     [&]( KVZ::VFlowStatePtr i_pState ) { Published.push_back( std::move( i_pState ) ); } );
-  Rig.m_pSource.reset();
   const auto pSource = KVZ::MakeShared<VTestSource>( Settings );
 
   pSource->AddMany( 2 );

@@ -2,7 +2,8 @@
 
 #include "tests/support/LogCapture.h"
 
-#include <algorithm>
+#include <numeric>
+#include <utility>
 
 namespace
 {
@@ -76,18 +77,19 @@ protected:
 
   static std::vector<int64_t> Range( int64_t i_First, int64_t i_End )
   {
-    std::vector<int64_t> Indices;
-    for( int64_t Index = i_First; Index < i_End; ++Index )
-    {
-      Indices.push_back( Index );
-    }
+    std::vector<int64_t> Indices( static_cast<size_t>( i_End - i_First ) );
+    std::iota( Indices.begin(), Indices.end(), i_First );
     return Indices;
   }
 
-  void TearDown() override
+  void GiveMemoryBack()
   {
-    std::for_each( m_Taken.begin(), m_Taken.end(), [this]( void* i_pBlock ) { m_Rig.m_Memory.m_pAllocator->Free( i_pBlock ); } );
+    for( void* pBlock : std::exchange( m_Taken, {} ) )
+    {
+      m_Rig.m_Memory.m_pAllocator->Free( pBlock );
+    }
   }
+  void TearDown() override { GiveMemoryBack(); }
 
   VSourceRig m_Rig;
   uint32_t m_Client = 0;
@@ -173,22 +175,14 @@ TEST_F( DataSourceCaptures, AStartBeforeTheOldestFrameIsClipped )
 // The counter of the present sync session began in the middle of the buffer session.
 TEST_F( DataSourceCaptures, ReachesBackAcrossSyncSessionsOfTheSameRun )
 {
-  VSourceRig Rig;
-  const uint32_t Client = Rig.m_pSource->Buffer()->RegisterClient( [] {} );
-  Rig.m_pSource->m_Timecode = Period * 100;
-  Rig.m_pSource->AddMany( 10 );
-  Rig.m_pSource->m_Timecode = Period * 5000;   // the frame number goes on: a new sync session
-  Rig.m_pSource->AddMany( 10 );
-  Rig.Join( 1, CounterStart );   // of frame 10
-  EXPECT_EQ( Rig.m_pSource->Buffer()->GetCurrentBufferSession(), KVZ::VBufferSessionId( 1 ) );
-  const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) };
-  Rig.OnStrand( [&] { EXPECT_TRUE( Rig.m_pSource->StartCapture( Header, At( -6 ) + VTick( 5 ), At( 3 ), false, 0 ) ); } );
-  SyncSystem::VRefCountedToken Frame;
-  SyncSystem::VClientRead Read;
-  ASSERT_TRUE( Rig.m_pSource->Buffer()->ClientNextFrame( Client, Frame, Read ) );
-  EXPECT_EQ( IndexOf( Frame ), 5 );
-  EXPECT_EQ( Rig.m_pSource->GetCaptureStatus().m_Start, At( -5 ) );
-  EXPECT_EQ( Rig.m_pSource->GetCaptureStatus().m_CapturedDuration, Period * 8 );
+  m_Rig.m_pSource->m_Timecode = Period * 5000;   // appears, while the frame number goes on: a new sync session
+  m_Rig.m_pSource->AddMany( 10 );
+  m_Rig.Join( 2, CounterStart );   // of frame 10
+  EXPECT_EQ( m_Rig.m_pSource->Buffer()->GetCurrentBufferSession(), KVZ::VBufferSessionId( 1 ) );
+  ASSERT_TRUE( Start( 1, At( -6 ) + VTick( 5 ), At( 3 ), false, 2 ) );
+  EXPECT_EQ( Drain(), Range( 5, 13 ) );
+  EXPECT_EQ( Status().m_Start, At( -5 ) );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 8 );
 }
 
 TEST_F( DataSourceCaptures, AStatusStaysTrueAfterLaterSessionsAndEviction )
@@ -202,18 +196,6 @@ TEST_F( DataSourceCaptures, AStatusStaysTrueAfterLaterSessionsAndEviction )
   EXPECT_EQ( Done.m_State, ECaptureState::Complete );
   EXPECT_EQ( Done.m_Start, At( 4 ) );
   EXPECT_EQ( Done.m_CapturedDuration, Period * 4 );
-}
-
-TEST_F( DataSourceCaptures, ABreakInTheFramesEndsTheCaptureEarly )
-{
-  ASSERT_TRUE( Start( 1, At( 6 ), At( 30 ) ) );
-  m_Rig.m_pSource->AddMany( 2 );
-  m_Rig.m_pSource->Miss( 1 );
-  m_Rig.m_pSource->AddMany( 2 );
-  EXPECT_EQ( Drain(), Range( 6, 12 ) );
-  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
-  EXPECT_EQ( Status().m_Failure, ECaptureFailure::EndedEarly );
-  EXPECT_EQ( Status().m_CapturedDuration, Period * 6 );
 }
 
 TEST_F( DataSourceCaptures, CancelsWhileWaitingAndWhileRunning )
@@ -319,67 +301,53 @@ TEST_F( DataSourceCaptures, ARangeThatCannotBeHadFailsWithItsFlag )
   }
 }
 
-TEST( DataSourceMemory, ExhaustionEndsTheCaptureAndRefusesFramesUntilItIsDrained )
+TEST_F( DataSourceCaptures, ExhaustionEndsTheCaptureAndRefusesFramesUntilItIsDrained )
 {
-  VSourceRig Rig( 40 );
-  VTestSource& rSource = *Rig.m_pSource;
-  const uint32_t Client = rSource.Buffer()->RegisterClient( [] {} );
-  rSource.AddMany( 8 );
-  Rig.Join( 1, CounterStart );
-  const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) };
-  Rig.OnStrand( [&] { EXPECT_TRUE( rSource.StartCapture( Header, At( 0 ), VTick::Open(), false, 0 ) ); } );
-  int64_t Stored = 8;
+  VTestSource& rSource = *m_Rig.m_pSource;
+  ASSERT_TRUE( Start( 1, At( 0 ), VTick::Open() ) );
+  int64_t Stored = 10;
   while( rSource.Add() )
   {
-    ASSERT_LT( ++Stored, 100 );
+    ASSERT_LT( ++Stored, 300 );
   }
-  EXPECT_EQ( rSource.GetCaptureStatus().m_State, ECaptureState::Captured );
-  EXPECT_EQ( rSource.GetCaptureStatus().m_Failure, ECaptureFailure::MemoryExhausted );
-  EXPECT_EQ( rSource.GetCaptureStatus().m_CapturedDuration, Period * Stored );
-  EXPECT_GT( rSource.GetCaptureStatus().m_BufferFill, 0.9 );
+  EXPECT_EQ( Status().m_State, ECaptureState::Captured );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::MemoryExhausted );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * Stored );
+  EXPECT_GT( Status().m_BufferFill, 0.9 );
 
   SyncSystem::VRefCountedToken Frame;
   SyncSystem::VClientRead Read;
   for( int64_t Index = 0; Index < Stored; ++Index )
   {
     EXPECT_FALSE( rSource.Add() ) << "not before the last frame is written, though there is room";
-    ASSERT_TRUE( rSource.Buffer()->ClientNextFrame( Client, Frame, Read ) );
+    ASSERT_TRUE( rSource.Buffer()->ClientNextFrame( m_Client, Frame, Read ) );
     ASSERT_EQ( IndexOf( Frame ), Index );
   }
-  rSource.Buffer()->ClientNextFrame( Client, Frame, Read );
-  EXPECT_EQ( rSource.GetCaptureStatus().m_State, ECaptureState::Complete );
+  Drain();
+  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
   EXPECT_TRUE( rSource.Add() );
-  const auto Status = Rig.SyncStatus();
-  EXPECT_EQ( Status.m_RefusedFrames, static_cast<uint64_t>( Stored ) + 1 );
-  EXPECT_EQ( Status.m_Session.m_Id, 2u ) << "what follows the gap is another session";
+  const auto SyncStatus = m_Rig.SyncStatus();
+  EXPECT_EQ( SyncStatus.m_RefusedFrames, static_cast<uint64_t>( Stored ) + 1 );
+  EXPECT_EQ( SyncStatus.m_Session.m_Id, 2u ) << "what follows the gap is another session";
 }
 
 // A device that finds no memory delivers nothing, and its frame count goes on as if nothing had been lost.
-TEST( DataSourceMemory, AFrameThatFoundNoMemoryBreaksTheRun )
+TEST_F( DataSourceCaptures, AFrameThatFoundNoMemoryBreaksTheRun )
 {
-  VSourceRig Rig( 40 );
-  Rig.m_pSource->AddMany( 20 );
-  std::vector<SyncSystem::VRefCountedToken> Pinned( 20 );
   SyncSystem::VToken Token;
-  ASSERT_TRUE( Rig.m_pSource->Buffer()->GetFirstToken( KVZ::VBufferSessionId( 1 ), Token ) );
+  ASSERT_TRUE( m_Rig.m_pSource->Buffer()->GetFirstToken( KVZ::VBufferSessionId( 1 ), Token ) );
+  std::vector<SyncSystem::VRefCountedToken> Pinned( 10 );   // of three blocks
   for( auto& rFrame : Pinned )
   {
-    ASSERT_TRUE( Rig.m_pSource->Buffer()->Read( Token, rFrame ) );
-    Rig.m_pSource->Buffer()->Advance( Token, 1 );
+    ASSERT_TRUE( m_Rig.m_pSource->Buffer()->Read( Token, rFrame ) );
+    m_Rig.m_pSource->Buffer()->Advance( Token, 1 );
   }
-  std::vector<void*> Blocks;
-  while( void* pBlock = Rig.m_Memory.m_pAllocator->Allocate( Rig.m_Memory.m_pAllocator->MaxAllocation() ) )
-  {
-    Blocks.push_back( pBlock );
-  }
-  EXPECT_EQ( Rig.SyncStatus().m_RefusedFrames, 1u );
-  for( void* pBlock : Blocks )
-  {
-    Rig.m_Memory.m_pAllocator->Free( pBlock );
-  }
+  TakeMemory( 47 + 1 );
+  EXPECT_EQ( m_Rig.SyncStatus().m_RefusedFrames, 1u );
+  GiveMemoryBack();
   Pinned.clear();
-  ASSERT_TRUE( Rig.m_pSource->Add() );
-  EXPECT_EQ( Rig.SyncStatus().m_Session.m_Id, 2u );
+  ASSERT_TRUE( m_Rig.m_pSource->Add() );
+  EXPECT_EQ( m_Rig.SyncStatus().m_Session.m_Id, 2u );
 }
 
 }

@@ -125,17 +125,6 @@ TEST( DataSourceSessions, TellsItsPlaceAndForgetsSessionsWhoseFramesHaveGone )
   EXPECT_EQ( Rig.m_pSource->GetOldestGlobalSyncSession(), VGlobalSyncSessionId( 2 ) );
 }
 
-TEST( DataSourceSessions, ATriggeredSessionIsThereBeforeItsFrames )
-{
-  VSourceRig Rig;
-  Rig.m_pSource->m_Plan = { 1, Period, Period, {} };
-  Rig.m_pSource->m_BeatPeriod = Period;
-  const TestSupport::VLogCapture Log( "Hal.Test" );
-  Rig.Join( 1, VTick( 100 ) );
-  EXPECT_TRUE( Log.Has( "Creating new triggered buffer session 1" ) );
-  EXPECT_TRUE( Log.Has( "DeclareGlobalSyncSession(1): Source prepping for Triggered session - will use source sync session 1" ) );
-}
-
 TEST( DataSourceSessions, TimesItsFrames )
 {
   VSourceRig Rig;
@@ -154,12 +143,8 @@ TEST( DataSourceSessions, TimesItsFrames )
 // An engine that answers a request on the source's own strand.
 TEST( DataSourceSessions, ACallerOnTheStrandIsAnsweredInPlace )
 {
-  TestSupport::VFrameMemory Memory( 10, 4 );
-  SyncSystem::VDataSourceSettings Settings;
-  Settings.m_Name = "Test";
-  Settings.m_pAllocator = Memory.m_pAllocator;
-  Settings.m_pPostalService = std::make_shared<NotificationSystem::VAsioPostalService>( "Strand" );
-  const auto pSource = KVZ::MakeShared<VTestSource>( Settings );
+  const TestSupport::VFrameMemory Memory( 10, 4 );
+  const auto pSource = KVZ::MakeShared<VTestSource>( SourceSettings( Memory, std::make_shared<NotificationSystem::VAsioPostalService>( "Strand" ) ) );
   std::promise<uint32_t> Offered;
   pSource->OnRequestNewGlobalSyncSession().Set(
     [&]( VGlobalSyncSessionId )

@@ -69,7 +69,6 @@ public:
   std::vector<uint32_t> m_CancelledCaptures;
   std::vector<VTick> m_Ends;
   std::vector<bool> m_Busy;
-  SyncSystem::VTriggerPlan m_Plan;
 
 protected:
   bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>&, uint32_t,
@@ -85,15 +84,20 @@ protected:
   }
   void OnCaptureCancelled( KVZ::VCaptureSessionId i_Id ) override { m_CancelledCaptures.push_back( i_Id.Value() ); }
   void OnBusyChanged( bool i_bBusy ) override { m_Busy.push_back( i_bBusy ); }
-  bool PrepareForGlobalSyncSession( KVZ::VGlobalSyncSessionId, const std::shared_ptr<KVZ::IBaseLineClock>&,
-    SyncSystem::VTriggerPlan& o_rPlan ) override
-  {
-    o_rPlan = m_Plan;
-    return true;
-  }
 };
 
 inline int64_t IndexOf( const SyncSystem::VRefCountedToken& i_rFrame ) { return TestSupport::NumberedPayload( i_rFrame.Frame() ).m_Number; }
+
+inline SyncSystem::VDataSourceSettings SourceSettings( const TestSupport::VFrameMemory& i_rMemory, std::shared_ptr<KVZ::IPostalService> i_pService )
+{
+  SyncSystem::VDataSourceSettings Settings;
+  Settings.m_Name = "Test";
+  Settings.m_pAllocator = i_rMemory.m_pAllocator;
+  Settings.m_DeleteFrame = &TestSupport::VNumberedCaptureBuffer::DestroyPayload;
+  Settings.m_pPostalService = std::move( i_pService );
+  Settings.m_NoticeSeconds = 0.5;
+  return Settings;
+}
 
 // One source with memory for a number of frames, on a strand that runs when the test says so.
 class VSourceRig
@@ -101,13 +105,7 @@ class VSourceRig
 public:
   explicit VSourceRig( size_t i_Frames = 200 ) : m_Memory( i_Frames / 4, 4 )
   {
-    SyncSystem::VDataSourceSettings Settings;
-    Settings.m_Name = "Test";
-    Settings.m_pAllocator = m_Memory.m_pAllocator;
-    Settings.m_DeleteFrame = &TestSupport::VNumberedCaptureBuffer::DestroyPayload;
-    Settings.m_pPostalService = m_pService;
-    Settings.m_NoticeSeconds = 0.5;
-    m_pSource = KVZ::MakeShared<VTestSource>( Settings );
+    m_pSource = KVZ::MakeShared<VTestSource>( SourceSettings( m_Memory, m_pService ) );
     m_pSource->OnRequestNewGlobalSyncSession().Set( [this]( KVZ::VGlobalSyncSessionId i_Id ) { m_Requests.push_back( i_Id.Value() ); } );
   }
 
