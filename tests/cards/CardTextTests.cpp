@@ -2,11 +2,7 @@
 #include "cards/common/CardSpec.h"
 #include "cards/common/EventScript.h"
 
-#include "tests/support/TemporaryFolder.h"
-
 #include <gtest/gtest.h>
-
-#include <fstream>
 
 using namespace VirtualCards;
 using KVZ::IVideoStandard;
@@ -15,6 +11,14 @@ namespace
 {
 
 const VCardKind& DeckLink() { return *FindCardKind( "decklink" ); }
+
+VCardSpec Parsed( const std::string& i_rText )
+{
+  std::string Error;
+  const std::optional<VCardSpec> Spec = ParseCardSpec( i_rText, Error );
+  EXPECT_TRUE( Spec ) << Error;
+  return Spec.value_or( VCardSpec() );
+}
 
 void ExpectWords( const std::string& i_rError, const std::vector<std::string>& i_rWords )
 {
@@ -41,43 +45,23 @@ void ExpectScriptRefusal( const std::string& i_rText, const std::vector<std::str
 
 }
 
-TEST( CardText, AKindAloneIsACard )
+TEST( CardText, EveryKeyIsTaken )
 {
-  std::string Error;
-  const std::optional<VCardSpec> Spec = ParseCardSpec( "decklink", Error );
-  ASSERT_TRUE( Spec ) << Error;
-  EXPECT_FALSE( Spec->m_Standard );
-  EXPECT_FALSE( Spec->m_Audio );
-  EXPECT_TRUE( Spec->m_Timecode );
-  EXPECT_TRUE( ParseCardSpec( "bluefish444:standard=HD_1920_1080PSF_2398", Error ) ) << Error;
-}
+  const VCardSpec Spec = Parsed(
+    "decklink:standard=HD_1280_720P_5994,pattern=counter,timecode=23:59:00;02,audio=ramp,channels=8,script=/tmp/a=b:c.json,speed=2.5" );
+  EXPECT_EQ( Spec.m_Standard, IVideoStandard::EHD_1280_720P_5994 );
+  EXPECT_EQ( Spec.m_Pattern, EPattern::Counter );
+  EXPECT_EQ( Spec.m_Timecode->m_Hours, 23 );
+  EXPECT_TRUE( Spec.m_Timecode->m_bDropFrame );
+  EXPECT_EQ( Spec.m_Audio, EAudio::Ramp );
+  EXPECT_EQ( Spec.m_Channels, 8u );
+  EXPECT_EQ( Spec.m_Script, "/tmp/a=b:c.json" );
+  EXPECT_DOUBLE_EQ( Spec.m_Speed, 2.5 );
 
-TEST( CardText, AllKeys )
-{
-  std::string Error;
-  const std::optional<VCardSpec> Spec = ParseCardSpec(
-    "decklink:standard=HD_1280_720P_5994,pattern=counter,timecode=23:59:00;02,audio=ramp,channels=8,"
-    "script=/tmp/a=b:c.json,speed=2.5",
-    Error );
-  ASSERT_TRUE( Spec ) << Error;
-  EXPECT_EQ( Spec->m_Standard, IVideoStandard::EHD_1280_720P_5994 );
-  EXPECT_EQ( Spec->m_Pattern, EPattern::Counter );
-  EXPECT_EQ( Spec->m_Timecode->m_Hours, 23 );
-  EXPECT_TRUE( Spec->m_Timecode->m_bDropFrame );
-  EXPECT_EQ( Spec->m_Audio, EAudio::Ramp );
-  EXPECT_EQ( Spec->m_Channels, 8u );
-  EXPECT_EQ( Spec->m_Script, "/tmp/a=b:c.json" );
-  EXPECT_DOUBLE_EQ( Spec->m_Speed, 2.5 );
-}
-
-TEST( CardText, InputTakesTheRest )
-{
-  std::string Error;
-  const std::optional<VCardSpec> Spec = ParseCardSpec( "decklink:timecode=none,loop=0,input=http://host:80/a,b=c.mov", Error );
-  ASSERT_TRUE( Spec ) << Error;
-  EXPECT_EQ( Spec->m_Input, "http://host:80/a,b=c.mov" );
-  EXPECT_FALSE( Spec->m_Timecode );
-  EXPECT_FALSE( Spec->m_bLoop );
+  const VCardSpec Clip = Parsed( "decklink:timecode=none,loop=0,input=http://host:80/a,b=c.mov" );
+  EXPECT_EQ( Clip.m_Input, "http://host:80/a,b=c.mov" ) << "it takes the rest";
+  EXPECT_FALSE( Clip.m_Timecode );
+  EXPECT_FALSE( Clip.m_bLoop );
 }
 
 TEST( CardText, RefusalsNameTheKeyTheReasonAndWhatIsAccepted )
@@ -85,13 +69,11 @@ TEST( CardText, RefusalsNameTheKeyTheReasonAndWhatIsAccepted )
   ExpectRefusal( "aja", { "\"aja\"", "accepted: decklink, bluefish444" } );
   ExpectRefusal( "decklink:", { "no key", "accepted: standard, pattern" } );
   ExpectRefusal( "decklink:colour=red", { "\"colour\"", "accepted: standard, pattern, timecode, audio, channels, script, speed, loop, input" } );
-  ExpectRefusal( "decklink:pattern", { "pattern: has no value" } );
   ExpectRefusal( "decklink:pattern=", { "pattern: has no value" } );
   ExpectRefusal( "decklink:pattern=bars,pattern=noise", { "pattern: is given twice" } );
   ExpectRefusal( "decklink:pattern=plaid", { "pattern: \"plaid\"", "accepted: bars, counter, noise" } );
   ExpectRefusal( "decklink:audio=loud", { "audio: \"loud\"", "accepted: tone, ramp, silence, none" } );
   ExpectRefusal( "decklink:channels=17", { "channels: \"17\"", "1 to 16" } );
-  ExpectRefusal( "decklink:channels=2x", { "channels: \"2x\"" } );
   ExpectRefusal( "decklink:speed=0", { "speed: \"0\"", "0.01 to 100" } );
   ExpectRefusal( "decklink:speed=nan", { "speed: \"nan\"" } );
   ExpectRefusal( "decklink:loop=2,input=a.mov", { "loop: \"2\"", "accepted: 1, 0" } );
@@ -99,17 +81,9 @@ TEST( CardText, RefusalsNameTheKeyTheReasonAndWhatIsAccepted )
   ExpectRefusal( "decklink:pattern=bars,input=a.mov", { "pattern:", "input" } );
   ExpectRefusal( "bluefish444:inputs=5", { "inputs: \"5\" is not understood; accepted: a whole number from 0 to 4" } );
   ExpectRefusal( "bluefish444:driver=ancient", { "accepted: new, old" } );
-  ExpectRefusal( "bluefish444:standard=HD_3840_2160P_2500", { "cannot be carried by this kind of card" } );
-}
-
-TEST( CardText, AStandardTheKindCannotCarryIsRefusedWithTheList )
-{
+  ExpectRefusal( "bluefish444:standard=HD_2048_1556PSF_1500", { "cannot be carried by this kind of card" } );
   ExpectRefusal( "decklink:standard=HD_1920_1080P_4800", { "standard:", "cannot be carried", "SD_720_486I_5994", "HD_4096_2160P_2500" } );
   ExpectRefusal( "decklink:standard=PAL", { "standard:", "is no video standard", "SD_720_576I_5000" } );
-  ExpectRefusal( "bluefish444:standard=HD_2048_1556PSF_1500", { "cannot be carried" } );
-  std::string Error;
-  EXPECT_FALSE( ParseCardSpec( "decklink:standard=HD_1920_1080PSF_2500", Error ) );
-  EXPECT_EQ( Error.find( "PSF_2500," ), std::string::npos );
 }
 
 TEST( CardText, ATimecodeMustFitTheRate )
@@ -119,33 +93,8 @@ TEST( CardText, ATimecodeMustFitTheRate )
   ExpectRefusal( "decklink:timecode=01:00:00:25", { "timecode:", "00 to 24" } );
   ExpectRefusal( "decklink:timecode=01:00:00;00", { "timecode:", "29.97" } );
   ExpectRefusal( "decklink:standard=HD_1280_720P_5994,timecode=01:01:00;01", { "timecode:", "leaves out" } );
-  std::string Error;
-  EXPECT_TRUE( ParseCardSpec( "decklink:timecode=01:00:00;00,standard=HD_1920_1080P_2997", Error ) ) << Error;
-  EXPECT_TRUE( ParseCardSpec( "decklink:timecode=01:00:00;00,input=unknown-yet.mov", Error ) ) << Error;
-}
-
-TEST( EventScript, AllEvents )
-{
-  std::string Error;
-  const std::optional<std::vector<VCardEvent>> Events = ParseEvents( DeckLink(), DefaultStandard, R"([
-    { "frame": 1, "do": "signal-loss", "frames": 2 },
-    { "frame": 3, "do": "format", "standard": "HD_1280_720P_5994" },
-    { "frame": 4, "do": "drop", "frames": 5 },
-    { "frame": 6, "do": "timecode-jump", "to": "10:00:00;00" },
-    { "frame": 7, "do": "timecode-loss" },
-    { "frame": 7, "do": "timecode-loss", "frames": 9 },
-    { "frame": 8, "do": "late", "milliseconds": 40 },
-    { "frame": 9, "do": "remove" },
-    { "frame": 10, "do": "arrive" } ])",
-    Error );
-  ASSERT_TRUE( Events ) << Error;
-  ASSERT_EQ( Events->size(), 9u );
-  EXPECT_EQ( ( *Events )[0].m_Frames, 2u );
-  EXPECT_EQ( ( *Events )[1].m_Standard, IVideoStandard::EHD_1280_720P_5994 );
-  EXPECT_EQ( ( *Events )[3].m_To.m_Hours, 10 );
-  EXPECT_EQ( ( *Events )[4].m_Frames, 0u );
-  EXPECT_EQ( ( *Events )[6].m_Milliseconds, 40u );
-  EXPECT_EQ( ( *Events )[8].m_Do, EEvent::Arrive );
+  Parsed( "decklink:timecode=01:00:00;00,standard=HD_1920_1080P_2997" );
+  Parsed( "decklink:timecode=01:00:00;00,input=unknown-yet.mov" );
 }
 
 TEST( EventScript, RefusalsNameTheEventOrTheLine )
@@ -153,12 +102,9 @@ TEST( EventScript, RefusalsNameTheEventOrTheLine )
   ExpectScriptRefusal( "[\n{ \"frame\": 1,\n}]", { "line 3" } );
   ExpectScriptRefusal( "{}", { "list" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "remove" }, 7])", { "event 1:", "object" } );
-  ExpectScriptRefusal( R"([{ "frame": 1, "do": "explode" }])", { "event 0: \"do\"", "explode", "signal-loss, format, drop" } );
   ExpectScriptRefusal( R"([{ "frame": 1 }])", { "event 0: \"do\": is missing" } );
   ExpectScriptRefusal( R"([{ "do": "remove" }])", { "\"frame\": is missing", "0 to" } );
-  ExpectScriptRefusal( R"([{ "frame": -1, "do": "remove" }])", { "\"frame\": cannot be -1" } );
   ExpectScriptRefusal( R"([{ "frame": 1.5, "do": "remove" }])", { "\"frame\": cannot be 1.5" } );
-  ExpectScriptRefusal( R"([{ "frame": 1, "do": "drop" }])", { "\"frames\": is missing", "1 to" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "drop", "frames": 0 }])", { "\"frames\": cannot be 0" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "remove", "frames": 3 }])", { "\"frames\"", "no such key", "accepted: do, frame" } );
   ExpectScriptRefusal( R"([{ "frame": 1, "do": "late", "milliseconds": "40" }])", { "\"milliseconds\": cannot be \"40\"" } );
@@ -175,17 +121,6 @@ TEST( EventScript, AJumpMustFitTheRateThatTheSignalHasByThen )
   EXPECT_TRUE(
     ParseEvents( DeckLink(), DefaultStandard, "[" + Jump + R"(, { "frame": 5, "do": "format", "standard": "HD_1920_1080P_6000" }])", Error ) )
     << Error;
-}
-
-TEST( EventScript, AFileIsNamedInARefusal )
-{
-  const TestSupport::VTemporaryFolder Folder;
-  std::string Error;
-  EXPECT_FALSE( ReadEvents( DeckLink(), DefaultStandard, Folder.File( "missing.json" ), Error ) );
-  EXPECT_NE( Error.find( "missing.json" ), std::string::npos );
-  std::ofstream( Folder.File( "bad.json" ) ) << "[{}]";
-  EXPECT_FALSE( ReadEvents( DeckLink(), DefaultStandard, Folder.File( "bad.json" ), Error ) );
-  EXPECT_NE( Error.find( "bad.json\" event 0" ), std::string::npos ) << Error;
 }
 
 TEST( EventScript, OneEventByHandHasNoFrame )

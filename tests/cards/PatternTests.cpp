@@ -1,6 +1,5 @@
 // Pictures and sounds as an independent reader sees them.
 #include "cards/common/Painter.h"
-#include "cards/common/SignalContent.h"
 #include "cards/common/Sound.h"
 
 #include "tests/support/CounterReader.h"
@@ -12,15 +11,9 @@ using namespace VirtualCards;
 using KVZ::IPixelFormat;
 using KVZ::IVideoStandard;
 using TestSupport::VPixels;
-using TestSupport::VSamples;
 
 namespace
 {
-
-constexpr IPixelFormat::Enum Formats[] = { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8,
-  IPixelFormat::EB8G8R8, IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8, IPixelFormat::ELuminance8 };
-constexpr IVideoStandard::Enum Sizes[] = { IVideoStandard::ESD_720_486I_5994, IVideoStandard::EHD_1280_720P_5000,
-  IVideoStandard::EHD_1920_1080P_2500 };
 
 VPictureFormat FormatOf( IVideoStandard::Enum i_Standard, IPixelFormat::Enum i_Format ) { return { KVZ::FindVideoStandard( i_Standard ), i_Format }; }
 
@@ -50,9 +43,11 @@ std::vector<uint8_t> BytesOf( const VPictureFormat& i_rFormat, VPicture& i_rPict
 template<class TCheck>
 void ForEachFormat( EPattern i_Pattern, TCheck i_Check )
 {
-  for( const IVideoStandard::Enum Standard : Sizes )
+  for( const IVideoStandard::Enum Standard :
+    { IVideoStandard::ESD_720_486I_5994, IVideoStandard::EHD_1280_720P_5000, IVideoStandard::EHD_1920_1080P_2500 } )
   {
-    for( const IPixelFormat::Enum Format : Formats )
+    for( const IPixelFormat::Enum Format : { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EY8U8Y8V8, IPixelFormat::EU10Y10V10Y10, IPixelFormat::ER8G8B8,
+           IPixelFormat::EB8G8R8, IPixelFormat::ER8G8B8u8, IPixelFormat::EB8G8R8u8, IPixelFormat::ELuminance8 } )
     {
       SCOPED_TRACE( KVZ::ToName( Standard ) + " " + KVZ::ToName( Format ) );
       const VPictureFormat Picture = FormatOf( Standard, Format );
@@ -93,18 +88,6 @@ TEST( CounterPattern, CellsHaveExactLevelsAndEdges )
   EXPECT_LT( TestSupport::BrightnessAt( Pixels, 600, 500 ), TestSupport::BrightnessAt( Pixels, 1600, 500 ) );
 }
 
-TEST( CounterPattern, AReaderNoticesATornPicture )
-{
-  const VPictureFormat Format = FormatOf( IVideoStandard::EHD_1280_720P_5000, IPixelFormat::EU8Y8V8Y8 );
-  const std::unique_ptr<IPainter> pPainter = MakeCounterPainter( Format );
-  VPicture Upper;
-  VPicture Lower;
-  pPainter->Paint( Upper, FrameNumber( 7 ) );
-  pPainter->Paint( Lower, FrameNumber( 8 ) );
-  std::memcpy( Upper.Bytes( Format.Size() ) + 16 * Format.RowBytes(), Lower.Bytes( Format.Size() ) + 16 * Format.RowBytes(), 16 * Format.RowBytes() );
-  EXPECT_FALSE( TestSupport::ReadCounter( PixelsOf( Format, Upper ) ) );
-}
-
 TEST( Patterns, APictureThatIsReusedEqualsAFreshOne )
 {
   for( const EPattern Pattern : { EPattern::Bars, EPattern::Counter, EPattern::Noise } )
@@ -138,49 +121,27 @@ TEST( BarsPattern, SevenBarsWithTheirPublishedLevels )
   }
 }
 
-TEST( Sound, ARampReaderFindsTheFirstSampleInEveryLayout )
-{
-  VSound Sound;
-  Sound.m_Audio = EAudio::Ramp;
-  Sound.m_SignalChannels = 4;
-  Sound.m_FirstSample = 65000;
-  Sound.m_Samples = 1602;
-  for( const uint32_t Bits : { 16u, 32u } )
-  {
-    for( const uint32_t Channels : { 2u, 8u, 16u } )
-    {
-      const VSoundLayout Layout{ Bits, Channels };
-      std::vector<uint8_t> Bytes( Layout.BytesPerFrame() * Sound.m_Samples );
-      Sound.Write( Layout, Bytes.data() );
-      EXPECT_EQ( TestSupport::ReadRamp( { Bytes.data(), Sound.m_Samples, Channels, Bits / 8 }, std::min( 4u, Channels ) ), 65000 );
-      Bytes[Bytes.size() / 2] ^= 1;
-      EXPECT_FALSE( TestSupport::ReadRamp( { Bytes.data(), Sound.m_Samples, Channels, Bits / 8 }, std::min( 4u, Channels ) ) );
-    }
-  }
-}
-
 TEST( Sound, TheToneIsContinuousAtMinus18dBFSAndDiffersByChannel )
 {
   VSound Sound;
   Sound.m_Audio = EAudio::Tone;
   Sound.m_SignalChannels = 2;
-  const VSoundLayout Layout{ 16, 2 };
   std::vector<uint8_t> Bytes;
-  for( uint64_t Frame = 0; Frame < 5; ++Frame )
+  for( const uint32_t Samples : { 1602u, 1601u, 1602u, 1601u, 1602u } )
   {
     Sound.m_FirstSample = Bytes.size() / 4;
-    Sound.m_Samples = Frame % 2 == 0 ? 1602 : 1601;
-    Bytes.resize( Bytes.size() + Layout.BytesPerFrame() * Sound.m_Samples );
-    Sound.Write( Layout, Bytes.data() + Bytes.size() - Layout.BytesPerFrame() * Sound.m_Samples );
+    Sound.m_Samples = Samples;
+    Bytes.resize( Bytes.size() + size_t{ Samples } * 4 );
+    Sound.Write( { 16, 2 }, Bytes.data() + Sound.m_FirstSample * 4 );
   }
-  const VSamples Samples{ Bytes.data(), Bytes.size() / 4, 2, 2 };
+  const TestSupport::VSamples All{ Bytes.data(), Bytes.size() / 4, 2, 2 };
   int32_t Peak = 0;
   bool bDiffers = false;
-  for( size_t i = 0; i < Samples.m_Frames; ++i )
+  for( size_t i = 48; i < All.m_Frames; ++i )
   {
-    Peak = std::max( Peak, SampleAt( Samples, i, 0 ) );
-    bDiffers = bDiffers || SampleAt( Samples, i, 0 ) != SampleAt( Samples, i, 1 );
-    ASSERT_TRUE( i < 48 || SampleAt( Samples, i, 0 ) == SampleAt( Samples, i - 48, 0 ) ) << "not 1 kHz at " << i;
+    Peak = std::max( Peak, SampleAt( All, i, 0 ) );
+    bDiffers = bDiffers || SampleAt( All, i, 0 ) != SampleAt( All, i, 1 );
+    ASSERT_EQ( SampleAt( All, i, 0 ), SampleAt( All, i - 48, 0 ) ) << "not 1 kHz at " << i;
   }
   EXPECT_NEAR( Peak, 4125, 1 );   // 32768 * 10^(-18/20)
   EXPECT_TRUE( bDiffers );
@@ -197,20 +158,4 @@ TEST( Sound, AClipsSamplesKeepTheirUpperHalfAndTheirChannels )
   std::vector<int16_t> Samples( 2 * 8 );
   Sound.Write( { 16, 8 }, reinterpret_cast<uint8_t*>( Samples.data() ) );
   EXPECT_EQ( Samples, std::vector<int16_t>( { 0x1234, -1, 0, 0, 0, 0, 0, 0, 0x7FFF, 0, 0, 0, 0, 0, 0, 0 } ) );
-}
-
-TEST( CapturedFrame, ContentIsMadeOnFirstLookAndFollowsTheFrame )
-{
-  std::string Error;
-  const VSignalSource Source = OpenSource( *ParseCardSpec( "decklink:pattern=counter,audio=ramp,channels=2", Error ), true, Error );
-  const VPictureFormat Format = FormatOf( Source.m_Standard, IPixelFormat::EU8Y8V8Y8 );
-  VSignalTimeline Signal( Source.m_Standard, {}, {} );
-  VCapturedFrame Captured;
-  for( uint32_t i = 0; i < 3; ++i )
-  {
-    ASSERT_TRUE( Source.m_pContent->Take( Signal.Next(), Format, Captured ) );
-    EXPECT_EQ( Captured.Picture().Size(), i == 0 ? 0 : Format.Size() ) << "memory before anybody looks";
-    EXPECT_EQ( TestSupport::ReadCounter( { Format.m_PixelFormat, Captured.PictureBytes(), Format.RowBytes() } ), i );
-    EXPECT_EQ( TestSupport::ReadRamp( { Captured.SoundBytes( { 32, 2 } ), 1920, 2, 4 }, 2 ), i * 1920 );
-  }
 }

@@ -1,5 +1,7 @@
 // The signal as a sequence: labels, samples and events, frame by frame.
 #include "cards/common/CardRunner.h"
+#include "cards/common/CardSpec.h"
+#include "cards/common/EventScript.h"
 #include "cards/common/SampleCadence.h"
 #include "cards/common/SignalTimeline.h"
 
@@ -11,22 +13,8 @@ using KVZ::IVideoStandard;
 namespace
 {
 
-struct VLabel
-{
-  int m_Hours;
-  int m_Minutes;
-  int m_Seconds;
-  int m_Frames;
-  bool operator==( const VLabel& ) const = default;
-};
-
-std::ostream& operator<<( std::ostream& io_rStream, const VLabel& i_rLabel )
-{
-  return io_rStream << i_rLabel.m_Hours << ':' << i_rLabel.m_Minutes << ':' << i_rLabel.m_Seconds << ':' << i_rLabel.m_Frames;
-}
-
 // A clock as a person would count: one label up at a time.
-void CountUp( VLabel& io_rLabel, int i_Nominal, bool i_bDropFrame )
+void CountUp( VTimecodeLabel& io_rLabel, int i_Nominal )
 {
   if( ++io_rLabel.m_Frames < i_Nominal )
   {
@@ -43,30 +31,25 @@ void CountUp( VLabel& io_rLabel, int i_Nominal, bool i_bDropFrame )
     io_rLabel.m_Minutes = 0;
     io_rLabel.m_Hours = ( io_rLabel.m_Hours + 1 ) % 24;
   }
-  if( i_bDropFrame && io_rLabel.m_Minutes % 10 != 0 )
+  if( io_rLabel.m_bDropFrame && io_rLabel.m_Minutes % 10 != 0 )
   {
     io_rLabel.m_Frames = 2;
   }
 }
 
-VLabel LabelOf( const VSignalFrame& i_rFrame )
+bool Carries( const VSignalFrame& i_rFrame, const VTimecodeLabel& i_rLabel )
 {
-  const KVZ::ITimecode& rLabel = i_rFrame.m_Timecode->m_Label;
-  return { rLabel.m_Hours, rLabel.m_Minutes, rLabel.m_Seconds, rLabel.m_Frames };
+  const KVZ::ITimecode& rCarried = i_rFrame.m_Timecode->m_Label;
+  return rCarried.m_Days == 0 && rCarried.m_Hours == i_rLabel.m_Hours && rCarried.m_Minutes == i_rLabel.m_Minutes &&
+    rCarried.m_Seconds == i_rLabel.m_Seconds && rCarried.m_Frames == i_rLabel.m_Frames;
 }
 
-VSignalTimeline Timeline( IVideoStandard::Enum i_Standard, std::vector<VCardEvent> i_Events = {} )
+std::vector<VCardEvent> Events( const std::string& i_rScript )
 {
-  return VSignalTimeline( i_Standard, VTimecodeLabel(), std::move( i_Events ) );
-}
-
-VCardEvent Event( uint64_t i_Frame, EEvent i_Do, uint64_t i_Frames = 0 )
-{
-  VCardEvent Event;
-  Event.m_Frame = i_Frame;
-  Event.m_Do = i_Do;
-  Event.m_Frames = i_Frames;
-  return Event;
+  std::string Error;
+  const auto Events = ParseEvents( *FindCardKind( "decklink" ), DefaultStandard, i_rScript, Error );
+  EXPECT_TRUE( Events ) << Error;
+  return Events.value_or( std::vector<VCardEvent>() );
 }
 
 struct VRateCase
@@ -86,20 +69,19 @@ class TimecodeAtRate : public testing::TestWithParam<VRateCase>
 TEST_P( TimecodeAtRate, CountsAsAPersonWouldThroughMidnight )
 {
   const VRateCase& rCase = GetParam();
-  VSignalTimeline Signal( rCase.m_Standard, VTimecodeLabel{ 23, 48, 58, 20, rCase.m_bDropFrame }, {} );
-  VLabel Expected{ 23, 48, 58, 20 };
+  VTimecodeLabel Expected{ 23, 48, 58, 20, rCase.m_bDropFrame };
+  VSignalTimeline Signal( rCase.m_Standard, Expected, {} );
   const int Labels = 20 * 60 * rCase.m_Nominal;
-  for( int i = 0; i < Labels; ++i )
+  for( int Label = 0; Label < Labels; ++Label )
   {
     for( int Field = 0; Field < rCase.m_FramesPerLabel; ++Field )
     {
       const VSignalFrame Frame = Signal.Next();
       ASSERT_TRUE( Frame.m_Timecode );
-      ASSERT_EQ( LabelOf( Frame ), Expected );
+      ASSERT_TRUE( Carries( Frame, Expected ) ) << KVZ::ToText( Frame.m_Timecode->m_Label ) << " as label " << Label;
       ASSERT_EQ( Frame.m_Timecode->m_bFieldMark, Field == 1 );
-      ASSERT_EQ( Frame.m_Timecode->m_Label.m_Days, 0 );
     }
-    CountUp( Expected, rCase.m_Nominal, rCase.m_bDropFrame );
+    CountUp( Expected, rCase.m_Nominal );
   }
   EXPECT_EQ( Expected.m_Hours, 0 );
 }
@@ -112,45 +94,34 @@ INSTANTIATE_TEST_SUITE_P( Rates, TimecodeAtRate,
     VRateCase{ IVideoStandard::EHD_1920_1080P_5994, 30, 2, false }, VRateCase{ IVideoStandard::EHD_1920_1080P_5994, 30, 2, true },
     VRateCase{ IVideoStandard::EHD_1920_1080P_6000, 30, 2, false } ) );
 
+// 29.97 frames a second: five hold 8008 samples.
 TEST( SignalTimeline, SamplesFollowTheCadence )
 {
-  const auto Cadence = []( IVideoStandard::Enum i_Standard )
+  constexpr uint64_t Cadence[] = { 1602, 1601, 1602, 1601, 1602 };
+  VSignalTimeline Signal( IVideoStandard::EHD_1920_1080P_2997, {}, {} );
+  uint64_t Next = 0;
+  for( uint64_t Number = 0; Number < 10; ++Number )
   {
-    VSignalTimeline Signal = Timeline( i_Standard );
-    std::vector<uint32_t> Samples;
-    uint64_t Next = 0;
-    for( int i = 0; i < 5; ++i )
-    {
-      const VSignalFrame Frame = Signal.Next();
-      EXPECT_EQ( Frame.m_FirstSample, Next );
-      Next += Frame.m_Samples;
-      Samples.push_back( Frame.m_Samples );
-    }
-    return Samples;
-  };
-  using VSamples = std::vector<uint32_t>;
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_2997 ), VSamples( { 1602, 1601, 1602, 1601, 1602 } ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_5994 ), VSamples( { 801, 801, 800, 801, 801 } ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_2398 ), VSamples( 5, 2002 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_2400 ), VSamples( 5, 2000 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_2500 ), VSamples( 5, 1920 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_3000 ), VSamples( 5, 1600 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_4800 ), VSamples( 5, 1000 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_5000 ), VSamples( 5, 960 ) );
-  EXPECT_EQ( Cadence( IVideoStandard::EHD_1920_1080P_6000 ), VSamples( 5, 800 ) );
-  // An hour at 29.97: 107892.1 frames, and no sample is lost
+    const VSignalFrame Frame = Signal.Next();
+    EXPECT_EQ( Frame.m_Samples, Cadence[Number % 5] ) << Number;
+    EXPECT_EQ( Frame.m_FirstSample, Next );
+    Next += Frame.m_Samples;
+  }
+  // An hour has 107892.1 frames, and no sample is lost in five of them
   EXPECT_EQ( SamplesUntil( 5 * 107892, 4504500 ), uint64_t{ 8008 } * 107892 );
 }
 
 TEST( SignalTimeline, EventsHappenAtTheirFramesAndTheClockGoesOn )
 {
-  VCardEvent Late = Event( 8, EEvent::Late );
-  Late.m_Milliseconds = 40;
-  VCardEvent Jump = Event( 10, EEvent::TimecodeJump );
-  Jump.m_To = { 5, 0, 0, 0, false };
-  VSignalTimeline Signal = Timeline( IVideoStandard::EHD_1920_1080P_2500,
-    { Jump, Late, Event( 2, EEvent::SignalLoss, 2 ), Event( 5, EEvent::Drop, 2 ), Event( 12, EEvent::TimecodeLoss, 2 ),
-      Event( 15, EEvent::TimecodeLoss ), Event( 17, EEvent::Remove ), Event( 19, EEvent::Arrive ) } );
+  VSignalTimeline Signal( DefaultStandard, VTimecodeLabel(), Events( R"([
+    { "frame": 10, "do": "timecode-jump", "to": "05:00:00:00" },
+    { "frame": 8, "do": "late", "milliseconds": 40 },
+    { "frame": 2, "do": "signal-loss", "frames": 2 },
+    { "frame": 5, "do": "drop", "frames": 2 },
+    { "frame": 12, "do": "timecode-loss", "frames": 2 },
+    { "frame": 15, "do": "timecode-loss" },
+    { "frame": 17, "do": "remove" },
+    { "frame": 19, "do": "arrive" } ])" ) );
   for( uint64_t i = 0; i < 22; ++i )
   {
     SCOPED_TRACE( i );
@@ -165,45 +136,33 @@ TEST( SignalTimeline, EventsHappenAtTheirFramesAndTheClockGoesOn )
     EXPECT_EQ( Frame.m_Timecode.has_value(), Frame.m_bSignal && i != 12 && i != 13 && i < 15 );
     if( Frame.m_Timecode )
     {
-      EXPECT_EQ( LabelOf( Frame ), ( i < 10 ? VLabel{ 1, 0, 0, static_cast<int>( i ) } : VLabel{ 5, 0, 0, static_cast<int>( i ) - 10 } ) );
+      EXPECT_EQ( KVZ::ToText( Frame.m_Timecode->m_Label ),
+        ( i < 10 ? "01:00:00:0" + std::to_string( i ) : "05:00:00:0" + std::to_string( i - 10 ) ) );
     }
   }
 }
 
 TEST( SignalTimeline, AFormatChangeKeepsNumberSamplesAndLabelGoing )
 {
-  VCardEvent Format = Event( 7, EEvent::Format );
-  Format.m_Standard = IVideoStandard::EHD_1280_720P_5994;
-  VSignalTimeline Signal( IVideoStandard::EHD_1920_1080P_2997, VTimecodeLabel{ 1, 0, 59, 25, true }, { Format } );
-  VSignalFrame Frame;
-  uint64_t Samples = 0;
+  VSignalTimeline Signal( IVideoStandard::EHD_1920_1080P_2997, VTimecodeLabel{ 1, 0, 59, 25, true },
+    Events( R"([{ "frame": 7, "do": "format", "standard": "HD_1280_720P_5994" }])" ) );
+  VSignalFrame Before;
   for( int i = 0; i < 7; ++i )
   {
-    Frame = Signal.Next();
-    EXPECT_EQ( Frame.m_FirstSample, Samples );
-    Samples += Frame.m_Samples;
+    Before = Signal.Next();
   }
-  EXPECT_EQ( LabelOf( Frame ), ( VLabel{ 1, 1, 0, 3 } ) );
-  Frame = Signal.Next();
-  EXPECT_EQ( Frame.m_Number, 7u );
-  EXPECT_EQ( Frame.m_pStandard->m_Standard, IVideoStandard::EHD_1280_720P_5994 );
-  EXPECT_EQ( Frame.m_Time, 7 * 4504500 );
-  EXPECT_EQ( Frame.m_FirstSample, Samples );
-  EXPECT_EQ( Frame.m_Samples, 801u );
-  EXPECT_EQ( LabelOf( Frame ), ( VLabel{ 1, 1, 0, 4 } ) );
-  EXPECT_FALSE( Frame.m_Timecode->m_bFieldMark );
-  EXPECT_EQ( Frame.m_Timecode->m_Label.m_Standard, KVZ::ITimecodeStandard::ETimecode30Drop );
-  Frame = Signal.Next();
-  EXPECT_EQ( Frame.m_Time, 7 * 4504500 + 2252250 );
-  EXPECT_TRUE( Frame.m_Timecode->m_bFieldMark );
-}
-
-TEST( SignalTimeline, ACardWhoseFirstNewsIsItsArrivalIsAbsentUntilThen )
-{
-  VSignalTimeline Signal = Timeline( IVideoStandard::EHD_1920_1080P_2500, { Event( 2, EEvent::Arrive ) } );
-  EXPECT_FALSE( Signal.Next().m_bPresent );
-  EXPECT_FALSE( Signal.Next().m_bPresent );
-  EXPECT_TRUE( Signal.Next().m_bPresent );
+  EXPECT_EQ( KVZ::ToText( Before.m_Timecode->m_Label ), "01:01:00;03" );
+  const VSignalFrame First = Signal.Next();
+  EXPECT_EQ( First.m_Number, 7u );
+  EXPECT_EQ( First.m_pStandard->m_Standard, IVideoStandard::EHD_1280_720P_5994 );
+  EXPECT_EQ( First.m_Time, 7 * 4504500 );
+  EXPECT_EQ( First.m_FirstSample, Before.m_FirstSample + Before.m_Samples );
+  EXPECT_EQ( First.m_Samples, 801u );
+  EXPECT_EQ( KVZ::ToText( First.m_Timecode->m_Label ), "01:01:00;04" );
+  EXPECT_FALSE( First.m_Timecode->m_bFieldMark );
+  const VSignalFrame Second = Signal.Next();
+  EXPECT_EQ( Second.m_Time, 7 * 4504500 + 2252250 );
+  EXPECT_TRUE( Second.m_Timecode->m_bFieldMark );
 }
 
 TEST( CardRunner, DueTimesDoNotDrift )
