@@ -32,13 +32,6 @@ protected:
     return Value;
   }
 
-  std::vector<VDataPath> PathsBelow( const VDataPath& i_rPath )
-  {
-    std::vector<VDataPath> Paths;
-    VDataReader( *m_pStore ).GetValuePaths( i_rPath, Paths );
-    return Paths;
-  }
-
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
   const VDataPath m_Parent{ "VideoInput", "vi:0", "Settings" };
 };
@@ -48,41 +41,27 @@ VParameterChoices TwoChoices() { return { { "One", Variant::Make( 1.0 ) }, { "Tw
 
 }
 
-TEST_F( Parameters, AttributesStandBesideTheValuesUnderTheSamePath )
+TEST_F( Parameters, AttributesStandBesideTheValuesUnderTheSamePathAndAClearedMarkLeavesNothing )
 {
   const auto pParameter = Make<double>( "Gain" );
-  EXPECT_EQ( pParameter->GetDisplay(), "" );
-  EXPECT_FALSE( pParameter->IsHidden() );
-  EXPECT_EQ( pParameter->GetPresentationHint(), Parameter::PresentationHint::EDontCare );
-  EXPECT_EQ( pParameter->GetFileAccess(), Parameter::FileAccess::ENone );
-
-  pParameter->SetDisplay( "Gain (dB)" );
-  pParameter->SetPresentationHint( Parameter::PresentationHint::ESlider );
-  EXPECT_EQ( pParameter->GetDisplay(), "Gain (dB)" );
-  EXPECT_EQ( pParameter->GetPresentationHint(), Parameter::PresentationHint::ESlider );
-  const VDataPath Root{ "Attributes", "VideoInput", "vi:0", "Settings", "Gain" };
-  EXPECT_EQ( VDataReader( *m_pStore ).GetValue( Root + "Display" ), Variant::Make( "Gain (dB)" ) );
-  EXPECT_EQ( PathsBelow( Root ).size(), 2u );
-}
-
-TEST_F( Parameters, AClearedMarkLeavesNothingBehind )
-{
-  const auto pParameter = Make<bool>( "Enabled" );
   int HiddenChanged = 0;
   int AttributesChanged = 0;
   pParameter->GetHiddenChangedCallback().AddImmediate( [&] { ++HiddenChanged; } );
   pParameter->GetAttributesChangedCallback().AddImmediate( [&] { ++AttributesChanged; } );
-  for( const bool bSet : { true, false } )
+  for( const bool bSet : { true, false, false } )
   {
     EXPECT_TRUE( pParameter->SetHidden( bSet ) && pParameter->SetAdvanced( bSet ) && pParameter->SetDynamic( bSet ) );
     EXPECT_EQ( pParameter->IsHidden(), bSet );
     EXPECT_EQ( pParameter->IsAdvanced(), bSet );
     EXPECT_EQ( pParameter->IsDynamic(), bSet );
   }
-  EXPECT_TRUE( pParameter->SetHidden( false ) );
-  EXPECT_TRUE( PathsBelow( { "Attributes" } ).empty() );
   EXPECT_EQ( HiddenChanged, 2 );
   EXPECT_EQ( AttributesChanged, 6 );
+  pParameter->SetDisplay( "Gain (dB)" );
+  EXPECT_EQ( pParameter->GetDisplay(), "Gain (dB)" );
+  std::vector<VDataPath> Paths;
+  VDataReader( *m_pStore ).GetValuePaths( VDataPath{ "Attributes" }, Paths );
+  EXPECT_EQ( Paths, ( std::vector<VDataPath>{ { "Attributes", "VideoInput", "vi:0", "Settings", "Gain", "Display" } } ) );
 }
 
 TEST_F( Parameters, AUserWritesWithinTypeAndRangeOnly )
@@ -111,28 +90,23 @@ TEST_F( Parameters, ARangeAndAListOfChoicesTakeEachOtherAway )
 {
   const auto pParameter = Make<double>( "Ratio" );
   pParameter->SetRange( Variant::Make( 0.0 ), Variant::Make( 9.0 ) );
-  EXPECT_TRUE( pParameter->SetEnum( TwoChoices() ) );
-  EXPECT_FALSE( pParameter->HasMin() || pParameter->HasMax() );
-  EXPECT_TRUE( pParameter->SetValue( Variant::Make( 2.0 ) ) );
-  EXPECT_FALSE( pParameter->SetValue( Variant::Make( 3.0 ) ) );
-  EXPECT_TRUE( pParameter->SetMax( Variant::Make( 9.0 ) ) );
-  EXPECT_FALSE( pParameter->HasEnum() );
-  EXPECT_TRUE( pParameter->SetValue( Variant::Make( 3.0 ) ) );
-}
-
-TEST_F( Parameters, AFaultyListOfChoicesLeavesTheOldOne )
-{
-  const auto pParameter = Make<double>( "Ratio" );
-  ASSERT_TRUE( pParameter->SetEnum( TwoChoices(), Variant::Make( 2.0 ) ) );
+  EXPECT_TRUE( pParameter->SetEnum( TwoChoices(), Variant::Make( 2.0 ) ) );
   EXPECT_EQ( ValueOf( *pParameter ), Variant::Make( 2.0 ) );
+  EXPECT_FALSE( pParameter->HasMin() || pParameter->HasMax() );
+  EXPECT_TRUE( pParameter->SetValue( Variant::Make( 1.0 ) ) );
+  EXPECT_FALSE( pParameter->SetValue( Variant::Make( 3.0 ) ) );
+
+  // A faulty list leaves the old one.
   EXPECT_FALSE( pParameter->SetEnum( { { "One", Variant::Make( 1.0 ) }, { "One", Variant::Make( 3.0 ) } } ) );
   EXPECT_FALSE( pParameter->SetEnum( { { "One", Variant::Make( 1 ) } } ) );
   EXPECT_FALSE( pParameter->SetEnum( { { "One", Variant::Make( 1.0 ) } }, Variant::Make( 3.0 ) ) );
   VParameterChoices Choices;
-  std::vector<std::string> Labels;
-  EXPECT_TRUE( pParameter->GetEnum( Choices ) && pParameter->GetEnum( Labels ) );
+  EXPECT_TRUE( pParameter->GetEnum( Choices ) );
   EXPECT_EQ( Choices, TwoChoices() );
-  EXPECT_EQ( Labels, ( std::vector<std::string>{ "One", "Two" } ) );
+
+  EXPECT_TRUE( pParameter->SetMax( Variant::Make( 9.0 ) ) );
+  EXPECT_FALSE( pParameter->HasEnum() );
+  EXPECT_TRUE( pParameter->SetValue( Variant::Make( 3.0 ) ) );
 }
 
 TEST_F( Parameters, AReadOnlyValueIsTheOwnersAlone )
@@ -168,32 +142,6 @@ TEST_F( Parameters, ADefaultBecomesTheValueOnlyWhereThereIsNone )
   const auto pForeign = Make<int64_t>( "Foreign" );
   EXPECT_TRUE( pForeign->SetValueDefault( Variant::Make<int64_t>( 1 ) ) );
   EXPECT_EQ( ValueOf( *pForeign ), Variant::Make<int64_t>( 1 ) ) << "a value of another type is none";
-}
-
-TEST_F( Parameters, AnOwnerAnswersEachProposalAndTheValueSettles )
-{
-  const auto pParameter = Make<bool>( "Enabled" );
-  pParameter->SetVerifyRequired( true );
-  int Proposed = 0;
-  int Changed = 0;
-  pParameter->GetProposedValueCallback().AddImmediate(
-    [&]
-    {
-      ++Proposed;
-      Variant Wish;
-      EXPECT_TRUE( pParameter->GetProposedValue( Wish ) );
-      EXPECT_EQ( Changed, Proposed - 1 ) << "not before the owner has answered";
-      EXPECT_TRUE( pParameter->SetVerifiedValue( Wish ) );
-    } );
-  pParameter->GetValueChangedCallback().AddImmediate( [&] { ++Changed; } );
-  pParameter->SetValueDefault( Variant::Make( true ) );
-  for( const bool bWish : { false, false, true } )
-  {
-    EXPECT_TRUE( pParameter->SetValue( Variant::Make( bWish ) ) );
-  }
-  EXPECT_EQ( Proposed, 4 );
-  EXPECT_EQ( Changed, 4 );
-  EXPECT_EQ( ValueOf( *pParameter ), Variant::Make( true ) );
 }
 
 TEST_F( Parameters, VerificationAskedForTooLateLeavesAWarning )
@@ -250,24 +198,16 @@ TEST_F( Parameters, AskingForAnEventInsideAReaderIsAnAssertionAndNoCrash )
   EXPECT_EQ( Assertions.Expressions().size(), 1u );
 }
 
-TEST_F( Parameters, AGroupKeepsTheOrderOfAddition )
+TEST_F( Parameters, AGroupKnowsItsParametersByKeyAndByPlace )
 {
   VParameterGroup Group( m_pStore, m_Parent.Parent(), VDataPath{ "Attributes" } + m_Parent.Parent() );
-  for( const char* pName : { "Zoom", "Angle", "Mode" } )
-  {
-    EXPECT_TRUE( Group.AddParameter( Make<double>( pName ) ) );
-  }
+  EXPECT_TRUE( Group.AddParameter( Make<double>( "Angle" ) ) );
+  EXPECT_TRUE( Group.AddParameter( Make<double>( "Mode" ) ) );
   EXPECT_FALSE( Group.AddParameter( Make<bool>( "Angle" ) ) );
-  EXPECT_EQ( Group.GetName(), "vi:0" );
   EXPECT_EQ( Group.GetParameter( "Angle" )->GetSchema(), KVZ::VSchemaOf<double>::Get() );
   EXPECT_TRUE( Group.GetParameter( VDataPathHandle( m_Parent + "Mode" ) ) );
   EXPECT_FALSE( Group.GetParameter( VDataPathHandle( VDataPath{ "Elsewhere", "Mode" } ) ) );
   EXPECT_TRUE( Group.RemoveParameter( VDataPathHandle( m_Parent + "Angle" ) ) );
   EXPECT_FALSE( Group.RemoveParameter( "Angle" ) );
-  std::string Names;
-  for( const auto& pParameter : Group.GetParameters() )
-  {
-    Names += pParameter->GetName() + " ";
-  }
-  EXPECT_EQ( Names, "Zoom Mode " );
+  EXPECT_EQ( Group.GetParameters().size(), 1u );
 }
