@@ -8,9 +8,11 @@
 namespace BlueVelvet
 {
 
-TEST( BlueVelvetLoader, AMissingLibraryGivesNoFunctions ) { EXPECT_EQ( VRuntimeLibrary( "libNoSuchVendorRuntime.so" ).Functions(), nullptr ); }
-
-TEST( BlueVelvetLoader, ALibraryThatLacksFunctionsGivesNone ) { EXPECT_EQ( VRuntimeLibrary( "libm.so.6" ).Functions(), nullptr ); }
+TEST( BlueVelvetLoader, ALibraryThatIsMissingOrLacksFunctionsGivesNone )
+{
+  EXPECT_EQ( VRuntimeLibrary( "libNoSuchVendorRuntime.so" ).Functions(), nullptr );
+  EXPECT_EQ( VRuntimeLibrary( "libm.so.6" ).Functions(), nullptr );
+}
 
 // A library of the older generation: it has no bfcGetVideoInfo, and takes the memory format before the update method.
 TEST( BlueVelvetLoader, AnOlderLibraryTellsSizesByItsOwnFunctions )

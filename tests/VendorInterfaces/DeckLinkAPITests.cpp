@@ -24,16 +24,6 @@ long Slot( TMember i_pMember )
   return static_cast<long>( Representation / sizeof( void* ) );
 }
 
-// The operations stand one behind the other, the first in this slot.
-template<class... TMembers>
-void ExpectSlots( long i_First, TMembers... i_Members )
-{
-  const std::vector<long> Found = { Slot( i_Members )... };
-  std::vector<long> Expected( Found.size() );
-  std::iota( Expected.begin(), Expected.end(), i_First );
-  EXPECT_EQ( Found, Expected );
-}
-
 // The slot that an operation added by a derived class gets: it counts all slots of the base, its destructor's two included.
 template<class TInterface>
 long SlotCount()
@@ -45,6 +35,17 @@ long SlotCount()
   return Slot( &VDerived::Added );
 }
 
+// The operations stand one behind the other, the first in the given slot; the slot count shows whether a destructor follows.
+template<class TInterface, class... TMembers>
+void ExpectTable( long i_SlotCount, long i_First, TMembers... i_Members )
+{
+  const std::vector<long> Found = { Slot( i_Members )... };
+  std::vector<long> Expected( Found.size() );
+  std::iota( Expected.begin(), Expected.end(), i_First );
+  EXPECT_EQ( Found, Expected );
+  EXPECT_EQ( SlotCount<TInterface>(), i_SlotCount );
+}
+
 // The types that pass the boundary
 static_assert( sizeof( HRESULT ) == 4 && sizeof( bool ) == 1 && sizeof( long ) == 8 );
 static_assert( std::is_same_v<decltype( &IUnknown::AddRef ), unsigned long ( IUnknown::* )()> && sizeof( ULONG ) == 8 );
@@ -53,60 +54,42 @@ static_assert( std::is_same_v<decltype( &IUnknown::QueryInterface ), int ( IUnkn
 static_assert( std::is_trivially_copyable_v<REFIID> );
 }
 
-TEST( DeckLinkAPI, OperationsStandInTheVendorsSlots )
+TEST( DeckLinkAPI, OperationsAndDestructorsStandInTheVendorsSlots )
 {
-  ExpectSlots( 0, &IUnknown::QueryInterface, &IUnknown::AddRef, &IUnknown::Release );
-  ExpectSlots( 3, &IDeckLinkInput::DoesSupportVideoMode, &IDeckLinkInput::GetDisplayModeIterator, &IDeckLinkInput::SetScreenPreviewCallback,
-    &IDeckLinkInput::EnableVideoInput, &IDeckLinkInput::DisableVideoInput, &IDeckLinkInput::GetAvailableVideoFrameCount,
-    &IDeckLinkInput::SetVideoInputFrameMemoryAllocator, &IDeckLinkInput::EnableAudioInput, &IDeckLinkInput::DisableAudioInput,
-    &IDeckLinkInput::GetAvailableAudioSampleFrameCount, &IDeckLinkInput::StartStreams, &IDeckLinkInput::StopStreams, &IDeckLinkInput::PauseStreams,
-    &IDeckLinkInput::FlushStreams, &IDeckLinkInput::SetCallback, &IDeckLinkInput::GetHardwareReferenceClock );
-  ExpectSlots( 3, &IDeckLinkVideoFrame::GetWidth, &IDeckLinkVideoFrame::GetHeight, &IDeckLinkVideoFrame::GetRowBytes,
+  ExpectTable<IUnknown>( 3, 0, &IUnknown::QueryInterface, &IUnknown::AddRef, &IUnknown::Release );
+  ExpectTable<IDeckLinkInput>( 21, 3, &IDeckLinkInput::DoesSupportVideoMode, &IDeckLinkInput::GetDisplayModeIterator,
+    &IDeckLinkInput::SetScreenPreviewCallback, &IDeckLinkInput::EnableVideoInput, &IDeckLinkInput::DisableVideoInput,
+    &IDeckLinkInput::GetAvailableVideoFrameCount, &IDeckLinkInput::SetVideoInputFrameMemoryAllocator, &IDeckLinkInput::EnableAudioInput,
+    &IDeckLinkInput::DisableAudioInput, &IDeckLinkInput::GetAvailableAudioSampleFrameCount, &IDeckLinkInput::StartStreams,
+    &IDeckLinkInput::StopStreams, &IDeckLinkInput::PauseStreams, &IDeckLinkInput::FlushStreams, &IDeckLinkInput::SetCallback,
+    &IDeckLinkInput::GetHardwareReferenceClock );
+  ExpectTable<IDeckLinkVideoFrame>( 13, 3, &IDeckLinkVideoFrame::GetWidth, &IDeckLinkVideoFrame::GetHeight, &IDeckLinkVideoFrame::GetRowBytes,
     &IDeckLinkVideoFrame::GetPixelFormat, &IDeckLinkVideoFrame::GetFlags, &IDeckLinkVideoFrame::GetBytes, &IDeckLinkVideoFrame::GetTimecode,
     &IDeckLinkVideoFrame::GetAncillaryData );
-  ExpectSlots( 13, &IDeckLinkVideoInputFrame::GetStreamTime, &IDeckLinkVideoInputFrame::GetHardwareReferenceTimestamp );
-  ExpectSlots( 3, &IDeckLinkInputCallback::VideoInputFormatChanged, &IDeckLinkInputCallback::VideoInputFrameArrived );
-  ExpectSlots( 3, &IDeckLinkAudioInputPacket::GetSampleFrameCount, &IDeckLinkAudioInputPacket::GetBytes, &IDeckLinkAudioInputPacket::GetPacketTime );
-  ExpectSlots( 3, &IDeckLinkTimecode::GetBCD, &IDeckLinkTimecode::GetComponents, &IDeckLinkTimecode::GetString, &IDeckLinkTimecode::GetFlags,
-    &IDeckLinkTimecode::GetTimecodeUserBits );
-  ExpectSlots( 3, &IDeckLinkDiscovery::InstallDeviceNotifications, &IDeckLinkDiscovery::UninstallDeviceNotifications );
-  ExpectSlots( 3, &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceArrived, &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceRemoved );
-  ExpectSlots( 3, &IDeckLink::GetModelName, &IDeckLink::GetDisplayName );
-  ExpectSlots( 3, &IDeckLinkIterator::Next );
-  ExpectSlots( 3, &IDeckLinkAttributes::GetFlag, &IDeckLinkAttributes::GetInt, &IDeckLinkAttributes::GetFloat, &IDeckLinkAttributes::GetString );
-  ExpectSlots( 3, &IDeckLinkAPIInformation::GetFlag );
-  ExpectSlots( 6, &IDeckLinkAPIInformation::GetString );
-  ExpectSlots( 3, &IDeckLinkDisplayModeIterator::Next );
-  ExpectSlots( 3, &IDeckLinkDisplayMode::GetName, &IDeckLinkDisplayMode::GetDisplayMode, &IDeckLinkDisplayMode::GetWidth,
+  ExpectTable<IDeckLinkVideoInputFrame>( 15, 13, &IDeckLinkVideoInputFrame::GetStreamTime, &IDeckLinkVideoInputFrame::GetHardwareReferenceTimestamp );
+  ExpectTable<IDeckLinkInputCallback>( 7, 3, &IDeckLinkInputCallback::VideoInputFormatChanged, &IDeckLinkInputCallback::VideoInputFrameArrived );
+  ExpectTable<IDeckLinkAudioInputPacket>( 8, 3, &IDeckLinkAudioInputPacket::GetSampleFrameCount, &IDeckLinkAudioInputPacket::GetBytes,
+    &IDeckLinkAudioInputPacket::GetPacketTime );
+  ExpectTable<IDeckLinkTimecode>( 10, 3, &IDeckLinkTimecode::GetBCD, &IDeckLinkTimecode::GetComponents, &IDeckLinkTimecode::GetString,
+    &IDeckLinkTimecode::GetFlags, &IDeckLinkTimecode::GetTimecodeUserBits );
+  ExpectTable<IDeckLinkDiscovery>( 7, 3, &IDeckLinkDiscovery::InstallDeviceNotifications, &IDeckLinkDiscovery::UninstallDeviceNotifications );
+  ExpectTable<IDeckLinkDeviceNotificationCallback>( 7, 3, &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceArrived,
+    &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceRemoved );
+  ExpectTable<IDeckLink>( 7, 3, &IDeckLink::GetModelName, &IDeckLink::GetDisplayName );
+  ExpectTable<IDeckLinkIterator>( 4, 3, &IDeckLinkIterator::Next );
+  ExpectTable<IDeckLinkAttributes>( 9, 3, &IDeckLinkAttributes::GetFlag, &IDeckLinkAttributes::GetInt, &IDeckLinkAttributes::GetFloat,
+    &IDeckLinkAttributes::GetString );
+  ExpectTable<IDeckLinkAPIInformation>( 9, 3, &IDeckLinkAPIInformation::GetFlag, &IDeckLinkAPIInformation::GetInt, &IDeckLinkAPIInformation::GetFloat,
+    &IDeckLinkAPIInformation::GetString );
+  ExpectTable<IDeckLinkDisplayModeIterator>( 6, 3, &IDeckLinkDisplayModeIterator::Next );
+  ExpectTable<IDeckLinkDisplayMode>( 12, 3, &IDeckLinkDisplayMode::GetName, &IDeckLinkDisplayMode::GetDisplayMode, &IDeckLinkDisplayMode::GetWidth,
     &IDeckLinkDisplayMode::GetHeight, &IDeckLinkDisplayMode::GetFrameRate, &IDeckLinkDisplayMode::GetFieldDominance,
     &IDeckLinkDisplayMode::GetFlags );
-  ExpectSlots( 3, &IDeckLinkVideoFrameAncillary::GetBufferForVerticalBlankingLine, &IDeckLinkVideoFrameAncillary::GetPixelFormat,
-    &IDeckLinkVideoFrameAncillary::GetDisplayMode );
-  ExpectSlots( 3, &IDeckLinkMemoryAllocator::AllocateBuffer, &IDeckLinkMemoryAllocator::ReleaseBuffer, &IDeckLinkMemoryAllocator::Commit,
-    &IDeckLinkMemoryAllocator::Decommit );
-  ExpectSlots( 3, &IDeckLinkScreenPreviewCallback::DrawFrame );
-}
-
-TEST( DeckLinkAPI, DestructorsTakeTwoSlotsWhereTheVendorHasThem )
-{
-  EXPECT_EQ( SlotCount<IUnknown>(), 3 );
-  EXPECT_EQ( SlotCount<IDeckLinkIterator>(), 4 );
-  EXPECT_EQ( SlotCount<IDeckLinkMemoryAllocator>(), 7 );
-  EXPECT_EQ( SlotCount<IDeckLinkDiscovery>(), 7 );
-  EXPECT_EQ( SlotCount<IDeckLinkDeviceNotificationCallback>(), 7 );
-  EXPECT_EQ( SlotCount<IDeckLink>(), 7 );
-  EXPECT_EQ( SlotCount<IDeckLinkAttributes>(), 9 );
-  EXPECT_EQ( SlotCount<IDeckLinkAPIInformation>(), 9 );
-  EXPECT_EQ( SlotCount<IDeckLinkInput>(), 21 );
-  EXPECT_EQ( SlotCount<IDeckLinkInputCallback>(), 7 );
-  EXPECT_EQ( SlotCount<IDeckLinkDisplayModeIterator>(), 6 );
-  EXPECT_EQ( SlotCount<IDeckLinkDisplayMode>(), 12 );
-  EXPECT_EQ( SlotCount<IDeckLinkVideoFrame>(), 13 );
-  EXPECT_EQ( SlotCount<IDeckLinkVideoInputFrame>(), 15 );
-  EXPECT_EQ( SlotCount<IDeckLinkAudioInputPacket>(), 8 );
-  EXPECT_EQ( SlotCount<IDeckLinkTimecode>(), 10 );
-  EXPECT_EQ( SlotCount<IDeckLinkVideoFrameAncillary>(), 8 );
-  EXPECT_EQ( SlotCount<IDeckLinkScreenPreviewCallback>(), 6 );
+  ExpectTable<IDeckLinkVideoFrameAncillary>( 8, 3, &IDeckLinkVideoFrameAncillary::GetBufferForVerticalBlankingLine,
+    &IDeckLinkVideoFrameAncillary::GetPixelFormat, &IDeckLinkVideoFrameAncillary::GetDisplayMode );
+  ExpectTable<IDeckLinkMemoryAllocator>( 7, 3, &IDeckLinkMemoryAllocator::AllocateBuffer, &IDeckLinkMemoryAllocator::ReleaseBuffer,
+    &IDeckLinkMemoryAllocator::Commit, &IDeckLinkMemoryAllocator::Decommit );
+  ExpectTable<IDeckLinkScreenPreviewCallback>( 6, 3, &IDeckLinkScreenPreviewCallback::DrawFrame );
 }
 
 }

@@ -39,51 +39,56 @@ public:
   size_t m_Outstanding = 0;
 };
 
-std::vector<void*> TakeAll( VBalancedClientAllocator& i_rClient )
+// A client and the blocks that it has taken. Its end frees them.
+struct VTaker
 {
-  std::vector<void*> Blocks;
-  while( void* pBlock = i_rClient.Allocate( BlockSize ) )
-  {
-    std::memset( pBlock, static_cast<int>( Blocks.size() ), BlockSize );
-    Blocks.push_back( pBlock );
-  }
-  return Blocks;
-}
+  explicit VTaker( VBalancingAllocator& i_rPool ) : m_pClient( i_rPool.MakeClient() ) {}
+  VTaker( VTaker&& ) = default;
+  ~VTaker() { FreeAll(); }
 
-size_t TakeAtMost( VBalancedClientAllocator& i_rClient, size_t i_Count, std::vector<void*>& io_rBlocks )
-{
-  size_t Taken = 0;
-  for( ; Taken < i_Count; ++Taken )
+  size_t Take( size_t i_Most )
   {
-    void* pBlock = i_rClient.Allocate( BlockSize );
-    if( !pBlock ) break;
-    io_rBlocks.push_back( pBlock );
+    size_t Taken = 0;
+    for( ; Taken < i_Most; ++Taken )
+    {
+      void* pBlock = m_pClient->Allocate( BlockSize );
+      if( !pBlock ) break;
+      std::memset( pBlock, static_cast<int>( Taken ), BlockSize );
+      m_Blocks.push_back( pBlock );
+    }
+    return Taken;
   }
-  return Taken;
-}
+  bool FreeAt( size_t i_Index )
+  {
+    if( i_Index >= m_Blocks.size() ) return false;
+    m_pClient->Free( m_Blocks[i_Index] );
+    m_Blocks.erase( m_Blocks.begin() + static_cast<std::ptrdiff_t>( i_Index ) );
+    return true;
+  }
+  void FreeAll()
+  {
+    while( !m_Blocks.empty() ) FreeAt( 0 );
+  }
 
-void FreeAll( std::vector<void*>& io_rBlocks, UtilsMemory::VAllocator& i_rAllocator )
-{
-  for( void* pBlock : io_rBlocks ) i_rAllocator.Free( pBlock );
-  io_rBlocks.clear();
-}
+  std::shared_ptr<VBalancedClientAllocator> m_pClient;
+  std::vector<void*> m_Blocks;
+};
 
 TEST( BalancingAllocator, GuaranteesHoldAgainstAGreedyClient )
 {
   for( const bool bRecovery : { false, true } )
   {
     const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-    const auto pGreedy = pPool->MakeClient();
-    const auto pModest = pPool->MakeClient();
+    VTaker Greedy( *pPool );
+    VTaker Modest( *pPool );
     ASSERT_TRUE( pPool->Configure( 30, 0, 10 ) );
-    if( bRecovery ) pGreedy->SetRecovery( [] { return false; } );
-    auto Greedy = TakeAll( *pGreedy );
-    EXPECT_EQ( Greedy.size(), 20u );
-    auto Modest = TakeAll( *pModest );
-    EXPECT_EQ( Modest.size(), 10u );
-    FreeAll( Greedy, *pModest );   // any holder may free
-    FreeAll( Modest, *pGreedy );
-    EXPECT_EQ( pGreedy->GetHeldBlocks() + pModest->GetHeldBlocks(), 0u );
+    if( bRecovery ) Greedy.m_pClient->SetRecovery( [] { return false; } );
+    EXPECT_EQ( Greedy.Take( 30 ), 20u );
+    EXPECT_EQ( Modest.Take( 30 ), 10u );
+    Greedy.m_Blocks.swap( Modest.m_Blocks );   // any holder may free
+    Greedy.FreeAll();
+    Modest.FreeAll();
+    EXPECT_EQ( Greedy.m_pClient->GetHeldBlocks() + Modest.m_pClient->GetHeldBlocks(), 0u );
   }
 }
 
@@ -91,126 +96,101 @@ TEST( BalancingAllocator, GuaranteesHoldAgainstAGreedyClient )
 TEST( BalancingAllocator, BlocksMoveToTheClientThatAsks )
 {
   const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-  const auto pFirst = pPool->MakeClient();
-  const auto pSecond = pPool->MakeClient();
+  VTaker First( *pPool );
+  VTaker Second( *pPool );
   ASSERT_TRUE( pPool->Configure( 20, 2, 2 ) );
-  std::vector<void*> First, Second;
-  const auto FreeOldest = []( std::vector<void*>& io_rBlocks, VBalancedClientAllocator& i_rClient )
-  {
-    return [&io_rBlocks, &i_rClient]
-    {
-      if( io_rBlocks.empty() ) return false;
-      i_rClient.Free( io_rBlocks.front() );
-      io_rBlocks.erase( io_rBlocks.begin() );
-      return true;
-    };
-  };
-  pFirst->SetRecovery( FreeOldest( First, *pFirst ) );
-  pSecond->SetRecovery( FreeOldest( Second, *pSecond ) );
-  TakeAtMost( *pFirst, 100, First );
-  EXPECT_EQ( First.size(), 16u );   // all but the reserve and what the other is promised
+  First.m_pClient->SetRecovery( [&First] { return First.FreeAt( 0 ); } );
+  Second.m_pClient->SetRecovery( [&Second] { return Second.FreeAt( 0 ); } );
+  First.Take( 100 );
+  EXPECT_EQ( First.m_Blocks.size(), 16u );   // all but the reserve and what the other is promised
   for( int Round = 0; Round < 100; ++Round )
   {
-    TakeAtMost( *pSecond, 2, Second );
-    TakeAtMost( *pFirst, 1, First );
-    ASSERT_LE( First.size() + Second.size(), 20u );
-    ASSERT_GE( Second.size(), std::min<size_t>( 2 * ( Round + 1 ), 2 ) );
+    Second.Take( 2 );
+    First.Take( 1 );
+    ASSERT_LE( First.m_Blocks.size() + Second.m_Blocks.size(), 20u );
+    ASSERT_GE( Second.m_Blocks.size(), 2u );
   }
-  EXPECT_NEAR( static_cast<double>( Second.size() ), 12.0, 2.0 );   // two thirds of the grants
-  EXPECT_NEAR( static_cast<double>( First.size() ), 6.0, 2.0 );
-  FreeAll( First, *pFirst );
-  FreeAll( Second, *pSecond );
+  EXPECT_NEAR( static_cast<double>( Second.m_Blocks.size() ), 12.0, 2.0 );   // two thirds of the grants
+  EXPECT_NEAR( static_cast<double>( First.m_Blocks.size() ), 6.0, 2.0 );
 }
 
 TEST( BalancingAllocator, ShareThatWasSetIsTakenWithoutRecoveryUpToTheOthersGuarantee )
 {
   const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-  const auto pClient = pPool->MakeClient();
-  const auto pOther = pPool->MakeClient();
+  VTaker Client( *pPool );
+  const VTaker Other( *pPool );
   ASSERT_TRUE( pPool->Configure( 8, 3, 2 ) );   // requests alone earn no more than three
   size_t Recoveries = 0;
-  pClient->SetRecovery(
-    [&Recoveries]
-    {
-      ++Recoveries;
-      return false;
-    } );
-  std::vector<void*> Blocks;
-  pClient->SetShare( 4 );
-  EXPECT_EQ( TakeAtMost( *pClient, 4, Blocks ), 4u );
+  const auto Recover = [&Recoveries]
+  {
+    ++Recoveries;
+    return false;
+  };
+  Client.m_pClient->SetRecovery( Recover );
+  Client.m_pClient->SetShare( 4 );
+  EXPECT_EQ( Client.Take( 4 ), 4u );
   EXPECT_EQ( Recoveries, 0u );
-  EXPECT_EQ( TakeAtMost( *pClient, 8, Blocks ), 2u );   // beyond it, what recovery cannot give comes from the reserve
+  EXPECT_EQ( Client.Take( 8 ), 2u );   // beyond it, what recovery cannot give comes from the reserve
   EXPECT_EQ( Recoveries, 3u );
-  FreeAll( Blocks, *pClient );
 }
 
 TEST( BalancingAllocator, RefusesAndTellsThatRecoveryCouldNotHelp )
 {
   const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-  const auto pClient = pPool->MakeClient();
+  VTaker Client( *pPool );
   size_t Finished = 0;
-  pClient->SetRecoveryFinished( [&Finished] { ++Finished; } );
-  EXPECT_EQ( pClient->Allocate( 1 ), nullptr );   // no budget yet
+  Client.m_pClient->SetRecoveryFinished( [&Finished] { ++Finished; } );
+  EXPECT_EQ( Client.Take( 1 ), 0u );   // no budget yet
   ASSERT_TRUE( pPool->Configure( 1, 0, 0 ) );
-  EXPECT_EQ( pClient->MaxAllocation(), BlockSize );
-  EXPECT_EQ( pClient->Allocate( BlockSize + 1 ), nullptr );
+  EXPECT_EQ( Client.m_pClient->MaxAllocation(), BlockSize );
+  EXPECT_EQ( Client.m_pClient->Allocate( BlockSize + 1 ), nullptr );
   EXPECT_EQ( Finished, 1u );   // a request that can never succeed is no shortage
-  void* pBlock = pClient->Allocate( BlockSize );
-  ASSERT_NE( pBlock, nullptr );
-  EXPECT_EQ( reinterpret_cast<uintptr_t>( pBlock ) % 16, 0u );
-  EXPECT_EQ( pClient->Allocate( 1 ), nullptr );
+  EXPECT_EQ( Client.Take( 2 ), 1u );
+  EXPECT_EQ( reinterpret_cast<uintptr_t>( Client.m_Blocks[0] ) % 16, 0u );
   EXPECT_EQ( Finished, 2u );
-  pClient->Free( pBlock );
 }
 
 TEST( BalancingAllocator, BudgetFallsAsFarAsBlocksAreFree )
 {
   const auto pBelow = std::make_shared<VLimitedAllocator>( 12 );
-  {
-    const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize, 64, pBelow );
-    const auto pClient = pPool->MakeClient();
-    EXPECT_FALSE( pPool->Configure( 13, 0, 0 ) );
-    EXPECT_EQ( pBelow->m_Outstanding, 12u );
-    EXPECT_TRUE( pPool->Configure( 10, 0, 0 ) );
-    EXPECT_EQ( pBelow->m_Outstanding, 10u );
-    std::vector<void*> Blocks;
-    EXPECT_EQ( TakeAtMost( *pClient, 6, Blocks ), 6u );
-    EXPECT_FALSE( pPool->Configure( 4, 0, 0 ) );
-    EXPECT_EQ( pBelow->m_Outstanding, 6u );
-    double Total = 0, Used = 0;
-    pClient->GetMemoryStats( Total, Used );
-    EXPECT_GE( Total, Used );
-    EXPECT_EQ( pClient->Allocate( 1 ), nullptr );
-    FreeAll( Blocks, *pClient );   // what is over the budget goes below at once
-    EXPECT_EQ( pBelow->m_Outstanding, 4u );
-    EXPECT_TRUE( pPool->Configure( 4, 0, 0 ) );
-  }
-  EXPECT_EQ( pBelow->m_Outstanding, 0u );
+  const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize, 64, pBelow );
+  VTaker Client( *pPool );
+  EXPECT_FALSE( pPool->Configure( 13, 0, 0 ) );
+  EXPECT_EQ( pBelow->m_Outstanding, 12u );
+  EXPECT_TRUE( pPool->Configure( 10, 0, 0 ) );
+  EXPECT_EQ( pBelow->m_Outstanding, 10u );
+  EXPECT_EQ( Client.Take( 6 ), 6u );
+  EXPECT_FALSE( pPool->Configure( 4, 0, 0 ) );
+  EXPECT_EQ( pBelow->m_Outstanding, 6u );
+  EXPECT_EQ( Client.Take( 1 ), 0u );
+  Client.FreeAll();   // what is over the budget goes below at once
+  EXPECT_EQ( pBelow->m_Outstanding, 4u );
+  EXPECT_TRUE( pPool->Configure( 4, 0, 0 ) );
 }
 
 TEST( BalancingAllocator, BlocksOutliveTheirClientAndCountAgainstTheBudget )
 {
   const auto pBelow = std::make_shared<VLimitedAllocator>( 12 );
   auto pPool = std::make_shared<VBalancingAllocator>( BlockSize, 64, pBelow );
-  auto pGone = pPool->MakeClient();
-  auto pClient = pPool->MakeClient();
+  VTaker Gone( *pPool );
+  VTaker Client( *pPool );
   ASSERT_TRUE( pPool->Configure( 12, 0, 4 ) );
-  std::vector<void*> Left, Blocks;
-  EXPECT_EQ( TakeAtMost( *pGone, 6, Left ), 6u );
-  pGone.reset();
-  EXPECT_EQ( TakeAtMost( *pClient, 12, Blocks ), 6u );
+  EXPECT_EQ( Gone.Take( 6 ), 6u );
+  Gone.m_pClient = Client.m_pClient;
+  EXPECT_EQ( Client.Take( 12 ), 6u );
   double Total = 0, Used = 0;
-  pClient->GetMemoryStats( Total, Used );
+  Client.m_pClient->GetMemoryStats( Total, Used );
   EXPECT_DOUBLE_EQ( Total, 6.0 * BlockSize / 1048576.0 );
   EXPECT_DOUBLE_EQ( Used, 6.0 * BlockSize / 1048576.0 );
-  std::memset( Left.back(), 1, BlockSize );
-  FreeAll( Left, *pClient );
-  EXPECT_EQ( TakeAtMost( *pClient, 12, Blocks ), 6u );
+  std::memset( Gone.m_Blocks.back(), 1, BlockSize );
+  Gone.FreeAll();
+  EXPECT_EQ( Client.Take( 12 ), 6u );
   pPool.reset();
-  pClient->Release();
-  EXPECT_EQ( pClient->Allocate( 1 ), nullptr );
-  FreeAll( Blocks, *pClient );
-  pClient.reset();
+  Client.m_pClient->Release();
+  EXPECT_EQ( Client.Take( 1 ), 0u );
+  Client.FreeAll();
+  Gone.m_pClient.reset();
+  Client.m_pClient.reset();
   EXPECT_EQ( pBelow->m_Outstanding, 0u );
 }
 
@@ -225,39 +205,27 @@ TEST( BalancingAllocator, RandomRun )
     const size_t Guarantee = Pick( 4 );
     const size_t Total = 3 * Guarantee + 1 + Pick( 20 );
     const auto pPool = std::make_shared<VBalancingAllocator>( BlockSize );
-    struct VOwner
-    {
-      std::shared_ptr<VBalancedClientAllocator> m_pClient;
-      std::vector<void*> m_Blocks;
-    };
-    std::vector<VOwner> Owners( 3 );
-    for( VOwner& rOwner : Owners ) rOwner.m_pClient = pPool->MakeClient();
+    std::vector<VTaker> Takers;
+    for( int Taker = 0; Taker < 3; ++Taker ) Takers.emplace_back( *pPool );
     ASSERT_TRUE( pPool->Configure( Total, Pick( 3 ), Guarantee ) );
     for( int Step = 0; Step < 500; ++Step )
     {
-      VOwner& rOwner = Owners[Pick( 3 )];
-      if( Pick( 5 ) < 3 )
-      {
-        const size_t Held = rOwner.m_Blocks.size();
-        void* pBlock = rOwner.m_pClient->Allocate( BlockSize );
-        ASSERT_TRUE( pBlock || Held >= Guarantee );
-        if( pBlock ) std::memset( pBlock, static_cast<int>( Pick( 256 ) ), BlockSize );
-        if( pBlock ) rOwner.m_Blocks.push_back( pBlock );
-      }
-      else if( !rOwner.m_Blocks.empty() )
-      {
-        std::swap( rOwner.m_Blocks[Pick( rOwner.m_Blocks.size() )], rOwner.m_Blocks.back() );
-        rOwner.m_pClient->Free( rOwner.m_Blocks.back() );
-        rOwner.m_Blocks.pop_back();
-      }
+      VTaker& rTaker = Takers[Pick( 3 )];
+      const size_t Held = rTaker.m_Blocks.size();
+      if( Pick( 5 ) < 3 ) ASSERT_TRUE( rTaker.Take( 1 ) == 1 || Held >= Guarantee );
+      else if( Held != 0 ) rTaker.FreeAt( Pick( Held ) );
     }
-    size_t Held = 0;
-    for( VOwner& rOwner : Owners ) Held += rOwner.m_Blocks.size();
-    ASSERT_LE( Held, Total );
-    for( VOwner& rOwner : Owners ) FreeAll( rOwner.m_Blocks, *rOwner.m_pClient );
-    std::vector<void*> Blocks;
-    EXPECT_EQ( TakeAtMost( *Owners[0].m_pClient, Total, Blocks ), Total - 2 * Guarantee );
-    FreeAll( Blocks, *Owners[0].m_pClient );
+    std::set<void*> Held;
+    size_t Count = 0;
+    for( const VTaker& rTaker : Takers )
+    {
+      Held.insert( rTaker.m_Blocks.begin(), rTaker.m_Blocks.end() );
+      Count += rTaker.m_Blocks.size();
+    }
+    ASSERT_EQ( Held.size(), Count );
+    ASSERT_LE( Count, Total );
+    for( VTaker& rTaker : Takers ) rTaker.FreeAll();
+    EXPECT_EQ( Takers[0].Take( Total ), Total - 2 * Guarantee );
   }
 }
 
