@@ -22,12 +22,7 @@ protected:
   }
   void Start( uint32_t i_Id, int64_t i_First, int64_t i_End, const std::string& i_rName = "Take" )
   {
-    const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( i_Id ), i_rName, 0, KVZ::VGlobalSyncSessionId( 1 ) };
-    m_Rig.OnStrand( *m_pSource, [&] { EXPECT_TRUE( m_pSource->StartCapture( Header, At( i_First ), At( i_End ), false, 0 ) ); } );
-  }
-  void Cancel()
-  {
-    m_Rig.OnStrand( *m_pSource, [&] { m_pSource->CancelCapture(); } );
+    m_Rig.Start( *m_pSource, i_Id, i_First, i_End, i_rName );
   }
   // The writing thread's turn.
   void Write() { m_Rig.m_pWriterService->RunAll(); }
@@ -36,7 +31,7 @@ protected:
   void UseTwoContainers() { m_Rig.m_pTargets->m_Containers = { KVZ::IVideoContainer::EMOV, KVZ::IVideoContainer::ETVID }; }
 
   VVideoRig m_Rig;
-  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make<VTestVideoSource>();
+  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make();
 };
 
 TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
@@ -52,10 +47,9 @@ TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
   ASSERT_EQ( rFile.m_Frames.size(), 10u );
   for( size_t Index = 0; Index < rFile.m_Frames.size(); ++Index )
   {
-    EXPECT_EQ( rFile.m_Frames[Index], std::vector<uint8_t>( 64, static_cast<uint8_t>( Index + 4 ) ) );
-    EXPECT_EQ( rFile.m_Keys[Index], Index );
-    ASSERT_EQ( rFile.m_Sound[Index].size(), 160u );
-    EXPECT_EQ( rFile.m_Sound[Index][7], Index + 4 + 7 );
+    EXPECT_EQ( rFile.m_Frames.at( Index ), std::vector<uint8_t>( 64, static_cast<uint8_t>( Index + 4 ) ) );
+    ASSERT_EQ( rFile.m_Sound.at( Index ).size(), 160u );
+    EXPECT_EQ( rFile.m_Sound.at( Index )[7], Index + 4 + 7 );
   }
   EXPECT_EQ( rFile.m_Closes, 1 );
   EXPECT_EQ( rFile.m_Timing, ( KVZ::VTimingRecord{ 135000000, 5400000, At( 4 ).Count() } ) );
@@ -223,7 +217,7 @@ TEST_F( BufferClient, ACancelledWaitMakesNoFile )
 {
   const TestSupport::VLogCapture Log( "VideoInputDataSource" );
   Start( 1, 20, 30 );
-  Cancel();
+  m_Rig.Cancel( *m_pSource );
   Write();
   EXPECT_EQ( Log.Texts(), ( std::vector<std::string>{ "Client 1 cancelled after writing 0 seconds of data." } ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
@@ -236,7 +230,7 @@ TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWritten )
   const TestSupport::VLogCapture Log( "VideoInputDataSource" );
   Start( 1, 0, 30 );
   Write();
-  Cancel();
+  m_Rig.Cancel( *m_pSource );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelling );
   m_Rig.DeliverMany( 2 );
   Write();

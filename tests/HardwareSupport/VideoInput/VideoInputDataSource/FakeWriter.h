@@ -2,12 +2,18 @@
 #pragma once
 
 #include "Core/VideoInterface/VideoWriter.h"
+#include "tests/support/TestFrames.h"
 
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/mutex.hpp>
+
+#include <atomic>
 #include <cstdint>
 #include <limits>
 #include <map>
 #include <memory>
 #include <new>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -16,12 +22,14 @@ struct VFakeFile
   static constexpr uint64_t Never = std::numeric_limits<uint64_t>::max();
 
   uint64_t m_FailingCall = Never;   // 0 opens, 1 writes the header, 2 the first frame and so on
-  bool m_bThrows = false;           // and that call throws: memory runs out around the writer
+  bool m_bThrows = false;           // a frame that fails throws: memory runs out around the writer
+  std::set<uint64_t> m_FailingKeys;
   bool m_bCloseFails = false;
   uint64_t m_IncompleteFrames = 0;   // as the writer counts them
 
   bool m_bOpen = false;
   int m_Closes = 0;
+  bool m_bClosedWithAFrameInHand = false;
   bool m_bHeaded = false;
   KVZ::VideoFrameInfo m_Video;
   KVZ::AudioFrameInfo m_Audio;
@@ -32,21 +40,24 @@ struct VFakeFile
   std::string m_CaptureName;
   KVZ::VCameraHardwareRecord m_Camera;
   std::vector<KVZ::VConversionRecord> m_Conversion;
-  std::vector<std::vector<uint8_t>> m_Frames;
-  std::vector<std::vector<uint8_t>> m_Sound;
-  std::vector<uint64_t> m_Keys;
-  std::vector<const uint8_t*> m_Addresses;   // of the frames' bytes as they were given
+  std::map<uint64_t, std::vector<uint8_t>> m_Frames;   // by their keys
+  std::map<uint64_t, std::vector<uint8_t>> m_Sound;
+  std::map<uint64_t, const uint8_t*> m_Addresses;   // of the frames' bytes as they were given
 };
 
 // What lies on the disk, by path.
 using VFakeDisk = std::map<std::string, VFakeFile>;
 
+// Several threads may write frames at once, as they do where the container is a sequence of images.
 class VFakeWriter : public KVZ::IVideoWriter
 {
 public:
-  explicit VFakeWriter( std::shared_ptr<VFakeDisk> i_pDisk ) : m_pDisk( std::move( i_pDisk ) ) {}
+  VFakeWriter( std::shared_ptr<VFakeDisk> i_pDisk, KVZ::IVideoContainer::Enum i_Container )
+    : m_pDisk( std::move( i_pDisk ) ), m_Container( i_Container )
+  {
+  }
 
-  const KVZ::IVideoWriterCapabilities& GetCapabilities() const override { return KVZ::GetVideoWriterCapabilities( KVZ::IVideoContainer::ETVID ); }
+  const KVZ::IVideoWriterCapabilities& GetCapabilities() const override { return KVZ::GetVideoWriterCapabilities( m_Container ); }
   bool Open( const std::string& i_rPath ) override
   {
     m_pFile = &( *m_pDisk )[i_rPath];
@@ -74,45 +85,43 @@ public:
   bool WriteFrame( KVZ::VBufferList& io_rVideo, const KVZ::VideoFrameInfo&, KVZ::VBufferList& io_rAudio, const KVZ::AudioFrameInfo&,
     uint64_t i_FrameKey ) override
   {
-    if( !IsOpen() || !m_pFile->m_bHeaded || !Succeeds() )
+    ++m_InHand;
+    const bool bWritten = Keep( io_rVideo, io_rAudio, i_FrameKey );
+    --m_InHand;
+    if( !bWritten && m_pFile->m_bThrows )
     {
-      return false;
+      throw std::bad_alloc();
     }
-    m_pFile->m_Addresses.push_back( io_rVideo.front()->Data() );
-    m_pFile->m_Frames.push_back( BytesOf( io_rVideo ) );
-    m_pFile->m_Sound.push_back( BytesOf( io_rAudio ) );
-    m_pFile->m_Keys.push_back( i_FrameKey );
-    return true;
+    return bWritten;
   }
   bool Close() override
   {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
     m_pFile->m_bOpen = false;
+    m_pFile->m_bClosedWithAFrameInHand = m_InHand != 0;
     ++m_pFile->m_Closes;
     return !m_pFile->m_bCloseFails;
   }
   uint64_t CountIncompleteFrames() const override { return m_pFile->m_IncompleteFrames; }
 
 private:
-  bool Succeeds()
+  bool Succeeds() { return m_Calls++ != m_pFile->m_FailingCall; }
+  bool Keep( const KVZ::VBufferList& i_rVideo, const KVZ::VBufferList& i_rAudio, uint64_t i_Key )
   {
-    const bool bSucceeds = m_Calls++ != m_pFile->m_FailingCall;
-    if( !bSucceeds && m_pFile->m_bThrows )
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    if( !IsOpen() || !m_pFile->m_bHeaded || !Succeeds() || m_pFile->m_FailingKeys.count( i_Key ) != 0 )
     {
-      throw std::bad_alloc();
+      return false;
     }
-    return bSucceeds;
-  }
-  static std::vector<uint8_t> BytesOf( const KVZ::VBufferList& i_rBuffers )
-  {
-    std::vector<uint8_t> Bytes;
-    for( const auto& pBuffer : i_rBuffers )
-    {
-      Bytes.insert( Bytes.end(), pBuffer->Data(), pBuffer->Data() + pBuffer->Size() );
-    }
-    return Bytes;
+    m_pFile->m_Addresses[i_Key] = i_rVideo.front()->Data();
+    m_pFile->m_Sound[i_Key] = TestSupport::BytesOf( i_rAudio );
+    return m_pFile->m_Frames.emplace( i_Key, TestSupport::BytesOf( i_rVideo ) ).second;
   }
 
   const std::shared_ptr<VFakeDisk> m_pDisk;
+  const KVZ::IVideoContainer::Enum m_Container;
+  boost::mutex m_Mutex;
+  std::atomic<int> m_InHand{ 0 };
   VFakeFile* m_pFile = nullptr;
   uint64_t m_Calls = 0;
 };

@@ -3,7 +3,7 @@
 
 #include "Flow2/Flow2Utils/FlowException.h"
 #include "Flow2/Flow2Utils/FlowNodeFactory.h"
-#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/FlowRig.h"
+#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
 #include "tests/support/FakeFlowServices.h"
 #include "tests/support/LogCapture.h"
 
@@ -90,8 +90,8 @@ protected:
     return Used;
   }
 
-  VFlowRig m_Rig{ 160 };
-  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.MakeManaged();
+  VVideoRig m_Rig{ 160 };
+  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make();
   const std::shared_ptr<VideoInputHAL::VVideoInputDataSourceMap> m_pSources = std::make_shared<VideoInputHAL::VVideoInputDataSourceMap>();
   const std::shared_ptr<TestSupport::VFakeFlowServices> m_pServices = std::make_shared<TestSupport::VFakeFlowServices>();
   std::shared_ptr<KVZ::IFlowNode> m_pNode;
@@ -227,30 +227,6 @@ TEST_F( FlowNodeVideoInput, AStallCostsAllButTenFramesEvenlySpread )
   EXPECT_EQ( Dropped + Number( Next[0], "DroppedBefore" ) + 11.0, FiveSeconds + 1.0 );
 }
 
-TEST_F( FlowNodeVideoInput, ARecordingLosesNothingWhileTheGraphIsHeldBack )
-{
-  Begin();
-  m_Rig.OnStrand( *m_pSource,
-    [&] {
-      m_pSource->StartCapture( { KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) }, At( 0 ), At( FiveSeconds ), false, 0 );
-    } );
-  std::vector<VFlowStatePtr> Held = Round();
-  for( int Count = 1; Count < FiveSeconds; ++Count )
-  {
-    m_Rig.DeliverMany( 1 );
-    m_Rig.m_pStrand->RunAll();
-    m_Rig.m_pWriterService->RunAll();
-  }
-  m_Rig.DeliverMany( 5 );
-  m_Rig.m_pStrand->RunAll();
-  m_Rig.m_pWriterService->RunAll();
-  ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
-  const auto Report = m_Rig.m_pTargets->Reports().front();
-  EXPECT_EQ( Report.m_FramesWritten, static_cast<uint64_t>( FiveSeconds ) ) << Report.m_Error;
-  EXPECT_FALSE( Report.m_bFailed );
-  EXPECT_LE( Round().size(), 10u );
-}
-
 TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
 {
   Begin();
@@ -287,35 +263,11 @@ TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
   EXPECT_EQ( UsedMemory(), 0.0 );
 }
 
-TEST_F( FlowNodeVideoInput, GoesOnInTheNextSession )
-{
-  Begin();
-  Drain();
-  m_Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
-  m_Rig.m_Timecode.m_Hours = 10;   // a clock appears: a new session
-  m_Rig.DeliverMany( 5 );
-  EXPECT_TRUE( Drain().empty() ) << "not of the session that it is in";
-  m_Rig.Join( *m_pSource, 2 );
-  auto States = Drain();
-  ASSERT_EQ( States.size(), 5u );
-  EXPECT_EQ( Item<KVZ::VFlowCameraHardware>( States[0] ).m_GlobalSession, KVZ::VGlobalSyncSessionId( 2 ) );
-  EXPECT_EQ( KVZ::ToText( Item<KVZ::VFlowVideoFrame>( States[4] ).m_Timecode ), "10:00:00:04" );
-
-  m_Rig.m_Timecode.m_Hours = 12;   // a jump
-  m_Rig.m_Format.m_Width = 16;     // and another format with it
-  m_Rig.DeliverMany( 3 );
-  m_Rig.Join( *m_pSource, 3 );
-  States = Drain();
-  ASSERT_EQ( States.size(), 3u );
-  EXPECT_EQ( Item<KVZ::VFlowCameraHardware>( States[0] ).m_GlobalSession, KVZ::VGlobalSyncSessionId( 3 ) );
-  EXPECT_EQ( Item<KVZ::VFlowVideoFrame>( States[0] ).m_Info.m_ImageWidth, 16u );
-}
-
 TEST_F( FlowNodeVideoInput, TakesItsDeviceFromGlobalItemsToo )
 {
   const TestSupport::VLogCapture Log( "", 2 );
-  VFlowRig Other;
-  const auto pOther = Other.MakeManaged();
+  VVideoRig Other;
+  const auto pOther = Other.Make();
   m_pSources->Insert( "vi:1", pOther );
   Begin();
   Drain();

@@ -3,7 +3,7 @@
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDevice.h"
 #include "host/FlowGraph.h"
-#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/FlowRig.h"
+#include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
 #include "tests/support/FakeDeckLink.h"
 
 #include <boost/thread/thread.hpp>
@@ -80,8 +80,8 @@ public:
 // between the look for frames and the sleep leaves the test waiting for ever.
 TEST( FlowNodeThreads, NoFrameComesUnnoticedWhileTheNodeGoesToSleep )
 {
-  VFlowRig Rig;
-  const auto pSource = Rig.MakeManaged();
+  VVideoRig Rig;
+  const auto pSource = Rig.Make();
   Rig.DeliverMany( 1 );
   Rig.Join( *pSource, 1 );
 
@@ -101,10 +101,10 @@ TEST( FlowNodeThreads, StatesAreMadeAndCapturesStartedWhileTheDeviceIsBusy )
 {
   namespace Fake = TestSupport::FakeDeckLink;
   const auto pAllocator = std::make_shared<VSlowAllocator>();   // frames name it, so it outlives them
-  VFlowRig Rig;
+  VVideoRig Rig;
   auto* const pCard = new Fake::VCard;
   const auto pDevice = KVZ::MakeShared<VideoInputHAL::VBlackmagicDeckLinkDevice>( pCard, 1, Rig.m_pStrand );
-  const auto pSource = Rig.MakeManaged( pDevice );
+  const auto pSource = Rig.Make( {}, pDevice );
   pAllocator->m_pFrames = Rig.m_pFrames;
   ASSERT_TRUE( pDevice->Initialise().Succeeded() );
   pDevice->SetAllocator( pAllocator );
@@ -122,10 +122,7 @@ TEST( FlowNodeThreads, StatesAreMadeAndCapturesStartedWhileTheDeviceIsBusy )
     Live.m_Graph.Start();
     Live.WaitForStates( 2 );
   }
-  Rig.OnStrand( *pSource,
-    [&] {
-      EXPECT_TRUE( pSource->StartCapture( { KVZ::VCaptureSessionId( 1 ), "Take", 0, KVZ::VGlobalSyncSessionId( 1 ) }, At( 0 ), At( 1 ), false, 0 ) );
-    } );
+  Rig.Start( *pSource, 1, 0, 1 );
   pAllocator->m_Opened.set_value();
   Card.join();
   pDevice->Close();

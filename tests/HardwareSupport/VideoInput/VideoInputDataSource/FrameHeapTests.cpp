@@ -37,7 +37,7 @@ namespace
 TEST( VideoFrameHeap, DeliveringTimedFramesWithTimecodeAllocatesNothing )
 {
   VVideoRig Rig;
-  const auto pSource = Rig.Make<VTestVideoSource>();
+  const auto pSource = Rig.Make();
   Rig.m_Timecode.m_Standard = KVZ::ITimecodeStandard::ETimecode25;
   uint64_t Notified = 0;   // as a client that records is
   pSource->Buffer()->NewDataCallback().AddImmediate( [&Notified]( KVZ::VBufferSessionId ) { ++Notified; } );

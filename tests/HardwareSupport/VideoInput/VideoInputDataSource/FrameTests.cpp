@@ -25,7 +25,7 @@ protected:
   }
 
   VVideoRig m_Rig;
-  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make<VTestVideoSource>();
+  std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make();
   SyncSystem::VRefCountedToken m_Pinned;
 };
 
@@ -46,27 +46,9 @@ TEST_F( VideoFrames, CarryTheirNumberAndASharedTimecode )
 
 TEST_F( VideoFrames, AnImpossibleTimecodeIsNoClock )
 {
-  const struct
-  {
-    KVZ::ITimecode m_Timecode;
-    bool m_bValid;
-  } Cases[] = {
-    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 23, 59, 59, 24 }, true },
-    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 24, 0, 0, 0 }, false },
-    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode30Drop, 0, 1, 0, 0 }, false },
-    { KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode30Drop, 0, 10, 0, 0 }, true },
-    { KVZ::ITimecode{ 6, 0, 0, 0, 0 }, false },
-  };
-  for( const auto& rCase : Cases )
-  {
-    m_Rig.m_NextIndex += 1000;   // always a new session
-    m_Rig.m_Timecode = rCase.m_Timecode;
-    ASSERT_TRUE( m_Rig.Deliver() );
-    EXPECT_EQ( StartClocks().m_TickByClock.size() == 3, rCase.m_bValid ) << KVZ::ToText( rCase.m_Timecode );
-  }
-  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 10, 0, 0, 0 };
-  m_Rig.DeliverMany( 3 );
-  m_Rig.m_Timecode = {};
+  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 23, 59, 59, 24 };
+  m_Rig.DeliverMany( 1 );
+  m_Rig.m_Timecode = KVZ::ITimecode{ KVZ::ITimecodeStandard::ETimecode25, 24, 0, 0, 0 };
   const TestSupport::VLogCapture Log( "CaptureBuffer" );
   ASSERT_TRUE( m_Rig.Deliver() );
   EXPECT_TRUE( Log.Has( "Buffer vi:0: New Sync Session. Clock Changes: Timecode Removed, (1 continuous)" ) );

@@ -16,14 +16,8 @@ class VBusySource
 public:
   explicit VBusySource( VVideoRig& io_rRig ) : m_rRig( io_rRig )
   {
-    VideoInputHAL::VVideoInputDataSourceOptions Options;
-    auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
-    pFactory->Register( KVZ::IVideoContainer::ETVID, [pDisk = m_rRig.m_pDisk]( auto, auto ) { return std::make_shared<VFakeWriter>( pDisk ); } );
-    Options.m_pWriterFactory = pFactory;
-    m_rRig.m_pFrames = std::make_shared<VideoInputHAL::VVideoInputDataSourceAllocator>( m_rRig.m_Memory.m_pAllocator );
-    m_pSource = KVZ::MakeShared<VTestVideoSource>( nullptr, m_rRig.m_pDevice, m_rRig.m_pFrames, nullptr, nullptr, m_rRig.m_pTargets, m_rRig.m_pTime,
-      Options );
-    m_rRig.m_pSource = m_pSource;
+    m_rRig.m_bThreads = true;
+    m_pSource = m_rRig.Make();
     m_rRig.m_pTime->m_Now = 5.0;
   }
 
@@ -138,7 +132,7 @@ TEST( VideoInputDataSourceThreads, EveryFileHoldsAnUnbrokenRun )
     EXPECT_EQ( rFile.m_Closes, 1 ) << Path;
     for( size_t Index = 1; Index < rFile.m_Frames.size(); ++Index )
     {
-      ASSERT_EQ( rFile.m_Frames[Index], std::vector<uint8_t>( 64, static_cast<uint8_t>( rFile.m_Frames[0][0] + Index ) ) ) << Path;
+      ASSERT_EQ( rFile.m_Frames.at( Index ), std::vector<uint8_t>( 64, static_cast<uint8_t>( rFile.m_Frames.at( 0 )[0] + Index ) ) ) << Path;
     }
     Whole += rFile.m_Frames.size() == 12 ? 1 : 0;
   }

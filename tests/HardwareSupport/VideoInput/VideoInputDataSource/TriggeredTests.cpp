@@ -135,12 +135,15 @@ TEST( TriggeredSourceWithoutATimer, SaysSo )
 
 TEST_F( TriggeredSource, OffersASessionOfItsOwnPeriod )
 {
+  const TestSupport::VLogCapture Log( "Hal.vi:0" );
   boost::optional<KVZ::ISourceSyncSession> Session;
   OnStrand( [&] { Session = m_pSource->DeclareGlobalSyncSession( KVZ::VGlobalSyncSessionId( 1 ), nullptr ); } );
   ASSERT_TRUE( Session );
   EXPECT_EQ( Session->m_Period, VTick( 2700000 ) );
   EXPECT_EQ( Session->m_BeatPeriod, VTick( 2700000 ) );
   EXPECT_EQ( Session->Validate(), "" );
+  EXPECT_TRUE( Log.Has( "Creating new triggered buffer session 1" ) );
+  EXPECT_TRUE( Log.Has( "DeclareGlobalSyncSession(1): Source prepping for Triggered session - will use source sync session 1" ) );
 }
 
 }

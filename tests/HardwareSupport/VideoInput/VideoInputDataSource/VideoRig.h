@@ -2,6 +2,7 @@
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDataSource/VideoInputDataSource.h"
+#include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDeviceManager.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 
 #include "tests/HardwareSupport/VideoInput/VideoInputDataSource/FakeWriter.h"
@@ -78,6 +79,18 @@ private:
   NotificationSystem::VMultiCallbackPostal<void()> m_Changed;
 };
 
+class VOneDeviceDriver : public VideoInputHAL::IVideoInputDriver
+{
+public:
+  explicit VOneDeviceDriver( std::shared_ptr<VideoInputHAL::IVideoInputDevice> i_pDevice ) : m_pDevice( std::move( i_pDevice ) ) {}
+  VDeviceCallback& GetDeviceArrivedCallback() override { return m_Arrived; }
+  void StartDiscovery() override { m_Arrived( m_pDevice ); }
+
+private:
+  const std::shared_ptr<VideoInputHAL::IVideoInputDevice> m_pDevice;
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<VideoInputHAL::IVideoInputDevice> )> m_Arrived;
+};
+
 class VTestVideoSource : public VVideoInputDataSource
 {
 public:
@@ -101,21 +114,28 @@ class VVideoRig
 public:
   explicit VVideoRig( size_t i_Frames = 80 ) : m_Memory( i_Frames / 4, 4, 9000 ) { m_pTargets->m_Folder = m_Folder.File( "takes" ); }
 
-  // Any source class with the constructor of a data source.
-  template<class TSource>
-  std::shared_ptr<TSource> Make( VideoInputHAL::VVideoInputDataSourceOptions i_Options = {} )
+  // Any source class with the constructor of a data source, for the rig's device or another one, which a manager knows.
+  template<class TSource = VTestVideoSource>
+  std::shared_ptr<TSource> Make( VideoInputHAL::VVideoInputDataSourceOptions i_Options = {},
+    std::shared_ptr<VideoInputHAL::IVideoInputDevice> i_pDevice = nullptr )
   {
+    const auto pDevice = i_pDevice ? i_pDevice : m_pDevice;
+    m_pManager = KVZ::MakeShared<VideoInputHAL::VVideoInputDeviceManager>(
+      std::vector<VideoInputHAL::VDriverMaker>{ [pDevice] { return std::make_shared<VOneDeviceDriver>( pDevice ); } } );
+    m_pManager->StartDiscovery();
     m_pFrames = std::make_shared<VideoInputHAL::VVideoInputDataSourceAllocator>( m_Memory.m_pAllocator );
     auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
-    for( const auto Container : { KVZ::IVideoContainer::ETVID, KVZ::IVideoContainer::EMOV } )
+    for( const auto Container : { KVZ::IVideoContainer::ETVID, KVZ::IVideoContainer::EMOV, KVZ::IVideoContainer::EIMAGES } )
     {
-      pFactory->Register( Container, [pDisk = m_pDisk]( auto, auto ) { return std::make_shared<VFakeWriter>( pDisk ); } );
+      pFactory->Register( Container, [pDisk = m_pDisk, Container]( auto, auto ) { return std::make_shared<VFakeWriter>( pDisk, Container ); } );
     }
-    i_Options.m_pWriterFactory = i_Options.m_pWriterFactory ? i_Options.m_pWriterFactory : pFactory;
-    i_Options.m_pPostalService = m_pStrand;
-    i_Options.m_MakeWriterService = i_Options.m_MakeWriterService ? i_Options.m_MakeWriterService
-                                                                  : [pService = m_pWriterService] { return pService; };
-    const auto pSource = KVZ::MakeShared<TSource>( nullptr, m_pDevice, m_pFrames, m_pService, m_pService, m_pTargets, m_pTime, i_Options );
+    i_Options.m_pWriterFactory = pFactory;
+    if( !m_bThreads )
+    {
+      i_Options.m_pPostalService = m_pStrand;
+      i_Options.m_MakeWriterService = [pService = m_pWriterService] { return pService; };
+    }
+    const auto pSource = KVZ::MakeShared<TSource>( m_pManager, pDevice, m_pFrames, m_pService, m_pService, m_pTargets, m_pTime, i_Options );
     m_pSource = pSource;
     return pSource;
   }
@@ -202,6 +222,17 @@ public:
     m_pStrand->RunAll();
   }
 
+  // A streamed capture of session 1.
+  void Start( VTestVideoSource& i_rSource, uint32_t i_Id, int64_t i_First, int64_t i_End, const std::string& i_rName = "Take" )
+  {
+    const KVZ::ICaptureHeader Header{ KVZ::VCaptureSessionId( i_Id ), i_rName, 0, KVZ::VGlobalSyncSessionId( 1 ) };
+    OnStrand( i_rSource, [&] { EXPECT_TRUE( i_rSource.StartCapture( Header, At( i_First ), At( i_End ), false, 0 ) ); } );
+  }
+  void Cancel( VTestVideoSource& i_rSource )
+  {
+    OnStrand( i_rSource, [&] { i_rSource.CancelCapture(); } );
+  }
+
   std::string Path( const std::string& i_rName = "Take", const std::string& i_rExtension = "tvid" ) const
   {
     return m_Folder.File( "takes/" + i_rName + "_Label." + i_rExtension );
@@ -217,7 +248,9 @@ public:
   const std::shared_ptr<VCountedService> m_pService = std::make_shared<VCountedService>();
   const std::shared_ptr<VFakeDisk> m_pDisk = std::make_shared<VFakeDisk>();
   std::shared_ptr<VideoInputHAL::VVideoInputDataSourceAllocator> m_pFrames;
+  std::shared_ptr<VideoInputHAL::VVideoInputDeviceManager> m_pManager;
   std::shared_ptr<VVideoInputDataSource> m_pSource;
+  bool m_bThreads = false;   // the source makes services of its own
   VFrameFormat m_Format;
   KVZ::ITimecode m_Timecode;   // of the next frame
   uint32_t m_NextIndex = 0;
