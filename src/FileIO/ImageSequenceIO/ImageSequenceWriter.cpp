@@ -27,8 +27,12 @@ bool VImageSequenceWriter::DoOpen( const std::string& i_rPath )
   const std::string Folder = Slash == std::string::npos ? "." : i_rPath.substr( 0, Slash + 1 );
   const std::string Pattern = Slash == std::string::npos ? i_rPath : i_rPath.substr( Slash + 1 );
   boost::system::error_code Error;
-  boost::filesystem::create_directories( Folder, Error );
-  if( Error || Pattern.empty() || !boost::filesystem::is_directory( Folder, Error ) )
+  // Only where it is missing: the library makes an error of "."
+  if( !boost::filesystem::is_directory( Folder, Error ) )
+  {
+    boost::filesystem::create_directories( Folder, Error );
+  }
+  if( Pattern.empty() || !boost::filesystem::is_directory( Folder, Error ) )
   {
     KVZ_LOG_ERROR( Category(), "File could not be opened." );
     return false;
