@@ -1,6 +1,5 @@
 // What OpenGL cannot do, and what becomes of the frame then.
 #include "tests/CoreVideoUtilsOpenGL/Images.h"
-#include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 
 #include <QtGui/QOffscreenSurface>
@@ -8,7 +7,6 @@
 
 #include <boost/filesystem/operations.hpp>
 
-#include <algorithm>
 #include <fstream>
 
 using namespace OpenGLTests;
@@ -19,25 +17,11 @@ namespace
 
 constexpr char LensText[] = "Lens un-distortion not supported in software conversion.";
 
-size_t CountBeginningWith( const TestSupport::VLogCapture& i_rLog, const std::string& i_rText )
-{
-  const auto Texts = i_rLog.Texts();
-  return static_cast<size_t>(
-    std::count_if( Texts.begin(), Texts.end(), [&]( const std::string& i_rLine ) { return i_rLine.compare( 0, i_rText.size(), i_rText ) == 0; } ) );
-}
-
-KVZ::VLensDistortionRecord SomeLens()
-{
-  KVZ::VLensDistortionRecord Lens;
-  Lens.m_RadialModel = KVZ::VLensDistortionRecord::ETarvo2Parameter;
-  Lens.m_Centre = { 24.0, 8.0 };
-  Lens.m_Parameters = { 1e-4, 0.0, 0.0 };
-  return Lens;
-}
+const VLensDistortionRecord Lens = MakeLensRecord( { 24.0, 8.0 }, { 1e-4, 0.0, 0.0 } );
 
 }
 
-TEST( OpenGLFailure, RefusesOtherOutputsAndShortBuffers )
+TEST( OpenGLFailure, RefusesOtherFormatsShortBuffersAndImagesWiderThanTextures )
 {
   VPixelFormatConverterOpenGL Converter( {} );
   for( const IPixelFormat::Enum Target : { IPixelFormat::EU8Y8V8Y8, IPixelFormat::EBayerGB7, IPixelFormat::EUnspecified } )
@@ -45,20 +29,15 @@ TEST( OpenGLFailure, RefusesOtherOutputsAndShortBuffers )
     EXPECT_FALSE( Convert( Converter, MakeNoise( IPixelFormat::ER8G8B8, 16, 8 ), Target ) );
   }
   EXPECT_FALSE( Convert( Converter, MakeNoise( IPixelFormat::EUnspecified, 16, 8 ), IPixelFormat::ER8G8B8 ) );
-  const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 16, 8 );
-  VBytes Target( 16 * 8 * 4 );
-  EXPECT_FALSE( Converter.Convert( Image.m_Info, Image.m_Bytes.data(), 16 * 8 * 3 - 1, IPixelFormat::EB8G8R8u8, Target.data(), Target.size() ) );
-  EXPECT_FALSE( Converter.Convert( Image.m_Info, Image.m_Bytes.data(), 16 * 8 * 3, IPixelFormat::EB8G8R8u8, Target.data(), Target.size() - 1 ) );
-  EXPECT_TRUE( Converter.Convert( Image.m_Info, Image.m_Bytes.data(), 16 * 8 * 3, IPixelFormat::EB8G8R8u8, Target.data(), Target.size() ) );
-}
-
-// Wider than any texture. Images without pixels are done at once.
-TEST( OpenGLFailure, RefusesImagesOfSizesThatTexturesCannotHave )
-{
-  VPixelFormatConverterOpenGL Converter( {} );
   EXPECT_FALSE( Convert( Converter, MakeNoise( IPixelFormat::ELuminance8, 70000, 1 ), IPixelFormat::ER8G8B8 ) );
   EXPECT_TRUE( Convert( Converter, MakeNoise( IPixelFormat::ELuminance8, 0, 4 ), IPixelFormat::ER8G8B8 ) );
-  EXPECT_TRUE( Convert( Converter, MakeNoise( IPixelFormat::ELuminance8, 4, 4 ), IPixelFormat::ER8G8B8 ) );
+  const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 16, 8 );
+  VBytes Target( 16 * 8 * 4 );
+  const auto Run = [&]( size_t i_SourceSize, size_t i_TargetSize )
+  { return Converter.Convert( Image.m_Info, Image.m_Bytes.data(), i_SourceSize, IPixelFormat::EB8G8R8u8, Target.data(), i_TargetSize ); };
+  EXPECT_FALSE( Run( 16 * 8 * 3 - 1, Target.size() ) );
+  EXPECT_FALSE( Run( 16 * 8 * 3, Target.size() - 1 ) );
+  EXPECT_TRUE( Run( 16 * 8 * 3, Target.size() ) );
 }
 
 // Where OpenGL is wanted for the lens alone, the software converter takes what it cannot do, and says what is missing.
@@ -69,8 +48,7 @@ TEST( OpenGLFailure, LeavesOtherOutputsToSoftwareWhereItMay )
   const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 48, 16 );
   EXPECT_TRUE( Convert( Converter, Image, IPixelFormat::EU8Y8V8Y8 ) );
   EXPECT_EQ( 0u, Log.Count( LensText ) );
-  Converter.SetLensCorrection( SomeLens() );
-  Converter.SetLensCorrectionEnabled( true );
+  SetLens( Converter, Lens );
   EXPECT_EQ( InSoftware( Image, IPixelFormat::EU8Y8V8Y8 ), Convert( Converter, Image, IPixelFormat::EU8Y8V8Y8 ) );
   EXPECT_EQ( 1u, Log.Count( LensText ) );
 }
@@ -85,8 +63,7 @@ TEST( OpenGLFailure, ConvertsInSoftwareWithoutAContext )
     const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
     VPixelFormatConverterOpenGL Converter( { Use } );
     Converter.SetColourCorrection( { 0.5f, 1.5f } );
-    Converter.SetLensCorrection( SomeLens() );
-    Converter.SetLensCorrectionEnabled( true );
+    SetLens( Converter, Lens );
     const VImage Image = MakeNoise( IPixelFormat::EBayerRG8, 48, 16 );
     for( int Round = 0; Round < 2; ++Round )
     {
@@ -113,8 +90,7 @@ TEST( OpenGLFailure, GoesOnAfterAContextIsLost )
           dynamic_cast<QOffscreenSurface&>( *QOpenGLContext::currentContext()->surface() ).destroy();
         }
       } } );
-    Converter.SetLensCorrection( SomeLens() );
-    Converter.SetLensCorrectionEnabled( true );
+    SetLens( Converter, Lens );
     const std::optional<VBytes> Drawn = Convert( Converter, Image, IPixelFormat::ER8G8B8 );
     ASSERT_TRUE( Drawn );
     bLose = false;

@@ -3,6 +3,8 @@
 
 #include "CoreVideoUtils/PixelFormatConverter.h"
 #include "CoreVideoUtilsOpenGL/PixelFormatConverterOpenGL.h"
+#include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
@@ -20,7 +22,8 @@ namespace OpenGLTests
 using CoreVideoUtilsOpenGL::EUse;
 using CoreVideoUtilsOpenGL::VPixelFormatConverterOpenGL;
 using KVZ::IPixelFormat;
-using VBytes = std::vector<uint8_t>;
+using KVZ::VLensDistortionRecord;
+using TestSupport::VBytes;
 
 // Another value of a variable while it lives.
 class VOtherVariable
@@ -56,22 +59,15 @@ inline size_t SizeOf( IPixelFormat::Enum i_Format, const KVZ::VideoFrameInfo& i_
 
 inline VImage MakeImage( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
 {
-  VImage Image;
-  Image.m_Info.m_PixelFormat = i_Format;
-  Image.m_Info.m_ImageWidth = i_Width;
-  Image.m_Info.m_ImageHeight = i_Height;
-  Image.m_Bytes.resize( SizeOf( i_Format, Image.m_Info ) );
-  return Image;
+  const KVZ::VideoFrameInfo Info = TestSupport::VideoInfo( i_Format, i_Width, i_Height );
+  return { Info, VBytes( SizeOf( i_Format, Info ) ) };
 }
 
 inline VImage MakeNoise( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height )
 {
   std::mt19937 Random( i_Width * 31 + i_Height );
   VImage Image = MakeImage( i_Format, i_Width, i_Height );
-  for( uint8_t& rByte : Image.m_Bytes )
-  {
-    rByte = static_cast<uint8_t>( Random() >> 8 );
-  }
+  Image.m_Bytes = TestSupport::Noise( Image.m_Bytes.size(), Random() );
   if( i_Format == IPixelFormat::EU8Y8V8Y8 || i_Format == IPixelFormat::EY8U8Y8V8 )
   {
     std::replace( Image.m_Bytes.begin(), Image.m_Bytes.end(), uint8_t{ 0 }, uint8_t{ 1 } );   // the signal's timing, as below
@@ -115,21 +111,42 @@ inline VBytes InOpenGL( const VImage& i_rImage, IPixelFormat::Enum i_Target, con
   return Convert( Converter, i_rImage, i_Target ).value_or( VBytes() );
 }
 
-// Colour formats with a fourth byte have nothing to compare there.
-inline bool HasFourthByte( IPixelFormat::Enum i_Format ) { return i_Format == IPixelFormat::ER8G8B8u8 || i_Format == IPixelFormat::EB8G8R8u8; }
-
-// The largest difference of two images of the same format; 256 where they are not of one size.
-inline int LargestDifference( const VBytes& i_rA, const VBytes& i_rB, bool i_bFourthByte = false )
+inline VLensDistortionRecord MakeLensRecord( std::array<double, 2> i_Centre, std::array<double, 3> i_Parameters )
 {
-  int Largest = i_rA.size() == i_rB.size() && !i_rA.empty() ? 0 : 256;
-  for( size_t Index = 0; Largest != 256 && Index < i_rA.size(); ++Index )
+  return { VLensDistortionRecord::ETarvo3Parameter, i_Centre, i_Parameters };
+}
+
+inline void SetLens( VPixelFormatConverterOpenGL& i_rConverter, const VLensDistortionRecord& i_rLens )
+{
+  i_rConverter.SetLensCorrection( i_rLens );
+  i_rConverter.SetLensCorrectionEnabled( true );
+}
+
+inline VBytes Corrected( const VImage& i_rImage, IPixelFormat::Enum i_Target, const VLensDistortionRecord& i_rLens, EUse i_Use = EUse::Always )
+{
+  VPixelFormatConverterOpenGL Converter( { i_Use } );
+  SetLens( Converter, i_rLens );
+  return Convert( Converter, i_rImage, i_Target ).value_or( VBytes() );
+}
+
+// The largest difference of two images; 256 where they are not of one size. A fourth byte that is no colour must be a half in the second one.
+inline int LargestDifference( const VBytes& i_rExpected, const VBytes& i_rDrawn, bool i_bFourthByte = false )
+{
+  int Largest = i_rExpected.size() == i_rDrawn.size() && !i_rExpected.empty() ? 0 : 256;
+  for( size_t Index = 0; Largest != 256 && Index < i_rDrawn.size(); ++Index )
   {
-    if( !i_bFourthByte || Index % 4 != 3 )
-    {
-      Largest = std::max( Largest, std::abs( i_rA[Index] - i_rB[Index] ) );
-    }
+    const int Drawn = i_rDrawn[Index];
+    const bool bColour = !i_bFourthByte || Index % 4 != 3;
+    Largest = std::max( Largest, bColour ? std::abs( i_rExpected[Index] - Drawn ) : ( Drawn == 127 || Drawn == 128 ? 0 : 256 ) );
   }
   return Largest;
+}
+
+inline size_t CountBeginningWith( const TestSupport::VLogCapture& i_rLog, const std::string& i_rText )
+{
+  const auto Texts = i_rLog.Texts();
+  return static_cast<size_t>(
+    std::count_if( Texts.begin(), Texts.end(), [&]( const std::string& i_rLine ) { return i_rLine.compare( 0, i_rText.size(), i_rText ) == 0; } ) );
 }
 
 }

@@ -4,33 +4,14 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstdio>
 
 using namespace OpenGLTests;
 using namespace CoreVideoUtilsOpenGL;
-using KVZ::VLensDistortionRecord;
 
 namespace
 {
 
 using VPoint = std::array<double, 2>;
-
-VLensDistortionRecord MakeRecord( VPoint i_Centre, std::array<double, 3> i_Parameters )
-{
-  VLensDistortionRecord Record;
-  Record.m_RadialModel = VLensDistortionRecord::ETarvo3Parameter;
-  Record.m_Centre = i_Centre;
-  Record.m_Parameters = i_Parameters;
-  return Record;
-}
-
-VBytes Corrected( const VImage& i_rImage, IPixelFormat::Enum i_Target, const VLensDistortionRecord& i_rLens, EUse i_Use = EUse::Always )
-{
-  VPixelFormatConverterOpenGL Converter( { i_Use } );
-  Converter.SetLensCorrection( i_rLens );
-  Converter.SetLensCorrectionEnabled( true );
-  return Convert( Converter, i_rImage, i_Target ).value_or( VBytes() );
-}
 
 VPoint Mix( const VPoint& i_rA, const VPoint& i_rB, double i_Part )
 {
@@ -71,7 +52,6 @@ double ErrorOfMesh( const VLens& i_rLens, uint32_t i_Width, uint32_t i_Height )
       Largest = std::max( Largest, ErrorOfCell( i_rLens, { Column * Cell[0], Row * Cell[1] }, { ( Column + 1 ) * Cell[0], ( Row + 1 ) * Cell[1] } ) );
     }
   }
-  std::printf( "mesh of %u by %u cells: %.4f pixels\n", Cells.m_Columns, Cells.m_Rows, Largest );
   return Largest;
 }
 
@@ -104,7 +84,7 @@ TEST( Lens, MovesPixelsAwayFromTheCentreOrTowardsIt )
   constexpr uint32_t Size = 256;
   for( const double K : { -4e-6, 4e-6 } )
   {
-    const VLensDistortionRecord Record = MakeRecord( { 100.0, 140.0 }, { K, K * 1e-5, 0.0 } );
+    const VLensDistortionRecord Record = MakeLensRecord( { 100.0, 140.0 }, { K, K * 1e-5, 0.0 } );
     const VLens Lens = MakeLens( Record );
     for( const size_t Axis : { size_t{ 0 }, size_t{ 1 } } )
     {
@@ -138,7 +118,7 @@ TEST( Lens, LeavesBlackWhereThereIsNoImage )
 {
   VImage White = MakeImage( IPixelFormat::ER8G8B8, 64, 64 );
   std::fill( White.m_Bytes.begin(), White.m_Bytes.end(), uint8_t{ 255 } );
-  const VBytes Shrunk = Corrected( White, IPixelFormat::ER8G8B8u8, MakeRecord( { 32.0, 32.0 }, { -1e-4, 0.0, 0.0 } ) );
+  const VBytes Shrunk = Corrected( White, IPixelFormat::ER8G8B8u8, MakeLensRecord( { 32.0, 32.0 }, { -1e-4, 0.0, 0.0 } ) );
   ASSERT_EQ( 64u * 64 * 4, Shrunk.size() );
   EXPECT_EQ( 0, Shrunk[0] );
   EXPECT_NEAR( 127.5, Shrunk[3], 1.0 );
@@ -149,16 +129,16 @@ TEST( Lens, CorrectsNothingWithItsCentreAtTheOriginOrWithoutAModel )
 {
   const VImage Image = MakeNoise( IPixelFormat::EBayerGB8, 96, 40 );
   const VBytes Plain = InOpenGL( Image, IPixelFormat::ER8G8B8 );
-  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 0.0, 0.0 }, { 1e-3, 1e-3, 1.0 } ) ) );
-  VLensDistortionRecord Bad = MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } );
+  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeLensRecord( { 0.0, 0.0 }, { 1e-3, 1e-3, 1.0 } ) ) );
+  VLensDistortionRecord Bad = MakeLensRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } );
   EXPECT_NE( Plain, Corrected( Image, IPixelFormat::ER8G8B8, Bad ) );
   Bad.m_RadialModel = VLensDistortionRecord::EBadRadialModel;
   EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, Bad ) );
-  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 48.0, NAN }, { 1e-4, 0.0, 0.0 } ) ) );
+  EXPECT_EQ( Plain, Corrected( Image, IPixelFormat::ER8G8B8, MakeLensRecord( { 48.0, NAN }, { 1e-4, 0.0, 0.0 } ) ) );
 
-  VLensDistortionRecord Two = MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 1e-8 } );
+  VLensDistortionRecord Two = MakeLensRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 1e-8 } );
   Two.m_RadialModel = VLensDistortionRecord::ETarvo2Parameter;
-  EXPECT_EQ( Corrected( Image, IPixelFormat::ER8G8B8, MakeRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } ) ),
+  EXPECT_EQ( Corrected( Image, IPixelFormat::ER8G8B8, MakeLensRecord( { 48.0, 20.0 }, { 1e-4, 0.0, 0.0 } ) ),
     Corrected( Image, IPixelFormat::ER8G8B8, Two ) );
 }
 
@@ -175,7 +155,7 @@ TEST( Lens, StaysWhereItIsWhenTheImageIsInverted )
       BottomUp.m_Bytes.begin() + static_cast<std::ptrdiff_t>( ( 29 - Row ) * 120 ) );
   }
   EXPECT_EQ( Image.m_Bytes, InOpenGL( BottomUp, IPixelFormat::ER8G8B8 ) );
-  const VLensDistortionRecord Record = MakeRecord( { 20.0, 8.0 }, { 1e-4, 0.0, 0.0 } );
+  const VLensDistortionRecord Record = MakeLensRecord( { 20.0, 8.0 }, { 1e-4, 0.0, 0.0 } );
   EXPECT_LE( LargestDifference( Corrected( Image, IPixelFormat::ER8G8B8, Record ), Corrected( BottomUp, IPixelFormat::ER8G8B8, Record ) ), 2 );
 }
 
@@ -185,7 +165,7 @@ TEST( Lens, IsAllThatOpenGLIsUsedForWhereItIsAskedForThat )
   const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 40, 30 );
   VPixelFormatConverterOpenGL Converter( { EUse::LensAlone } );
   EXPECT_EQ( InSoftware( Image, IPixelFormat::EB8G8R8u8 ), Convert( Converter, Image, IPixelFormat::EB8G8R8u8 ) );
-  const VLensDistortionRecord Record = MakeRecord( { 20.0, 15.0 }, { 1e-4, 0.0, 0.0 } );
+  const VLensDistortionRecord Record = MakeLensRecord( { 20.0, 15.0 }, { 1e-4, 0.0, 0.0 } );
   const VBytes Drawn = Corrected( Image, IPixelFormat::EB8G8R8u8, Record, EUse::LensAlone );
   EXPECT_EQ( Corrected( Image, IPixelFormat::EB8G8R8u8, Record ), Drawn );
   EXPECT_NE( InSoftware( Image, IPixelFormat::EB8G8R8u8 ), Drawn );
