@@ -10,10 +10,8 @@
 
 #include <atomic>
 #include <fstream>
-#include <numeric>
 #include <random>
 
-using ImageMagickWrapper::VFunctions;
 using KVZ::IPixelFormat;
 using UtilsMemory::VByteVector;
 
@@ -73,30 +71,20 @@ bool ComesBack( const VKind& i_rKind, const VImage& i_rImage )
   return Write( i_rKind, i_rImage, File ) && ::Read( i_rKind, File, Read ) && Read.m_Info == i_rImage.m_Info && Read.m_Pixels == i_rImage.m_Pixels;
 }
 
-// Every channel of an image through a wand, with the given type.
-VByteVector MakeForeignFile( const VKind& i_rKind, const char* i_pMap, int i_Type, const std::vector<uint8_t>& i_rPixels, size_t i_Width )
-{
-  const VFunctions& r = *Library().Functions();
-  ImageMagickWrapper::MagickWand* const pWand = r.NewMagickWand();
-  const size_t Height = i_rPixels.size() / i_Width / std::string( i_pMap ).size();
-  EXPECT_EQ( r.MagickConstituteImage( pWand, i_Width, Height, i_pMap, ImageMagickWrapper::CharPixel, i_rPixels.data() ), 1 );
-  r.MagickSetImageDepth( pWand, 8 );
-  r.MagickSetImageFormat( pWand, i_rKind.m_pName );
-  r.MagickSetImageType( pWand, i_Type );
-  size_t Size = 0;
-  unsigned char* const pBlob = r.MagickGetImageBlob( pWand, &Size );
-  const VByteVector File( pBlob, pBlob + Size );
-  r.MagickRelinquishMemory( pBlob );
-  r.DestroyMagickWand( pWand );
-  return File;
-}
-
-// What another program sees in a file, in our pixel format.
-std::string ReadWith( const std::vector<std::string>& i_rCommand )
+// What another program writes to its standard output
+std::string OutputOf( const std::vector<std::string>& i_rCommand )
 {
   const TestSupport::VRunResult Result = TestSupport::RunProgram( i_rCommand );
   EXPECT_EQ( Result.m_ExitCode, 0 ) << Result.m_Error;
   return Result.m_Output;
+}
+
+// Ten by ten pixels: the first colour on the left, the second on the right.
+VByteVector MakeForeignFile( const VKind& i_rKind, const std::string& i_rType, const std::string& i_rLeft, const std::string& i_rRight )
+{
+  const std::string File = OutputOf(
+    { "convert", "-size", "5x10", "xc:" + i_rLeft, "xc:" + i_rRight, "+append", "-type", i_rType, i_rKind.m_pName + std::string( ":-" ) } );
+  return { File.begin(), File.end() };
 }
 
 }
@@ -119,9 +107,9 @@ TEST( ImageFiles, ComeBackBitExactFromOurReaderAndOthers )
       std::ofstream( Path, std::ios::binary ).write( reinterpret_cast<const char*>( File.data() ), static_cast<std::streamsize>( File.size() ) );
       const std::string Pixels( Image.m_Pixels.begin(), Image.m_Pixels.end() );
       EXPECT_TRUE(
-        ReadWith( { "ffmpeg", "-nostdin", "-v", "error", "-i", Path, "-f", "rawvideo", "-pix_fmt", bGrey ? "gray" : "rgb24", "-" } ) == Pixels );
-      EXPECT_TRUE( ReadWith( { "convert", Path, "-depth", "8", bGrey ? "gray:-" : "rgb:-" } ) == Pixels );
-      EXPECT_EQ( ReadWith( { "identify", "-format", "%m %w %h %z", Path } ), rKind.m_pIdentity );
+        OutputOf( { "ffmpeg", "-nostdin", "-v", "error", "-i", Path, "-f", "rawvideo", "-pix_fmt", bGrey ? "gray" : "rgb24", "-" } ) == Pixels );
+      EXPECT_TRUE( OutputOf( { "convert", Path, "-depth", "8", bGrey ? "gray:-" : "rgb:-" } ) == Pixels );
+      EXPECT_EQ( OutputOf( { "identify", "-format", "%m %w %h %z", Path } ), rKind.m_pIdentity );
     }
   }
 }
@@ -130,33 +118,29 @@ TEST( ImageFiles, OfFewColoursComeBackInColour )
 {
   for( const VKind& rKind : Kinds )
   {
-    std::vector<uint8_t> Pixels;
-    while( Pixels.size() < 300 )
-    {
-      Pixels.insert( Pixels.end(), { 255, 0, 10, 20, 90, 200 } );
-    }
     VImage Image;
-    ASSERT_TRUE( Read( rKind, MakeForeignFile( rKind, "RGB", ImageMagickWrapper::ImageType::Palette, Pixels, 10 ), Image ) );
+    ASSERT_TRUE( Read( rKind, MakeForeignFile( rKind, "Palette", "#FF000A", "#145AC8" ), Image ) );
     EXPECT_EQ( Image.m_Info.m_PixelFormat, IPixelFormat::ER8G8B8 );
     EXPECT_EQ( Image.m_Info.m_ImageHeight, 10u );
-    EXPECT_EQ( std::vector<uint8_t>( Image.m_Pixels.begin(), Image.m_Pixels.end() ), Pixels );
+    ASSERT_EQ( Image.m_Pixels.size(), 300u );
+    const VByteVector Middle( Image.m_Pixels.begin() + 30 * 5 + 12, Image.m_Pixels.begin() + 30 * 5 + 18 );
+    EXPECT_EQ( Middle, ( VByteVector{ 0xFF, 0x00, 0x0A, 0x14, 0x5A, 0xC8 } ) );
   }
 }
 
 TEST( ImageFiles, RefusalsSayWhy )
 {
-  constexpr int TrueColorWithAlpha = 7;
   for( const VKind& rKind : Kinds )
   {
     const TestSupport::VLogCapture Log( rKind.m_pCategory );
     const VByteVector Kept{ 1, 2, 3 };
     VByteVector File = Kept;
-    // What the library is not asked about
+    // What the library is not asked about: formats, short buffers, and sides that would end the process
+    const VImage Whole = MakeImage( IPixelFormat::ER8G8B8, 4, 4 );
     EXPECT_FALSE( Write( rKind, MakeImage( IPixelFormat::EB8G8R8, 4, 4 ), File ) );
-    VImage Short = MakeImage( IPixelFormat::ER8G8B8, 4, 4 );
+    VImage Short = Whole;
     Short.m_Pixels.pop_back();
     EXPECT_FALSE( Write( rKind, Short, File ) );
-    // What would end the process
     for( const uint32_t Side : { 0u, 17000u } )
     {
       VImage Odd = MakeImage( IPixelFormat::ELuminance8, 17000, 1 );
@@ -165,15 +149,12 @@ TEST( ImageFiles, RefusalsSayWhy )
     }
     EXPECT_TRUE( Log.Texts().empty() );
     // What it does not like
-    const VImage Whole = MakeImage( IPixelFormat::ER8G8B8, 4, 4 );
     const ImageMagickWrapper::VFileKind NoKind{ "nosuchformat", rKind.m_pCategory };
     EXPECT_FALSE( ImageMagickWrapper::EncodeImage( Library(), NoKind, Whole.m_Pixels.data(), Whole.m_Pixels.size(), Whole.m_Info, File ) );
     EXPECT_EQ( File, Kept );
     VImage Image;
     EXPECT_FALSE( Read( rKind, Kept, Image ) );
-    std::vector<uint8_t> Pixels( 64 );
-    std::iota( Pixels.begin(), Pixels.end(), uint8_t{ 7 } );
-    EXPECT_FALSE( Read( rKind, MakeForeignFile( rKind, "RGBA", TrueColorWithAlpha, Pixels, 4 ), Image ) );
+    EXPECT_FALSE( Read( rKind, MakeForeignFile( rKind, "TrueColorMatte", "#FF000A80", "#145AC840" ), Image ) );
     EXPECT_TRUE( Image.m_Info.IsEmpty() );
     const std::vector<std::string> Texts = Log.Texts();
     ASSERT_EQ( Texts.size(), 3u );

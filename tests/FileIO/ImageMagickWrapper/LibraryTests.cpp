@@ -62,34 +62,17 @@ TEST_F( Library, FaultsOfOpeningAreToldOnce )
   }
 }
 
-TEST_F( Library, TakesTheFirstOfItsNamesThatIsThere )
-{
-  const std::vector<std::string> Names = SystemPlaces().m_Libraries;
-  VPlaces Places{ { "libNoMagickWand.so.1" } };
-  Places.m_Libraries.insert( Places.m_Libraries.end(), Names.begin(), Names.end() );
-  const VLibrary Found( Places, Category );
-  ASSERT_NE( Found.Functions(), nullptr );
-  EXPECT_NE( Found.Functions()->MagickIdentifyImageType, nullptr );
-  EXPECT_TRUE( m_Log.Texts().empty() );
-}
-
 TEST_F( Library, ItsCodersAreLookedForBesideTheProgramIfTheyAreThere )
 {
   const VPlaces Places{ { "libNoMagickWand.so.1" }, ProgramLink( m_Folder.File( "program" ) ) };
-  {
-    const VLibrary WithoutCoders( Places, Category );
-  }
+  VLibrary( Places, Category );
   EXPECT_EQ( std::getenv( CoderPath ), nullptr );
 
   std::ofstream( m_Folder.File( "png.la" ) ) << "coder";
-  {
-    const VLibrary WithCoders( Places, Category );
-  }
+  VLibrary( Places, Category );
   EXPECT_EQ( std::string( std::getenv( CoderPath ) ) + "/program", m_Folder.File( "program" ) );
 
   setenv( CoderPath, "/own", 1 );
-  {
-    const VLibrary WithOwnSetting( Places, Category );
-  }
+  VLibrary( Places, Category );
   EXPECT_STREQ( std::getenv( CoderPath ), "/own" );
 }
