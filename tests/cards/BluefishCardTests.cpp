@@ -1,6 +1,8 @@
 // What a client finds out about virtual Bluefish444 cards, and how they refuse.
 #include "tests/cards/BluefishClient.h"
 
+#include <array>
+
 using namespace BluefishTests;
 
 namespace
@@ -40,43 +42,38 @@ TEST_F( BluefishCard, CardsAreCountedAsTheyComeAndGo )
 
 TEST_F( BluefishCard, TellsItsFeatures )
 {
-  Plug( "bluefish444:inputs=3,outputs=1" );
-  EXPECT_EQ( m_Object.Query( Property::CardFeatureStreamInfo ), 0x31u );
-  EXPECT_EQ( m_Object.Query( Property::CardFeatureConnectorInfo ), 0x31u );
-  EXPECT_EQ( m_Object.Query( Property::ProductId ), 0x0Bu );
+  const struct
+  {
+    const char* m_pText;
+    std::optional<uint32_t> m_Features;   // of streams and of connectors
+    uint32_t m_Product;
+    uint32_t m_Devices;
+  } Cases[] = { { "bluefish444:inputs=3,outputs=1", 0x31, 0x0B, 3 }, { "bluefish444:inputs=0,outputs=2", 0x02, 0x02, 0 },
+    { "bluefish444:driver=old", std::nullopt, 0x02, 0 } };
+  for( const auto& rCase : Cases )
+  {
+    SCOPED_TRACE( rCase.m_pText );
+    AddCard( rCase.m_pText );
+    VObject Object;
+    ASSERT_TRUE( Object.Attach( 1 ) );
+    EXPECT_EQ( Object.Query( Property::CardFeatureStreamInfo ), rCase.m_Features );
+    EXPECT_EQ( Object.Query( Property::CardFeatureConnectorInfo ), rCase.m_Features );
+    EXPECT_EQ( Object.Query( Property::ProductId ), rCase.m_Product );
+    EXPECT_EQ( Control().CountDevices( m_Card ), rCase.m_Devices );
+    ASSERT_TRUE( Control().RemoveCard( m_Card ) );
+  }
+}
+
+TEST_F( BluefishCard, HasTheInputsThatItWasGivenAndNoOthers )
+{
+  Plug( "bluefish444:inputs=3" );
   EXPECT_EQ( m_Object.Query( Property::InvalidVideoModeFlag ), NoSignal );
   int Type = 0;
   EXPECT_EQ( Functions().bfcQueryCardType( m_Object.m_Handle, &Type, 0 ), 0 );
   EXPECT_EQ( Type, 33 );
-  EXPECT_EQ( Control().CountDevices( m_Card ), 3u );
   EXPECT_TRUE( m_Object.Set( Property::DefaultVideoInputChannel, 4 ) );
   EXPECT_EQ( m_Object.Query( Property::DefaultVideoInputChannel ), 4u );
   EXPECT_FALSE( m_Object.Set( Property::DefaultVideoInputChannel, 5 ) ) << "the fourth input";
-}
-
-TEST_F( BluefishCard, AnOldDriverDoesNotTellFeatures )
-{
-  Plug( "bluefish444:driver=old" );
-  EXPECT_FALSE( m_Object.Query( Property::CardFeatureStreamInfo ) );
-  EXPECT_FALSE( m_Object.Query( Property::CardFeatureConnectorInfo ) );
-  EXPECT_TRUE( m_Object.Query( Property::ProductId ) );
-  EXPECT_EQ( Control().CountDevices( m_Card ), 0u );
-}
-
-TEST_F( BluefishCard, RefusesOtherKinds )
-{
-  std::string Error;
-  EXPECT_EQ( Control().AddCard( "decklink", { true }, Error ), 0u );
-  EXPECT_NE( Error.find( "accepted: bluefish444" ), std::string::npos );
-}
-
-TEST_F( BluefishCard, ACardOfOutputsHasNoInputToUse )
-{
-  Plug( "bluefish444:inputs=0,outputs=2" );
-  EXPECT_EQ( m_Object.Query( Property::CardFeatureStreamInfo ), 0x02u );
-  EXPECT_FALSE( m_Object.Query( Property::VideoInputSignalVideoMode ) );
-  EXPECT_FALSE( m_Object.Wait() );
-  EXPECT_EQ( Control().CountDevices( m_Card ), 0u );
 }
 
 TEST_F( BluefishCard, ObjectsAreCounted )
@@ -100,26 +97,28 @@ TEST_F( BluefishCard, ObjectsAreCounted )
 
 TEST_F( BluefishCard, SizesOfBothGenerationsAgree )
 {
-  const auto Equal = []( uint32_t i_Mode, uint32_t i_Memory )
+  const struct
   {
-    uint32_t Width = 0;
-    uint32_t Lines = 0;
-    uint32_t LineBytes = 0;
-    uint32_t Bytes = 0;
-    uint32_t Golden = 0;
-    EXPECT_EQ(
-      Functions().bfcGetVideoInfo( static_cast<int>( i_Mode ), 1, static_cast<int>( i_Memory ), &Width, &Lines, &LineBytes, &Bytes, &Golden ), 0 );
-    EXPECT_EQ( Functions().bfcGetPixelsPerLine( i_Mode ), Width );
-    EXPECT_EQ( Functions().bfcGetLinesPerFrame( i_Mode, 1 ), Lines );
-    EXPECT_EQ( Functions().bfcGetBytesPerLine( i_Mode, i_Memory ), LineBytes );
-    EXPECT_EQ( Functions().bfcGetGoldenValue( i_Mode, i_Memory, 1 ), Golden );
-    EXPECT_EQ( Bytes, LineBytes * Lines );
-    EXPECT_TRUE( Golden >= Bytes && Golden < Bytes + 4096 && Golden % 4096 == 0 );
-    return std::vector<uint32_t>{ Width, Lines, LineBytes };
-  };
-  EXPECT_EQ( Equal( 0, MemoryFormat::TwoVUY ), ( std::vector<uint32_t>{ 720, 576, 1440 } ) );
-  EXPECT_EQ( Equal( 3, MemoryFormat::V210 ), ( std::vector<uint32_t>{ 1280, 720, 3456 } ) );
-  EXPECT_EQ( Equal( 36, MemoryFormat::RGB ), ( std::vector<uint32_t>{ 2048, 1080, 6144 } ) );
+    uint32_t m_Mode;
+    uint32_t m_Memory;
+    uint32_t m_Width;
+    uint32_t m_Lines;
+    uint32_t m_LineBytes;
+  } Cases[] = { { 0, MemoryFormat::TwoVUY, 720, 576, 1440 }, { 3, MemoryFormat::V210, 1280, 720, 3456 },
+    { 36, MemoryFormat::RGB, 2048, 1080, 6144 } };
+  for( const auto& [Mode, Memory, Width, Lines, LineBytes] : Cases )
+  {
+    SCOPED_TRACE( Mode );
+    const uint32_t Golden = ( LineBytes * Lines + 4095 ) / 4096 * 4096;
+    std::array<uint32_t, 5> Sizes{};
+    auto& [rWidth, rLines, rLineBytes, rBytes, rGolden] = Sizes;
+    Functions().bfcGetVideoInfo( static_cast<int>( Mode ), 1, static_cast<int>( Memory ), &rWidth, &rLines, &rLineBytes, &rBytes, &rGolden );
+    EXPECT_EQ( Sizes, ( std::array{ Width, Lines, LineBytes, LineBytes * Lines, Golden } ) );
+    EXPECT_EQ( Functions().bfcGetPixelsPerLine( Mode ), Width );
+    EXPECT_EQ( Functions().bfcGetLinesPerFrame( Mode, UpdateMethod::Frame ), Lines );
+    EXPECT_EQ( Functions().bfcGetBytesPerLine( Mode, Memory ), LineBytes );
+    EXPECT_EQ( Functions().bfcGetGoldenValue( Mode, Memory, UpdateMethod::Frame ), Golden );
+  }
   EXPECT_EQ( Functions().bfcGetLinesPerFrame( 8, UpdateMethod::Field ), 540u );
   EXPECT_EQ( Functions().bfcGetLinesPerFrame( NoSignal, UpdateMethod::Frame ), 0u );
 }

@@ -30,10 +30,10 @@ protected:
 
   void Step( uint64_t i_Frames = 1 ) { ASSERT_TRUE( Control().Step( m_Card, i_Frames ) ); }
 
-  void Event( const char* i_pEvent )
+  void Event( const std::string& i_rEvent )
   {
     std::string Error;
-    ASSERT_TRUE( Control().RunEvent( m_Card, i_pEvent, Error ) ) << Error;
+    ASSERT_TRUE( Control().RunEvent( m_Card, i_rEvent.c_str(), Error ) ) << Error;
   }
 
   VirtualCards::VCardCounters Counters()

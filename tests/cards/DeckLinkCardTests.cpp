@@ -51,6 +51,9 @@ TEST_F( DeckLinkCard, ModesAndTheirSupport )
     EXPECT_GT( TimeScale / Duration, 22 );
     if( pMode->GetDisplayMode() == FourCharacterCode( "Hi59" ) )
     {
+      const char* pName = nullptr;
+      EXPECT_EQ( pMode->GetName( &pName ), S_OK );
+      EXPECT_EQ( TakeText( pName ), "1080i59.94" );
       EXPECT_EQ( pMode->GetHeight(), 1080 );
       EXPECT_EQ( Duration * 30000, TimeScale * 1001 );
       EXPECT_EQ( pMode->GetFieldDominance(), FieldDominance::UpperFieldFirst );
@@ -61,14 +64,8 @@ TEST_F( DeckLinkCard, ModesAndTheirSupport )
   EXPECT_EQ( Codes.size(), 36u );
 
   uint32_t Support = 9;
-  IDeckLinkDisplayMode* pMode = nullptr;
-  EXPECT_EQ( m_pInput->DoesSupportVideoMode( Mode1080p25, PixelFormat::YUV10Bit, InputFlag::FormatDetection, &Support, &pMode ), S_OK );
+  EXPECT_EQ( m_pInput->DoesSupportVideoMode( Mode1080p25, PixelFormat::YUV10Bit, InputFlag::FormatDetection, &Support, nullptr ), S_OK );
   EXPECT_EQ( Support, ModeSupport::Yes );
-  ASSERT_NE( pMode, nullptr );
-  const char* pName = nullptr;
-  EXPECT_EQ( pMode->GetName( &pName ), S_OK );
-  EXPECT_EQ( TakeText( pName ), "1080p25" );
-  pMode->Release();
   EXPECT_EQ( m_pInput->DoesSupportVideoMode( Mode1080p25, PixelFormat::RGB12Bit, 0, &Support, nullptr ), S_OK );
   EXPECT_EQ( Support, ModeSupport::No );
 }
@@ -85,26 +82,10 @@ TEST_F( DeckLinkCard, InterfacesAreOneObjectAndRefuseTheUnknown )
   bool bDetects = false;
   EXPECT_EQ( pAttributes->GetFlag( AttributeId::SupportsInputFormatDetection, &bDetects ), S_OK );
   EXPECT_TRUE( bDetects );
-  EXPECT_EQ( pAttributes->GetFlag( AttributeId::MaximumAudioChannels, &bDetects ), E_INVALIDARG );
-  int64_t Channels = 0;
-  EXPECT_EQ( pAttributes->GetInt( AttributeId::MaximumAudioChannels, &Channels ), S_OK );
-  EXPECT_EQ( Channels, 16 );
   void* pFound = this;
   EXPECT_EQ( m_pCard->QueryInterface( IID_IDeckLinkVideoFrame, &pFound ), E_NOINTERFACE );
   EXPECT_EQ( pFound, nullptr );
   EXPECT_EQ( m_pCard->QueryInterface( IID_IDeckLink, nullptr ), E_POINTER );
-
-  m_Client.m_OnFrame = []( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
-  {
-    EXPECT_NE( ( Query<IDeckLinkVideoFrame>( *i_pFrame, IID_IDeckLinkVideoFrame ) ), nullptr );
-    EXPECT_EQ( ( Query<IDeckLink>( *i_pFrame, IID_IDeckLink ) ), nullptr );
-    int64_t Time = 0;
-    EXPECT_EQ( i_pFrame->GetHardwareReferenceTimestamp( 0, &Time, &Time ), E_INVALIDARG );
-  };
-  Enable();
-  Start();
-  Step();
-  EXPECT_EQ( m_Client.m_FrameCalls, 1 );
 }
 
 TEST_F( DeckLinkCard, AReleaseTooManyIsNoticed )
@@ -116,20 +97,4 @@ TEST_F( DeckLinkCard, AReleaseTooManyIsNoticed )
   Start();
   Step( 2 );
   EXPECT_EQ( Control().ReleaseErrors(), Before + 2 );
-}
-
-TEST_F( DeckLinkCard, TheHardwareClockRunsWithTheFrames )
-{
-  Plug( "decklink" );
-  Step( 10 );
-  int64_t Time = 0;
-  int64_t InFrame = 0;
-  int64_t PerFrame = 0;
-  EXPECT_EQ( m_pInput->GetHardwareReferenceClock( 1000, &Time, &InFrame, &PerFrame ), S_OK );
-  const int64_t First = Time;
-  EXPECT_EQ( PerFrame, 40 );
-  Step( 25 );
-  EXPECT_EQ( m_pInput->GetHardwareReferenceClock( 1000, &Time, &InFrame, &PerFrame ), S_OK );
-  EXPECT_EQ( Time - First, 1000 );
-  EXPECT_EQ( m_pInput->GetHardwareReferenceClock( 0, &Time, &InFrame, &PerFrame ), E_INVALIDARG );
 }

@@ -9,6 +9,7 @@
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
 
+#include <algorithm>
 #include <atomic>
 #include <cstdlib>
 #include <functional>
@@ -36,13 +37,12 @@ TFunction* Exported( const char* i_pName )
 
 inline IVirtualCardControl& DeckLinkControl() { return ControlOf( VIRTUAL_DECKLINK ); }
 
-template<class TInterface>
 struct VReleaser
 {
-  void operator()( TInterface* i_pObject ) const { i_pObject->Release(); }
+  void operator()( IUnknown* i_pObject ) const { i_pObject->Release(); }
 };
 template<class TInterface>
-using VPointer = std::unique_ptr<TInterface, VReleaser<TInterface>>;
+using VPointer = std::unique_ptr<TInterface, VReleaser>;
 
 template<class TInterface>
 VPointer<TInterface> Query( IUnknown& i_rObject, REFIID i_Id )
@@ -128,22 +128,28 @@ inline VSeen Look( IDeckLinkVideoInputFrame& i_rFrame, IDeckLinkAudioInputPacket
   return Seen;
 }
 
-// Counts references, and hands every call to functions that a test sets.
-class VClient final : public IDeckLinkInputCallback
+// A callback object of a client's, which counts the library's references to it.
+template<class TInterface>
+class VCallbackObject : public TInterface
 {
 public:
-  virtual ~VClient() = default;
+  virtual ~VCallbackObject() = default;
 
-  HRESULT QueryInterface( REFIID i_Id, void** o_ppObject ) override
+  HRESULT QueryInterface( REFIID, void** o_ppObject ) override
   {
-    const bool bKnown = i_Id == IID_IUnknown || i_Id == IID_IDeckLinkInputCallback;
-    *o_ppObject = bKnown ? this : nullptr;
-    m_References += bKnown ? 1 : 0;
-    return bKnown ? S_OK : E_NOINTERFACE;
+    *o_ppObject = nullptr;
+    return E_NOINTERFACE;
   }
   ULONG AddRef() override { return static_cast<ULONG>( ++m_References ); }
   ULONG Release() override { return static_cast<ULONG>( --m_References ); }
 
+  std::atomic<int> m_References{ 1 };
+};
+
+// Hands every call to functions that a test sets.
+class VClient final : public VCallbackObject<IDeckLinkInputCallback>
+{
+public:
   HRESULT VideoInputFormatChanged( uint32_t i_Events, IDeckLinkDisplayMode* i_pMode, uint32_t i_Detected ) override
   {
     ++m_FormatCalls;
@@ -175,7 +181,6 @@ public:
 
   std::function<void( uint32_t )> m_OnFormat;
   std::function<void( IDeckLinkVideoInputFrame*, IDeckLinkAudioInputPacket* )> m_OnFrame;
-  std::atomic<int> m_References{ 1 };
   std::atomic<int> m_FormatCalls{ 0 };
   std::atomic<int> m_FrameCalls{ 0 };
   uint32_t m_LastEvents = 0;
@@ -216,16 +221,22 @@ protected:
     Start();
   }
 
-  // What drivers do with a new format, inside the callback
+  // What drivers do with a new format, inside the callback. The worst of the results.
+  HRESULT Restart( uint32_t i_Mode, uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  {
+    return std::min( { m_pInput->PauseStreams(), m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, InputFlag::FormatDetection ),
+      m_pInput->FlushStreams(), m_pInput->StartStreams() } );
+  }
   void RestartOnFormat( uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
   {
-    m_Client.m_OnFormat = [this, i_PixelFormat]( uint32_t i_Mode )
-    {
-      EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
-      EXPECT_EQ( m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, InputFlag::FormatDetection ), S_OK );
-      EXPECT_EQ( m_pInput->FlushStreams(), S_OK );
-      EXPECT_EQ( m_pInput->StartStreams(), S_OK );
-    };
+    m_Client.m_OnFormat = [this, i_PixelFormat]( uint32_t i_Mode ) { EXPECT_EQ( Restart( i_Mode, i_PixelFormat ), S_OK ); };
+  }
+
+  // A client that lets its card look for the signal's format.
+  void StartDetecting( uint32_t i_Mode = ModeNTSC, uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  {
+    Enable( i_Mode, i_PixelFormat, InputFlag::FormatDetection );
+    Start();
   }
 
   void TearDown() override

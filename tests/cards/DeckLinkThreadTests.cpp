@@ -58,13 +58,9 @@ TEST_F( DeckLinkThreads, AStopFromOutsideWinsOverARestartInsideACallback )
     {
       Inside.count_down();
       Stopping.wait();
-      m_pInput->PauseStreams();
-      m_pInput->EnableVideoInput( i_Mode, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
-      m_pInput->FlushStreams();
-      m_pInput->StartStreams();
+      Restart( i_Mode );
     };
-    Enable( ModeNTSC, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
-    Start();
+    StartDetecting();
     VThread Stepper( [this] { Control().Step( m_Card, 1 ); } );
     Inside.wait();
     Stopping.count_down();
@@ -79,13 +75,7 @@ TEST_F( DeckLinkThreads, AStopFromOutsideWinsOverARestartInsideACallback )
 TEST_F( DeckLinkThreads, NoCallbackBeginsAfterAStopInAStormOfStartsAndStops )
 {
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
-  m_Client.m_OnFormat = [&]( uint32_t i_Mode )
-  {
-    m_pInput->PauseStreams();
-    m_pInput->EnableVideoInput( i_Mode, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
-    m_pInput->FlushStreams();
-    m_pInput->StartStreams();
-  };
+  m_Client.m_OnFormat = [&]( uint32_t i_Mode ) { Restart( i_Mode ); };
   const auto Storm = [this]( uint32_t i_Mode )
   {
     for( int i = 0; i < 500; ++i )
@@ -118,38 +108,32 @@ TEST_F( DeckLinkThreads, CardsComeAndGoWhileTheyRunAndFramesAreGivenBackElsewher
 {
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
   boost::mutex Mutex;
-  std::vector<IDeckLinkVideoInputFrame*> Kept;
+  std::vector<VPointer<IDeckLinkVideoInputFrame>> Kept;
   m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
   {
     i_pFrame->AddRef();
     const boost::lock_guard<boost::mutex> Lock( Mutex );
-    Kept.push_back( i_pFrame );
+    Kept.emplace_back( i_pFrame );
   };
   Enable( FourCharacterCode( "pal " ) );
   Start();
-  for( int Given = 0; Given < 300; )
+  for( size_t Given = 0; Given < 300; )
   {
-    std::vector<IDeckLinkVideoInputFrame*> Mine;
+    std::vector<VPointer<IDeckLinkVideoInputFrame>> Mine;
     {
       const boost::lock_guard<boost::mutex> Lock( Mutex );
       Mine.swap( Kept );
     }
-    for( IDeckLinkVideoInputFrame* pFrame : Mine )
+    for( const auto& pFrame : Mine )
     {
-      void* pBytes = nullptr;
-      EXPECT_EQ( pFrame->GetBytes( &pBytes ), S_OK );
-      pFrame->Release();
-      ++Given;
+      PixelsOf( *pFrame );
     }
+    Given += Mine.size();
     boost::this_thread::yield();
   }
   // The card goes while its frames flow
   EXPECT_TRUE( Control().RemoveCard( m_Card ) );
   EXPECT_EQ( m_pInput->StartStreams(), E_FAIL );
-  for( IDeckLinkVideoInputFrame* pFrame : Kept )
-  {
-    pFrame->Release();
-  }
 }
 
 TEST_F( DeckLinkThreads, ACardIsNotTakenOutFromInsideItsCallback )
