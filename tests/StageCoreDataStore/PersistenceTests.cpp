@@ -5,7 +5,7 @@
 
 #include <gtest/gtest.h>
 
-#include <boost/optional/optional_io.hpp>
+#include <optional>
 
 using KVZ::Variant;
 namespace Options = DataStorePersistence::Options;
@@ -42,20 +42,16 @@ protected:
     Writer.SetProposedValue( i_rPath, Variant::Make( i_Proposed ) );
   }
 
-  static boost::optional<int32_t> Verified( IDataStore& i_rStore, const VDataPath& i_rPath )
+  using VNumber = std::optional<int32_t>;
+  static VNumber Stored( IDataStore& i_rStore, const VDataPath& i_rPath, EDataForm i_Form )
   {
+    const VDataReader Lock( i_rStore );
     Variant Value;
     int32_t Number = 0;
-    const bool bFound = VDataVerifyReader( i_rStore ).GetVerifiedValue( i_rPath, Value ) && Value.Get( Number );
-    return bFound ? boost::optional<int32_t>( Number ) : boost::none;
+    return i_rStore.GetValue( i_rPath, Value, i_Form ) && Value.Get( Number ) ? VNumber( Number ) : std::nullopt;
   }
-  static boost::optional<int32_t> Proposed( IDataStore& i_rStore, const VDataPath& i_rPath )
-  {
-    Variant Value;
-    int32_t Number = 0;
-    const bool bFound = VDataVerifyReader( i_rStore ).GetProposedValue( i_rPath, Value ) && Value.Get( Number );
-    return bFound ? boost::optional<int32_t>( Number ) : boost::none;
-  }
+  static VNumber Verified( IDataStore& i_rStore, const VDataPath& i_rPath ) { return Stored( i_rStore, i_rPath, EDataForm::Verified ); }
+  static VNumber Proposed( IDataStore& i_rStore, const VDataPath& i_rPath ) { return Stored( i_rStore, i_rPath, EDataForm::Proposed ); }
   static uint32_t Flags( IDataStore& i_rStore, const VDataPath& i_rPath )
   {
     uint32_t Flags = 0;

@@ -1,6 +1,4 @@
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
-#include "StageCoreDataStoreTypes/GreyscaleMode.h"
-#include "StageCoreDataStoreTypes/MaskGrid.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -34,10 +32,7 @@ TEST( DeviceSchemas, FormPathsOfClassDeviceGroupAndKey )
   EXPECT_EQ( DeviceSchemas::AnalogueCard::GenlockAndTimecode( DeviceSchemas::AnalogueCard::Path( 12, "ac:1" ) ).ToString(),
     "AnalogueCard12.ac:1.Genlock and Timecode" );
   EXPECT_EQ( DeviceSchemas::Nodes::CaptureFileNameStem().ToString(), "ApplicationSettings.Capture.FileNameStem" );
-}
 
-TEST( DeviceSchemas, KeepTheWildcardButGiveNoHandleForIt )
-{
   const VDataPath All = DeviceSchemas::VideoInput::Path( "*" );
   EXPECT_TRUE( DeviceSchemas::Settings( All ).IsWildcard() );
   EXPECT_TRUE( DeviceSchemas::UserId( All ).IsWildcard() );
@@ -56,21 +51,4 @@ TEST_F( DeviceSchemasLog, WritesAtMostOneLineInThirtySeconds )
   DeviceSchemas::DevicePath( {}, "vi:3" );
   EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Failed to create device schema: [] [vi:3] (total log count = 3)" } );
   EXPECT_EQ( m_Log.Lines()[0].m_Level, 2 );
-}
-
-TEST( ValueSchemas, AMaskGridComesBackAsItWas )
-{
-  const VMaskGrid Grid{ "vi:0", 4, 4, 480, 270, { 10, 2, 129588 } };
-  const KVZ::Variant Value = KVZ::Variant::Make( Grid );
-  VMaskGrid Back;
-  ASSERT_TRUE( Value.Get( Back ) );
-  EXPECT_EQ( Back, Grid );
-  ASSERT_EQ( Value.Schema()->Fields().size(), 6u );
-  EXPECT_EQ( Value.Schema()->Fields()[5].m_Name, "RunLengths" );
-}
-
-TEST( ValueSchemas, GreyscaleModesGoByTheirNames )
-{
-  const auto* pSchema = KVZ::VSchemaOf<CoreTarvoTypesUtils::EGreyscaleMode::Enum>::Get();
-  EXPECT_EQ( KVZ::Variant::FromText( pSchema, "NoEdges" ), KVZ::Variant::Make( CoreTarvoTypesUtils::EGreyscaleMode::ENoEdges ) );
 }

@@ -37,6 +37,7 @@ TEST_F( VParameters, TellWhatTheDeviceIsInTheirOrder )
   EXPECT_EQ( LabelsOf( "AudioChannelCount" ), ( Labels{ "2", "8", "16" } ) );
   EXPECT_EQ( Value<uint32_t>( "AudioChannelCount" ), 16u );
   EXPECT_EQ( LabelsOf( "AudioSampleRate" ), Labels{ "48000 Hz" } );
+  EXPECT_EQ( LabelsOf( "GreyscaleMode" ), ( Labels{ "Auto", "None", "Only", "Edges", "NoEdges" } ) );
   EXPECT_EQ( Value<double>( "Threshold" ), 0.6 );
   EXPECT_TRUE( m_pHandler->GetParameter( "Status" )->IsReadOnly() );
   EXPECT_TRUE( m_pHandler->GetParameter( "PixelAspectRatio" )->IsHidden() );
