@@ -9,13 +9,6 @@
 namespace
 {
 
-template<class T>
-T Export( const char* i_pName )
-{
-  void* const pModule = dlopen( VIDEO_INPUT_MODULE, RTLD_NOW | RTLD_LOCAL );
-  return pModule ? reinterpret_cast<T>( dlsym( pModule, i_pName ) ) : nullptr;
-}
-
 TEST( Module, ALoadedModuleThatIsNeverInitialisedEndsQuietly )
 {
   std::string Error;
@@ -34,7 +27,9 @@ TEST( Module, ALoadedModuleThatIsNeverInitialisedEndsQuietly )
 
 TEST( Module, DestroysNothingWhereThereIsNothing )
 {
-  const auto pDestroy = Export<VDestroyPlugin>( "DestroyPlugin" );
+  void* const pModule = dlopen( VIDEO_INPUT_MODULE, RTLD_NOW | RTLD_LOCAL );
+  ASSERT_TRUE( pModule );
+  const auto pDestroy = reinterpret_cast<VDestroyPlugin>( dlsym( pModule, "DestroyPlugin" ) );
   ASSERT_TRUE( pDestroy );
   pDestroy( nullptr );
 }
