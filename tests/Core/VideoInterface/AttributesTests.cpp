@@ -1,6 +1,5 @@
 #include "Core/VideoInterface/FrameRecords.h"
 #include "Core/VideoInterface/VideoAttributes.h"
-#include "Utils/UtilsIO/StreamAdapters.h"
 
 #include <gtest/gtest.h>
 
@@ -8,14 +7,6 @@ using namespace KVZ;
 
 namespace
 {
-
-std::vector<uint8_t> BytesOf( const IVideoAttributes& i_rAttributes, const std::string& i_rKey )
-{
-  std::vector<uint8_t> Bytes;
-  ISimpleStreamAdapter Stream( Bytes );
-  EXPECT_TRUE( i_rAttributes.Values().at( i_rKey )->Write( Stream ) );
-  return Bytes;
-}
 
 VideoFrameInfo WholeVideo()
 {
@@ -42,37 +33,6 @@ void CheckRoundTrip( const TRecord& i_rRecord )
   EXPECT_EQ( Back, i_rRecord );
 }
 
-}
-
-TEST( Attributes, AValueIsItsTagAndItsBytes )
-{
-  IVideoAttributes Attributes;
-  Attributes.Set( "flag", true );
-  Attributes.Set( "small", char{ -2 } );
-  Attributes.Set( "big", int64_t{ -2 } );
-  Attributes.Set( "ratio", 1.0 );
-  Attributes.Set( "text", "ab" );
-  EXPECT_EQ( BytesOf( Attributes, "flag" ), ( std::vector<uint8_t>{ 0, 0, 0, 0, 1 } ) );
-  EXPECT_EQ( BytesOf( Attributes, "small" ), ( std::vector<uint8_t>{ 1, 0, 0, 0, 0xFE } ) );
-  EXPECT_EQ( BytesOf( Attributes, "big" ), ( std::vector<uint8_t>{ 4, 0, 0, 0, 0xFE, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF } ) );
-  EXPECT_EQ( BytesOf( Attributes, "ratio" ), ( std::vector<uint8_t>{ 10, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0xF0, 0x3F } ) );
-  EXPECT_EQ( BytesOf( Attributes, "text" ), ( std::vector<uint8_t>{ 11, 0, 0, 0, 2, 0, 0, 0, 'a', 'b' } ) );
-}
-
-TEST( Attributes, TypesAreNeverMixed )
-{
-  IVideoAttributes Attributes;
-  Attributes.Set( "value", uint32_t{ 7 } );
-  int32_t Signed = -1;
-  EXPECT_FALSE( Attributes.Get( "value", Signed ) );
-  EXPECT_FALSE( Attributes.Get( "other", Signed ) );
-  EXPECT_EQ( Signed, -1 );
-
-  IVideoAttributes Other;
-  Other.Set( "value", int32_t{ 7 } );
-  EXPECT_FALSE( Attributes == Other );
-  Other.Set( "value", uint32_t{ 7 } );
-  EXPECT_TRUE( Attributes == Other );
 }
 
 TEST( FrameRecords, ComeBackAsTheyWere )

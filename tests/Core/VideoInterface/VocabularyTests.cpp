@@ -1,5 +1,4 @@
 #include "Core/VideoInterface/Schemas.h"
-#include "Core/VideoInterface/VideoWriter.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -107,24 +106,4 @@ TEST( Vocabulary, PackedImagesRoundUpWhereTheirLayoutDoes )
   EXPECT_EQ( GetImageSize( IPixelFormat::ELuminance7, 3, 3 ), 8u );   // 63 bits
   EXPECT_EQ( GetImageSize( IPixelFormat::EBayerGB6, 3, 3 ), 7u );     // 54 bits
   EXPECT_EQ( GetImageSize( IPixelFormat::ER8G8B8u8, 65536, 65536 ), uint64_t{ 1 } << 34 );
-}
-
-TEST( WriterCapabilities, MovAndMp4AnswerAlikeAndNobodyTakesFlac )
-{
-  const auto& rMov = GetVideoWriterCapabilities( IVideoContainer::EMOV );
-  const auto& rMp4 = GetVideoWriterCapabilities( IVideoContainer::EMP4 );
-  for( int32_t Value = -1; Value < 40; ++Value )
-  {
-    EXPECT_EQ( rMov.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ),
-      rMp4.IsPixelFormatSupported( static_cast<IPixelFormat::Enum>( Value ) ) );
-    EXPECT_EQ( rMov.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ),
-      rMp4.IsVideoPayloadSupported( static_cast<IVideoPayload::Enum>( Value ) ) );
-  }
-  for( int32_t Container = 0; Container <= VideoContainerCount; ++Container )
-  {
-    const auto& rCapabilities = GetVideoWriterCapabilities( static_cast<IVideoContainer::Enum>( Container ) );
-    EXPECT_FALSE( rCapabilities.IsAudioPayloadSupported( IAudioPayload::ELosslessFLAC ) );
-    EXPECT_EQ( rCapabilities.IsNative(), Container == IVideoContainer::ETVID );
-    EXPECT_EQ( rCapabilities.IsAudioPayloadSupported( IAudioPayload::ENone ), Container < VideoContainerCount );
-  }
 }
