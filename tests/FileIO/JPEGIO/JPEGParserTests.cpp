@@ -5,10 +5,9 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/MemoryFile.h"
 #include "tests/support/SlowJPEGParser.h"
-#include "tests/support/TestFrames.h"
+#include "tests/support/TurboJPEG.h"
 
 #include <gtest/gtest.h>
-#include <turbojpeg.h>
 
 #include <random>
 
@@ -22,27 +21,21 @@ using TestSupport::VBytes;
 
 VBytes operator+( VBytes i_Front, const VBytes& i_rBack )
 {
-  i_Front.insert( i_Front.end(), i_rBack.begin(), i_rBack.end() );
+  TestSupport::Append( i_Front, i_rBack );
   return i_Front;
 }
+
+constexpr const char* NoCleanEnd = "Did not end cleanly.  Data may be truncated or corrupt.";
 
 const VBytes SOI = { 0xFF, 0xD8 };
 const VBytes EOI = { 0xFF, 0xD9 };
 const VBytes Table = { 0xFF, 0xDB, 0x00, 0x04, 0x01, 0x02 };
 const VBytes Scan = { 0xFF, 0xDA, 0x00, 0x03, 0x01 };
 
-// A noisy image as TurboJPEG makes it.
-VBytes MakeJPEG( int i_Width, int i_Height, int i_Subsampling, int i_Flags )
+VBytes MakeJPEG( int i_Width, int i_Height, int i_Subsampling, int i_Flags = 0 )
 {
-  const VBytes Pixels = TestSupport::Noise( static_cast<size_t>( i_Width * i_Height ) * 3, 7 );
-  const tjhandle Handle = tjInitCompress();
-  unsigned char* pImage = nullptr;
-  unsigned long Size = 0;
-  EXPECT_EQ( tjCompress2( Handle, Pixels.data(), i_Width, 0, i_Height, TJPF_RGB, &pImage, &Size, i_Subsampling, 90, i_Flags ), 0 );
-  const VBytes Image( pImage, pImage + Size );
-  tjFree( pImage );
-  tjDestroy( Handle );
-  return Image;
+  const VBytes Noise = TestSupport::Noise( static_cast<size_t>( i_Width * i_Height ) * 3, 7 );
+  return TestSupport::TurboJPEG( Noise, i_Width, i_Height, { .m_Subsampling = i_Subsampling, .m_Flags = i_Flags } );
 }
 
 // The records are packed, so their fields cannot be referred to, which the checks below would do.
@@ -92,7 +85,7 @@ protected:
 
 TEST_F( JPEGParser, ListsWhatTurboJPEGWrites )
 {
-  const VBytes Colour = MakeJPEG( 640, 360, TJSAMP_444, 0 );
+  const VBytes Colour = MakeJPEG( 640, 360, TJSAMP_444 );
   ASSERT_GT( Colour.size(), 100000u );   // many times what the parser sees at once
   ASSERT_TRUE( Parse( Colour ) );
   EXPECT_EQ( Markers( m_Segments ), "D8 E0 DB DB C0 C4 C4 C4 C4 DA D9 " );
@@ -101,7 +94,7 @@ TEST_F( JPEGParser, ListsWhatTurboJPEGWrites )
   EXPECT_EQ( LengthOf( m_Segments[1] ), 18u );   // JFIF, without a thumbnail
   EXPECT_EQ( PositionOf( m_Segments.back() ), Colour.size() - 2 );
 
-  ASSERT_TRUE( Parse( MakeJPEG( 61, 33, TJSAMP_GRAY, 0 ) ) );
+  ASSERT_TRUE( Parse( MakeJPEG( 61, 33, TJSAMP_GRAY ) ) );
   EXPECT_EQ( Markers( m_Segments ), "D8 E0 DB C0 C4 C4 DA D9 " );
 
   const VBytes Progressive = MakeJPEG( 61, 33, TJSAMP_420, TJFLAG_PROGRESSIVE );
@@ -141,10 +134,10 @@ TEST_F( JPEGParser, FaultsHaveTheirText )
   const std::vector<std::pair<VBytes, std::string>> Cases = {
     { SOI + VBytes{ 0xFF, 0x00 } + EOI, "0xff00 found outside of image scan." },
     { SOI + Table + VBytes{ 0x41 } + EOI, "Unrecognised data found in buffer at 0x8" },
-    { VBytes( Whole.begin(), Whole.begin() + 4 ), "Did not end cleanly.  Data may be truncated or corrupt." },
-    { VBytes( Whole.begin(), Whole.begin() + 6 ), "Did not end cleanly.  Data may be truncated or corrupt." },
-    { VBytes( Whole.begin(), Whole.begin() + 9 ), "Did not end cleanly.  Data may be truncated or corrupt." },
-    { Whole + VBytes{ 0xFF }, "Did not end cleanly.  Data may be truncated or corrupt." },
+    { VBytes( Whole.begin(), Whole.begin() + 4 ), NoCleanEnd },
+    { VBytes( Whole.begin(), Whole.begin() + 6 ), NoCleanEnd },
+    { VBytes( Whole.begin(), Whole.begin() + 9 ), NoCleanEnd },
+    { Whole + VBytes{ 0xFF }, NoCleanEnd },
     { SOI + EOI, "Not enough segments.  Data may be truncated or corrupt." },
     { {}, "Not enough segments.  Data may be truncated or corrupt." },
     { Table + Table + Scan + EOI, "Missing SOI marker." },
@@ -161,12 +154,12 @@ TEST_F( JPEGParser, FaultsHaveTheirText )
 
 TEST_F( JPEGParser, AStreamThatFailsOrEndsEarlyIsNoImage )
 {
-  const auto pBytes = std::make_shared<VBytes>( MakeJPEG( 61, 33, TJSAMP_444, 0 ) );
+  const auto pBytes = std::make_shared<VBytes>( MakeJPEG( 61, 33, TJSAMP_444 ) );
   TestSupport::VFailingStream Failing( std::make_unique<TestSupport::VMemoryFile>( pBytes ), { TestSupport::VFault::Never, 1 } );
   EXPECT_FALSE( ParseJPEGSegments( Failing, pBytes->size(), m_Segments ) );
   KVZ::ISimpleInputStreamAdapter Short( *pBytes );
   EXPECT_FALSE( ParseJPEGSegments( Short, pBytes->size() + 1, m_Segments ) );
-  EXPECT_EQ( m_Log.Count( "Did not end cleanly.  Data may be truncated or corrupt." ), 2u );
+  EXPECT_EQ( m_Log.Count( NoCleanEnd ), 2u );
 }
 
 // Damaged images, read by the parser and by a second one.
@@ -198,12 +191,7 @@ TEST_F( JPEGParser, AgreesWithASlowReadingOfDamagedImages )
 
 TEST( JPEGMarkers, HaveATextIfTheyAreDefined )
 {
-  std::string Without;
-  for( int Marker = 0; Marker < 256; ++Marker )
-  {
-    Without += JPEGIO::FindMarkerText( static_cast<uint8_t>( Marker ) ) ? '.' : '-';
-  }
-  EXPECT_EQ( Without, std::string( 0xC0, '-' ) + std::string( 0x30, '.' ) + std::string( 14, '-' ) + ".-" );
-  EXPECT_STREQ( JPEGIO::FindMarkerText( 0xE6 ), "APP6" );
   EXPECT_STREQ( JPEGIO::FindMarkerText( 0xD5 ), "Resync marker" );
+  EXPECT_STREQ( JPEGIO::FindMarkerText( 0xE6 ), "APP6" );
+  EXPECT_EQ( JPEGIO::FindMarkerText( 0xF0 ), nullptr );
 }

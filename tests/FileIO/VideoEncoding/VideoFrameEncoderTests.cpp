@@ -1,11 +1,21 @@
+// The encoder with its real converter, compressors and text, as the plug-in composes it.
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+
+#include "CoreVideoUtils/BurnInText.h"
+#include "CoreVideoUtils/FrameSize.h"
+#include "CoreVideoUtils/PixelFormatConverter.h"
+#include "FileIO/PNGIO/PNGIO.h"
+#include "FileIO/TIFFIO/TIFFIO.h"
+#include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
-#include "tests/support/TestFrames.h"
+#include "tests/support/TurboJPEG.h"
 
+#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
-#include <numeric>
+#include <atomic>
+#include <optional>
 
 using namespace KVZ;
 using namespace VideoEncoding;
@@ -14,76 +24,68 @@ using namespace TestSupport;
 namespace
 {
 
-VideoFrameInfo Small( IPixelFormat::Enum i_Format ) { return VideoInfo( i_Format, 4, 2 ); }
+constexpr int Width = 64;
+constexpr int Height = 40;
 
-std::shared_ptr<IStandardBuffer> Counting( uint8_t i_First, size_t i_Size )
+VideoFrameInfo Picture( IPixelFormat::Enum i_Format ) { return VideoInfo( i_Format, Width, Height ); }
+
+VBytes NoisyFrame( IPixelFormat::Enum i_Format, uint32_t i_Seed = 1 ) { return Noise( CoreVideoUtils::GetFrameSize( Picture( i_Format ) ), i_Seed ); }
+
+VBufferList InTwo( const VBytes& i_rBytes )
 {
-  auto pBuffer = std::make_shared<IStandardBuffer>( i_Size );
-  std::iota( pBuffer->Bytes().begin(), pBuffer->Bytes().end(), i_First );
-  return pBuffer;
+  return { Buffer( { i_rBytes.begin(), i_rBytes.begin() + 1000 } ), Buffer( { i_rBytes.begin() + 1000, i_rBytes.end() } ) };
 }
 
-// Grey from any format: fills the target with the source's first byte plus one.
-class VFillingConverter : public IPixelFormatConverter
+VBytes Converted( IPixelFormat::Enum i_Source, const VBytes& i_rBytes, IPixelFormat::Enum i_Target, const VColourRecord& i_rColour = {} )
 {
-public:
-  bool Convert( const VideoFrameInfo& i_rInfo, const uint8_t* i_pSource, size_t i_SourceSize, IPixelFormat::Enum i_Target, uint8_t* o_pTarget,
-    size_t i_TargetSize ) override
-  {
-    m_Target = i_Target;
-    if( i_SourceSize < GetImageSize( i_rInfo.m_PixelFormat, i_rInfo.m_ImageWidth, i_rInfo.m_ImageHeight ) || i_TargetSize == 0 )
-    {
-      return false;
-    }
-    std::fill_n( o_pTarget, i_TargetSize, static_cast<uint8_t>( *i_pSource + 1 ) );
-    return true;
-  }
-  void SetColourCorrection( const VColourRecord& ) override {}
-  void SetLensCorrection( const VLensDistortionRecord& i_rLens ) override { m_Lens = i_rLens; }
-  void SetLensCorrectionEnabled( bool i_bEnabled ) override { m_bLens = i_bEnabled; }
+  CoreVideoUtils::VPixelFormatConverter Converter;
+  Converter.SetColourCorrection( i_rColour );
+  VBytes Target( CoreVideoUtils::GetFrameSize( Picture( i_Target ) ) );
+  EXPECT_TRUE( Converter.Convert( Picture( i_Source ), i_rBytes.data(), i_rBytes.size(), i_Target, Target.data(), Target.size() ) );
+  return Target;
+}
 
-  IPixelFormat::Enum m_Target = IPixelFormat::EUnspecified;
-  VLensDistortionRecord m_Lens;
-  bool m_bLens = false;
-};
+bool DrawText( IPixelFormatConverter& i_rConverter, const VideoFrameInfo& i_rInfo, const VBurnInSettings& i_rText, uint8_t* io_pPixels,
+  size_t i_Size )
+{
+  return CoreVideoUtils::BurnInText( i_rConverter, i_rInfo, i_rText.m_SizeIndex, i_rText.m_X, i_rText.m_Y, i_rText.m_Text, io_pPixels, i_Size );
+}
 
 class VideoFrameEncoder : public testing::Test
 {
 protected:
   VideoFrameEncoder()
   {
-    m_Parts.m_ConverterMakers[EConverter::Software] = [this] { return m_pConverter; };
-    m_Parts.m_Compressors[IVideoPayload::EImagePNG] =
-      [this]( const VCompressionInput& i_rInput, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& )
-    {
-      m_Compressed = i_rInput.m_rInfo.m_PixelFormat;
-      m_Quality = i_rInput.m_JPEGQuality;
-      o_rOutput.assign( i_rInput.m_pPixels, i_rInput.m_pPixels + 1 );
-      return m_bCompressorWorks;
-    };
-    m_Parts.m_DrawText = [this]( IPixelFormatConverter&, const VideoFrameInfo&, const VBurnInSettings& i_rSettings, uint8_t* io_pPixels, size_t )
-    {
-      io_pPixels[0] = static_cast<uint8_t>( i_rSettings.m_Text[0] );
-      return m_bDrawerWorks;
-    };
-  }
-
-  bool Encode( IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Target )
-  {
-    return m_Encoder->Encode( m_Allocator, m_Video, Small( i_Source ), i_Payload, i_Target );
+    m_Parts.m_ConverterMakers[EConverter::Software] = [] { return std::make_shared<CoreVideoUtils::VPixelFormatConverter>(); };
+    m_Parts.m_Compressors = ImageCompressors();
+    m_Parts.m_DrawText = &DrawText;
+    MakeEncoder();
   }
 
   void MakeEncoder() { m_Encoder.emplace( EConverter::Software, m_Parts ); }
 
+  bool Encode( VBufferList& io_rVideo, IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload,
+    IPixelFormat::Enum i_Target = IPixelFormat::EUnspecified )
+  {
+    return m_Encoder->Encode( m_Allocator, io_rVideo, Picture( i_Source ), i_Payload, i_Target );
+  }
+  // What becomes of a frame; empty where it is refused.
+  VBytes Encoded( VBufferList i_Video, IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload,
+    IPixelFormat::Enum i_Target = IPixelFormat::EUnspecified )
+  {
+    return Encode( i_Video, i_Source, i_Payload, i_Target ) ? BytesOf( i_Video ) : VBytes();
+  }
+  // The list stays as it is.
+  void ExpectRefusal( const VBufferList& i_rVideo, IPixelFormat::Enum i_Source, IVideoPayload::Enum i_Payload, IPixelFormat::Enum i_Target )
+  {
+    VBufferList Video = i_rVideo;
+    EXPECT_FALSE( Encode( Video, i_Source, i_Payload, i_Target ) );
+    EXPECT_EQ( Video, i_rVideo );
+  }
+
   KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
-  std::shared_ptr<VFillingConverter> m_pConverter = std::make_shared<VFillingConverter>();
   VEncoderParts m_Parts;
   std::optional<VVideoFrameEncoder> m_Encoder;
-  VBufferList m_Video{ Counting( 10, 8 ), Counting( 18, 8 ) };
-  IPixelFormat::Enum m_Compressed = IPixelFormat::EUnspecified;
-  int m_Quality = 0;
-  bool m_bCompressorWorks = true;
-  bool m_bDrawerWorks = true;
   const VLogCapture m_Log{ "VideoEncoding" };
 };
 
@@ -91,93 +93,137 @@ protected:
 
 TEST_F( VideoFrameEncoder, AnUncompressedFrameInItsFormatPassesWithoutACopy )
 {
-  MakeEncoder();
-  const VBufferList Before = m_Video;
-  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_EQ( m_Video, Before );
-  m_Video.clear();
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  const VBufferList Frame = InTwo( NoisyFrame( IPixelFormat::EU8Y8V8Y8 ) );
+  VBufferList Video = Frame;
+  EXPECT_TRUE( Encode( Video, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( Video, Frame );
+  ExpectRefusal( {}, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 );
 }
 
 TEST_F( VideoFrameEncoder, LensCorrectionConvertsEvenBetweenEqualFormats )
 {
+  struct VLensConverter : public CoreVideoUtils::VPixelFormatConverter
+  {
+    void SetLensCorrection( const VLensDistortionRecord& i_rLens ) override { m_Lens = i_rLens; }
+    void SetLensCorrectionEnabled( bool i_bEnabled ) override { m_bLens = i_bEnabled; }
+
+    VLensDistortionRecord m_Lens;
+    bool m_bLens = false;
+  };
+  const auto pConverter = std::make_shared<VLensConverter>();
+  m_Parts.m_ConverterMakers[EConverter::Software] = [&] { return pConverter; };
   MakeEncoder();
   const VLensDistortionRecord Lens{ VLensDistortionRecord::ETarvo2Parameter, { 1, 2 }, { 3, 4, 0 } };
   m_Encoder->SetLensCorrection( Lens );
   m_Encoder->SetLensCorrectionEnabled( true );
-  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 16, 11 ) );
-  EXPECT_TRUE( m_pConverter->m_bLens );
-  EXPECT_EQ( m_pConverter->m_Lens, Lens );
+  const VBytes Frame = NoisyFrame( IPixelFormat::EU8Y8V8Y8 );
+  VBufferList Video = InTwo( Frame );
+  EXPECT_TRUE( Encode( Video, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  EXPECT_EQ( Video.size(), 1u );
+  EXPECT_EQ( BytesOf( Video ), Frame );
+  EXPECT_TRUE( pConverter->m_bLens );
+  EXPECT_EQ( pConverter->m_Lens, Lens );
 }
 
-TEST_F( VideoFrameEncoder, TextIsDrawnIntoACopy )
+// What each step gives by itself, one after another: two buffers joined, converted and colour corrected, text drawn, compressed.
+TEST_F( VideoFrameEncoder, AFrameGoesThroughAllSteps )
 {
-  MakeEncoder();
-  m_Encoder->SetBurnIn( { "T" } );
-  const std::shared_ptr<IStandardBuffer> pCaptured = Counting( 10, 16 );
-  m_Video = { pCaptured };
-  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
-  std::vector<uint8_t> Expected = pCaptured->Bytes();
-  EXPECT_EQ( Expected[0], 10 );
-  Expected[0] = 'T';
-  EXPECT_EQ( BytesOf( m_Video ), Expected );
-
-  m_Video = { Counting( 10, 15 ) };
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  constexpr VColourRecord Colour = { 0.5f, 2.0f };
+  const VBurnInSettings Text = { "01:02", 5, 3, 0 };
+  m_Encoder->SetColour( Colour );
+  m_Encoder->SetBurnIn( Text );
+  for( const IPixelFormat::Enum Format : { IPixelFormat::EBayerGB8, IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 } )
+  {
+    SCOPED_TRACE( ToName( Format ) );
+    const VBytes Frame = NoisyFrame( Format );
+    VBytes Drawn = Converted( Format, Frame, IPixelFormat::ER8G8B8, Colour );
+    CoreVideoUtils::VPixelFormatConverter Converter;
+    ASSERT_TRUE( DrawText( Converter, Picture( IPixelFormat::ER8G8B8 ), Text, Drawn.data(), Drawn.size() ) );
+    EXPECT_EQ( Encoded( InTwo( Frame ), Format, IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ), Drawn );
+    EXPECT_EQ( Encoded( InTwo( Frame ), Format, IVideoPayload::EImageJPEG ), TurboJPEG( Drawn, Width, Height ) );
+    const VBufferList Whole = { Buffer( Frame ) };
+    EXPECT_EQ( Encoded( Whole, Format, IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 ), Drawn );
+    EXPECT_EQ( BytesOf( Whole ), Frame ) << "text is drawn into a copy";
+  }
 }
 
-TEST_F( VideoFrameEncoder, ACompressedPayloadChoosesItsOwnFormat )
+TEST_F( VideoFrameEncoder, EachPayloadHasItsFormatAndItsCompressor )
 {
-  MakeEncoder();
-  m_Encoder->SetJPEGQuality( 75 );
-  EXPECT_TRUE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EImagePNG, IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::ER8G8B8 );
-  EXPECT_EQ( m_Compressed, IPixelFormat::ER8G8B8 );
-  EXPECT_EQ( m_Quality, 75 );
-  EXPECT_EQ( BytesOf( m_Video ), std::vector<uint8_t>( 1, 11 ) );
-
-  m_bCompressorWorks = false;
-  m_Video = { Counting( 10, 8 ) };
-  EXPECT_FALSE( Encode( IPixelFormat::ELuminance7, IVideoPayload::EImagePNG, IPixelFormat::EUnspecified ) );
-  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::ELuminance8 );
-  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Error encoding data in 'Luminance8' pixel format to 'ImagePNG'." } );
+  struct VKind
+  {
+    IVideoPayload::Enum m_Payload;
+    decltype( &PNGIO::PNGReader ) m_pReader;
+    uint8_t m_FirstByte;
+  };
+  for( const auto& [Source, Stored] : { std::pair{ IPixelFormat::ER8G8B8, IPixelFormat::ER8G8B8 }, { IPixelFormat::EU8Y8V8Y8, IPixelFormat::ER8G8B8 },
+         { IPixelFormat::ELuminance7, IPixelFormat::ELuminance8 } } )
+  {
+    const VBytes Frame = NoisyFrame( Source );
+    for( const VKind& rKind :
+      { VKind{ IVideoPayload::EImagePNG, &PNGIO::PNGReader, 0x89 }, { IVideoPayload::EImageTIFF, &TIFFIO::TIFFReader, 'I' } } )
+    {
+      const VBytes File = Encoded( { Buffer( Frame ) }, Source, rKind.m_Payload );
+      VideoFrameInfo Info;
+      UtilsMemory::VByteVector Pixels;
+      ASSERT_TRUE( rKind.m_pReader( File.data(), File.size(), Info, Pixels, ImageMagickWrapper::Instance( PNGIO::Category ) ) );
+      EXPECT_EQ( File[0], rKind.m_FirstByte );
+      EXPECT_EQ( VBytes( Pixels.begin(), Pixels.end() ), Converted( Source, Frame, Stored ) );
+    }
+  }
+  const VBytes Colour = NoisyFrame( IPixelFormat::ER8G8B8 );
+  m_Encoder->SetJPEGQuality( 35 );   // the steps above have the one that nobody has set
+  EXPECT_EQ( Encoded( { Buffer( Colour ) }, IPixelFormat::ER8G8B8, IVideoPayload::EImageJPEG ),
+    TurboJPEG( Colour, Width, Height, { .m_Quality = 35 } ) );
 }
 
-// All steps before compression are gone through first, and change nothing.
-TEST_F( VideoFrameEncoder, APayloadWithoutACompressorIsRefusedLast )
+TEST_F( VideoFrameEncoder, WithoutImageMagickOnlyPNGAndTIFFAreRefused )
 {
+  const VLogCapture Log( PNGIO::Category );
+  const ImageMagickWrapper::VLibrary Missing( { { "libNoMagickWand.so.1" } }, PNGIO::Category );
+  m_Parts.m_Compressors = ImageCompressors( Missing );
   MakeEncoder();
-  const VBufferList Before = m_Video;
-  EXPECT_FALSE( Encode( IPixelFormat::ER8G8B8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 ) );
-  EXPECT_EQ( m_Video, Before );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 ) );
-  EXPECT_EQ( m_Video.size(), 1u );
-  EXPECT_EQ( m_pConverter->m_Target, IPixelFormat::EUnspecified );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::ENone, IPixelFormat::ELuminance8 ) );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, static_cast<IVideoPayload::Enum>( 77 ), IPixelFormat::EU8Y8V8Y8 ) );
+  const VBufferList Frame = { Buffer( NoisyFrame( IPixelFormat::ER8G8B8 ) ) };
+  for( const IVideoPayload::Enum Payload : { IVideoPayload::EImagePNG, IVideoPayload::EImageTIFF, IVideoPayload::EImagePNG } )
+  {
+    ExpectRefusal( Frame, IPixelFormat::ER8G8B8, Payload, IPixelFormat::EUnspecified );
+  }
+  EXPECT_FALSE( Encoded( Frame, IPixelFormat::ER8G8B8, IVideoPayload::EImageJPEG ).empty() );
+  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Could not load MagickWand DLL" } );
   EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.", "Unsupported video payload format 'VideoH264'.",
-      "Unsupported video payload format 'None'.", "Unsupported video payload format 'Unspecified'." } ) );
+    ( std::vector<std::string>{ "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'.",
+      "Error encoding data in 'R8G8B8' pixel format to 'ImageTIFF'.", "Error encoding data in 'R8G8B8' pixel format to 'ImagePNG'." } ) );
 }
 
 TEST_F( VideoFrameEncoder, RefusalsSayWhy )
 {
-  MakeEncoder();
-  EXPECT_FALSE( Encode( IPixelFormat::ER8G8B8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
+  const VBytes Frame = NoisyFrame( IPixelFormat::EU8Y8V8Y8 );
+  const VBufferList Whole = { Buffer( Frame ) };
+  // Joining comes first, and a payload without a compressor is refused last, in the frame's own format.
+  ExpectRefusal( InTwo( Frame ), IPixelFormat::ER8G8B8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 );
+  VBufferList Video = InTwo( Frame );
+  EXPECT_FALSE( Encode( Video, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EVideoH264, IPixelFormat::ELuminance8 ) );
+  EXPECT_EQ( Video.size(), 1u );
+  EXPECT_EQ( BytesOf( Video ), Frame );
+  ExpectRefusal( Whole, IPixelFormat::EU8Y8V8Y8, IVideoPayload::ENone, IPixelFormat::ELuminance8 );
+  ExpectRefusal( Whole, IPixelFormat::EU8Y8V8Y8, static_cast<IVideoPayload::Enum>( 77 ), IPixelFormat::EU8Y8V8Y8 );
+  ExpectRefusal( Whole, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EBayerGB8 );
   m_Encoder->SetBurnIn( { "T" } );
-  m_bDrawerWorks = false;
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
-  m_Parts.m_ConverterMakers.clear();
+  ExpectRefusal( { Buffer( VBytes( Frame.begin(), Frame.end() - 1 ) ) }, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed,
+    IPixelFormat::EU8Y8V8Y8 );
+  EXPECT_TRUE( Encoded( Whole, IPixelFormat::ELuminance7, IVideoPayload::EUncompressed, IPixelFormat::ELuminance7 ).empty() );
   m_Parts.m_DrawText = {};
   MakeEncoder();
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::ELuminance8 ) );
   m_Encoder->SetBurnIn( { "T" } );
-  EXPECT_FALSE( Encode( IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 ) );
+  ExpectRefusal( Whole, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::EU8Y8V8Y8 );
+  m_Parts.m_ConverterMakers.clear();
+  MakeEncoder();
+  ExpectRefusal( Whole, IPixelFormat::EU8Y8V8Y8, IVideoPayload::EUncompressed, IPixelFormat::ER8G8B8 );
   EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.",
-      "Error burning text into an image in 'U8Y8V8Y8' pixel format.", "Error converting pixel format from 'U8Y8V8Y8' to 'Luminance8'.",
-      "Burn-in text is not available." } ) );
+    ( std::vector<std::string>{ "Unexpected buffer size when copying frame data to make contiguous.", "Unsupported video payload format 'VideoH264'.",
+      "Unsupported video payload format 'None'.", "Unsupported video payload format 'Unspecified'.",
+      "Error converting pixel format from 'U8Y8V8Y8' to 'BayerGB8'.", "Frame of 5119 bytes is too short for its description, which needs 5120.",
+      "Error burning text into an image in 'Luminance7' pixel format.", "Burn-in text is not available.",
+      "Error converting pixel format from 'U8Y8V8Y8' to 'R8G8B8'." } ) );
 }
 
 TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
@@ -185,10 +231,10 @@ TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
   std::string Made;
   for( const EConverter Converter : { EConverter::OpenGLFirst, EConverter::Software, EConverter::OpenGLSecond } )
   {
-    m_Parts.m_ConverterMakers[Converter] = [this, &Made, Converter]
+    m_Parts.m_ConverterMakers[Converter] = [&Made, Converter]
     {
       Made += std::to_string( static_cast<int>( Converter ) );
-      return m_pConverter;
+      return nullptr;
     };
   }
   for( const int Argument : { 1, 2, 3, 0, 17 } )
@@ -204,6 +250,39 @@ TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
   }
   EXPECT_EQ( Made, "12333222" );
   EXPECT_EQ( 2u, m_Log.Count( "There is no OpenGL in this build: pixel formats are converted in software." ) );
+}
+
+TEST_F( VideoFrameEncoder, OneServesSeveralThreads )
+{
+  m_Encoder->SetBurnIn( { "00:00", 1, 1, 0 } );
+  m_Encoder->SetColour( { 0.5f, 2.0f } );
+  const auto Compressed = [&]( uint32_t i_Seed )
+  {
+    const IPixelFormat::Enum Format = i_Seed % 2 ? IPixelFormat::EBayerGB8 : IPixelFormat::EU8Y8V8Y8;
+    return Encoded( { Buffer( NoisyFrame( Format, i_Seed ) ) }, Format, IVideoPayload::EImageJPEG );
+  };
+  constexpr uint32_t Frames = 40;
+  std::vector<VBytes> Alone;
+  for( uint32_t Frame = 0; Frame < Frames; ++Frame )
+  {
+    Alone.push_back( Compressed( Frame ) );
+  }
+  std::atomic<uint32_t> Next{ 0 };
+  std::atomic<uint32_t> Equal{ 0 };
+  boost::thread_group Threads;
+  for( int Number = 0; Number < 4; ++Number )
+  {
+    Threads.create_thread(
+      [&]
+      {
+        for( uint32_t Frame = Next++; Frame < Frames; Frame = Next++ )
+        {
+          Equal += Compressed( Frame ) == Alone[Frame];
+        }
+      } );
+  }
+  Threads.join_all();
+  EXPECT_EQ( Equal, Frames );
 }
 
 TEST( PixelFormatForPayload, EachKeepsWhatItsCompressorTakes )
