@@ -112,6 +112,7 @@ VRecording::VDevice VRecording::MakeDevice( const VStartedSource& i_rSource, con
     : static_cast<uint64_t>( CeilDivide( ( i_Start + i_rRequest.m_Duration - CounterStart ).Count(), Period.Count() ) - First );
   Device.m_Sync = i_rSource.m_pSource->Temporal().GetSourceSyncStatus();
   Device.m_DroppedAtStart = Device.m_Sync.m_DroppedFrames;
+  Device.m_DroppedBefore = Device.m_DroppedAtStart;
   const KVZ::VTick Newest = CounterStart + Period * static_cast<int64_t>( Device.m_Sync.m_LatestCounterFrames );
   Device.m_Arrived = FramesOf( Newest - Device.m_Start + Period, Period );
   Device.m_LastProgress = m_rTime.Now();
@@ -173,17 +174,29 @@ void VRecording::PollDevice( VDevice& io_rDevice )
   const auto Sync = io_rDevice.m_pSource->Temporal().GetSourceSyncStatus();   // first: what it counts lies before the status
   io_rDevice.m_Status = io_rDevice.m_pSource->Capture().GetCaptureStatus();
   CountArrivals( io_rDevice, Sync );
-  const auto Before = std::exchange( io_rDevice.m_Sync, Sync );
-  // A signal that comes back makes the card count its absence some time before its first frame ends the capture: what is counted belongs to the range
-  // once a later frame has come and the capture goes on, or has ended as it was to.
-  const bool bEnded = HasEnded( io_rDevice.m_Status );
-  const bool bEndMoved = bEnded && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0;
-  if( !bHadEnded && !bEndMoved && NewestFrame( Sync ) != NewestFrame( Before ) )
-  {
-    io_rDevice.m_Dropped = ( bEnded ? Sync : Before ).m_DroppedFrames - io_rDevice.m_DroppedAtStart;
-  }
+  CountDropped( io_rDevice, bHadEnded, std::exchange( io_rDevice.m_Sync, Sync ) );
   io_rDevice.m_PeakFill = std::max( io_rDevice.m_PeakFill, io_rDevice.m_Status.m_BufferFill );
   io_rDevice.m_PeakBacklog = std::max( io_rDevice.m_PeakBacklog, FramesOf( io_rDevice.m_Status.m_AvailableDuration, io_rDevice.m_Period ) );
+}
+
+// A signal that comes back makes the card count its absence some time before its first frame ends the capture: what is counted belongs to the range
+// once two later frames have come and the capture goes on, or has ended as it was to. The first of them may not have reached the buffer yet.
+void VRecording::CountDropped( VDevice& io_rDevice, bool i_bHadEnded, const KVZ::ISourceTemporal::ISourceSyncStatus& i_rBefore )
+{
+  const bool bEnded = HasEnded( io_rDevice.m_Status );
+  if( i_bHadEnded || ( bEnded && ( io_rDevice.m_Status.m_Failure & FailureEndMoved ) != 0 ) )
+  {
+    return;
+  }
+  const bool bNewer = NewestFrame( io_rDevice.m_Sync ) != NewestFrame( i_rBefore );
+  if( bNewer || bEnded )
+  {
+    io_rDevice.m_Dropped = ( bNewer && bEnded ? io_rDevice.m_Sync.m_DroppedFrames : io_rDevice.m_DroppedBefore ) - io_rDevice.m_DroppedAtStart;
+  }
+  if( bNewer )
+  {
+    io_rDevice.m_DroppedBefore = i_rBefore.m_DroppedFrames;
+  }
 }
 
 // A new session counts from 0 again; frames that came between the last look at the old one and its end are not seen.

@@ -82,10 +82,11 @@ private:
     uint64_t m_FramesRequested = 0;
     KVZ::VTick m_Period;
     uint64_t m_DroppedAtStart = 0;
-    uint64_t m_Dropped = 0;        // by the card, since the start and before the capture's end
-    uint64_t m_Arrived = 0;        // frames of the range so far, as the polls have seen them
-    uint64_t m_NewestFrame = 0;    // progress of delivery, for stalls
-    double m_LastProgress = 0.0;   // seconds
+    uint64_t m_DroppedBefore = 0;   // ahead of the newest frame
+    uint64_t m_Dropped = 0;         // by the card, since the start and before the capture's end
+    uint64_t m_Arrived = 0;         // frames of the range so far, as the polls have seen them
+    uint64_t m_NewestFrame = 0;     // progress of delivery, for stalls
+    double m_LastProgress = 0.0;    // seconds
     KVZ::ICaptureStatus m_Status;
     KVZ::ISourceTemporal::ISourceSyncStatus m_Sync;
     double m_PeakFill = 0.0;
@@ -96,6 +97,7 @@ private:
   const VStartedSource* FindReady( const VStartedSession& i_rSession, const std::string& i_rDeviceURN, KVZ::VTick i_PreRoll ) const;
   VDevice MakeDevice( const VStartedSource& i_rSource, const VRecordingRequest& i_rRequest, KVZ::VTick i_Start ) const;
   void PollDevice( VDevice& io_rDevice );
+  static void CountDropped( VDevice& io_rDevice, bool i_bHadEnded, const KVZ::ISourceTemporal::ISourceSyncStatus& i_rBefore );
   static void CountArrivals( VDevice& io_rDevice, const KVZ::ISourceTemporal::ISourceSyncStatus& i_rSync );
   void EndStalled( VDevice& io_rDevice, double i_Now );
   VDeviceOutcome MakeOutcome( const VDevice& i_rDevice ) const;

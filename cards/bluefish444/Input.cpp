@@ -281,7 +281,7 @@ void VBluefishInput::PassSync( const VSignalFrame& i_rFrame, bool i_bSignal, con
     m_pStandard = i_rFrame.m_pStandard;
     m_FieldCount = 2 * ( i_rFrame.m_Number + 1 );
     ++m_Syncs;
-    m_bInRound = m_Waiting > 0 && i_bSignal && ( m_Named.m_Image || m_Named.m_Hanc );
+    m_bInRound = m_Waiting > 0 && ( i_bSignal || m_LastToldMode != NoSignalMode ) && ( m_Named.m_Image || m_Named.m_Hanc );
     m_Waiting = 0;
   }
   m_Sync.notify_all();
@@ -301,6 +301,8 @@ uint32_t VBluefishInput::DetectedModeLocked()
   const uint32_t Mode = m_bSignal ? ModeOf( m_pStandard->m_Standard ) : NoSignalMode;
   m_Counters.m_FormatChanges += Mode != m_LastToldMode ? 1 : 0;
   m_LastToldMode = Mode;
+  m_bInRound = m_bInRound && m_bSignal;
+  m_ClientWaits.notify_all();
   return Mode;
 }
 

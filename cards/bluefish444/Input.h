@@ -6,7 +6,8 @@
 // go on at the card's own pace.
 //
 // A client that polls is given up to two seconds a frame before the next one passes or the card is taken out, as any virtual card waits for a slow
-// client; after that the frame is lost to it. It is not waited for where it captures nothing or there is no signal.
+// client; after that the frame is lost to it. It is not waited for where it captures nothing, nor while there is no signal, once it has asked for
+// the mode and so knows.
 //
 // Any thread may call.
 #pragma once

@@ -172,6 +172,25 @@ TEST_F( BluefishStream, ACardIsNotTakenOutUnderABusyClient )
   Card.join();
 }
 
+// Were it not so, a slow client would read what its buffers held before a short loss, and take it for new.
+TEST_F( BluefishStream, ALossOfSignalWaitsUntilTheClientKnows )
+{
+  Play( "bluefish444:standard=SD_720_576I_5000,pattern=counter" );
+  EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode576i );
+  Event( R"({"do": "signal-loss", "frames": 1})" );
+  Sync();
+  const uint64_t Passed = Counters().m_FramesPassed;
+  boost::thread Card( [&] { EXPECT_TRUE( Control().Step( m_Card, 1 ) ); } );
+  while( Counters().m_FramesPassed == Passed )
+  {
+    boost::this_thread::yield();
+  }
+  EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), NoSignal );
+  Card.join();
+  EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode576i );
+  EXPECT_EQ( Counters().m_FramesWithoutBuffer, 0u );
+}
+
 TEST_F( BluefishStream, InputsWorkOnTheirOwn )
 {
   Plug( "bluefish444:inputs=4,standard=SD_720_576I_5000,pattern=counter" );

@@ -1,39 +1,25 @@
 #include "host/Recording.h"
 
 #include "host/DataStore.h"
-#include "tests/host/Engine/SourceTimes.h"
-#include "tests/support/FakeSource.h"
+#include "tests/host/Engine/SyncEngineFixture.h"
 #include "tests/support/HandTime.h"
-#include "tests/support/ManualPostalService.h"
-
-#include <gtest/gtest.h>
 
 using namespace StageHost;
 using KVZ::VTick;
 using TestSupport::VFakeSource;
-using TestSupport::VManualPostalService;
 
 namespace
 {
 
-class VNoDelays : public IDelayedCalls
-{
-public:
-  void CallAfter( double, std::function<void()> ) override {}
-};
-
 constexpr uint32_t Capturing = 4;
 constexpr uint32_t Complete = 32;
 
-class RecordingTest : public ::testing::Test
+class RecordingTest : public VSyncEngineFixture
 {
 protected:
   std::shared_ptr<VFakeSource> Add( const std::string& i_rName, int64_t i_Period, VTick i_Timecode, uint64_t i_Newest )
   {
-    auto pSource = std::make_shared<VFakeSource>( i_rName, i_Period );
-    m_pEngine->AddSource( pSource );
-    pSource->BeginSession( 100.0, i_Timecode );
-    pSource->SetNewest( i_Newest );
+    auto pSource = AddRunning( i_rName, i_Period, i_Timecode, i_Newest );
     m_pStrand->RunAll();
     return pSource;
   }
@@ -48,8 +34,6 @@ protected:
     return Request;
   }
 
-  const std::shared_ptr<VManualPostalService> m_pStrand = std::make_shared<VManualPostalService>();
-  const std::shared_ptr<VSyncEngine> m_pEngine = std::make_shared<VSyncEngine>( m_pStrand, std::make_shared<VNoDelays>() );
   const std::shared_ptr<VCaptureTargets> m_pTargets = std::make_shared<VCaptureTargets>( std::make_shared<VDataStore>() );
   TestSupport::VHandTime m_Time;
   VRecording m_Recording{ *m_pEngine, *m_pTargets, m_Time };
@@ -136,7 +120,10 @@ TEST_F( RecordingTest, LossesAreToldByTheirCause )
   m_Recording.Poll();
   pSource->m_Dropped = 30;   // an absence: no frame of the range comes after it
   m_Recording.Poll();
+  pSource->SetNewest( 150 );   // the frame that is about to end the capture
+  m_Recording.Poll();
   pSource->m_Status.m_State = Complete;
+  pSource->m_Status.m_Failure = 2;
   pSource->m_Status.m_CapturedDuration = VTick( Period25 * 40 );
   m_Recording.Poll();
   ASSERT_TRUE( m_Recording.IsFinished() );
