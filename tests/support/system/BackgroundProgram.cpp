@@ -114,4 +114,17 @@ int VBackgroundProgram::WaitForEnd( double i_Seconds )
   return WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
 }
 
+VPrivateDisplay::VPrivateDisplay() : VBackgroundProgram( { "Xvfb", "-displayfd", "1", "-screen", "0", "720x576x24", "-nolisten", "tcp" } )
+{
+  // The display's number is the last line that it prints.
+  constexpr double PatienceSeconds = 30.0;
+  if( !WaitFor( "\n", PatienceSeconds ) )
+  {
+    throw std::runtime_error( "no X server: " + Printed() );
+  }
+  const size_t End = Printed().find_last_of( "0123456789" );
+  const size_t Before = Printed().find_last_not_of( "0123456789", End );
+  m_Name = ":" + Printed().substr( Before + 1, End - Before );
+}
+
 }

@@ -37,4 +37,15 @@ private:
   std::string m_Printed;
 };
 
+// A private X server, on a display that it has picked itself. Throws where it does not start.
+class VPrivateDisplay : public VBackgroundProgram
+{
+public:
+  VPrivateDisplay();
+  const std::string& Name() const { return m_Name; }
+
+private:
+  std::string m_Name;
+};
+
 }

@@ -118,6 +118,20 @@ std::vector<VCounterFrame> ReadCounterFile( const std::string& i_rPath )
   return Frames;
 }
 
+std::vector<uint32_t> DecodeCounters( const std::string& i_rPath, uint32_t i_Width, uint32_t i_Height )
+{
+  const VRunResult Run = TestSupport::RunProgram(
+    { "ffmpeg", "-nostdin", "-v", "error", "-i", i_rPath, "-map", "0:v", "-fps_mode", "passthrough", "-pix_fmt", "uyvy422", "-f", "rawvideo", "-" } );
+  const size_t RowBytes = size_t{ i_Width } * 2;
+  std::vector<uint32_t> Counters;
+  for( size_t Position = 0; Position + RowBytes * i_Height <= Run.m_Output.size(); Position += RowBytes * i_Height )
+  {
+    const auto* pImage = reinterpret_cast<const uint8_t*>( Run.m_Output.data() ) + Position;
+    Counters.push_back( TestSupport::ReadCounter( { KVZ::IPixelFormat::EU8Y8V8Y8, pImage, RowBytes } ).value_or( 0xFFFFFFFF ) );
+  }
+  return Counters;
+}
+
 void ExpectUnbroken( const std::vector<VCounterFrame>& i_rFrames, const VSignalRate& i_rRate )
 {
   for( size_t Index = 0; Index < i_rFrames.size(); ++Index )

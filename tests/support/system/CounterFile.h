@@ -39,6 +39,10 @@ VArguments CounterCard( const VSignalRate& i_rRate, const std::string& i_rMore =
 // an unreadable counter, a background that differs from the first frame's, a ramp that is not one, keys that do not count from 0.
 std::vector<VCounterFrame> ReadCounterFile( const std::string& i_rPath );
 
+// The numbers in the pictures of any movie or sequence of images ("frame_%08d.png"), as FFmpeg decodes them; 0xFFFFFFFF in one without. FFmpeg may
+// complain of a last one that was cut short.
+std::vector<uint32_t> DecodeCounters( const std::string& i_rPath, uint32_t i_Width, uint32_t i_Height );
+
 // Counters without a gap, sound without a break at the joints of frames, and as many samples in each frame as the cadence has there.
 void ExpectUnbroken( const std::vector<VCounterFrame>& i_rFrames, const VSignalRate& i_rRate );
 

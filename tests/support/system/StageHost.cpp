@@ -1,7 +1,10 @@
 #include "tests/support/system/StageHost.h"
 
+#include <csignal>
 #include <cstdlib>
 #include <fstream>
+#include <iterator>
+#include <utility>
 
 namespace SystemTests
 {
@@ -61,6 +64,40 @@ nlohmann::json EveryFrames( uint64_t i_Every, const nlohmann::json& i_rEvent )
     Events.push_back( std::move( Event ) );
   }
   return Events;
+}
+
+VRunOptions SignalOnce( std::vector<int> i_Signals, std::function<bool( const std::string& )> i_IsTime )
+{
+  VRunOptions Options;
+  Options.m_OnErrorText = [i_Signals, i_IsTime, bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
+  {
+    if( bSent || !i_IsTime( i_rText ) )
+    {
+      return;
+    }
+    bSent = true;
+    for( const int Signal : i_Signals )
+    {
+      kill( i_Child, Signal );
+    }
+  };
+  return Options;
+}
+
+VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames )
+{
+  return SignalOnce( std::move( i_Signals ),
+    [i_Frames]( const std::string& i_rText )
+    {
+      const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", i_rText );
+      return !Captured.empty() && Captured.back() >= i_Frames;
+    } );
+}
+
+std::string ReadFile( const std::string& i_rPath )
+{
+  std::ifstream File( i_rPath, std::ios::binary );
+  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
 }
 
 std::vector<int64_t> NumbersBehind( const std::string& i_rWords, const std::string& i_rText )

@@ -5,6 +5,7 @@
 
 #include <nlohmann/json.hpp>
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -42,6 +43,14 @@ std::string WriteScript( const std::string& i_rPath, const nlohmann::json& i_rEv
 
 // The same event before every frame that is a multiple of i_Every, so that any recording longer than that meets it.
 nlohmann::json EveryFrames( uint64_t i_Every, const nlohmann::json& i_rEvent );
+
+// Sends these signals to the program, once, as soon as what it has printed to standard error is as wanted.
+VRunOptions SignalOnce( std::vector<int> i_Signals, std::function<bool( const std::string& )> i_IsTime );
+// As soon as the program, which needs --progress, tells that so many frames are captured.
+VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames );
+
+// All bytes of a file; none where it cannot be read.
+std::string ReadFile( const std::string& i_rPath );
 
 // The whole numbers behind each occurrence of a text: NumbersBehind( "frames_captured=", ... ).
 std::vector<int64_t> NumbersBehind( const std::string& i_rWords, const std::string& i_rText );

@@ -88,12 +88,6 @@ std::string WithFolder( std::string i_Text, const std::string& i_rFolder )
   return Place == std::string::npos ? i_Text : i_Text.replace( Place, 6, i_rFolder );
 }
 
-std::string ReadFile( const std::string& i_rPath )
-{
-  std::ifstream File( i_rPath, std::ios::binary );
-  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
-}
-
 void WriteFile( const std::string& i_rPath, const std::string& i_rBytes ) { std::ofstream( i_rPath, std::ios::binary ) << i_rBytes; }
 
 // One line of the program's own, and at most log lines besides.

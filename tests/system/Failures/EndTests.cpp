@@ -15,25 +15,6 @@ using namespace SystemTests;
 namespace
 {
 
-// Sends signals once so many frames are captured.
-VRunOptions SignalAfter( int64_t i_Frames, std::vector<int> i_Signals )
-{
-  VRunOptions Options;
-  Options.m_OnErrorText = [i_Frames, i_Signals, bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
-  {
-    const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", i_rText );
-    if( !bSent && !Captured.empty() && Captured.back() >= i_Frames )
-    {
-      bSent = true;
-      for( const int Signal : i_Signals )
-      {
-        kill( i_Child, Signal );
-      }
-    }
-  };
-  return Options;
-}
-
 constexpr int64_t EnoughFrames = 30;
 
 }
@@ -44,7 +25,7 @@ protected:
   VRecordResult RecordUntil( const std::vector<int>& i_rSignals ) const
   {
     return Record( m_Folder.File( "out" ), CounterCard( GetParam(), "speed=4" ) + VArguments{ "--frames", "100000", "--progress" },
-      SignalAfter( EnoughFrames, i_rSignals ) );
+      SignalAfterFrames( i_rSignals, EnoughFrames ) );
   }
 
   const TestSupport::VTemporaryFolder m_Folder;
@@ -93,19 +74,11 @@ TEST_P( EndTest, AKilledRecordingCanBeRead )
 // A signal before there is anything to finish.
 TEST_P( EndTest, AnEndBeforeTheBeginning )
 {
-  VRunOptions Options;
-  Options.m_OnErrorText = [bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
-  {
-    if( !bSent && i_rText.find( "SetSourceEnabled" ) != std::string::npos )
-    {
-      bSent = true;
-      kill( i_Child, SIGINT );
-    }
-  };
   // A card with no signal for a long time: the program waits.
   const std::string Script = WriteScript( m_Folder.File( "script.json" ), { { { "frame", 0 }, { "do", "signal-loss" }, { "frames", 100000 } } } );
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    CounterCard( GetParam(), "script=" + Script ) + VArguments{ "--frames", "10", "--verbose" }, Options );
+    CounterCard( GetParam(), "script=" + Script ) + VArguments{ "--frames", "10", "--verbose" },
+    SignalOnce( { SIGINT }, []( const std::string& i_rText ) { return i_rText.find( "SetSourceEnabled" ) != std::string::npos; } ) );
   EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( "", Result.m_Run.m_Output );
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: Interrupted " ) ) << Describe( Result.m_Run );

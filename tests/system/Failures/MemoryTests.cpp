@@ -1,7 +1,6 @@
-// Memory that runs out: the card delivers faster than a file can take.
+// Memory that runs out: the card delivers faster than files can take.
 #include "StageCoreRuntime/SanitizerBuild.h"
 #include "tests/support/TemporaryFolder.h"
-#include "tests/support/TvidParser.h"
 #include "tests/support/system/CounterFile.h"
 #include "tests/support/system/Rates.h"
 #include "tests/support/system/StageHost.h"
@@ -28,11 +27,13 @@ protected:
   const TestSupport::VTemporaryFolder m_Folder;
 };
 
-// As fast as it can; the memory is full to its pre-roll when the recording begins.
+// Images take their time to compress, and the memory is full to its pre-roll when the recording begins.
 TEST_P( MemoryTest, TheCaptureEndsWithWhatItHas )
 {
+  const std::string Small = std::string( GetParam().m_pKind ) + ":pattern=counter,speed=8,standard=" + Rate25.m_pStandard;
   const VRecordResult Result = Record( m_Folder.File( "out" ),
-    CounterCard( GetParam(), "speed=100" ) + Memory + VArguments{ "--pre-roll", "0.8", "--frames", "5000" } );
+    { "--card", Small, "--pixel-format", "U8Y8V8Y8", "--container", "images", "--video", "png", "--memory", "120", "--pre-roll", "0.8", "--frames",
+      "5000" } );
   EXPECT_EQ( 3, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   const nlohmann::json& rDevice = Result.Device();
   EXPECT_EQ( FailureMemory, rDevice.value( "failure", 0 ) ) << Describe( Result.m_Run );
@@ -40,16 +41,15 @@ TEST_P( MemoryTest, TheCaptureEndsWithWhatItHas )
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: vi:0: " ) ) << "nobody was told why";
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "--memory" ) ) << "nobody was told what helps";
 
-  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
-  // A machine that cannot keep up with the card makes it drop frames, which is another matter.
-  if( !DebugServices::IsSanitizerBuild && rDevice.value( "lost", nlohmann::json::object() ).value( "card", 0u ) == 0 )
+  const std::vector<uint32_t> Counters = DecodeCounters( Result.Path() + "/take_vi0_%08d.png", 720, 576 );
+  ASSERT_FALSE( Counters.empty() );
+  for( size_t Frame = 0; Frame < Counters.size(); ++Frame )
   {
-    ExpectUnbroken( Frames, GetParam() );
+    EXPECT_EQ( Counters.front() + Frame, Counters[Frame] );
   }
-  EXPECT_TRUE( TestSupport::VTvidParser( Result.Path() ).IsFinished() );
-  EXPECT_EQ( Frames.size(), rDevice.value( "frames_captured", 0u ) );
-  EXPECT_EQ( Frames.size(), rDevice.value( "frames_written", 0u ) );
-  EXPECT_EQ( 5000u - Frames.size(), rDevice.value( "lost", nlohmann::json::object() ).value( "memory", 0u ) );
+  EXPECT_EQ( Counters.size(), rDevice.value( "frames_captured", 0u ) );
+  EXPECT_EQ( Counters.size(), rDevice.value( "frames_written", 0u ) );
+  EXPECT_EQ( 5000u - Counters.size(), rDevice.value( "lost", nlohmann::json::object() ).value( "memory", 0u ) );
   EXPECT_GT( rDevice.value( "buffer_peak_fill", 0.0 ), 0.9 );
 }
 

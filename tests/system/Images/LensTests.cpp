@@ -57,38 +57,22 @@ protected:
 
 #if defined( STAGECORE_OPENGL )
 
-namespace
-{
-
-const std::vector<std::string> XServer = { "Xvfb", "-displayfd", "1", "-screen", "0", "640x480x24", "-nolisten", "tcp" };
-
-// The last number of what the server printed.
-std::string DisplayOf( const std::string& i_rPrinted )
-{
-  const size_t End = i_rPrinted.find_last_of( "0123456789" );
-  const size_t Before = i_rPrinted.find_last_not_of( "0123456789", End );
-  return ":" + i_rPrinted.substr( Before + 1, End - Before );
-}
-
-}
-
 // Once the first frame is on its way, the server ends and with it the context. The file that was promised a lens undone fails and is whole so far;
 // the one that takes what there is goes on without.
 TEST_F( LensTest, IsLeftFromWhereTheDisplayEnds )
 {
   for( const auto& [pConverter, ExitCode] : { std::pair{ "opengl", 1 }, { "auto", 0 } } )
   {
-    VBackgroundProgram Server( XServer );
-    ASSERT_TRUE( Server.WaitFor( "\n", 30.0 ) ) << Server.Printed();
+    VPrivateDisplay Display;
     VRunOptions Options;
-    Options.m_Environment = { "DISPLAY=" + DisplayOf( Server.Printed() ), "LIBGL_ALWAYS_SOFTWARE=1" };
+    Options.m_Environment = { "DISPLAY=" + Display.Name(), "LIBGL_ALWAYS_SOFTWARE=1" };
     Options.m_OnErrorText = [&, bSent = false]( pid_t, const std::string& i_rText ) mutable
     {
       if( !bSent && i_rText.find( "Loading shader file :/FragmentShaders/VideoYUV.glsl" ) != std::string::npos )
       {
         bSent = true;
-        Server.Interrupt();
-        Server.WaitForEnd( 30.0 );
+        Display.Interrupt();
+        Display.WaitForEnd( 30.0 );
       }
     };
     const VRecordResult Result = Record( m_Folder.File( pConverter ),
@@ -105,12 +89,10 @@ TEST_F( LensTest, IsLeftFromWhereTheDisplayEnds )
 
 TEST_F( LensTest, IsUndoneByOpenGL )
 {
-  VBackgroundProgram Server( XServer );
-  ASSERT_TRUE( Server.WaitFor( "\n", 30.0 ) ) << Server.Printed();
-  const std::string OnServer = DisplayOf( Server.Printed() );
-  for( const auto& [Display, pConverter] : { std::pair{ OnServer, "opengl" }, { OnServer, "auto" }, { std::string(), "opengl" } } )
+  const VPrivateDisplay Display;
+  for( const auto& [Name, pConverter] : { std::pair{ Display.Name(), "opengl" }, { Display.Name(), "auto" }, { std::string(), "opengl" } } )
   {
-    const VRecordResult Result = RecordOn( Display, Packed + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
+    const VRecordResult Result = RecordOn( Name, Packed + Lens + VArguments{ "--overwrite", "--converter", pConverter } );
     ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
     EXPECT_EQ( Frames, Result.Device().value( "frames_written", uint64_t{ 0 } ) );
     const std::vector<uint8_t> Frame = FirstFrame( Result );

@@ -14,21 +14,14 @@ TEST( Screen, AWindowIsRecordedAsItMovesByBothKindsOfCard )
 {
   constexpr double PatienceSeconds = 30.0;
   constexpr size_t FrameCount = 75;
-  // The server picks a free display and prints its number.
-  VBackgroundProgram Server( { "Xvfb", "-displayfd", "1", "-screen", "0", "720x576x24", "-nolisten", "tcp" } );
-  ASSERT_TRUE( Server.WaitFor( "\n", PatienceSeconds ) ) << Server.Printed();
-  const std::string Printed = Server.Printed();
-  const size_t End = Printed.find_last_of( "0123456789" );
-  ASSERT_NE( std::string::npos, End ) << Printed;
-  const size_t Before = Printed.find_last_not_of( "0123456789", End );
-  const std::string Display = ":" + Printed.substr( Before + 1, End - Before );
+  const VPrivateDisplay Display;
 
   VBackgroundProgram Player( { "ffplay", "-v", "info", "-stats", "-f", "lavfi", "-i", "testsrc2=s=720x576:r=25", "-noborder" },
-    { "DISPLAY=" + Display, "SDL_VIDEODRIVER=x11", "SDL_AUDIODRIVER=dummy" } );
+    { "DISPLAY=" + Display.Name(), "SDL_VIDEODRIVER=x11", "SDL_AUDIODRIVER=dummy" } );
   ASSERT_TRUE( Player.WaitFor( "M-V:", PatienceSeconds ) ) << Player.Printed();
 
   const TestSupport::VTemporaryFolder Folder;
-  const std::string Input = ":standard=SD_720_576I_5000,input=-f x11grab -framerate 25 -video_size 720x576 -i " + Display;
+  const std::string Input = ":standard=SD_720_576I_5000,input=-f x11grab -framerate 25 -video_size 720x576 -i " + Display.Name();
   const VRecordResult Result = Record( Folder.File( "out" ),
     { "--card", "decklink" + Input, "--card", "bluefish444" + Input, "--pixel-format", "U8Y8V8Y8", "--frames", std::to_string( FrameCount ) } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );

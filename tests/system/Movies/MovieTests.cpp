@@ -14,8 +14,6 @@
 
 #include <csignal>
 #include <cstdlib>
-#include <fstream>
-#include <iterator>
 
 using namespace SystemTests;
 
@@ -65,11 +63,6 @@ uint64_t SamplesBefore( const VSignalRate& i_rRate, uint64_t i_Frame )
   }
   return Sum;
 }
-
-}
-
-namespace
-{
 
 void CheckByMkvToolNix( const std::string& i_rPath )
 {
@@ -183,36 +176,6 @@ TEST_P( MovieTest, HoldsTheCardsFramesSoundAndTimecode )
 INSTANTIATE_TEST_SUITE_P( Containers, MovieTest, testing::ValuesIn( Movies ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pContainer ) + "_" + i_rInfo.param.m_pVideo; } );
 
-// Matroska is made so that a file which nobody closed can be read.
-TEST( KilledMovieTest, AMatroskaRecordingHoldsItsFrames )
-{
-  constexpr int64_t EnoughFrames = 50;
-  const TestSupport::VTemporaryFolder Folder;
-  VRunOptions Options;
-  int64_t Captured = 0;
-  Options.m_OnErrorText = [&Captured]( pid_t i_Child, const std::string& i_rText )
-  {
-    const std::vector<int64_t> Counts = NumbersBehind( "frames_captured=", i_rText );
-    if( Captured == 0 && !Counts.empty() && Counts.back() >= EnoughFrames )
-    {
-      Captured = Counts.back();
-      kill( i_Child, SIGKILL );
-    }
-  };
-  const VRecordResult Result = Record( Folder.File( "out" ),
-    { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "100000", "--container", "mkv", "--progress" }, Options );
-  EXPECT_EQ( SIGKILL, Result.m_Run.m_Signal ) << Describe( Result.m_Run );
-  const std::string Path = Folder.File( "out/take_vi0.mkv" );
-  std::ifstream Stream( Path, std::ios::binary );
-  const TestSupport::VEbmlParser File( { std::istreambuf_iterator<char>( Stream ), {} } );
-  const std::string Whole = std::to_string( File.FindAll( { TestSupport::Ebml::Segment, TestSupport::Ebml::Cluster } ).size() );
-  EXPECT_TRUE( File.Find( { TestSupport::Ebml::Segment } ).m_bUnknownSize );
-  EXPECT_NE( Whole, "0" );
-  const VRunResult Probe = TestSupport::RunProgram(
-    { "ffprobe", "-v", "quiet", "-count_frames", "-show_entries", "stream=nb_read_frames", "-of", "csv=p=0", Path } );
-  EXPECT_EQ( Probe.m_Output, Whole + "\n" + Whole + "\n" ) << "pictures and sounds";
-}
-
 // What is another in each take: times, and the container.
 bool IsOfOneTake( const std::string& i_rKey )
 {
@@ -230,8 +193,8 @@ TEST( MovieAttributesTest, MatroskaHoldsAllThatTheSystemsOwnContainerHolds )
       .Path();
   };
   const TestSupport::VTvidParser Reference( Take( "tvid" ) );
-  std::ifstream Stream( Take( "mkv" ), std::ios::binary );
-  auto Tags = TestSupport::ReadTags( TestSupport::VEbmlParser( { std::istreambuf_iterator<char>( Stream ), {} } ) );
+  const std::string Matroska = ReadFile( Take( "mkv" ) );
+  auto Tags = TestSupport::ReadTags( TestSupport::VEbmlParser( { Matroska.begin(), Matroska.end() } ) );
   EXPECT_EQ( Tags.size(), Reference.Internal().size() + Reference.External().size() );
   for( const auto& [pPrefix, rBlock] :
     { std::pair( "Tarvo.Internal.", Reference.Internal() ), std::pair( "Tarvo.External.", Reference.External() ) } )
@@ -305,15 +268,7 @@ TEST( MovieCheckTest, AFinishedMovieThatCannotBeReadIsAFailure )
 TEST( MovieLimitTest, ARecordingThatIsToBeLongerThanItsContainerIsWarnedOf )
 {
   const TestSupport::VTemporaryFolder Folder;
-  VRunOptions Options;
-  Options.m_OnErrorText = [bSent = false]( pid_t i_Child, const std::string& i_rText ) mutable
-  {
-    if( !bSent && i_rText.find( "frames_captured=" ) != std::string::npos )
-    {
-      bSent = true;
-      kill( i_Child, SIGINT );
-    }
-  };
+  const VRunOptions Options = SignalAfterFrames( { SIGINT }, 0 );
   const VArguments Card = { "--card", CardText( Rate2997Drop, "01:00:00;00" ), "--progress" };
   const VRecordResult Movie = Record( Folder.File( "mov" ), Card + VArguments{ "--seconds", "20000", "--container", "mov" }, Options );
   EXPECT_NEAR( Movie.Device().value( "longest_seconds", 0.0 ), 4294967295.0 / 240000.0, 0.01 ) << Describe( Movie.m_Run );

@@ -19,12 +19,6 @@ const VArguments Card = { "--card", "decklink:standard=SD_720_576I_5000,speed=4"
 
 std::string Key( const std::string& i_rName ) { return "VideoInput.vi:0.Settings." + i_rName; }
 
-std::string ReadFile( const std::string& i_rPath )
-{
-  std::ifstream File( i_rPath, std::ios::binary );
-  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
-}
-
 class SettingsTest : public testing::Test
 {
 protected:
@@ -63,11 +57,6 @@ int64_t CountOf( const std::string& i_rExtension, const std::string& i_rFolder )
     [&]( const boost::filesystem::directory_entry& i_rFile ) { return i_rFile.path().extension() == i_rExtension; } );
 }
 
-bool EndsWith( const std::string& i_rText, const std::string& i_rEnd )
-{
-  return i_rText.size() >= i_rEnd.size() && i_rText.compare( i_rText.size() - i_rEnd.size(), i_rEnd.size(), i_rEnd ) == 0;
-}
-
 }
 
 TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
@@ -75,7 +64,7 @@ TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
   Set( "AudioChannelCount", "2" );
   Set( "Name", "left" );
   VRecordResult Result = RecordMore( "a" );
-  EXPECT_TRUE( EndsWith( Result.Path(), "/a_left.tvid" ) ) << Describe( Result.m_Run );
+  EXPECT_TRUE( Result.Path().ends_with( "/a_left.tvid" ) ) << Describe( Result.m_Run );
   EXPECT_EQ( 2, Inspect( Result.Path() )["internal"].value( "AudioFrameInfo.Channels", 0 ) );
 
   // The payload is one that only the container of an earlier run takes.
@@ -87,8 +76,8 @@ TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
   EXPECT_EQ( 3, CountOf( ".png", m_Folder.File( "out/b_left" ) ) );
 
   // The command line has the last word, for its run.
-  EXPECT_TRUE( EndsWith( RecordMore( "c", { "--container", "mkv", "--audio-channels", "0" } ).Path(), "/c_left.mkv" ) );
-  EXPECT_TRUE( EndsWith( RecordMore( "d", { "--settings", "none" } ).Path(), "/d_vi0.tvid" ) );
+  EXPECT_TRUE( RecordMore( "c", { "--container", "mkv", "--audio-channels", "0" } ).Path().ends_with( "/c_left.mkv" ) );
+  EXPECT_TRUE( RecordMore( "d", { "--settings", "none" } ).Path().ends_with( "/d_vi0.tvid" ) );
   EXPECT_EQ( "IMAGES\n", Get( "VideoContainer" ) );
 
   const VRunResult Reset = Params( { "reset", "VideoInput.vi:0" } );
@@ -96,7 +85,7 @@ TEST_F( SettingsTest, ARecordingTakesWhatWasSetBefore )
   EXPECT_NE( std::string::npos, Reset.m_Output.find( Key( "AudioChannelCount" ) + " = 16\n" ) ) << Reset.m_Output;
   EXPECT_NE( std::string::npos, Reset.m_Output.find( Key( "VideoPayload" ) + " = Uncompressed\n" ) ) << Reset.m_Output;
   EXPECT_TRUE( Saved().empty() ) << Saved();
-  EXPECT_TRUE( EndsWith( RecordMore( "e" ).Path(), "/e_vi0.tvid" ) );
+  EXPECT_TRUE( RecordMore( "e" ).Path().ends_with( "/e_vi0.tvid" ) );
 }
 
 // The Bluefish444 card comes first, and takes what the other does not.

@@ -8,7 +8,6 @@
 #include <array>
 #include <csignal>
 #include <fstream>
-#include <iterator>
 
 using namespace SystemTests;
 
@@ -182,8 +181,7 @@ TEST_F( WatchTest, KeepsAPictureOfEachDevice )
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   for( const char* pName : { "pictures/vi0.png", "pictures/vi1.png" } )
   {
-    std::ifstream File( m_Folder.File( pName ), std::ios::binary );
-    const std::string Bytes{ std::istreambuf_iterator<char>( File ), {} };
+    const std::string Bytes = ReadFile( m_Folder.File( pName ) );
     ASSERT_GT( Bytes.size(), 24u );
     EXPECT_EQ( std::string( "\x89PNG\r\n\x1a\n", 8 ), Bytes.substr( 0, 8 ) );
     EXPECT_EQ( std::string( "\0\0\x02\xd0\0\0\x02\x40", 8 ), Bytes.substr( 16, 8 ) ) << "720 by 576";
@@ -197,18 +195,8 @@ TEST_F( WatchTest, KeepsAPictureOfEachDevice )
 
 TEST_F( WatchTest, AnInterruptEndsItWithTheFigures )
 {
-  VRunOptions Options;
-  bool bSent = false;
-  Options.m_OnErrorText = [&bSent]( pid_t i_Child, const std::string& i_rText )
-  {
-    if( !bSent && i_rText.find( "Node Watch vi:0 runs." ) != std::string::npos )
-    {
-      bSent = true;
-      kill( i_Child, SIGINT );
-    }
-  };
-  const VWatchResult Result = Watch( { "--card", CardText( "speed=4" ), "--verbose" }, Options );
-  EXPECT_TRUE( bSent );
+  const VWatchResult Result = Watch( { "--card", CardText( "speed=4" ), "--verbose" },
+    SignalOnce( { SIGINT }, []( const std::string& i_rText ) { return i_rText.find( "Node Watch vi:0 runs." ) != std::string::npos; } ) );
   EXPECT_FALSE( Result.m_Run.m_bTimedOut );
   EXPECT_EQ( 1u, Result.m_Devices.size() ) << Describe( Result.m_Run );
 }
