@@ -1,6 +1,8 @@
 // Reads EBML and the parts of Matroska that our files have. Knows nothing of the code that writes them: ids are those of RFC 8794 and RFC 9559.
 #pragma once
 
+#include "tests/support/FileBytes.h"
+
 #include <cstdint>
 #include <map>
 #include <string>
@@ -32,35 +34,16 @@ enum EId : uint32_t
   WritingApp = 0x5741,
   Tracks = 0x1654AE6B,
   TrackEntry = 0xAE,
-  TrackNumber = 0xD7,
-  TrackUID = 0x73C5,
-  TrackType = 0x83,
-  FlagEnabled = 0xB9,
-  FlagDefault = 0x88,
-  FlagForced = 0x55AA,
-  FlagLacing = 0x9C,
-  MinCache = 0x6DE7,
-  DefaultDuration = 0x23E383,
-  MaxBlockAdditionID = 0x55EE,
-  Language = 0x22B59C,
   CodecID = 0x86,
   CodecPrivate = 0x63A2,
   Video = 0xE0,
-  PixelWidth = 0xB0,
-  PixelHeight = 0xBA,
-  DisplayWidth = 0x54B0,
-  DisplayHeight = 0x54BA,
   UncompressedFourCC = 0x2EB524,
   Audio = 0xE1,
-  SamplingFrequency = 0xB5,
-  OutputSamplingFrequency = 0x78B5,
   Channels = 0x9F,
   BitDepth = 0x6264,
   Tags = 0x1254C367,
   Tag = 0x7373,
   Targets = 0x63C0,
-  TagTrackUID = 0x63C5,
-  TagChapterUID = 0x63C4,
   TagAttachmentUID = 0x63C6,
   SimpleTag = 0x67C8,
   TagName = 0x45A3,
@@ -81,6 +64,8 @@ enum EId : uint32_t
 
 struct VEbmlElement
 {
+  using VPath = std::vector<uint32_t>;
+
   uint32_t m_Id = 0;
   uint64_t m_Position = 0;   // of its first byte
   uint64_t m_Data = 0;       // where its data begin
@@ -90,40 +75,39 @@ struct VEbmlElement
   std::vector<VEbmlElement> m_Children{};   // of a master
 
   uint64_t End() const { return m_Data + m_Size; }
+
+  // All elements below that the ids lead to, from the outermost one, or the first of them; throws where there is none.
+  std::vector<const VEbmlElement*> FindAll( const VPath& i_rPath ) const;
+  const VEbmlElement& Find( const VPath& i_rPath ) const;
 };
 
 class VEbmlParser
 {
 public:
   using VBytes = std::vector<uint8_t>;
-  using VPath = std::vector<uint32_t>;
+  using VPath = VEbmlElement::VPath;
 
   // Throws std::runtime_error where an element runs past its parent's end; in a segment of unknown size such a one ends the reading.
-  explicit VEbmlParser( VBytes i_Bytes );
+  explicit VEbmlParser( const VBytes& i_rBytes );
 
-  const std::vector<VEbmlElement>& Elements() const { return m_Elements; }
-
-  // All elements that the ids lead to, from the outermost one.
-  std::vector<const VEbmlElement*> FindAll( const VPath& i_rPath ) const { return FindIn( m_Elements, i_rPath ); }
-  static std::vector<const VEbmlElement*> FindIn( const std::vector<VEbmlElement>& i_rElements, const VPath& i_rPath );
-
-  // Of the first element there. Throw std::runtime_error where there is none.
-  const VEbmlElement& Find( const VPath& i_rPath ) const;
+  std::vector<const VEbmlElement*> FindAll( const VPath& i_rPath ) const { return m_File.FindAll( i_rPath ); }
+  const VEbmlElement& Find( const VPath& i_rPath ) const { return m_File.Find( i_rPath ); }
   uint64_t Number( const VPath& i_rPath ) const { return NumberOf( Find( i_rPath ) ); }
   std::string Text( const VPath& i_rPath ) const { return TextOf( Find( i_rPath ) ); }
   double Real( const VPath& i_rPath ) const;
 
-  uint64_t NumberOf( const VEbmlElement& i_rElement ) const;
-  std::string TextOf( const VEbmlElement& i_rElement ) const;
-  VBytes BytesOf( const VEbmlElement& i_rElement ) const;
+  uint64_t NumberOf( const VEbmlElement& i_rElement ) const { return m_Bytes.Big( i_rElement.m_Data, i_rElement.m_Size ); }
+  std::string TextOf( const VEbmlElement& i_rElement ) const { return m_Bytes.Text( i_rElement.m_Data, i_rElement.m_Size ); }
+  VBytes BytesOf( const VEbmlElement& i_rElement ) const { return m_Bytes.Read( i_rElement.m_Data, i_rElement.m_Size ); }
 
 private:
   std::vector<VEbmlElement> Parse( uint64_t i_Begin, uint64_t i_End, bool i_bMayBeCut ) const;
   bool ParseHead( uint64_t i_End, VEbmlElement& io_rElement ) const;
-  uint64_t BigEndian( uint64_t i_Position, uint64_t i_Size ) const;
+  // Of the number that begins there: as many as its first byte has leading zeros, and one.
+  uint64_t CodedBytes( uint64_t i_Position ) const;
 
-  const VBytes m_Bytes;
-  std::vector<VEbmlElement> m_Elements;
+  const VFileBytes m_Bytes;
+  VEbmlElement m_File;   // what stands for it all
 };
 
 struct VMatroskaBlock

@@ -1,10 +1,6 @@
 #include "tests/support/MovParser.h"
 
-#include "tests/support/ParserCheck.h"
-
 #include <algorithm>
-#include <fstream>
-#include <memory>
 #include <set>
 #include <stdexcept>
 
@@ -16,18 +12,6 @@ namespace
 
 // "tmcd" and "hdlr" are none: in a media header the one holds another atom, as a sample format it does not.
 const std::set<std::string> Containers = { "moov", "trak", "tapt", "edts", "tref", "mdia", "minf", "dinf", "gmhd", "stbl" };
-
-uint64_t BigEndian( const uint8_t* i_pBytes, size_t i_Count )
-{
-  uint64_t Value = 0;
-  for( size_t Byte = 0; Byte < i_Count; ++Byte )
-  {
-    Value = Value << 8 | i_pBytes[Byte];
-  }
-  return Value;
-}
-
-std::string FourCC( const uint8_t* i_pBytes ) { return { i_pBytes, i_pBytes + 4 }; }
 
 }
 
@@ -58,10 +42,10 @@ bool VMovAtom::Has( const std::string& i_rType ) const
   return std::any_of( m_Children.begin(), m_Children.end(), [&]( const VMovAtom& i_rChild ) { return i_rChild.m_Type == i_rType; } );
 }
 
-VMovParser::VMovParser( VSource i_Source, uint64_t i_Size ) : m_Source( std::move( i_Source ) )
+VMovParser::VMovParser( VFileBytes i_Bytes ) : m_Bytes( std::move( i_Bytes ) )
 {
   m_Root.m_Type = "file";
-  m_Root.m_End = i_Size;
+  m_Root.m_End = m_Bytes.Size();
   ReadAtoms( m_Root, 0 );
   for( const VMovAtom& rAtom : m_Root.Child( "moov" ).m_Children )
   {
@@ -72,47 +56,16 @@ VMovParser::VMovParser( VSource i_Source, uint64_t i_Size ) : m_Source( std::mov
   }
 }
 
-VMovParser VMovParser::OfFile( const std::string& i_rPath )
-{
-  const auto pFile = std::make_shared<std::ifstream>( i_rPath, std::ios::binary | std::ios::ate );
-  Require( pFile->is_open(), "cannot open " + i_rPath, 0 );
-  const auto Size = static_cast<uint64_t>( pFile->tellg() );
-  return VMovParser(
-    [pFile]( uint64_t i_Position, uint64_t i_Bytes )
-    {
-      VMovBytes Bytes( i_Bytes );
-      pFile->clear();
-      pFile->seekg( static_cast<std::streamoff>( i_Position ) );
-      pFile->read( reinterpret_cast<char*>( Bytes.data() ), static_cast<std::streamsize>( i_Bytes ) );
-      Require( pFile->good(), "cut short", i_Position );
-      return Bytes;
-    },
-    Size );
-}
-
-VMovParser VMovParser::OfBytes( const VMovBytes& i_rBytes )
-{
-  return VMovParser(
-    [Bytes = i_rBytes]( uint64_t i_Position, uint64_t i_Size )
-    {
-      Require( i_Position <= Bytes.size() && i_Size <= Bytes.size() - i_Position, "cut short", i_Position );
-      const auto Start = Bytes.begin() + static_cast<std::ptrdiff_t>( i_Position );
-      return VMovBytes( Start, Start + static_cast<std::ptrdiff_t>( i_Size ) );
-    },
-    i_rBytes.size() );
-}
-
 void VMovParser::ReadAtoms( VMovAtom& io_rParent, uint64_t i_Position ) const
 {
   while( i_Position != io_rParent.m_End )
   {
     Require( i_Position + 8 <= io_rParent.m_End, "no room for an atom in '" + io_rParent.m_Type + "'", i_Position );
-    const VMovBytes Header = m_Source( i_Position, 8 );
-    VMovAtom Atom{ FourCC( &Header[4] ), i_Position, i_Position + 8, 0, {} };
-    uint64_t Size = BigEndian( Header.data(), 4 );
+    VMovAtom Atom{ m_Bytes.Text( i_Position + 4, 4 ), i_Position, i_Position + 8, 0, {} };
+    uint64_t Size = m_Bytes.Big( i_Position, 4 );
     if( Size == 1 )
     {
-      Size = BigEndian( m_Source( i_Position + 8, 8 ).data(), 8 );
+      Size = m_Bytes.Big( i_Position + 8, 8 );
       Atom.m_Body += 8;
     }
     Atom.m_End = i_Position + Size;
@@ -130,7 +83,7 @@ void VMovParser::ReadAtoms( VMovAtom& io_rParent, uint64_t i_Position ) const
 uint64_t VMovParser::Number( const VMovAtom& i_rAtom, uint64_t i_Offset, size_t i_Bytes ) const
 {
   Require( i_rAtom.m_Body + i_Offset + i_Bytes <= i_rAtom.m_End, "'" + i_rAtom.m_Type + "' is too short", i_rAtom.m_Position );
-  return BigEndian( m_Source( i_rAtom.m_Body + i_Offset, i_Bytes ).data(), i_Bytes );
+  return m_Bytes.Big( i_rAtom.m_Body + i_Offset, i_Bytes );
 }
 
 const VMovTrack& VMovParser::Track( const std::string& i_rHandler ) const
@@ -146,21 +99,18 @@ VMovTrack VMovParser::ReadTrack( const VMovAtom& i_rTrak ) const
   const VMovAtom& rElst = i_rTrak.Child( "edts" ).Child( "elst" );
   Require( CountEntries( rElst, 4, 12 ) == 1, "more than one edit", rElst.m_Position );
   VMovTrack Track;
-  Track.m_Handler = FourCC( &Body( rMdia.Child( "hdlr" ) )[8] );
-  Track.m_Id = static_cast<uint32_t>( Number( i_rTrak.Child( "tkhd" ), 12 ) );
-  Track.m_Timescale = static_cast<uint32_t>( Number( rMdia.Child( "mdhd" ), 12 ) );
-  Track.m_MediaDuration = static_cast<uint32_t>( Number( rMdia.Child( "mdhd" ), 16 ) );
-  Track.m_EditDuration = static_cast<uint32_t>( Number( rElst, 8 ) );
-  Track.m_EditStart = static_cast<uint32_t>( Number( rElst, 12 ) );
-  const VMovAtom& rStbl = rMdia.Child( "minf" ).Child( "stbl" );
-  Track.m_Format = FourCC( &Body( rStbl.Child( "stsd" ) )[12] );
-  ReadSamples( rStbl, Track );
+  Track.m_Handler = m_Bytes.Text( rMdia.Child( "hdlr" ).m_Body + 8, 4 );
+  Track.m_Timescale = U32( rMdia.Child( "mdhd" ), 12 );
+  Track.m_MediaDuration = U32( rMdia.Child( "mdhd" ), 16 );
+  Track.m_EditDuration = U32( rElst, 8 );
+  Track.m_EditStart = U32( rElst, 12 );
+  ReadSamples( rMdia.Child( "minf" ).Child( "stbl" ), Track );
   return Track;
 }
 
 uint32_t VMovParser::CountEntries( const VMovAtom& i_rAtom, uint64_t i_Header, size_t i_Width ) const
 {
-  const auto Count = static_cast<uint32_t>( Number( i_rAtom, i_Header ) );
+  const uint32_t Count = U32( i_rAtom, i_Header );
   Require( i_rAtom.m_Body + i_Header + 4 + uint64_t{ Count } * i_Width == i_rAtom.m_End, "'" + i_rAtom.m_Type + "' is not what its count says",
     i_rAtom.m_Position );
   return Count;
@@ -170,10 +120,9 @@ void VMovParser::ReadSamples( const VMovAtom& i_rStbl, VMovTrack& o_rTrack ) con
 {
   const VMovAtom& rStts = i_rStbl.Child( "stts" );
   Require( CountEntries( rStts, 4, 8 ) == 1, "more than one duration", rStts.m_Position );
-  const auto Count = static_cast<uint32_t>( Number( rStts, 8 ) );
+  const uint32_t Count = U32( rStts, 8 );
   const uint64_t Delta = Number( rStts, 12 );
   const VMovAtom& rCo64 = i_rStbl.Child( "co64" );
-  const VMovBytes Offsets = Body( rCo64 );
   const std::vector<uint32_t> PerChunk = ReadChunkCounts( i_rStbl.Child( "stsc" ), CountEntries( rCo64, 4, 8 ) );
   const std::vector<uint32_t> Sizes = ReadSizes( i_rStbl.Child( "stsz" ), Count );
   const std::vector<uint32_t> Composition = ReadOffsets( i_rStbl, Count );
@@ -183,7 +132,7 @@ void VMovParser::ReadSamples( const VMovAtom& i_rStbl, VMovTrack& o_rTrack ) con
     const uint32_t Samples = PerChunk[Chunk];
     Require( uint64_t{ Sample } + Samples <= Count, "more samples in chunks than have a duration", rCo64.m_Position );
     VMovSample Found;
-    Found.m_Position = BigEndian( &Offsets[8 + 8 * Chunk], 8 );
+    Found.m_Position = Number( rCo64, 8 + 8 * Chunk, 8 );
     Found.m_Count = Samples;
     Found.m_Size = Sizes[Sample % Sizes.size()] * Samples;
     Found.m_DecodeTime = Sample * Delta;
@@ -195,7 +144,10 @@ void VMovParser::ReadSamples( const VMovAtom& i_rStbl, VMovTrack& o_rTrack ) con
   if( i_rStbl.Has( "stss" ) )
   {
     const VMovAtom& rStss = i_rStbl.Child( "stss" );
-    std::for_each( o_rTrack.m_Samples.begin(), o_rTrack.m_Samples.end(), []( VMovSample& io_rSample ) { io_rSample.m_bKeyFrame = false; } );
+    for( VMovSample& rSample : o_rTrack.m_Samples )
+    {
+      rSample.m_bKeyFrame = false;
+    }
     for( uint32_t Entry = 0; Entry < CountEntries( rStss, 4, 4 ); ++Entry )
     {
       o_rTrack.m_Samples.at( Number( rStss, 8 + 4 * Entry ) - 1 ).m_bKeyFrame = true;
@@ -206,18 +158,17 @@ void VMovParser::ReadSamples( const VMovAtom& i_rStbl, VMovTrack& o_rTrack ) con
 // One for all, or one each.
 std::vector<uint32_t> VMovParser::ReadSizes( const VMovAtom& i_rStsz, uint32_t i_Count ) const
 {
-  const auto OneSize = static_cast<uint32_t>( Number( i_rStsz, 4 ) );
+  const uint32_t OneSize = U32( i_rStsz, 4 );
   if( OneSize != 0 || i_Count == 0 )
   {
     Require( i_rStsz.m_End - i_rStsz.m_Body == 12 && Number( i_rStsz, 8 ) == i_Count, "'stsz' has another count", i_rStsz.m_Position );
     return { OneSize };
   }
   Require( CountEntries( i_rStsz, 8, 4 ) == i_Count, "'stsz' has another count", i_rStsz.m_Position );
-  const VMovBytes Table = Body( i_rStsz );
   std::vector<uint32_t> Sizes;
   for( uint32_t Sample = 0; Sample < i_Count; ++Sample )
   {
-    Sizes.push_back( static_cast<uint32_t>( BigEndian( &Table[12 + 4 * Sample], 4 ) ) );
+    Sizes.push_back( U32( i_rStsz, 12 + 4 * Sample ) );
   }
   return Sizes;
 }
@@ -225,16 +176,15 @@ std::vector<uint32_t> VMovParser::ReadSizes( const VMovAtom& i_rStsz, uint32_t i
 std::vector<uint32_t> VMovParser::ReadChunkCounts( const VMovAtom& i_rStsc, size_t i_Chunks ) const
 {
   const uint32_t Entries = CountEntries( i_rStsc, 4, 12 );
-  const VMovBytes Table = Body( i_rStsc );
   std::vector<uint32_t> Counts;
   for( uint32_t Entry = 0; Entry < Entries; ++Entry )
   {
-    const uint8_t* pEntry = &Table[8 + 12 * Entry];
-    Require( Entry == 0 ? BigEndian( pEntry, 4 ) == 1 : BigEndian( pEntry, 4 ) == Counts.size() + 1, "chunks out of order", i_rStsc.m_Position );
-    Require( BigEndian( pEntry + 8, 4 ) == 1, "another sample description", i_rStsc.m_Position );
-    const size_t End = Entry + 1 < Entries ? BigEndian( pEntry + 12, 4 ) - 1 : i_Chunks;
+    const uint64_t Offset = 8 + 12 * Entry;
+    Require( U32( i_rStsc, Offset ) == Counts.size() + 1, "chunks out of order", i_rStsc.m_Position );
+    Require( U32( i_rStsc, Offset + 8 ) == 1, "another sample description", i_rStsc.m_Position );
+    const size_t End = Entry + 1 < Entries ? U32( i_rStsc, Offset + 12 ) - 1 : i_Chunks;
     Require( End <= i_Chunks, "more chunks than offsets", i_rStsc.m_Position );
-    Counts.resize( std::max( Counts.size(), End ), static_cast<uint32_t>( BigEndian( pEntry + 4, 4 ) ) );
+    Counts.resize( std::max( Counts.size(), End ), U32( i_rStsc, Offset + 4 ) );
   }
   Require( Counts.size() == i_Chunks, "fewer chunks than offsets", i_rStsc.m_Position );
   return Counts;
@@ -242,16 +192,15 @@ std::vector<uint32_t> VMovParser::ReadChunkCounts( const VMovAtom& i_rStsc, size
 
 std::vector<uint32_t> VMovParser::ReadOffsets( const VMovAtom& i_rStbl, uint32_t i_Count ) const
 {
-  std::vector<uint32_t> Offsets;
   if( !i_rStbl.Has( "ctts" ) )
   {
-    Offsets.assign( i_Count, 0 );
-    return Offsets;
+    return std::vector<uint32_t>( i_Count, 0 );
   }
+  std::vector<uint32_t> Offsets;
   const VMovAtom& rCtts = i_rStbl.Child( "ctts" );
   for( uint32_t Entry = 0; Entry < CountEntries( rCtts, 4, 8 ); ++Entry )
   {
-    Offsets.resize( Offsets.size() + Number( rCtts, 8 + 8 * Entry ), static_cast<uint32_t>( Number( rCtts, 12 + 8 * Entry ) ) );
+    Offsets.resize( Offsets.size() + Number( rCtts, 8 + 8 * Entry ), U32( rCtts, 12 + 8 * Entry ) );
   }
   Require( Offsets.size() == i_Count, "'ctts' has another count", rCtts.m_Position );
   return Offsets;

@@ -3,8 +3,9 @@
 // What a file does not hold as that format says throws std::runtime_error with the place.
 #pragma once
 
+#include "tests/support/FileBytes.h"
+
 #include <cstdint>
-#include <functional>
 #include <string>
 #include <vector>
 
@@ -41,28 +42,23 @@ struct VMovSample
 struct VMovTrack
 {
   std::string m_Handler;   // "vide", "soun", "tmcd"
-  uint32_t m_Id = 0;
   uint32_t m_Timescale = 0;
   uint32_t m_MediaDuration = 0;
   uint32_t m_EditDuration = 0;
   uint32_t m_EditStart = 0;
-  std::string m_Format;
   std::vector<VMovSample> m_Samples;   // of sound chunks
 };
 
 class VMovParser
 {
 public:
-  // Gives so many bytes from a position.
-  using VSource = std::function<VMovBytes( uint64_t i_Position, uint64_t i_Size )>;
-
-  VMovParser( VSource i_Source, uint64_t i_Size );
-  static VMovParser OfFile( const std::string& i_rPath );
-  static VMovParser OfBytes( const VMovBytes& i_rBytes );
+  explicit VMovParser( VFileBytes i_Bytes );
+  static VMovParser OfFile( const std::string& i_rPath ) { return VMovParser( VFileBytes::OfFile( i_rPath ) ); }
+  static VMovParser OfBytes( const VMovBytes& i_rBytes ) { return VMovParser( VFileBytes::OfBytes( i_rBytes ) ); }
 
   const VMovAtom& Root() const { return m_Root; }
-  VMovBytes Body( const VMovAtom& i_rAtom ) const { return m_Source( i_rAtom.m_Body, i_rAtom.m_End - i_rAtom.m_Body ); }
-  VMovBytes Bytes( const VMovSample& i_rSample ) const { return m_Source( i_rSample.m_Position, i_rSample.m_Size ); }
+  VMovBytes Body( const VMovAtom& i_rAtom ) const { return m_Bytes.Read( i_rAtom.m_Body, i_rAtom.m_End - i_rAtom.m_Body ); }
+  VMovBytes Bytes( const VMovSample& i_rSample ) const { return m_Bytes.Read( i_rSample.m_Position, i_rSample.m_Size ); }
   // Big-endian, from a body.
   uint64_t Number( const VMovAtom& i_rAtom, uint64_t i_Offset, size_t i_Bytes = 4 ) const;
 
@@ -79,8 +75,9 @@ private:
   std::vector<uint32_t> ReadOffsets( const VMovAtom& i_rStbl, uint32_t i_Count ) const;
   // A table's entries of i_Width bytes, which must fill the atom behind the count at i_Header.
   uint32_t CountEntries( const VMovAtom& i_rAtom, uint64_t i_Header, size_t i_Width ) const;
+  uint32_t U32( const VMovAtom& i_rAtom, uint64_t i_Offset ) const { return static_cast<uint32_t>( Number( i_rAtom, i_Offset ) ); }
 
-  VSource m_Source;
+  VFileBytes m_Bytes;
   VMovAtom m_Root;
   std::vector<VMovTrack> m_Tracks;
 };

@@ -1,10 +1,6 @@
 #include "tests/support/RiffParser.h"
 
-#include "tests/support/ParserCheck.h"
-
 #include <algorithm>
-#include <fstream>
-#include <iterator>
 #include <stdexcept>
 
 namespace TestSupport
@@ -34,12 +30,11 @@ const VRiffChunk& VRiffChunk::Child( const std::string& i_rIdOrForm ) const
 
 VRiffParser::VBytes VRiffParser::ReadFile( const std::string& i_rPath )
 {
-  std::ifstream File( i_rPath, std::ios::binary );
-  Require( File.is_open(), "cannot open " + i_rPath, 0 );
-  return VBytes( std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() );
+  const VFileBytes File = VFileBytes::OfFile( i_rPath );
+  return File.Read( 0, File.Size() );
 }
 
-VRiffParser::VRiffParser( VBytes i_Bytes ) : m_Bytes( std::move( i_Bytes ) ), m_Riffs( ParseChunks( 0, m_Bytes.size() ) )
+VRiffParser::VRiffParser( const VBytes& i_rBytes ) : m_Bytes( VFileBytes::OfBytes( i_rBytes ) ), m_Riffs( ParseChunks( 0, m_Bytes.Size() ) )
 {
   for( const VRiffChunk& rRiff : m_Riffs )
   {
@@ -59,7 +54,7 @@ std::vector<VRiffChunk> VRiffParser::ParseChunks( uint64_t i_Position, uint64_t 
     Chunk.m_Data = i_Position + 8;
     const uint64_t End = Chunk.m_Data + Chunk.m_Size;
     Require( End + Chunk.m_Size % 2 <= i_End, Chunk.m_Id + " of " + std::to_string( Chunk.m_Size ) + " bytes runs past its parent", i_Position );
-    Require( Chunk.m_Size % 2 == 0 || m_Bytes[End] == 0, "padding that is not zero", End );
+    Require( Chunk.m_Size % 2 == 0 || m_Bytes.Big( End, 1 ) == 0, "padding that is not zero", End );
     if( Chunk.m_Id == "RIFF" || Chunk.m_Id == "LIST" )
     {
       Chunk.m_Form = FourCC( Chunk.m_Data );
@@ -72,30 +67,6 @@ std::vector<VRiffChunk> VRiffParser::ParseChunks( uint64_t i_Position, uint64_t 
     Chunks.push_back( std::move( Chunk ) );
   }
   return Chunks;
-}
-
-VRiffParser::VBytes VRiffParser::Bytes( uint64_t i_Position, uint64_t i_Size ) const
-{
-  Require( i_Position <= m_Bytes.size() && i_Size <= m_Bytes.size() - i_Position, "nothing", i_Position );
-  const auto Begin = m_Bytes.begin() + static_cast<std::ptrdiff_t>( i_Position );
-  return VBytes( Begin, Begin + static_cast<std::ptrdiff_t>( i_Size ) );
-}
-
-uint64_t VRiffParser::Number( uint64_t i_Position, size_t i_Size ) const
-{
-  uint64_t Value = 0;
-  const VBytes Raw = Bytes( i_Position, i_Size );
-  for( size_t Byte = i_Size; Byte != 0; --Byte )
-  {
-    Value = Value << 8 | Raw[Byte - 1];
-  }
-  return Value;
-}
-
-std::string VRiffParser::FourCC( uint64_t i_Position ) const
-{
-  const VBytes Raw = Bytes( i_Position, 4 );
-  return std::string( Raw.begin(), Raw.end() );
 }
 
 VAviParser::VAviParser( std::vector<uint8_t> i_Bytes ) : m_Riff( std::move( i_Bytes ) )

@@ -2,8 +2,9 @@
 // std::runtime_error with the position.
 #pragma once
 
+#include "tests/support/FileBytes.h"
+
 #include <cstdint>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -30,22 +31,21 @@ public:
   using VBytes = std::vector<uint8_t>;
 
   // Reads all of a file, chunk by chunk to its last byte.
-  explicit VRiffParser( VBytes i_Bytes );
+  explicit VRiffParser( const VBytes& i_rBytes );
   static VBytes ReadFile( const std::string& i_rPath );
 
   const std::vector<VRiffChunk>& Riffs() const { return m_Riffs; }
   VBytes Content( const VRiffChunk& i_rChunk ) const { return Bytes( i_rChunk.m_Data, i_rChunk.m_Size ); }
-  VBytes Bytes( uint64_t i_Position, uint64_t i_Size ) const;
-  uint16_t U16( uint64_t i_Position ) const { return static_cast<uint16_t>( Number( i_Position, 2 ) ); }
-  uint32_t U32( uint64_t i_Position ) const { return static_cast<uint32_t>( Number( i_Position, 4 ) ); }
-  uint64_t U64( uint64_t i_Position ) const { return Number( i_Position, 8 ); }
-  std::string FourCC( uint64_t i_Position ) const;
+  VBytes Bytes( uint64_t i_Position, uint64_t i_Size ) const { return m_Bytes.Read( i_Position, i_Size ); }
+  uint16_t U16( uint64_t i_Position ) const { return static_cast<uint16_t>( m_Bytes.Little( i_Position, 2 ) ); }
+  uint32_t U32( uint64_t i_Position ) const { return static_cast<uint32_t>( m_Bytes.Little( i_Position, 4 ) ); }
+  uint64_t U64( uint64_t i_Position ) const { return m_Bytes.Little( i_Position, 8 ); }
+  std::string FourCC( uint64_t i_Position ) const { return m_Bytes.Text( i_Position, 4 ); }
 
 private:
-  uint64_t Number( uint64_t i_Position, size_t i_Size ) const;
   std::vector<VRiffChunk> ParseChunks( uint64_t i_Position, uint64_t i_End ) const;
 
-  const VBytes m_Bytes;
+  const VFileBytes m_Bytes;
   std::vector<VRiffChunk> m_Riffs;
 };
 

@@ -1,7 +1,6 @@
 #include "tests/support/TvidParser.h"
 
-#include "tests/support/ParserCheck.h"
-
+#include <bit>
 #include <cstring>
 #include <stdexcept>
 
@@ -13,40 +12,23 @@ namespace
 
 uint64_t ImageSize( const std::string& i_rFormat, uint64_t i_Width, uint64_t i_Height )
 {
-  if( i_rFormat == "Luminance8" )
-  {
-    return i_Width * i_Height;
-  }
-  if( i_rFormat == "U8Y8V8Y8" )
-  {
-    return 2 * i_Width * i_Height;
-  }
   if( i_rFormat == "U10Y10V10Y10" )
   {
     return ( i_Width + 47 ) / 48 * 128 * i_Height;
   }
-  if( i_rFormat == "B8G8R8u8" )
-  {
-    return 4 * i_Width * i_Height;
-  }
-  if( i_rFormat == "R8G8B8" )
-  {
-    return 3 * i_Width * i_Height;
-  }
-  throw std::runtime_error( "tvid: no size known for pixel format " + i_rFormat );
+  static const std::map<std::string, uint64_t> s_BytesAPixel = { { "Luminance8", 1 }, { "U8Y8V8Y8", 2 }, { "R8G8B8", 3 }, { "B8G8R8u8", 4 } };
+  Require( s_BytesAPixel.count( i_rFormat ) != 0, "no size known for pixel format " + i_rFormat, 0 );
+  return s_BytesAPixel.at( i_rFormat ) * i_Width * i_Height;
 }
 
 }
 
-VTvidParser::VTvidParser( const std::string& i_rPath ) : m_File( i_rPath, std::ios::binary | std::ios::ate )
+VTvidParser::VTvidParser( const std::string& i_rPath ) : m_File( VFileBytes::OfFile( i_rPath ) )
 {
-  Require( m_File.is_open(), "cannot open " + i_rPath, 0 );
-  m_Size = static_cast<uint64_t>( m_File.tellg() );
-  m_File.seekg( 0 );
   ReadHeader();
   m_Internal = ReadBlock();
   m_External = ReadBlock();
-  m_RecordsStart = static_cast<uint64_t>( m_File.tellg() );
+  m_RecordsStart = m_Cursor;
   ReadDescription();
   if( m_bFinished )
   {
@@ -58,71 +40,62 @@ VTvidParser::VTvidParser( const std::string& i_rPath ) : m_File( i_rPath, std::i
   }
 }
 
-template<class T>
-T VTvidParser::Read()
+uint64_t VTvidParser::Next( uint64_t i_Bytes )
 {
-  T Value{};
-  const uint64_t Position = static_cast<uint64_t>( m_File.tellg() );
-  m_File.read( reinterpret_cast<char*>( &Value ), sizeof( Value ) );
-  Require( m_File.good(), "cut short", Position );
+  const uint64_t Value = m_File.Little( m_Cursor, i_Bytes );
+  m_Cursor += i_Bytes;
   return Value;
 }
 
-std::string VTvidParser::ReadText()
+std::string VTvidParser::NextText()
 {
-  const uint32_t Length = Read<uint32_t>();
-  Require( Length <= m_Size, "a text longer than the file", static_cast<uint64_t>( m_File.tellg() ) );
-  std::string Text( Length, '\0' );
-  m_File.read( Text.data(), Length );
-  Require( m_File.good(), "a text is cut short", m_Size );
-  return Text;
+  const uint64_t Length = Next( 4 );
+  m_Cursor += Length;
+  return m_File.Text( m_Cursor - Length, Length );
 }
 
-VTvidParser::VValue VTvidParser::ReadValue( uint32_t i_Tag )
+VTvidParser::VValue VTvidParser::ReadValue( uint64_t i_Tag )
 {
   switch( i_Tag )
   {
-    case 0: return Read<uint8_t>() != 0;
-    case 1: return int64_t{ Read<int8_t>() };
-    case 2: return int64_t{ Read<int16_t>() };
-    case 3: return int64_t{ Read<int32_t>() };
-    case 4: return Read<int64_t>();
-    case 5: return uint64_t{ Read<uint8_t>() };
-    case 6: return uint64_t{ Read<uint16_t>() };
-    case 7: return uint64_t{ Read<uint32_t>() };
-    case 8: return Read<uint64_t>();
-    case 9: return double{ Read<float>() };
-    case 10: return Read<double>();
-    case 11: return ReadText();
-    default: throw std::runtime_error( "tvid: unknown type tag " + std::to_string( i_Tag ) );
+    case 0: return Next( 1 ) != 0;
+    case 1: return int64_t{ static_cast<int8_t>( Next( 1 ) ) };
+    case 2: return int64_t{ static_cast<int16_t>( Next( 2 ) ) };
+    case 3: return int64_t{ static_cast<int32_t>( Next( 4 ) ) };
+    case 4: return static_cast<int64_t>( Next( 8 ) );
+    case 5: return Next( 1 );
+    case 6: return Next( 2 );
+    case 7: return Next( 4 );
+    case 8: return Next( 8 );
+    case 9: return double{ std::bit_cast<float>( static_cast<uint32_t>( Next( 4 ) ) ) };
+    case 10: return std::bit_cast<double>( Next( 8 ) );
+    case 11: return NextText();
+    default: throw std::runtime_error( "unknown type tag " + std::to_string( i_Tag ) );
   }
 }
 
 VTvidParser::VAttributes VTvidParser::ReadBlock()
 {
   VAttributes Attributes;
-  std::string Previous;
-  const uint32_t Count = Read<uint32_t>();
-  for( uint32_t Entry = 0; Entry < Count; ++Entry )
+  for( uint64_t Left = Next( 4 ); Left != 0; --Left )
   {
-    std::string Key = ReadText();
-    Require( Entry == 0 || Previous < Key, "keys out of order, " + Key, static_cast<uint64_t>( m_File.tellg() ) );
-    Attributes[Key] = ReadValue( Read<uint32_t>() );
-    Previous = std::move( Key );
+    const std::string Key = NextText();
+    Require( Attributes.empty() || Attributes.rbegin()->first < Key, "keys out of order, " + Key, m_Cursor );
+    Attributes[Key] = ReadValue( Next( 4 ) );
   }
   return Attributes;
 }
 
 void VTvidParser::ReadHeader()
 {
-  char Magic[20];
-  m_File.read( Magic, sizeof( Magic ) );
-  Require( m_File.good() && std::memcmp( Magic, "###TarvoVideoFile###", sizeof( Magic ) ) == 0, "wrong first words", 0 );
-  Require( Read<uint32_t>() == 0x9F31C19C, "wrong constant", 20 );
-  Require( Read<uint32_t>() == 1, "wrong constant", 24 );
-  Require( Read<uint32_t>() == 2, "wrong constant", 28 );
-  Require( Read<uint64_t>() == 1, "wrong constant", 32 );
-  m_IndexPosition = Read<uint64_t>();
+  Require( m_File.Text( 0, 20 ) == "###TarvoVideoFile###", "wrong first words", 0 );
+  m_Cursor = 20;
+  for( const uint64_t Constant : { 0x9F31C19C, 1u, 2u } )
+  {
+    Require( Next( 4 ) == Constant, "wrong constant", m_Cursor );
+  }
+  Require( Next( 8 ) == 1, "wrong constant", m_Cursor );
+  m_IndexPosition = Next( 8 );
   m_bFinished = m_IndexPosition != 0;
 }
 
@@ -150,9 +123,7 @@ bool VTvidParser::ReadRecord( uint64_t i_Key, uint64_t i_Position, uint64_t i_Li
     {
       return false;
     }
-    m_File.clear();
-    m_File.seekg( static_cast<std::streamoff>( Frame.m_AudioPosition ) );
-    Frame.m_AudioSize = Read<uint32_t>();
+    Frame.m_AudioSize = m_File.Little( Frame.m_AudioPosition, 4 );
     Frame.m_AudioPosition += 4;
   }
   if( Frame.m_AudioPosition + Frame.m_AudioSize > i_Limit )
@@ -165,44 +136,30 @@ bool VTvidParser::ReadRecord( uint64_t i_Key, uint64_t i_Position, uint64_t i_Li
 
 void VTvidParser::ReadIndex()
 {
-  m_File.seekg( static_cast<std::streamoff>( m_IndexPosition ) );
-  const uint64_t Count = Read<uint64_t>();
-  Require( m_IndexPosition + 8 + 16 * Count == m_Size, "the index does not end the file", m_IndexPosition );
-  std::vector<std::pair<uint64_t, uint64_t>> Entries;
+  m_Cursor = m_IndexPosition;
+  const uint64_t Count = Next( 8 );
+  Require( m_Cursor + 16 * Count == m_File.Size(), "the index does not end the file", m_IndexPosition );
   for( uint64_t Entry = 0; Entry < Count; ++Entry )
   {
-    const uint64_t Key = Read<uint64_t>();
-    Require( Entries.empty() || Entries.back().first < Key, "index keys out of order", m_IndexPosition );
-    Entries.emplace_back( Key, Read<uint64_t>() );
-  }
-  for( const auto& rEntry : Entries )
-  {
-    Require( rEntry.second >= m_RecordsStart && ReadRecord( rEntry.first, rEntry.second, m_IndexPosition ), "no room for a record", rEntry.second );
+    const uint64_t Key = Next( 8 );
+    const uint64_t Position = Next( 8 );
+    Require( Entry == 0 || m_Frames.back().m_Key < Key, "index keys out of order", m_Cursor );
+    Require( Position >= m_RecordsStart && ReadRecord( Key, Position, m_IndexPosition ), "no room for a record", Position );
   }
 }
 
 void VTvidParser::WalkRecords()
 {
   uint64_t Position = m_RecordsStart;
-  while( ReadRecord( m_Frames.size(), Position, m_Size ) )
+  while( ReadRecord( m_Frames.size(), Position, m_File.Size() ) )
   {
     Position = m_Frames.back().m_AudioPosition + m_Frames.back().m_AudioSize;
   }
 }
 
-std::vector<uint8_t> VTvidParser::Bytes( uint64_t i_Position, uint64_t i_Size )
+std::vector<uint16_t> VTvidParser::Audio( const VFrame& i_rFrame ) const
 {
-  std::vector<uint8_t> Bytes( i_Size );
-  m_File.clear();
-  m_File.seekg( static_cast<std::streamoff>( i_Position ) );
-  m_File.read( reinterpret_cast<char*>( Bytes.data() ), static_cast<std::streamsize>( i_Size ) );
-  Require( m_File.good(), "cut short", i_Position );
-  return Bytes;
-}
-
-std::vector<uint16_t> VTvidParser::Audio( const VFrame& i_rFrame )
-{
-  const std::vector<uint8_t> Raw = Bytes( i_rFrame.m_AudioPosition, i_rFrame.m_AudioSize );
+  const std::vector<uint8_t> Raw = m_File.Read( i_rFrame.m_AudioPosition, i_rFrame.m_AudioSize );
   std::vector<uint16_t> Samples( Raw.size() / sizeof( uint16_t ) );
   std::memcpy( Samples.data(), Raw.data(), Samples.size() * sizeof( uint16_t ) );
   return Samples;
@@ -224,20 +181,13 @@ const VTvidParser::VValue* VTvidParser::Find( const std::string& i_rKey ) const
 int64_t VTvidParser::Number( const std::string& i_rKey ) const
 {
   const VValue* const pValue = Find( i_rKey );
-  Require( pValue && !std::holds_alternative<std::string>( *pValue ), "no number " + i_rKey, m_RecordsStart );
-  return std::visit(
-    []( const auto& i_rValue ) -> int64_t
-    {
-      if constexpr( std::is_same_v<std::decay_t<decltype( i_rValue )>, std::string> )
-      {
-        return 0;
-      }
-      else
-      {
-        return static_cast<int64_t>( i_rValue );
-      }
-    },
-    *pValue );
+  Require( pValue && pValue->index() <= 2, "no whole number " + i_rKey, m_RecordsStart );
+  if( const auto* const pUnsigned = std::get_if<uint64_t>( pValue ) )
+  {
+    return static_cast<int64_t>( *pUnsigned );
+  }
+  const auto* const pSigned = std::get_if<int64_t>( pValue );
+  return pSigned ? *pSigned : std::get<bool>( *pValue );
 }
 
 std::string VTvidParser::Text( const std::string& i_rKey ) const

@@ -3,8 +3,9 @@
 // What a file does not hold as described throws std::runtime_error with the place.
 #pragma once
 
+#include "tests/support/FileBytes.h"
+
 #include <cstdint>
-#include <fstream>
 #include <map>
 #include <string>
 #include <variant>
@@ -43,19 +44,18 @@ public:
   uint32_t Height() const { return m_Height; }
   uint32_t Channels() const { return m_Channels; }
   const std::vector<VFrame>& Frames() const { return m_Frames; }
-  uint64_t FileSize() const { return m_Size; }
+  uint64_t FileSize() const { return m_File.Size(); }
   uint64_t RecordsStart() const { return m_RecordsStart; }
 
-  std::vector<uint8_t> Video( const VFrame& i_rFrame ) { return Bytes( i_rFrame.m_VideoPosition, i_rFrame.m_VideoSize ); }
+  std::vector<uint8_t> Video( const VFrame& i_rFrame ) const { return m_File.Read( i_rFrame.m_VideoPosition, i_rFrame.m_VideoSize ); }
   // Interleaved samples of a file with Int16.
-  std::vector<uint16_t> Audio( const VFrame& i_rFrame );
+  std::vector<uint16_t> Audio( const VFrame& i_rFrame ) const;
 
 private:
-  std::vector<uint8_t> Bytes( uint64_t i_Position, uint64_t i_Size );
-  template<class T>
-  T Read();
-  std::string ReadText();
-  VValue ReadValue( uint32_t i_Tag );
+  // What lies at the cursor, which goes on behind it.
+  uint64_t Next( uint64_t i_Bytes );
+  std::string NextText();
+  VValue ReadValue( uint64_t i_Tag );
   VAttributes ReadBlock();
   void ReadHeader();
   void ReadDescription();
@@ -64,8 +64,8 @@ private:
   bool ReadRecord( uint64_t i_Key, uint64_t i_Position, uint64_t i_Limit );
   const VValue* Find( const std::string& i_rKey ) const;
 
-  std::ifstream m_File;
-  uint64_t m_Size = 0;
+  const VFileBytes m_File;
+  uint64_t m_Cursor = 0;
   bool m_bFinished = false;
   VAttributes m_Internal;
   VAttributes m_External;
