@@ -88,17 +88,20 @@ private:
 
 }
 
-TEST_F( Settings, ResetGoesBackToTheDefaultThatIsAllowed )
+// A device that answers what it is asked must not be asked for nothing in between.
+TEST_F( Settings, ResetGoesBackAtOnceToTheDefaultThatIsAllowed )
 {
   const VDevice First = AddDevice( "vi:0" );
   const VDevice Second = AddDevice( "vi:1" );
   First.m_pName->SetValueDefault( Variant::Make( "default" ) );
   First.m_pPayload->SetValueDefault( Variant::Make( "gone" ) );
   First.m_pPayload->SetEnum( { { "A", Variant::Make( "a" ) }, { "Set", Variant::Make( "set" ) } } );
+  VTexts Heard;
+  First.m_pName->GetValueChangedCallback().AddImmediate( [&] { Heard.push_back( Text( First.m_pName ) ); } );
 
   EXPECT_EQ( Texts( m_Settings.Reset( "VideoInput.vi:0", m_Error ) ),
     ( VTexts{ "VideoInput.vi:0.Settings.Name", "VideoInput.vi:0.Settings.Payload" } ) );
-  EXPECT_EQ( Text( First.m_pName ), "default" );
+  EXPECT_EQ( Heard, VTexts{ "default" } );
   EXPECT_EQ( Text( First.m_pPayload ), "a" );
   EXPECT_EQ( Text( First.m_pStatus ), "set" );
   EXPECT_EQ( Text( Second.m_pName ), "set" );
@@ -106,11 +109,8 @@ TEST_F( Settings, ResetGoesBackToTheDefaultThatIsAllowed )
   EXPECT_EQ( Texts( m_Settings.Reset( "VideoInput.vi:1.Settings.Name", m_Error ) ), ( VTexts{ "VideoInput.vi:1.Settings.Name" } ) );
   EXPECT_EQ( Text( Second.m_pName ), "none" ) << "there is no default";
   EXPECT_EQ( Text( Second.m_pPayload ), "set" );
-}
 
-TEST_F( Settings, ResetTellsWhyNothingIsReset )
-{
-  AddDevice( "vi:0" );
+  // Or tells why nothing is reset.
   EXPECT_TRUE( m_Settings.Reset( "VideoInput.vi:0.Settings.Status", m_Error ).empty() );
   EXPECT_NE( m_Error.find( "read-only" ), std::string::npos ) << m_Error;
   for( const char* pPath : { "", "VideoInput.vi:", "VideoInput.*" } )
@@ -118,17 +118,6 @@ TEST_F( Settings, ResetTellsWhyNothingIsReset )
     EXPECT_TRUE( m_Settings.Reset( pPath, m_Error ).empty() );
     EXPECT_NE( m_Error.find( "There is no setting" ), std::string::npos ) << m_Error;
   }
-}
-
-// A device that answers what it is asked must not be asked for nothing in between.
-TEST_F( Settings, AnOwnerHearsOfAResetOnce )
-{
-  const VDevice Device = AddDevice( "vi:0" );
-  Device.m_pName->SetValueDefault( Variant::Make( "default" ) );
-  VTexts Heard;
-  Device.m_pName->GetValueChangedCallback().AddImmediate( [&] { Heard.push_back( Text( Device.m_pName ) ); } );
-  m_Settings.Reset( "VideoInput", m_Error );
-  EXPECT_EQ( Heard, VTexts{ "default" } );
 }
 
 // As a device finds them in the store, and makes its parameters around them.

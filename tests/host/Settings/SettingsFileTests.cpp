@@ -54,6 +54,12 @@ protected:
     }
     return m_File.Save( m_Store, Paths, m_Error );
   }
+  bool SaveName( const std::string& i_rName )
+  {
+    Put( "Name", i_rName );
+    return Save( { "Name" } );
+  }
+  VJson SavedName() const { return ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"]; }
   // The values of the file in a store of a new run.
   VTexts Restore() { return m_File.Restore( m_Restored ); }
   std::string Text( const std::string& i_rKey ) { return VDataReader( m_Restored ).GetValue( m_Device + i_rKey ).ToText(); }
@@ -82,6 +88,12 @@ TEST_F( SettingsFile, ValuesComeBackAsTheyWere )
   Put( "Number", std::string( "5" ) );
   const VTexts Keys = { "Ratio", "Offset", "Odd", "Name", "Enabled", "Format", "Number" };
   ASSERT_TRUE( Save( Keys ) ) << m_Error;
+
+  // What is not the user's is never kept.
+  Put( "Status", 1, DataFlags::ReadOnly );
+  Put( "Password", std::string( "x" ), DataFlags::NotSerialized );
+  ASSERT_TRUE( Save( { "Status", "Password" } ) ) << m_Error;
+  EXPECT_EQ( ReadJson()["settings"].size(), Keys.size() );
   EXPECT_EQ( Restore(), VTexts() );
   for( const std::string& rKey : Keys )
   {
@@ -111,25 +123,14 @@ TEST_F( SettingsFile, AVerifiedValueKeepsBothFormsAndWaits )
   EXPECT_FALSE( Reader.IsSettled( m_Device + "Gain" ) );
 }
 
-TEST_F( SettingsFile, WhatIsNotTheUsersIsNeverKept )
-{
-  Put( "Status", 1, DataFlags::ReadOnly );
-  Put( "Password", std::string( "x" ), DataFlags::NotSerialized );
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Status", "Password", "Name" } ) ) << m_Error;
-  EXPECT_EQ( ReadJson()["settings"].size(), 1u );
-}
-
 TEST_F( SettingsFile, WhatTheFileCannotHoldIsRefusedAndTheFileStays )
 {
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Name" } ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   const std::string Before = ReadFile( m_Path );
   Put( "Mask", VMaskGrid() );
   EXPECT_FALSE( Save( { "Mask" } ) );
   EXPECT_NE( m_Error.find( "VideoInput.vi:0.Settings.Mask" ), std::string::npos ) << m_Error;
-  Put( "Name", std::string( "\xff" ) );
-  EXPECT_FALSE( Save( { "Name" } ) );
+  EXPECT_FALSE( SaveName( "\xff" ) );
   EXPECT_NE( m_Error.find( "UTF-8" ), std::string::npos ) << m_Error;
   EXPECT_FALSE( VSettingsFile( "" ).Save( m_Store, { m_Device + "Name" }, m_Error ) );
   EXPECT_EQ( ReadFile( m_Path ), Before );
@@ -137,9 +138,8 @@ TEST_F( SettingsFile, WhatTheFileCannotHoldIsRefusedAndTheFileStays )
 
 TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
 {
-  Put( "Name", std::string( "A" ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   Put( "Gain", 3 );
-  ASSERT_TRUE( Save( { "Name" } ) );
   WriteFile( R"({ "note": [ 1, null ], "settings": {
     "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
     "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "B", "who": "me" },
@@ -170,8 +170,7 @@ TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
 
 TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
 {
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Name" } ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   const std::string Whole = ReadFile( m_Path );
   const VTexts Damaged = { "", Whole.substr( 0, Whole.size() / 2 ), "[]", R"({ "settings": 5 })", R"({ "version": "x" })", "\xff\xfe",
     std::string( 100000, '[' ), R"({ "note": 1e999 })" };
@@ -195,8 +194,7 @@ TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
 
 TEST_F( SettingsFile, AFileOfALaterVersionIsLeftAlone )
 {
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Name" } ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   for( const std::string Version : { "2", "18446744073709551615" } )
   {
     const std::string Later = R"({ "settings": {}, "version": )" + Version + "}";
@@ -223,8 +221,7 @@ TEST_F( SettingsFile, OnlyAPlainFileIsASettingsFile )
 
 TEST_F( SettingsFile, ALinkStaysALink )
 {
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Name" } ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   const std::string Link = m_Folder.File( "link.json" );
   boost::filesystem::create_symlink( "new/settings.json", Link );
   boost::filesystem::permissions( m_Path, boost::filesystem::owner_read | boost::filesystem::owner_write );
@@ -232,7 +229,7 @@ TEST_F( SettingsFile, ALinkStaysALink )
   Put( "Name", std::string( "B" ) );
   ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
   EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
-  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
+  EXPECT_EQ( SavedName(), "B" );
   struct stat Status = {};
   ASSERT_EQ( stat( m_Path.c_str(), &Status ), 0 );
   EXPECT_EQ( Status.st_mode & 07777, 0600u );
@@ -242,13 +239,12 @@ TEST_F( SettingsFile, ALinkStaysALink )
   boost::filesystem::remove( m_Path );
   ASSERT_TRUE( VSettingsFile( Link ).Save( m_Store, { m_Device + "Name" }, m_Error ) ) << m_Error;
   EXPECT_TRUE( boost::filesystem::is_symlink( Link ) );
-  EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Name"]["value"], "B" );
+  EXPECT_EQ( SavedName(), "B" );
   // One in the place of the new file leads nowhere.
   const std::string Other = m_Folder.File( "other" );
   std::ofstream( Other ) << "mine";
   boost::filesystem::create_symlink( Other, m_Path + ".new" );
-  Put( "Name", std::string( "C" ) );
-  ASSERT_TRUE( Save( { "Name" } ) ) << m_Error;
+  ASSERT_TRUE( SaveName( "C" ) ) << m_Error;
   EXPECT_EQ( ReadFile( Other ), "mine" );
   const std::string Circle = m_Folder.File( "circle.json" );
   boost::filesystem::create_symlink( Circle, Circle );
@@ -257,13 +253,11 @@ TEST_F( SettingsFile, ALinkStaysALink )
 
 TEST_F( SettingsFile, AFullDiskLeavesTheOldFile )
 {
-  Put( "Name", std::string( "A" ) );
-  ASSERT_TRUE( Save( { "Name" } ) );
+  ASSERT_TRUE( SaveName( "A" ) );
   const std::string Before = ReadFile( m_Path );
-  Put( "Name", std::string( 5000, 'x' ) );
   {
     const TestSupport::VFileSizeLimit Limit( 1000 );
-    EXPECT_FALSE( Save( { "Name" } ) );
+    EXPECT_FALSE( SaveName( std::string( 5000, 'x' ) ) );
   }
   EXPECT_NE( m_Error.find( m_Path + "\" cannot be written: File too large" ), std::string::npos ) << m_Error;
   EXPECT_EQ( ReadFile( m_Path ), Before );
