@@ -10,7 +10,7 @@ namespace
 
 using KVZ::VGlobalSyncSessionId;
 
-TEST( DataSourceSessions, OptsOutWithoutFramesAndWhileDisabled )
+TEST( DataSourceSessions, OptsOutWithoutFramesAndWhileDisabledAndBeginsAnewWhenEnabled )
 {
   VSourceRig Rig;
   const TestSupport::VLogCapture Log( "Hal.Test" );
@@ -35,52 +35,38 @@ TEST( DataSourceSessions, OptsOutWithoutFramesAndWhileDisabled )
   const size_t Requests = Rig.m_Requests.size();
   Rig.OnStrand( [&] { EXPECT_FALSE( Rig.m_pSource->SetSourceEnabled( false ) ); } );
   EXPECT_EQ( Rig.m_Requests.size(), Requests ) << "no change, no request";
-}
 
-TEST( DataSourceSessions, EnablingBeginsANewBufferSessionAtTheNextFrame )
-{
-  VSourceRig Rig;
   Rig.m_pSource->AddMany( 3 );
-  Rig.OnStrand( [&] { Rig.m_pSource->SetSourceEnabled( false ); } );
-  Rig.m_pSource->AddMany( 3 );
-  Rig.OnStrand( [&] { Rig.m_pSource->SetSourceEnabled( true ); } );
-  EXPECT_FALSE( Rig.Declare( 1 ) ) << "no session is offered before the frame";
-  const auto Before = Rig.m_pSource->Buffer()->GetCurrentBufferSession();
+  Rig.OnStrand( [&] { EXPECT_TRUE( Rig.m_pSource->SetSourceEnabled( true ) ); } );
+  EXPECT_EQ( Rig.m_Requests.size(), Requests + 1 );
+  EXPECT_FALSE( Rig.Declare( 4 ) ) << "no session is offered before the next frame";
   Rig.m_pSource->AddMany( 1 );
-  EXPECT_NE( Rig.m_pSource->Buffer()->GetCurrentBufferSession(), Before );
-  const auto Session = Rig.Declare( 2 );
-  ASSERT_TRUE( Session );
-  EXPECT_EQ( Session->m_Id, 2u );
+  EXPECT_EQ( Rig.m_pSource->Buffer()->GetCurrentBufferSession().Value(), 2u );
+  const auto Next = Rig.Declare( 5 );
+  ASSERT_TRUE( Next );
+  EXPECT_EQ( Next->m_Id, 2u );
 }
 
-TEST( DataSourceSessions, AStartDoesNothingToASourceThatOptedOut )
+TEST( DataSourceSessions, AStartDoesNothingWithoutItsCounterOrToASourceThatOptedOut )
 {
   VSourceRig Rig;
   Rig.m_pSource->AddMany( 3 );
   const auto Session = Rig.Declare( 1 );
   ASSERT_TRUE( Session );
-  Rig.m_pSource->StartGlobalSyncSession( Rig.ReadingsAt( *Session, VTick( 1000 ), VTick( 1000 ) ), VTick() );
-  Rig.OnStrand( [&] { Rig.m_pSource->SetSourceEnabled( false ); } );
-  EXPECT_FALSE( Rig.Declare( 2 ) );
-  Rig.m_pSource->StartGlobalSyncSession( Rig.ReadingsAt( *Session, VTick( 9000 ), VTick( 9000 ) ), VTick() );
   SyncSystem::VReadFrames Read;
-  ASSERT_EQ( Rig.m_pSource->ReadFrames( 10, Read ), SyncSystem::EReadResult::Frames );
-  EXPECT_EQ( Read.m_Frames[0].m_Tick, VTick( 1000 ) );
-}
-
-TEST( DataSourceSessions, RefusesReadingsThatLackItsCounter )
-{
-  VSourceRig Rig;
-  Rig.m_pSource->AddMany( 3 );
-  const auto Session = Rig.Declare( 7 );
-  ASSERT_TRUE( Session );
-  KVZ::ITickInClocks Ticks = Rig.ReadingsAt( *Session, VTick( 0 ), VTick( 0 ) );
+  KVZ::ITickInClocks Ticks = Rig.ReadingsAt( *Session, VTick( 1000 ), VTick( 1000 ) );
   Ticks.m_TickByClock.erase( Rig.m_pSource->CounterClock() );
   const TestSupport::VLogCapture Log( "Hal.Test", 2 );
   Rig.m_pSource->StartGlobalSyncSession( Ticks, VTick() );
   EXPECT_EQ( Log.Lines().size(), 1u );
-  SyncSystem::VReadFrames Read;
   EXPECT_EQ( Rig.m_pSource->ReadFrames( 10, Read ), SyncSystem::EReadResult::None );
+
+  Rig.m_pSource->StartGlobalSyncSession( Rig.ReadingsAt( *Session, VTick( 1000 ), VTick( 1000 ) ), VTick() );
+  Rig.OnStrand( [&] { Rig.m_pSource->SetSourceEnabled( false ); } );
+  EXPECT_FALSE( Rig.Declare( 2 ) );
+  Rig.m_pSource->StartGlobalSyncSession( Rig.ReadingsAt( *Session, VTick( 9000 ), VTick( 9000 ) ), VTick() );
+  ASSERT_EQ( Rig.m_pSource->ReadFrames( 10, Read ), SyncSystem::EReadResult::Frames );
+  EXPECT_EQ( Read.m_Frames[0].m_Tick, VTick( 1000 ) );
 }
 
 TEST( DataSourceSessions, TakesTheTimecodeOfItsOwnStandard )
@@ -99,6 +85,7 @@ TEST( DataSourceSessions, TakesTheTimecodeOfItsOwnStandard )
   SyncSystem::VReadFrames Read;
   Rig.m_pSource->ReadFrames( 10, Read );
   ASSERT_TRUE( Read.m_pInfo );
+  EXPECT_EQ( KVZ::ToText( Read.m_FirstTimecode ), "00:01:00:08" );
   EXPECT_EQ( KVZ::ToText( Read.m_pInfo->m_Timecode ), "00:01:00:00" );
   EXPECT_EQ( Read.m_pInfo->m_CounterStart, VTick( 12345 ) );
   EXPECT_EQ( Read.m_pInfo->m_OffsetTimecodeFrames, 2 );
