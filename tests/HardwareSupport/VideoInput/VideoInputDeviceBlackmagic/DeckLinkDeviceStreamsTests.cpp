@@ -34,30 +34,22 @@ TEST_F( DeckLinkDevice, StreamsWithFormatDetectionFromTheMomentItIsFound )
 
 TEST_F( DeckLinkDevice, EachStepOfInitialisationThatFailsEndsIt )
 {
-  struct VRow
+  const struct
   {
     const char* m_pFailure;
-    const char* m_pMessage;
-  };
-  const VRow Rows[] = { { "GetDisplayModeIterator", nullptr }, { "SetCallback", "Could not set callback." }, { "EnableVideoInput", nullptr },
-    { "StartStreams", nullptr } };
-  for( const VRow& rRow : Rows )
+    VCalls m_Messages;
+  } Rows[] = { { "QueryInterface", { "Could not query interface." } }, { "GetDisplayModeIterator", {} },
+    { "SetCallback", { "Could not set callback." } }, { "EnableVideoInput", {} }, { "StartStreams", {} } };
+  m_pCard->m_Refused = { IID_IDeckLinkInput };
+  for( const auto& rRow : Rows )
   {
     SCOPED_TRACE( rRow.m_pFailure );
     m_Log.Clear();
     Input().m_Failures = { rRow.m_pFailure };
-    const auto pDevice = KVZ::MakeShared<VDevice>( m_pCard, 2, m_pService );
-    EXPECT_EQ( pDevice->Initialise().m_Code, InitialiseFailed );
-    EXPECT_EQ( m_Log.Texts(), rRow.m_pMessage ? VCalls{ rRow.m_pMessage } : VCalls{} );
+    EXPECT_EQ( MakeDevice( 2 )->Initialise().m_Code, InitialiseFailed );
+    EXPECT_EQ( m_Log.Texts(), rRow.m_Messages );
+    m_pCard->m_Refused = {};
   }
-}
-
-TEST_F( DeckLinkDevice, ACardWithoutTheInputInterfaceIsOfNoUse )
-{
-  m_pCard->m_Refused = { IID_IDeckLinkInput };
-  EXPECT_EQ( m_pDevice->Initialise().m_Code, InitialiseFailed );
-  EXPECT_EQ( m_Log.Texts(), ( VCalls{ "Could not query interface." } ) );
-  EXPECT_EQ( m_Log.Lines()[0].m_Level, 2 );
 }
 
 TEST_F( DeckLinkDevice, MissingAttributesAreNoFailureAndTheirNewerNameIsKnown )
@@ -66,10 +58,9 @@ TEST_F( DeckLinkDevice, MissingAttributesAreNoFailureAndTheirNewerNameIsKnown )
   EXPECT_TRUE( m_pDevice->Initialise().Succeeded() );
 
   TestSupport::VLogCapture Information( "VideoInputDeviceBlackmagic", 5 );
-  const auto pNewer = KVZ::MakeShared<VDevice>( m_pCard, 2, m_pService );
   m_pCard->m_Refused = {};
   m_pCard->m_AttributesId = IID_IDeckLinkProfileAttributes;
-  pNewer->Initialise();
+  MakeDevice( 2 )->Initialise();
   EXPECT_FALSE( Information.Has( "DeckLink C2 does not detect the format of its input." ) );
 }
 
@@ -82,40 +73,36 @@ TEST_F( DeckLinkDevice, AnswersTheVendorForItsOwnCallbackInterfaceAlone )
   auto& rCallback = *Input().Callback();
   for( const REFIID& rId : { IID_IUnknown, IID_IDeckLinkInputCallback } )
   {
-    void* pInterface = nullptr;
-    EXPECT_EQ( rCallback.QueryInterface( rId, &pInterface ), S_OK );
-    EXPECT_EQ( pInterface, &rCallback );
-    rCallback.Release();
+    EXPECT_EQ( VideoInputHAL::QueryInterface<IDeckLinkInputCallback>( rCallback, rId ).get(), &rCallback );
   }
   for( const REFIID& rId : { NewerCallback, NewestCallback, IID_IDeckLinkDeviceNotificationCallback } )
   {
-    void* pInterface = &rCallback;
-    EXPECT_EQ( rCallback.QueryInterface( rId, &pInterface ), E_NOINTERFACE );
-    EXPECT_EQ( pInterface, nullptr );
+    EXPECT_EQ( VideoInputHAL::QueryInterface<IUnknown>( rCallback, rId ), nullptr );
   }
-  EXPECT_EQ( rCallback.QueryInterface( IID_IUnknown, nullptr ), E_POINTER );
 }
 
 TEST_F( DeckLinkDevice, StartCaptureStopsEnablesAndStarts )
 {
-  struct VRow
+  const struct
   {
     KVZ::IAudioSampleFormat::Enum m_AudioFormat;
     uint32_t m_Channels;
-    VCalls m_Calls;
-  };
-  const VRow Rows[] = {
-    { Int16, 0, { "StopStreams", "EnableVideoInput ntsc v210 1", "StartStreams" } },
-    { Int16, 2, { "StopStreams", "EnableVideoInput ntsc v210 1", "EnableAudioInput 48000 16 2", "StartStreams" } },
-    { KVZ::IAudioSampleFormat::EInt32, 16, { "StopStreams", "EnableVideoInput ntsc v210 1", "EnableAudioInput 48000 32 16", "StartStreams" } },
-    { KVZ::IAudioSampleFormat::EFloat32, 8, { "StopStreams", "EnableVideoInput ntsc v210 1", "EnableAudioInput 48000 16 8", "StartStreams" } },
+    VCalls m_AudioCalls;
+  } Rows[] = {
+    { Int16, 0, {} },
+    { Int16, 2, { "EnableAudioInput 48000 16 2" } },
+    { KVZ::IAudioSampleFormat::EInt32, 16, { "EnableAudioInput 48000 32 16" } },
+    { KVZ::IAudioSampleFormat::EFloat32, 8, { "EnableAudioInput 48000 16 8" } },
   };
   Initialise();
-  for( const VRow& rRow : Rows )
+  for( const auto& rRow : Rows )
   {
     Input().ForgetCalls();
     EXPECT_EQ( m_pDevice->StartCapture( IPixelFormat::EU10Y10V10Y10, AnyTimecode, rRow.m_AudioFormat, rRow.m_Channels ).m_Code, 0 );
-    EXPECT_EQ( Input().Calls(), rRow.m_Calls );
+    VCalls Expected{ "StopStreams", "EnableVideoInput ntsc v210 1" };
+    Expected.insert( Expected.end(), rRow.m_AudioCalls.begin(), rRow.m_AudioCalls.end() );
+    Expected.push_back( "StartStreams" );
+    EXPECT_EQ( Input().Calls(), Expected );
     EXPECT_EQ( Fired(), ( VFired{ { "status", 1 } } ) );
   }
   EXPECT_EQ( m_pDevice->GetPixelFormat(), IPixelFormat::EU10Y10V10Y10 );
@@ -123,52 +110,42 @@ TEST_F( DeckLinkDevice, StartCaptureStopsEnablesAndStarts )
   EXPECT_TRUE( m_Log.Texts().empty() );
 }
 
+// A restart that fails ends a capture that ran.
 TEST_F( DeckLinkDevice, EachStepOfStartCaptureThatFailsIsNamedAndLeavesCaptureOff )
 {
-  struct VRow
+  const struct
   {
     const char* m_pFailure;
     int32_t m_Code;
-    const char* m_pMessage;
+    VCalls m_Messages;
+    IPixelFormat::Enum m_PixelFormat = UYVY;
+  } Rows[] = {
+    { "EnableVideoInput", StartFailed, { "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." } },
+    { "EnableAudioInput", StartFailed, { "Unable to select the chosen audio mode for capture.  Perhaps the selected device is in use." } },
+    { "StartStreams", StartFailed, { "Unable to start the capture. Perhaps the selected device is in use." } },
+    { "a format that no card delivers", StartFailed,
+      { "Unsupported pixel format.", "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." },
+      IPixelFormat::ER8G8B8 },
+    { "a mode that the card did not list", ModeNotFound, { "Could not find requested mode." } },
   };
-  const VRow Rows[] = {
-    { "EnableVideoInput", StartFailed, "Unable to select the chosen video mode for capture.  Perhaps the selected device is in use." },
-    { "EnableAudioInput", StartFailed, "Unable to select the chosen audio mode for capture.  Perhaps the selected device is in use." },
-    { "StartStreams", StartFailed, "Unable to start the capture. Perhaps the selected device is in use." },
-  };
-  for( const VRow& rRow : Rows )
+  Initialise();
+  for( const auto& rRow : Rows )
   {
     SCOPED_TRACE( rRow.m_pFailure );
-    m_Log.Clear();
     Input().m_Failures = {};
-    const auto pDevice = KVZ::MakeShared<VDevice>( m_pCard, 2, m_pService );
-    ASSERT_TRUE( pDevice->Initialise().Succeeded() );
-    // A restart that fails ends a capture that ran.
-    ASSERT_TRUE( pDevice->StartCapture( UYVY, AnyTimecode, Int16, 2 ).Succeeded() );
+    Capture( 2 );
+    if( rRow.m_Code == ModeNotFound )
+    {
+      DeliverFormat( FourCharacterCode( "4k25" ) );
+    }
+    m_Log.Clear();
     Input().m_Failures = { rRow.m_pFailure };
-    EXPECT_EQ( pDevice->StartCapture( UYVY, AnyTimecode, Int16, 2 ).m_Code, rRow.m_Code );
-    EXPECT_EQ( m_Log.Texts(), VCalls{ rRow.m_pMessage } );
+    EXPECT_EQ( m_pDevice->StartCapture( rRow.m_PixelFormat, AnyTimecode, Int16, 2 ).m_Code, rRow.m_Code );
+    EXPECT_EQ( m_Log.Texts(), rRow.m_Messages );
     EXPECT_EQ( m_Log.Lines()[0].m_Level, 2 );
-    EXPECT_EQ( pDevice->GetStatus(), VDevice::EStatus::EReady );
+    EXPECT_EQ( m_pDevice->GetStatus(), VDevice::EStatus::EReady );
+    EXPECT_EQ( m_pDevice->GetPixelFormat(), UYVY );
   }
-}
-
-TEST_F( DeckLinkDevice, StartCaptureNeedsAModeThatTheCardListed )
-{
-  Input().m_ModeCodes = { FourCharacterCode( "ntsc" ), FourCharacterCode( "Hp25" ) };
-  Initialise();
-  Input().DeliverFormat( FourCharacterCode( "Hp60" ), DetectedSignal::YCbCr422 );
-  EXPECT_EQ( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, 0 ).m_Code, ModeNotFound );
-  EXPECT_EQ( m_Log.Texts(), ( VCalls{ "Could not find requested mode." } ) );
-  EXPECT_EQ( m_pDevice->GetStatus(), VDevice::EStatus::EReady );
-}
-
-TEST_F( DeckLinkDevice, APixelFormatThatNoCardDeliversIsRefused )
-{
-  Initialise();
-  EXPECT_EQ( m_pDevice->StartCapture( IPixelFormat::ER8G8B8, AnyTimecode, Int16, 0 ).m_Code, StartFailed );
-  EXPECT_TRUE( m_Log.Has( "Unsupported pixel format." ) );
-  EXPECT_EQ( m_pDevice->GetPixelFormat(), UYVY );
 }
 
 TEST_F( DeckLinkDevice, StopCaptureLeavesTheCardStreaming )
@@ -185,7 +162,7 @@ TEST_F( DeckLinkDevice, StopCaptureLeavesTheCardStreaming )
 TEST_F( DeckLinkDevice, AChangeOfFormatRestartsTheStreamsInTheNewMode )
 {
   InitialiseAndCapture();
-  Input().DeliverFormat( FourCharacterCode( "Hp60" ), DetectedSignal::YCbCr422 );
+  DeliverFormat( FourCharacterCode( "Hp60" ) );
   EXPECT_EQ( Input().Calls(), ( VCalls{ "PauseStreams", "EnableVideoInput Hp60 2vuy 1", "FlushStreams", "StartStreams" } ) );
   EXPECT_EQ( Fired(), ( VFired{ { "standard", 1 }, { "formats", 1 } } ) );
   EXPECT_EQ( m_pDevice->GetStatus(), VDevice::EStatus::ECapturing );
@@ -197,12 +174,11 @@ TEST_F( DeckLinkDevice, AChangeOfFormatRestartsTheStreamsInTheNewMode )
 
 TEST_F( DeckLinkDevice, TheDetectedSignalDecidesThePixelFormats )
 {
-  struct VRow
+  const struct
   {
     uint32_t m_Detected;
     std::set<IPixelFormat::Enum> m_Formats;
-  };
-  const VRow Rows[] = {
+  } Rows[] = {
     { DetectedSignal::YCbCr422, { UYVY, IPixelFormat::EU10Y10V10Y10 } },
     { DetectedSignal::RGB444, { IPixelFormat::EB8G8R8u8 } },
     { DetectedSignal::YCbCr422 | DetectedSignal::DualStream3D, {} },
@@ -210,19 +186,13 @@ TEST_F( DeckLinkDevice, TheDetectedSignalDecidesThePixelFormats )
   };
   Initialise();
   Input().DeliverFrame( {} );
-  for( const VRow& rRow : Rows )
+  for( const auto& rRow : Rows )
   {
     SCOPED_TRACE( rRow.m_Detected );
     Input().DeliverFormat( FourCharacterCode( "Hp25" ), rRow.m_Detected );
     EXPECT_EQ( PixelFormatsOf( *m_pDevice ), rRow.m_Formats );
   }
-}
-
-TEST_F( DeckLinkDevice, AnUnknownModeIsReportedAndHasNoStandard )
-{
-  Initialise();
-  Input().DeliverFrame( {} );
-  Input().DeliverFormat( DisplayModeUnknown, DetectedSignal::YCbCr422 );
+  DeliverFormat( DisplayModeUnknown );
   m_Log.Clear();
   EXPECT_EQ( m_pDevice->GetVideoStandard(), IVideoStandard::EUnspecified );
   EXPECT_EQ( m_Log.Texts(), ( VCalls{ "Unsupported video mode." } ) );

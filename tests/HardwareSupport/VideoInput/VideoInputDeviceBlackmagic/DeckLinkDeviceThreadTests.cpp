@@ -72,7 +72,7 @@ TEST_F( DeckLinkDevice, StartCaptureWaitsForTheFrameThatIsUnderWay )
 TEST_F( DeckLinkDevice, AChangeOfFormatDuringStartCaptureIsTakenUpByIt )
 {
   InitialiseAndCapture();
-  Input().m_OnStopStreams = [&] { boost::thread( [&] { Input().DeliverFormat( Hp60, DetectedSignal::YCbCr422 ); } ).join(); };
+  Input().m_OnStopStreams = [&] { boost::thread( [&] { DeliverFormat( Hp60 ); } ).join(); };
   EXPECT_TRUE( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, 0 ).Succeeded() );
   EXPECT_EQ( Input().Calls(), ( VCalls{ "StopStreams", "EnableVideoInput Hp60 2vuy 1", "StartStreams" } ) );
   EXPECT_TRUE( Input().IsRunning() );
@@ -84,14 +84,14 @@ TEST_F( DeckLinkDevice, AChangeOfFormatRightAfterAStartIsFollowed )
 {
   for( int Round = 0; Round < 200; ++Round )
   {
-    const auto pDevice = KVZ::MakeShared<VDevice>( m_pCard, 2, m_pService );
+    const auto pDevice = MakeDevice( 2 );
     boost::thread Vendor;
     bool bFirst = true;
     Input().m_OnStartStreams = [&]
     {
       if( std::exchange( bFirst, false ) )
       {
-        Vendor = boost::thread( [&] { Input().DeliverFormat( Hp25, DetectedSignal::YCbCr422 ); } );
+        Vendor = boost::thread( [&] { DeliverFormat( Hp25 ); } );
       }
     };
     ASSERT_TRUE( pDevice->Initialise().Succeeded() );
@@ -119,9 +119,10 @@ TEST_F( DeckLinkDevice, StartsFramesAndChangesOfFormatMixFreely )
   boost::thread Formats(
     [&]
     {
-      for( int Count = 0; !bEnd; ++Count )
+      while( !bEnd )
       {
-        Input().DeliverFormat( Count % 2 == 0 ? Hp25 : Hp60, DetectedSignal::YCbCr422 );
+        DeliverFormat( Hp25 );
+        DeliverFormat( Hp60 );
       }
     } );
   std::atomic<int> Failures{ 0 };
@@ -173,12 +174,10 @@ TEST_F( DeckLinkDevice, CallbacksThatBeginAfterTheEndDoNothing )
   auto* const pCallback = Input().Callback();
   pCallback->AddRef();
   m_pDevice.reset();
-  auto* const pFrame = new Fake::VFrame( {} );
-  auto* const pMode = new Fake::VDisplayMode( Hp60 );
-  EXPECT_EQ( pCallback->VideoInputFrameArrived( pFrame, nullptr ), S_OK );
-  EXPECT_EQ( pCallback->VideoInputFormatChanged( FormatChange::DisplayMode, pMode, DetectedSignal::RGB444 ), S_OK );
-  pFrame->Release();
-  pMode->Release();
+  const auto pFrame = VideoInputHAL::TakeReference( new Fake::VFrame( {} ) );
+  const auto pMode = VideoInputHAL::TakeReference( new Fake::VDisplayMode( Hp60 ) );
+  EXPECT_EQ( pCallback->VideoInputFrameArrived( pFrame.get(), nullptr ), S_OK );
+  EXPECT_EQ( pCallback->VideoInputFormatChanged( FormatChange::DisplayMode, pMode.get(), DetectedSignal::RGB444 ), S_OK );
   pCallback->Release();
   EXPECT_EQ( Fired(), VFired() );
   EXPECT_EQ( m_pReceiver->Count(), 0u );
@@ -195,7 +194,7 @@ TEST_F( DeckLinkDevice, CallbacksThatWaitForTheLockOutliveTheDevice )
   boost::thread First( [&] { Input().DeliverFrame( {} ); } );
   Gate.WaitReached();
   boost::thread Second( [&] { Input().DeliverFrame( {} ); } );
-  boost::thread Third( [&] { Input().DeliverFormat( Hp60, DetectedSignal::YCbCr422 ); } );
+  boost::thread Third( [&] { DeliverFormat( Hp60 ); } );
   Input().WaitForCallbacks( 3 );
 
   boost::thread End( [&] { m_pDevice.reset(); } );
@@ -223,7 +222,7 @@ TEST_F( DeckLinkDevice, ARuntimeThatBorrowsTheCallbackDoesNotLoseItUnderACall )
     Gate.Open();
     Vendor.join();
     End.join();
-    m_pDevice = KVZ::MakeShared<VDevice>( m_pCard, 1, m_pService );
+    m_pDevice = MakeDevice( 1 );
     InitialiseAndCapture();
   }
 }
@@ -231,16 +230,11 @@ TEST_F( DeckLinkDevice, ARuntimeThatBorrowsTheCallbackDoesNotLoseItUnderACall )
 // The receiver's last owner may be the call itself, and the receiver the device's: both end on the vendor's thread, inside the callback.
 TEST_F( DeckLinkDevice, MayEndOnTheVendorsThreadWithItsReceiver )
 {
-  class VOwningReceiver : public VFrameReceiver
-  {
-  public:
-    std::shared_ptr<VDevice> m_pDevice;
-  };
   InitialiseAndCapture();
   auto pOwner = std::make_shared<VOwningReceiver>();
   m_pDevice->SetDataCallback( pOwner );
   pOwner->m_pDevice = std::move( m_pDevice );
-  std::weak_ptr<VDevice> pDevice = pOwner->m_pDevice;
+  const std::weak_ptr<VideoInputHAL::IVideoInputDevice> pDevice = pOwner->m_pDevice;
   pOwner->m_OnFrame = [&] { pOwner.reset(); };
   EXPECT_TRUE( Input().DeliverFrame( {} ) );
   EXPECT_TRUE( pDevice.expired() );

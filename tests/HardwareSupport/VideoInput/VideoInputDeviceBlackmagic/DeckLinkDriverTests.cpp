@@ -1,5 +1,6 @@
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDriver.h"
 
+#include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
 #include "tests/support/FakeDeckLink.h"
 #include "tests/support/ManualPostalService.h"
 
@@ -15,21 +16,15 @@ namespace Fake = TestSupport::FakeDeckLink;
 using namespace DeckLinkAPI;
 using VideoInputHAL::IVideoInputDevice;
 using VideoInputHAL::VBlackmagicDeckLinkDriver;
-
-struct VReleaser
-{
-  void operator()( IUnknown* i_pObject ) const { i_pObject->Release(); }
-};
-template<class T>
-using VOwned = std::unique_ptr<T, VReleaser>;
+using VideoInputHAL::VComPointer;
 
 class DeckLinkDriver : public ::testing::Test
 {
 protected:
   const int m_LiveBefore = Fake::Live();
-  VOwned<Fake::VDiscovery> m_pDiscovery{ new Fake::VDiscovery };
-  VOwned<Fake::VCard> m_pCard{ new Fake::VCard };
-  VOwned<Fake::VCard> m_pOtherCard{ new Fake::VCard };
+  VComPointer<Fake::VDiscovery> m_pDiscovery{ new Fake::VDiscovery, false };
+  VComPointer<Fake::VCard> m_pCard{ new Fake::VCard, false };
+  VComPointer<Fake::VCard> m_pOtherCard{ new Fake::VCard, false };
   std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
   std::vector<std::shared_ptr<IVideoInputDevice>> m_Arrived;
   std::shared_ptr<VBlackmagicDeckLinkDriver> m_pDriver = KVZ::MakeShared<VBlackmagicDeckLinkDriver>(
@@ -122,12 +117,10 @@ TEST_F( DeckLinkDriver, ItsEndClosesItsDevicesThoughOthersHoldThem )
 TEST_F( DeckLinkDriver, ANotificationThatOutlivesTheDriverDoesNothing )
 {
   m_pDriver->StartDiscovery();
-  auto* const pCallback = m_pDiscovery->Callback();
-  pCallback->AddRef();
+  const VComPointer<IDeckLinkDeviceNotificationCallback> pCallback( m_pDiscovery->Callback() );
   m_pDriver.reset();
   EXPECT_EQ( pCallback->DeckLinkDeviceArrived( m_pCard.get() ), S_OK );
   EXPECT_EQ( pCallback->DeckLinkDeviceRemoved( m_pCard.get() ), S_OK );
-  pCallback->Release();
   EXPECT_EQ( m_pCard->References(), 1u );
 }
 
@@ -135,14 +128,11 @@ TEST_F( DeckLinkDriver, AnswersTheVendorForItsOwnInterfaceAlone )
 {
   m_pDriver->StartDiscovery();
   auto& rCallback = *m_pDiscovery->Callback();
-  void* pInterface = nullptr;
-  EXPECT_EQ( rCallback.QueryInterface( IID_IDeckLinkDeviceNotificationCallback, &pInterface ), S_OK );
-  EXPECT_EQ( pInterface, &rCallback );
-  rCallback.Release();
-  EXPECT_EQ( rCallback.QueryInterface( IID_IUnknown, &pInterface ), S_OK );
-  rCallback.Release();
-  EXPECT_EQ( rCallback.QueryInterface( IID_IDeckLinkInputCallback, &pInterface ), E_NOINTERFACE );
-  EXPECT_EQ( pInterface, nullptr );
+  for( const REFIID& rId : { IID_IUnknown, IID_IDeckLinkDeviceNotificationCallback } )
+  {
+    EXPECT_EQ( VideoInputHAL::QueryInterface<IDeckLinkDeviceNotificationCallback>( rCallback, rId ).get(), &rCallback );
+  }
+  EXPECT_EQ( VideoInputHAL::QueryInterface<IUnknown>( rCallback, IID_IDeckLinkInputCallback ), nullptr );
 }
 
 TEST( DeckLinkDriverWithoutRuntime, HasNoCards )
