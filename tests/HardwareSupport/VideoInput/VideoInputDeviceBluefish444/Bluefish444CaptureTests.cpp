@@ -14,7 +14,6 @@ VCalls operator+( VCalls i_A, const VCalls& i_rB )
 
 TEST_F( Bluefish444Device, SetsTheCardUpAndFollowsItsFirstSignal )
 {
-  m_Card.m_Mode = Mode576i;
   Make();
   EXPECT_EQ( m_Card.TakeCalls(), ( VCalls{ "Set 2D 2", "Query 69" } + SetUpForRGB + VCalls{ "Wait" } ) );
   EXPECT_EQ( m_pDevice->GetVideoStandard(), KVZ::IVideoStandard::EUnspecified );
@@ -64,7 +63,7 @@ TEST_F( Bluefish444Device, NothingNamedBeforeASetUpIsDelivered )
 
 TEST_F( Bluefish444Device, PausesASecondAtATimeWithoutASignal )
 {
-  Make();
+  Make( NoSignal );
   Order();
   EXPECT_EQ( m_Card.Resume(), "1000" );
   EXPECT_EQ( m_Card.Resume(), "sync" );
@@ -72,19 +71,14 @@ TEST_F( Bluefish444Device, PausesASecondAtATimeWithoutASignal )
   EXPECT_EQ( m_pReceiver->Count(), 0u );
   EXPECT_EQ( m_pDevice->GetVideoStandard(), KVZ::IVideoStandard::EUnspecified );
   m_Card.m_Mode = Mode576i;
-  for( int Syncs = 0; m_pReceiver->Count() == 0 && Syncs < 20; ++Syncs )
-  {
-    m_Card.Resume();
-  }
-  EXPECT_EQ( m_pReceiver->Count(), 1u );
+  EXPECT_EQ( ResumeUntilFrame().m_Index, 0u );
 }
 
 // The driver's own number for no signal counts, and without an answer the one of old.
 TEST_F( Bluefish444Device, TakesTheNoSignalModeFromTheCard )
 {
   m_Card.m_Properties.erase( BlueVelvet::Property::InvalidVideoModeFlag );
-  m_Card.m_Mode = 44;
-  Make();
+  Make( 44 );
   EXPECT_EQ( m_Card.Resume(), "1000" );
   m_Card.m_Mode = 46;
   Resume( 2 );
@@ -114,13 +108,8 @@ TEST_F( Bluefish444Device, ASignalThatGoesTakesItsTimecodeAlong )
 TEST_F( Bluefish444Device, AnotherModeIsSetUpBeforeItsFirstFrame )
 {
   MakeCapturing();
-  const size_t Before = m_pReceiver->Count();
   m_Card.m_Mode = Mode720p5994;
-  while( m_pReceiver->Count() == Before )
-  {
-    m_Card.Resume();
-  }
-  const VReceivedFrame Frame = m_pReceiver->Frames().back();
+  const VReceivedFrame Frame = ResumeUntilFrame();
   EXPECT_EQ( Frame.m_Period, 2252250 );
   EXPECT_EQ( Frame.m_Header.m_VideoInfo.m_InterlacedFormat, KVZ::IInterlacedFormat::ENotInterlaced );
   EXPECT_EQ( Fired(), ( VFired{ { "standard", 1 } } ) );
@@ -138,11 +127,7 @@ TEST_F( Bluefish444Device, ALostCardIsALostSignalUntilItComesBack )
   EXPECT_EQ( m_pDevice->GetVideoStandard(), KVZ::IVideoStandard::EUnspecified );
   EXPECT_EQ( m_pDevice->GetStatus(), VDevice::EStatus::ECapturing ) << "the order stands";
   m_Card.m_bLost = false;
-  for( int Syncs = 0; m_pReceiver->Count() == Before && Syncs < 20; ++Syncs )
-  {
-    m_Card.Resume();
-  }
-  EXPECT_EQ( m_pReceiver->Count(), Before + 1 );
+  EXPECT_EQ( ResumeUntilFrame().m_Index, Before );
 }
 
 TEST_F( Bluefish444Device, CountsTheFramesBetweenTwoSyncs )
@@ -154,7 +139,7 @@ TEST_F( Bluefish444Device, CountsTheFramesBetweenTwoSyncs )
   for( const uint32_t Fields : { 2u, 4u, 3u, 12u, 1u, 2u } )
   {
     m_Card.m_FieldsAFrame = Fields;
-    m_Card.Resume();
+    Resume();
   }
   m_pService->RunAll();
   EXPECT_EQ( m_Dropped, ( std::vector<unsigned int>{ 1, 0, 5 } ) );
@@ -162,7 +147,6 @@ TEST_F( Bluefish444Device, CountsTheFramesBetweenTwoSyncs )
 
 TEST_F( Bluefish444Device, OrdersAreTakenOneARound )
 {
-  m_Card.m_Mode = Mode576i;
   Make();
   Resume( 3 );
   Fired();
@@ -206,8 +190,7 @@ TEST_F( Bluefish444Device, StoppingEndsTheFramesAndKeepsWatchingTheSignal )
 
 TEST_F( Bluefish444Device, BadOrdersAreToldInTheLog )
 {
-  m_Card.m_Mode = Mode576i;
-  Make( 6 );
+  Make( Mode576i, 6 );
   EXPECT_EQ( m_pDevice->GetDeviceName(), "Epoch Horizon C1:Ch?" );
   EXPECT_TRUE( m_Log.Has( "Unknown channel." ) );
   Order( 0, Int16, KVZ::IPixelFormat::EBayerRG8 );

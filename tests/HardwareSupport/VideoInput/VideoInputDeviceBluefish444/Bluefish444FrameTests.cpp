@@ -15,23 +15,16 @@ namespace Place = BlueVelvet::TimecodePlace;
 
 TEST_F( Bluefish444Device, AFrameIsOneBlockWithItsHeader )
 {
+  constexpr uint32_t AudioBytes = 1920 * 2 * 2;
   MakeCapturing( Mode576i, 2 );
   const VReceivedFrame Frame = Next();
-  const VVideoInputDataSourceFrame& rHeader = Frame.m_Header;
-  EXPECT_EQ( rHeader.m_pAllocator, m_pAllocator.get() );
-  EXPECT_EQ( rHeader.m_DeviceIndex, 7 );
   KVZ::VideoFrameInfo Image;
   Image.m_ImageWidth = Fake::Width;
   Image.m_ImageHeight = Fake::Lines;
   Image.m_PixelFormat = UYVY;
   Image.m_InterlacedFormat = KVZ::GetInterlacedFormat( KVZ::IVideoStandard::ESD_720_576I_5000 );
-  EXPECT_TRUE( rHeader.m_VideoInfo == Image );
-  EXPECT_EQ( rHeader.m_ImageBytes, Fake::ImageBytes );
-  EXPECT_EQ( rHeader.m_ImageCapacity, 4096u );
-  EXPECT_EQ( rHeader.m_AudioInfo, ( KVZ::AudioFrameInfo{ Int16, 48000, 2 } ) );
-  EXPECT_EQ( Frame.m_Audio, std::vector<uint8_t>( 1920 * 2 * 2, 0x5A ) ) << "decoded after the image, whose rounded end reaches over its place";
-  EXPECT_EQ( rHeader.m_AudioCapacity, rHeader.m_AudioBytes );
-  EXPECT_EQ( m_pAllocator->m_LastBytes, 4096u + 4096 + 1920 * 2 * 2 );
+  ExpectHeader( Frame, Image, Fake::ImageBytes, AudioBytes );
+  EXPECT_EQ( Frame.m_Audio, std::vector<uint8_t>( AudioBytes, 0x5A ) ) << "decoded after the image, whose rounded end reaches over its place";
   EXPECT_EQ( Frame.m_Period, 5400000 );
   EXPECT_EQ( Frame.m_Index, m_pReceiver->Count() - 1 );
 }
@@ -107,7 +100,7 @@ TEST_F( Bluefish444Device, WhatCannotBeHadCostsOneFrame )
   m_pReceiver.reset();
   m_Card.Resume();
   EXPECT_EQ( m_pAllocator->m_Outstanding, 0 ) << "nobody takes it";
-  m_pReceiver = std::make_shared<TestSupport::VFrameReceiver>();
+  m_pReceiver = std::make_shared<VFrameReceiver>();
   m_pDevice->SetDataCallback( m_pReceiver );
   EXPECT_EQ( Next().m_Index, Before + 2 );
 }

@@ -12,8 +12,7 @@ TEST_F( Bluefish444Device, EndsWithinOneFrame )
   for( int Rests = 0; Rests < 9; ++Rests )
   {
     SCOPED_TRACE( Rests );
-    m_Card.m_Mode = Rests < 8 ? Mode576i : NoSignal;
-    Make();
+    Make( Rests < 8 ? Mode576i : NoSignal );
     Order( 2 );
     Resume( Rests );
     m_Card.WaitForRest();
@@ -35,9 +34,7 @@ TEST_F( Bluefish444Device, EndsWithinOneFrame )
 
 TEST_F( Bluefish444Device, ItsOwnPauseEndsWithIt )
 {
-  const auto pCard = std::make_shared<VideoInputHAL::VBluefish444SDKWrapper>( Fake::Functions() );
-  ASSERT_TRUE( pCard->AttachInput( 1, 0 ) );
-  m_pDevice = KVZ::MakeShared<VDevice>( VideoInputHAL::VBluefish444Input{ pCard, 27, 1, 2, 0 }, m_pService );
+  m_pDevice = KVZ::MakeShared<VDevice>( Attach(), m_pService );
   m_Card.WaitForRest();
   m_Card.Release();
   m_pDevice.reset();
@@ -45,7 +42,6 @@ TEST_F( Bluefish444Device, ItsOwnPauseEndsWithIt )
 
 TEST_F( Bluefish444Device, OrdersFramesAndModesMixFreely )
 {
-  m_Card.m_Mode = Mode576i;
   Make();
   m_Card.Freely();
   boost::thread Modes(
@@ -76,11 +72,6 @@ TEST_F( Bluefish444Device, OrdersFramesAndModesMixFreely )
 // The receiver may be the device's last owner: both end on the capture thread.
 TEST_F( Bluefish444Device, MayEndOnItsOwnThread )
 {
-  class VOwningReceiver : public TestSupport::VFrameReceiver
-  {
-  public:
-    std::shared_ptr<VDevice> m_pDevice;
-  };
   MakeCapturing();
   const auto pOwner = std::make_shared<VOwningReceiver>();
   m_pDevice->SetDataCallback( pOwner );
