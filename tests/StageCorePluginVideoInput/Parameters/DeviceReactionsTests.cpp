@@ -22,16 +22,6 @@ using VReactions = VHandlerFixture;
 using VSettings = TestSupport::VFakeVideoInputDevice::VSettings;
 namespace Keys = DeviceSchemas::VideoInput;
 
-KVZ::ITimecode Timecode( int32_t i_Standard, uint8_t i_Minutes, uint8_t i_Seconds, uint8_t i_Frames )
-{
-  KVZ::ITimecode Timecode;
-  Timecode.m_Standard = i_Standard;
-  Timecode.m_Minutes = i_Minutes;
-  Timecode.m_Seconds = i_Seconds;
-  Timecode.m_Frames = i_Frames;
-  return Timecode;
-}
-
 }
 
 TEST_F( VReactions, EnabledStartsAndStopsTheDevice )
@@ -160,19 +150,16 @@ TEST_F( VReactions, TheTimecodeSourceDefaultsToTheWidestThatThereIs )
 TEST_F( VReactions, TimecodeIsReceivedOrNotDetected )
 {
   Create();
-  struct VCase
+  const auto Told = [this]( const KVZ::ITimecode& i_rTimecode )
   {
-    KVZ::ITimecode m_Timecode;
-    const char* m_pText;
-  };
-  for( const VCase& rCase : { VCase{ Timecode( 2, 59, 59, 24 ), "Receiving 25 fps" }, VCase{ Timecode( 2, 59, 59, 25 ), "Not Detected" },
-         VCase{ Timecode( 5, 10, 0, 0 ), "Receiving 29.97 fps DF" }, VCase{ Timecode( 5, 11, 0, 1 ), "Not Detected" },
-         VCase{ Timecode( -1, 0, 0, 0 ), "Not Detected" } } )
-  {
-    m_pDevice->SetTimecode( rCase.m_Timecode );
+    m_pDevice->SetTimecode( i_rTimecode );
     m_pService->RunAll();
-    EXPECT_EQ( Value<std::string>( "TimecodeStandard" ), rCase.m_pText );
-  }
+    return Value<std::string>( "TimecodeStandard" );
+  };
+  EXPECT_EQ( Told( { KVZ::ITimecodeStandard::ETimecode25, 0, 59, 59, 24 } ), "Receiving 25 fps" );
+  EXPECT_EQ( Told( { KVZ::ITimecodeStandard::ETimecode25, 0, 59, 59, 25 } ), "Not Detected" );
+  EXPECT_EQ( Told( { KVZ::ITimecodeStandard::ETimecode30Drop, 0, 10, 0, 0 } ), "Receiving 29.97 fps DF" );
+  EXPECT_EQ( Told( {} ), "Not Detected" );
 }
 
 TEST_F( VReactions, TheTimeOffsetIsAWholeNumberOfMasterBeats )
@@ -267,7 +254,7 @@ TEST_F( VReactions, NothingReactsOnceTheHandlerHasGone )
   m_pHandler.reset();
   m_pService->RunAll();
   EXPECT_EQ( m_pDevice->m_Stops, 0 );
-  EXPECT_TRUE( m_pRegistry->m_Groups.empty() );
+  EXPECT_TRUE( m_pRegistry->GetGroups().empty() );
   EXPECT_EQ( m_pDevice->GetVideoStandardChangedCallback().Count(), 0u );
   m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
   m_pDevice->SetPixelFormats( { IPixelFormat::ELuminance8 } );

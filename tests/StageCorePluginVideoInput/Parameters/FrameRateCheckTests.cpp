@@ -6,8 +6,6 @@
 
 #include <cmath>
 #include <limits>
-#include <map>
-#include <optional>
 
 namespace
 {
@@ -21,22 +19,6 @@ struct VRate
   int64_t m_Numerator;
   int64_t m_Denominator;
 };
-
-// From the name alone: the digits behind the scan letters are hundredths of the rate, of fields where the letter is I.
-std::optional<VRate> RateFromName( const std::string& i_rName )
-{
-  static const std::map<std::string, VRate> s_Rates = { { "2398", { 24000, 1001 } }, { "2400", { 24, 1 } }, { "2500", { 25, 1 } },
-    { "2997", { 30000, 1001 } }, { "3000", { 30, 1 } }, { "4800", { 48, 1 } }, { "5000", { 50, 1 } }, { "5994", { 60000, 1001 } },
-    { "6000", { 60, 1 } } };
-  const size_t Split = i_rName.rfind( '_' );
-  if( Split == std::string::npos || s_Rates.count( i_rName.substr( Split + 1 ) ) == 0 )
-  {
-    return {};
-  }
-  VRate Rate = s_Rates.at( i_rName.substr( Split + 1 ) );
-  Rate.m_Denominator *= i_rName[Split - 1] == 'I' ? 2 : 1;
-  return Rate;
-}
 
 // By the number of the genlock standard; 0 is none.
 constexpr VRate GenlockRates[] = { { 0, 1 }, { 50, 1 }, { 60000, 1001 }, { 24, 1 }, { 24000, 1001 }, { 30, 1 }, { 50, 1 }, { 60, 1 }, { 100, 1 },
@@ -68,12 +50,12 @@ TEST( FrameRateCheck, AgreesWithExactArithmeticForAllStandardsAndGenlocks )
   for( int Value = 0; Value < KVZ::VideoStandardCount; ++Value )
   {
     const auto Standard = static_cast<IVideoStandard::Enum>( Value );
-    const auto VideoRate = RateFromName( ToName( Standard ) );
+    const KVZ::VVideoStandardRow& rRow = *KVZ::FindVideoStandard( Standard );
     for( int Genlock = 1; Genlock < static_cast<int>( std::size( GenlockRates ) ); ++Genlock )
     {
       SCOPED_TRACE( ToName( Standard ) + " with genlock " + std::to_string( Genlock ) );
       const int64_t GenlockPeriod = FrameRateCheck::GenlockPeriod( static_cast<IGenlockStandard::Enum>( Genlock ) );
-      const bool bExpected = VideoRate && CanLock( *VideoRate, GenlockRates[Genlock] );
+      const bool bExpected = rRow.m_Period != 0 && CanLock( { rRow.m_RateNumerator, rRow.m_RateDenominator }, GenlockRates[Genlock] );
       EXPECT_EQ( FrameRateCheck::AreCompatible( GenlockPeriod, KVZ::GetFramePeriod( Standard ) ), bExpected );
       Compatible += bExpected ? 1 : 0;
     }

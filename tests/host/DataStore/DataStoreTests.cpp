@@ -269,20 +269,6 @@ TEST_F( DataStore, EventsGoOutOnceWhenTheOutermostWriterEnds )
   EXPECT_TRUE( IsHeard( m_Heard, "pacb" ) );
 }
 
-TEST_F( DataStore, ASubscriberHearsOnlyOfWhatIsWrittenAfterwards )
-{
-  std::string Early;
-  std::string Late;
-  VDataWriter( m_Store ).GetNode( m_Path )->OnValueAdded().AddImmediate( [&Early] { Early += 'a'; } );
-  {
-    VDataWriter Outer( m_Store );
-    Set( m_Path, 1 );
-    VDataWriter( m_Store ).GetNode( m_Path )->OnValueChanged().AddImmediate( [&Late] { Late += 'c'; } );
-  }
-  EXPECT_EQ( Early, "a" );
-  EXPECT_EQ( Late, "" );
-}
-
 TEST_F( DataStore, PostedSubscribersWaitForTheirServiceAndImmediateOnesMayReadAndWrite )
 {
   const auto pService = std::make_shared<TestSupport::VManualPostalService>();

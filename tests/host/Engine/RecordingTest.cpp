@@ -24,12 +24,12 @@ protected:
     return pSource;
   }
 
-  static VRecordingRequest Frames( std::vector<std::string> i_URNs, uint64_t i_Count, VTick i_PreRoll = VTick() )
+  static VRecordingRequest Frames( std::vector<std::string> i_URNs, uint64_t i_Count, int i_PreRollSeconds = 0 )
   {
     VRecordingRequest Request;
     Request.m_DeviceURNs = std::move( i_URNs );
     Request.m_Frames = i_Count;
-    Request.m_PreRoll = i_PreRoll;
+    Request.m_PreRoll = KVZ::SecondsToTick135( i_PreRollSeconds );
     Request.m_Name = "take";
     return Request;
   }
@@ -46,9 +46,9 @@ TEST_F( RecordingTest, IsReadyOnceThePreRollIsInMemory )
 {
   const auto pSource = Add( "vi:0", Period25, OneHour, 74 );
   EXPECT_TRUE( m_Recording.IsReady( Frames( { "vi:0" }, 10 ) ) );
-  EXPECT_FALSE( m_Recording.IsReady( Frames( { "vi:0" }, 10, KVZ::SecondsToTick135( 3 ) ) ) );
+  EXPECT_FALSE( m_Recording.IsReady( Frames( { "vi:0" }, 10, 3 ) ) );
   pSource->SetNewest( 75 );
-  EXPECT_TRUE( m_Recording.IsReady( Frames( { "vi:0" }, 10, KVZ::SecondsToTick135( 3 ) ) ) );
+  EXPECT_TRUE( m_Recording.IsReady( Frames( { "vi:0" }, 10, 3 ) ) );
   EXPECT_FALSE( m_Recording.IsReady( Frames( { "vi:0", "vi:1" }, 10 ) ) );
   pSource->SetEnabled( false );
   EXPECT_FALSE( m_Recording.IsReady( Frames( { "vi:0" }, 10 ) ) );
@@ -67,13 +67,6 @@ TEST_F( RecordingTest, AsksForExactlyTheFramesOfEachDevice )
     EXPECT_LT( pSource->m_CaptureStart, Now + VTick( Period ) );
     EXPECT_EQ( pSource->m_CaptureStart + VTick( 30 * Period ), pSource->m_CaptureEnd );
   }
-}
-
-TEST_F( RecordingTest, PreRollReachesBackFromTheRequest )
-{
-  const auto pSource = Add( "vi:0", Period25, OneHour, 100 );
-  ASSERT_TRUE( m_Recording.Start( Frames( { "vi:0" }, 30, KVZ::SecondsToTick135( 3 ) ), m_Error ) );
-  EXPECT_EQ( OneHour + VTick( 25 * Period25 ), pSource->m_CaptureStart );
 }
 
 TEST_F( RecordingTest, ARefusedDeviceLeavesNoCaptureRunning )
@@ -109,7 +102,8 @@ TEST_F( RecordingTest, LossesAreToldByTheirCause )
 {
   const auto pSource = Add( "vi:0", Period25, OneHour, 100 );
   pSource->m_Dropped = 7;   // before the recording
-  ASSERT_TRUE( m_Recording.Start( Frames( { "vi:0" }, 50, KVZ::SecondsToTick135( 2 ) ), m_Error ) );
+  ASSERT_TRUE( m_Recording.Start( Frames( { "vi:0" }, 50, 2 ), m_Error ) );
+  EXPECT_EQ( OneHour + VTick( 50 * Period25 ), pSource->m_CaptureStart ) << "two seconds before the request";
   pSource->m_Dropped = 10;
   pSource->SetNewest( 110 );
   pSource->m_Status.m_Start = pSource->m_CaptureStart + VTick( 4 * Period25 );   // four frames had been evicted
