@@ -7,6 +7,7 @@
 #include "cards/common/VirtualCardControl.h"
 #include "tests/support/FakeFlowServices.h"
 #include "tests/support/FakeHost.h"
+#include "tests/support/LogCapture.h"
 
 #include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
@@ -15,6 +16,7 @@
 
 #include <atomic>
 #include <future>
+#include <stdexcept>
 
 namespace
 {
@@ -150,16 +152,6 @@ TEST_F( VideoInputEngine, IsBuiltInOrderAndHandsItsOwnShutdownObjectOverLast )
   EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "RemoveParameterGroup System.VideoInput" } ) );
 }
 
-TEST_F( VideoInputEngine, ShutdownObjectsOfALivingEngineEndNothing )
-{
-  AddCard();
-  MakeAndStart();
-  m_pHost->m_pShutdown->Shutdown();
-  EXPECT_TRUE( Sources( "Remove" ).empty() );
-  m_pHost->m_pHardwareStart->Fire();
-  WaitFor( "AddSource vi:0" );
-}
-
 TEST_F( VideoInputEngine, AStartOfHardwareAfterItsEndDoesNothing )
 {
   AddCard();
@@ -172,12 +164,6 @@ TEST_F( VideoInputEngine, AStartOfHardwareAfterItsEndDoesNothing )
 TEST_F( VideoInputEngine, WiresADeviceOnItsOwnThreadAndRegistersItsSourceLast )
 {
   AddCard();
-  m_pHost->m_pSources->m_OnAdd = [&]( const std::string& i_rName )
-  {
-    EXPECT_EQ( i_rName, "vi:0" );
-    EXPECT_TRUE( m_pHost->m_pHappenings->Has( "AddParameterGroup VideoInput.vi:0" ) );
-    EXPECT_EQ( m_pHost->m_pParameters->GetGroups().size(), 2u );
-  };
   MakeAndStart();
   m_pHost->m_pHappenings->Clear();
   m_pHost->m_pHardwareStart->Fire();   // finds the card on this thread
@@ -248,6 +234,25 @@ TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )
   EXPECT_EQ( m_pHost->m_pHappenings->Texts(),
     ( VTexts{ "RemoveParameterGroup VideoInput.vi:0", "RemoveParameterGroup VideoInput.vi:1", "RemoveParameterGroup VideoInput.vi:2",
       "RemoveSource vi:0", "RemoveSource vi:1", "RemoveSource vi:2", "RemoveParameterGroup System.VideoInput" } ) );
+}
+
+TEST_F( VideoInputEngine, ADeviceThatTheHostRefusesCostsThatDeviceOnly )
+{
+  TestSupport::VLogCapture Log( "NotificationSystem", 2 );
+  m_pHost->m_pSources->m_OnAdd = []( const std::string& i_rName )
+  {
+    if( i_rName == "vi:0" )
+    {
+      throw std::runtime_error( "no room" );
+    }
+  };
+  AddCard();
+  AddCard();
+  MakeAndFindCards();
+  WaitFor( "AddSource vi:1" );
+  m_pEngine.reset();
+  EXPECT_EQ( Log.Texts(), ( VTexts{ "A posted function ended with an exception: no room" } ) );
+  EXPECT_EQ( Sources( "RemoveSource" ), ( VTexts{ "RemoveSource vi:1" } ) );
 }
 
 TEST_F( VideoInputEngine, MayEndInMidStream )
