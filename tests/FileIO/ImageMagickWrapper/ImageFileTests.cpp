@@ -27,8 +27,8 @@ struct VKind
   decltype( &PNGIO::PNGReader ) m_pReader;
 };
 
-constexpr VKind Kinds[] = { { "png", "PNGIO", "PNG 61 37 8", &PNGIO::PNGWriter, &PNGIO::PNGReader },
-  { "tiff", "TIFFIO", "TIFF 61 37 8", &TIFFIO::TIFFWriter, &TIFFIO::TIFFReader } };
+constexpr VKind Kinds[] = { { "png", "PNGIO", "PNG 61 37 8 ", &PNGIO::PNGWriter, &PNGIO::PNGReader },
+  { "tiff", "TIFFIO", "TIFF 61 37 8 ", &TIFFIO::TIFFWriter, &TIFFIO::TIFFReader } };
 
 const ImageMagickWrapper::VLibrary& Library() { return ImageMagickWrapper::Instance( PNGIO::Category ); }
 
@@ -109,7 +109,8 @@ TEST( ImageFiles, ComeBackBitExactFromOurReaderAndOthers )
       EXPECT_TRUE(
         OutputOf( { "ffmpeg", "-nostdin", "-v", "error", "-i", Path, "-f", "rawvideo", "-pix_fmt", bGrey ? "gray" : "rgb24", "-" } ) == Pixels );
       EXPECT_TRUE( OutputOf( { "convert", Path, "-depth", "8", bGrey ? "gray:-" : "rgb:-" } ) == Pixels );
-      EXPECT_EQ( OutputOf( { "identify", "-format", "%m %w %h %z", Path } ), rKind.m_pIdentity );
+      EXPECT_EQ( OutputOf( { "identify", "-format", "%m %w %h %z %[type]", Path } ),
+        rKind.m_pIdentity + std::string( bGrey ? "Grayscale" : "TrueColor" ) );
     }
   }
 }

@@ -67,21 +67,6 @@ TEST_F( Steps, TheLibraryIsBegunAndEndedOnce )
   EXPECT_EQ( Calls(), "MagickWandTerminus\n" );
 }
 
-TEST_F( Steps, AnImageIsWrittenWithItsTypeAndDepth )
-{
-  Calls();
-  const VByteVector Pixels( 6, 9 );
-  VByteVector File;
-  const std::string End = "MagickGetImageBlob\nMagickRelinquishMemory\nDestroyMagickWand\n";
-  ASSERT_TRUE( PNGIO::PNGWriter( Pixels.data(), 6, Info( IPixelFormat::ER8G8B8 ), File, *m_Library ) );
-  EXPECT_EQ( std::string( File.begin(), File.end() ), "file" );
-  EXPECT_EQ( Calls(),
-    "NewMagickWand\nMagickConstituteImage 2 1 RGB 1 9\nMagickSetImageDepth 8\nMagickSetImageFormat png\nMagickSetImageType 6\n" + End );
-  ASSERT_TRUE( TIFFIO::TIFFWriter( Pixels.data(), 2, Info( IPixelFormat::ELuminance8 ), File, *m_Library ) );
-  EXPECT_EQ( Calls(),
-    "NewMagickWand\nMagickConstituteImage 2 1 I 1 9\nMagickSetImageDepth 8\nMagickSetImageFormat tiff\nMagickSetImageType 2\n" + End );
-}
-
 TEST_F( Steps, TheOneThatFailsIsTheLastAndIsReported )
 {
   for( const std::string Step : { "MagickConstituteImage", "MagickSetImageDepth", "MagickSetImageFormat", "MagickSetImageType", "MagickGetImageBlob",
@@ -122,9 +107,9 @@ TEST_F( Steps, AReadImagesTypeSaysWhatItIs )
     {
       EXPECT_EQ( Found, Info( bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 ) );
       EXPECT_EQ( Pixels, VByteVector( bGrey ? 2 : 6, 7 ) );
-      EXPECT_EQ( Calls(),
-        std::string( "NewMagickWand\nMagickReadImageBlob 5\nMagickExportImagePixels 2 1 " ) + ( bGrey ? "I" : "RGB" ) + " 1\nDestroyMagickWand\n" );
     }
+    EXPECT_EQ( Calls(),
+      std::string( "NewMagickWand\nMagickReadImageBlob\n" ) + ( bGrey || bColour ? "MagickExportImagePixels\n" : "" ) + "DestroyMagickWand\n" );
   }
   EXPECT_EQ( Log.Count( "Unsupported format" ), 7u );
 }
