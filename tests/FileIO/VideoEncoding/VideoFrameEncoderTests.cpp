@@ -285,29 +285,25 @@ TEST_F( VideoFrameEncoder, OneServesSeveralThreads )
   EXPECT_EQ( Equal, Frames );
 }
 
-TEST( PixelFormatForPayload, EachKeepsWhatItsCompressorTakes )
+TEST_F( VideoFrameEncoder, PixelFormatForPayloadFormatTellsWhatIsStored )
 {
   for( int32_t Value = 0; Value < PixelFormatCount; ++Value )
   {
     const auto Source = static_cast<IPixelFormat::Enum>( Value );
-    SCOPED_TRACE( ToName( Source ) );
-    const auto Stored = [Source]( IVideoPayload::Enum i_Payload )
+    const bool bGrey = Source == IPixelFormat::ELuminance8 || Source == IPixelFormat::ELuminance7 || Source == IPixelFormat::ELuminance6;
+    const bool bKept = Source == IPixelFormat::ELuminance8 || ( Source >= IPixelFormat::ER8G8B8 && Source <= IPixelFormat::EB8G8R8u8 );
+    for( const auto& [Payload, Expected] : { std::pair{ IVideoPayload::ENone, IPixelFormat::EUnspecified }, { IVideoPayload::EUncompressed, Source },
+           { IVideoPayload::EImageJPEG, bKept ? Source : IPixelFormat::ER8G8B8 },
+           { IVideoPayload::EImagePNG, bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 },
+           { IVideoPayload::EImageTIFF, bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 } } )
     {
-      auto Result = static_cast<IPixelFormat::Enum>( -1 );
-      EXPECT_TRUE( PixelFormatForPayloadFormat( i_Payload, Source, Result ) );
-      return Result;
-    };
-    const bool bGrey = Value == IPixelFormat::ELuminance8 || Value == IPixelFormat::ELuminance7 || Value == IPixelFormat::ELuminance6;
-    const bool bKept = Value == IPixelFormat::ELuminance8 || ( Value >= IPixelFormat::ER8G8B8 && Value <= IPixelFormat::EB8G8R8u8 );
-    EXPECT_EQ( Stored( IVideoPayload::ENone ), IPixelFormat::EUnspecified );
-    EXPECT_EQ( Stored( IVideoPayload::EUncompressed ), Source );
-    EXPECT_EQ( Stored( IVideoPayload::EImageJPEG ), bKept ? Source : IPixelFormat::ER8G8B8 );
-    EXPECT_EQ( Stored( IVideoPayload::EImagePNG ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
-    EXPECT_EQ( Stored( IVideoPayload::EImageTIFF ), bGrey ? IPixelFormat::ELuminance8 : IPixelFormat::ER8G8B8 );
+      auto Stored = static_cast<IPixelFormat::Enum>( -1 );
+      EXPECT_TRUE( PixelFormatForPayloadFormat( Payload, Source, Stored ) );
+      EXPECT_EQ( Stored, Expected ) << ToName( Source ) << " as " << ToName( Payload );
+    }
   }
-  const VLogCapture Log( "VideoEncoding" );
   auto Kept = IPixelFormat::ER5G6B5;
   EXPECT_FALSE( PixelFormatForPayloadFormat( IVideoPayload::EVideoH264, IPixelFormat::ER8G8B8, Kept ) );
   EXPECT_EQ( Kept, IPixelFormat::ER5G6B5 );
-  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Unsupported video payload format 'VideoH264'." } );
+  EXPECT_EQ( m_Log.Texts(), std::vector<std::string>{ "Unsupported video payload format 'VideoH264'." } );
 }
