@@ -5,17 +5,19 @@
 
 #include <gtest/gtest.h>
 
+#include <cstring>
+
 using namespace KVZ;
-using AudioEncoding::EncodeIfRequired;
 
 namespace
 {
 
+constexpr AudioFrameInfo FourChannels{ IAudioSampleFormat::EInt16, 48000, 4 };
+
 std::shared_ptr<IStandardBuffer> Samples( const std::vector<int16_t>& i_rSamples )
 {
   auto pBuffer = std::make_shared<IStandardBuffer>( i_rSamples.size() * 2 );
-  const auto* pBytes = reinterpret_cast<const uint8_t*>( i_rSamples.data() );
-  std::copy( pBytes, pBytes + pBuffer->Size(), pBuffer->Data() );
+  std::copy_n( reinterpret_cast<const uint8_t*>( i_rSamples.data() ), pBuffer->Size(), pBuffer->Data() );
   return pBuffer;
 }
 
@@ -30,39 +32,31 @@ std::vector<T> SamplesOf( const IBufferConst& i_rBuffer )
 class AudioEncoder : public testing::Test
 {
 protected:
-  bool Encode( const AudioFrameInfo& i_rInfo, IAudioPayload::Enum i_Payload, IAudioSampleFormat::Enum i_Format, uint32_t i_Channels )
+  bool Encode( uint32_t i_Channels, IAudioSampleFormat::Enum i_Format = IAudioSampleFormat::EInt16,
+    IAudioPayload::Enum i_Payload = IAudioPayload::EUncompressed, const AudioFrameInfo& i_rInfo = FourChannels )
   {
-    return EncodeIfRequired( m_Allocator, m_Audio, i_rInfo, i_Payload, i_Format, i_Channels );
+    return AudioEncoding::EncodeIfRequired( m_Allocator, m_Audio, i_rInfo, i_Payload, i_Format, i_Channels );
   }
 
   KVZ::IStandardBufferAllocator m_Allocator{ "Test" };
   VBufferList m_Audio{ Samples( { 1, 2, 3, 4, 5, 6, 7, 8 } ), Samples( {} ), Samples( { 9, 10, 11, 12 } ) };
+  const VBufferList m_Before = m_Audio;
   const TestSupport::VLogCapture m_Log{ "AudioEncoding" };
 };
 
-constexpr AudioFrameInfo FourChannels{ IAudioSampleFormat::EInt16, 48000, 4 };
-
 }
 
-TEST_F( AudioEncoder, WhatFitsPassesWithoutACopy )
+TEST_F( AudioEncoder, SurplusChannelsAreDroppedFromTheEndAndTheRestIsConverted )
 {
-  const VBufferList Before = m_Audio;
-  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 4 ) );
-  EXPECT_EQ( m_Audio, Before );
-}
-
-TEST_F( AudioEncoder, SurplusChannelsAreDroppedFromTheEnd )
-{
-  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 2 ) );
+  EXPECT_TRUE( Encode( 4 ) );
+  EXPECT_EQ( m_Audio, m_Before ) << "what fits passes without a copy";
+  EXPECT_TRUE( Encode( 2 ) );
   ASSERT_EQ( m_Audio.size(), 3u );
   EXPECT_EQ( SamplesOf<int16_t>( *m_Audio[0] ), ( std::vector<int16_t>{ 1, 2, 5, 6 } ) );
   EXPECT_EQ( m_Audio[1]->Size(), 0u );
   EXPECT_EQ( SamplesOf<int16_t>( *m_Audio[2] ), ( std::vector<int16_t>{ 9, 10 } ) );
-}
-
-TEST_F( AudioEncoder, DroppingAndConvertingGoTogether )
-{
-  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt32, 3 ) );
+  m_Audio = m_Before;
+  EXPECT_TRUE( Encode( 3, IAudioSampleFormat::EInt32 ) );
   EXPECT_EQ( SamplesOf<int32_t>( *m_Audio[2] ), ( std::vector<int32_t>{ 9 << 16, 10 << 16, 11 << 16 } ) );
 }
 
@@ -70,40 +64,37 @@ TEST_F( AudioEncoder, SoundForWhichThereIsNoMemoryIsRefused )
 {
   m_Audio = { std::make_shared<TestSupport::VEndlessBuffer>( ~size_t{ 0 } ) };
   const VBufferList Before = m_Audio;
-  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 3 ) );
-  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EUInt16, 4 ) );
+  EXPECT_FALSE( Encode( 3 ) );
+  EXPECT_FALSE( Encode( 4, IAudioSampleFormat::EUInt16 ) );
   EXPECT_EQ( m_Audio, Before );
 }
 
 TEST_F( AudioEncoder, WithoutAPayloadOrAFullDescriptionThereIsNoAudio )
 {
-  const VBufferList Before = m_Audio;
-  const std::vector<AudioFrameInfo> Incomplete = { { IAudioSampleFormat::EInt16, 0, 4 }, { IAudioSampleFormat::EInt16, 48000, 0 },
-    { IAudioSampleFormat::EUnspecified, 48000, 4 } };
-  for( const AudioFrameInfo& rInfo : Incomplete )
+  for( const AudioFrameInfo& rInfo :
+    { AudioFrameInfo{ IAudioSampleFormat::EInt16, 0, 4 }, { IAudioSampleFormat::EInt16, 48000, 0 }, { IAudioSampleFormat::EUnspecified, 48000, 4 } } )
   {
-    m_Audio = Before;
-    EXPECT_TRUE( Encode( rInfo, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt16, 8 ) );
+    m_Audio = m_Before;
+    EXPECT_TRUE( Encode( 8, IAudioSampleFormat::EInt16, IAudioPayload::EUncompressed, rInfo ) );
     EXPECT_TRUE( m_Audio.empty() );
   }
-  m_Audio = Before;
-  EXPECT_TRUE( Encode( FourChannels, IAudioPayload::ENone, IAudioSampleFormat::EUnspecified, 0 ) );
+  m_Audio = m_Before;
+  EXPECT_TRUE( Encode( 0, IAudioSampleFormat::EUnspecified, IAudioPayload::ENone ) );
   EXPECT_TRUE( m_Audio.empty() );
 }
 
 TEST_F( AudioEncoder, RefusalsSayWhyAndLeaveTheList )
 {
-  const VBufferList Before = m_Audio;
-  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EInt32, 5 ) );
-  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::ELosslessFLAC, IAudioSampleFormat::EInt16, 4 ) );
-  EXPECT_FALSE( Encode( FourChannels, IAudioPayload::EUncompressed, IAudioSampleFormat::EUInt16, 4 ) );
-  EXPECT_EQ( m_Audio, Before );
-  EXPECT_EQ( m_Log.Texts(), ( std::vector<std::string>{ "Increasing number of audio channels is not supported.", "Unsupported audio format" } ) );
-
+  EXPECT_FALSE( Encode( 5, IAudioSampleFormat::EInt32 ) );
+  EXPECT_FALSE( Encode( 4, IAudioSampleFormat::EInt16, IAudioPayload::ELosslessFLAC ) );
+  EXPECT_FALSE( Encode( 4, IAudioSampleFormat::EUInt16 ) );
+  EXPECT_EQ( m_Audio, m_Before );
   auto Stored = IAudioSampleFormat::EInt24;
   bool bConversionNeeded = false;
   AudioEncoding::SampleFormatForPayloadFormat( IAudioPayload::ELosslessFLAC, IAudioSampleFormat::EInt16, Stored, bConversionNeeded );
   EXPECT_EQ( Stored, IAudioSampleFormat::EInt24 );
   EXPECT_TRUE( bConversionNeeded );
-  EXPECT_EQ( m_Log.Texts().back(), "Unsupported audio format." );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "Increasing number of audio channels is not supported.", "Unsupported audio format",
+      "Unsupported audio format." } ) );
 }
