@@ -22,88 +22,64 @@ using TestSupport::VFakeFlowServices;
 class VScriptedNode : public Flow2Utils::VFlowNode<VScriptedNode>
 {
 public:
+  using VScript = std::function<void( VScriptedNode& )>;
+
   static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Scripted", "Runs a function", { "In" }, { "Out" } }; }
 
-  std::function<void( VScriptedNode& )> m_PreProcess;
-  std::function<void( VScriptedNode& )> m_Process;
-  std::function<void( VScriptedNode& )> m_PostProcess;
+  VScript m_PreProcess = []( VScriptedNode& ) {};
+  VScript m_Process = m_PreProcess;
+  VScript m_PostProcess = m_PreProcess;
+
+  // Where the wrappers put what they bring
+  KVZ::VFlowStatePtr m_pState;
+  uint32_t m_Index = 0;
+  KVZ::VFlowSelection m_Selection;
+  KVZ::VFlowItemList m_Items;
 
 protected:
   uint32_t PreProcess() override
   {
-    Run( m_PreProcess );
+    m_PreProcess( *this );
     return EFlowResult::Ok;
   }
-  void Process() override { Run( m_Process ); }
-  void PostProcess() override { Run( m_PostProcess ); }
-
-private:
-  void Run( const std::function<void( VScriptedNode& )>& i_rFunction )
-  {
-    if( i_rFunction )
-    {
-      i_rFunction( *this );
-    }
-  }
+  void Process() override { m_Process( *this ); }
+  void PostProcess() override { m_PostProcess( *this ); }
 };
 
-using VWrapper = std::function<bool( VScriptedNode& )>;
+bool Read( VScriptedNode& i_rNode ) { return i_rNode.Read( 7, VFlowLimit::Zero(), i_rNode.m_pState ); }
+bool ReadOneOf( VScriptedNode& i_rNode ) { return i_rNode.ReadOneOf( { 0 }, VFlowLimit::Zero(), i_rNode.m_Index, i_rNode.m_pState ); }
+bool Write( VScriptedNode& i_rNode ) { return i_rNode.Write( 0, nullptr, VFlowLimit::Zero() ); }
+bool Select( VScriptedNode& i_rNode ) { return i_rNode.Select( { 0 }, { 0 }, VFlowLimit::Zero(), i_rNode.m_Selection ); }
+bool Sleep( VScriptedNode& i_rNode )
+{
+  i_rNode.Sleep( VFlowLimit::Zero() );
+  return false;
+}
+bool DoBlockingCall( VScriptedNode& i_rNode )
+{
+  return i_rNode.DoBlockingCall( []( uint64_t ) { return 0u; }, VFlowLimit::Zero() );
+}
+bool GlobalItems( VScriptedNode& i_rNode ) { return i_rNode.GlobalItems( VFlowLimit::Zero(), i_rNode.m_Items ); }
+bool WaitInputConnected( VScriptedNode& i_rNode ) { return i_rNode.WaitInputConnected( 3, VFlowLimit::Zero() ); }
+bool WaitOutputConnected( VScriptedNode& i_rNode ) { return i_rNode.WaitOutputConnected( 4, VFlowLimit::Zero() ); }
 
-const struct VWrapperCase
+// All say "Detected that node is stopping", and "Unexpected Error" of what they have no words for.
+constexpr struct VWrapper
 {
   const char* m_pName;
-  VWrapper m_Call;
-  const char* m_pStopping;
-  const char* m_pEndOfData;   // a null pointer: an unexpected error
+  bool ( *m_pCall )( VScriptedNode& );
+  const char* m_pEndOfData;
   const char* m_pUnknown;
-  const char* m_pOther;
 } Wrappers[] = {
-  { "Read",
-    []( VScriptedNode& i_rNode )
-    {
-      KVZ::VFlowStatePtr pState;
-      return i_rNode.Read( 7, VFlowLimit::Zero(), pState );
-    },
-    "Read: Detected that node is stopping", "Read: End of data on input index 7", "Read: Unknown input - index = 7", "Read: Unexpected Error" },
-  { "ReadOneOf",
-    []( VScriptedNode& i_rNode )
-    {
-      KVZ::VFlowStatePtr pState;
-      uint32_t Index = 0;
-      return i_rNode.ReadOneOf( { 0 }, VFlowLimit::Zero(), Index, pState );
-    },
-    "ReadOneOf: Detected that node is stopping", "ReadOneOf: End of data on input", "ReadOneOf: Unknown input", "ReadOneOf: Unexpected Error" },
-  { "Write", []( VScriptedNode& i_rNode ) { return i_rNode.Write( 0, nullptr, VFlowLimit::Zero() ); }, "Write: Detected that node is stopping",
-    "Write: End of data on output", "Write: Unknown input", "Write: Unexpected Error" },
-  { "Select",
-    []( VScriptedNode& i_rNode )
-    {
-      KVZ::VFlowSelection Selection;
-      return i_rNode.Select( { 0 }, { 0 }, VFlowLimit::Zero(), Selection );
-    },
-    "Select: Detected that node is stopping", nullptr, "Select: Unknown input or output", "Select: Unexpected Error" },
-  { "Sleep",
-    []( VScriptedNode& i_rNode )
-    {
-      i_rNode.Sleep( VFlowLimit::Zero() );
-      return false;
-    },
-    "Sleep: Detected that node is stopping", nullptr, nullptr, "Sleep: Unexpected Error" },
-  { "DoBlockingCall", []( VScriptedNode& i_rNode ) { return i_rNode.DoBlockingCall( []( uint64_t ) { return 0u; }, VFlowLimit::Zero() ); },
-    "DoBlockingCall: Detected that node is stopping", "DoBlockingCall: End of data", nullptr, "DoBlockingCall: Unexpected Error" },
-  { "GlobalItems",
-    []( VScriptedNode& i_rNode )
-    {
-      KVZ::VFlowItemList Items;
-      return i_rNode.GlobalItems( VFlowLimit::Zero(), Items );
-    },
-    "GlobalItems: Detected that node is stopping", nullptr, nullptr, "GlobalItems: Unexpected Error" },
-  { "WaitInputConnected", []( VScriptedNode& i_rNode ) { return i_rNode.WaitInputConnected( 3, VFlowLimit::Zero() ); },
-    "WaitInputConnected: Detected that node is stopping", nullptr, "WaitInputConnected: Unknown input - index = 3",
-    "WaitInputConnected: Unexpected Error" },
-  { "WaitOutputConnected", []( VScriptedNode& i_rNode ) { return i_rNode.WaitOutputConnected( 4, VFlowLimit::Zero() ); },
-    "WaitOutputConnected: Detected that node is stopping", nullptr, "WaitOutputConnected: Unknown output - index = 4",
-    "WaitOutputConnected: Unexpected Error" },
+  { "Read", &Read, "End of data on input index 7", "Unknown input - index = 7" },
+  { "ReadOneOf", &ReadOneOf, "End of data on input", "Unknown input" },
+  { "Write", &Write, "End of data on output", "Unknown input" },
+  { "Select", &Select, nullptr, "Unknown input or output" },
+  { "Sleep", &Sleep, nullptr, nullptr },
+  { "DoBlockingCall", &DoBlockingCall, "End of data", nullptr },
+  { "GlobalItems", &GlobalItems, nullptr, nullptr },
+  { "WaitInputConnected", &WaitInputConnected, nullptr, "Unknown input - index = 3" },
+  { "WaitOutputConnected", &WaitOutputConnected, nullptr, "Unknown output - index = 4" },
 };
 
 struct VThrown
@@ -135,7 +111,7 @@ class FlowNode : public ::testing::Test
 {
 protected:
   // Runs the call inside Process, where the services are installed, and gives what it threw.
-  VThrown ThrownBy( const std::function<void( VScriptedNode& )>& i_rCall )
+  VThrown ThrownBy( const VScriptedNode::VScript& i_rCall )
   {
     VThrown Thrown;
     m_Node.m_Process = [&]( VScriptedNode& i_rNode ) { Thrown = Catch( [&] { i_rCall( i_rNode ); } ); };
@@ -144,11 +120,16 @@ protected:
     EXPECT_EQ( m_Node.PostProcessChecked(), EFlowResult::Ok );
     return Thrown;
   }
-  void Expect( const VWrapperCase& i_rCase, uint32_t i_Answer, const char* i_pText, bool i_bFinished )
+  std::string TextOf( uint32_t i_Answer, const VScriptedNode::VScript& i_rCall )
   {
     m_pServices->m_Answer = i_Answer;
-    const VThrown Thrown = ThrownBy( i_rCase.m_Call );
-    EXPECT_EQ( Thrown.m_Text, i_pText ? i_pText : i_rCase.m_pOther );
+    return ThrownBy( i_rCall ).m_Text;
+  }
+  void Expect( const VWrapper& i_rCase, uint32_t i_Answer, const char* i_pText, bool i_bFinished )
+  {
+    m_pServices->m_Answer = i_Answer;
+    const VThrown Thrown = ThrownBy( i_rCase.m_pCall );
+    EXPECT_EQ( Thrown.m_Text, std::string( i_rCase.m_pName ) + ": " + ( i_pText ? i_pText : "Unexpected Error" ) );
     EXPECT_EQ( Thrown.m_bFinished, i_bFinished && i_pText );
   }
 
@@ -158,59 +139,55 @@ protected:
 
 TEST_F( FlowNode, EveryWrapperHasItsWordsForEveryResult )
 {
-  for( const VWrapperCase& rCase : Wrappers )
+  for( const VWrapper& rCase : Wrappers )
   {
     SCOPED_TRACE( rCase.m_pName );
-    Expect( rCase, EFlowResult::Stopping, rCase.m_pStopping, true );
+    Expect( rCase, EFlowResult::Stopping, "Detected that node is stopping", true );
     Expect( rCase, EFlowResult::EndOfData, rCase.m_pEndOfData, true );
     Expect( rCase, EFlowResult::UnknownPort, rCase.m_pUnknown, false );
     Expect( rCase, 0x80004005u, nullptr, false );
-    m_pServices->m_Answer = EFlowResult::WouldBlock;
     bool bAnswer = true;
-    EXPECT_EQ( ThrownBy( [&]( VScriptedNode& i_rNode ) { bAnswer = rCase.m_Call( i_rNode ); } ).m_Text, "" ) << "a timeout is no exception";
+    EXPECT_EQ( TextOf( EFlowResult::WouldBlock, [&]( VScriptedNode& i_rNode ) { bAnswer = rCase.m_pCall( i_rNode ); } ), "" )
+      << "a timeout is no exception";
     EXPECT_FALSE( bAnswer );
   }
 }
 
 TEST_F( FlowNode, WrappersWithResultsOfTheirOwn )
 {
-  const auto Text = [&]( uint32_t i_Answer, const std::function<void( VScriptedNode& )>& i_rCall )
-  {
-    m_pServices->m_Answer = i_Answer;
-    return ThrownBy( i_rCall ).m_Text;
-  };
-  EXPECT_EQ( Text( EFlowResult::NotConnected, Wrappers[2].m_Call ), "Write: NotConnected" );
-  EXPECT_EQ( Text( EFlowResult::Failed, Wrappers[2].m_Call ), "Write: Failed" );
-  EXPECT_EQ( Text( EFlowResult::NotConnected, Wrappers[3].m_Call ), "Select: NotConnected" );
-  EXPECT_EQ( Text( EFlowResult::Failed, Wrappers[3].m_Call ), "Select: Failed" );
+  EXPECT_EQ( TextOf( EFlowResult::NotConnected, &Write ), "Write: NotConnected" );
+  EXPECT_EQ( TextOf( EFlowResult::Failed, &Write ), "Write: Failed" );
+  EXPECT_EQ( TextOf( EFlowResult::NotConnected, &Select ), "Select: NotConnected" );
+  EXPECT_EQ( TextOf( EFlowResult::Failed, &Select ), "Select: Failed" );
   const auto Input = []( VScriptedNode& i_rNode ) { i_rNode.InputIndex( "Left" ); };
   const auto Output = []( VScriptedNode& i_rNode ) { i_rNode.OutputIndex( "Right" ); };
-  EXPECT_EQ( Text( EFlowResult::UnknownName, Input ), "InputIndex: Unknown input name Left" );
-  EXPECT_EQ( Text( EFlowResult::Failed, Input ), "InputIndex: Unknown error" );
-  EXPECT_EQ( Text( EFlowResult::WouldBlock, Input ), "InputIndex: Unknown error" ) << "no index came, so there is none to go on with";
-  EXPECT_EQ( Text( EFlowResult::UnknownName, Output ), "OutputIndex: Unknown output name Right" );
-  EXPECT_EQ( Text( EFlowResult::Failed, Output ), "OutputIndex: Unknown error" );
-  EXPECT_EQ( Text( EFlowResult::WouldBlock, Output ), "OutputIndex: Unknown error" );
+  EXPECT_EQ( TextOf( EFlowResult::UnknownName, Input ), "InputIndex: Unknown input name Left" );
+  EXPECT_EQ( TextOf( EFlowResult::UnknownName, Output ), "OutputIndex: Unknown output name Right" );
+  for( const uint32_t Answer : { EFlowResult::Failed, EFlowResult::WouldBlock } )   // no index came, so there is none to go on with
+  {
+    EXPECT_EQ( TextOf( Answer, Input ), "InputIndex: Unknown error" );
+    EXPECT_EQ( TextOf( Answer, Output ), "OutputIndex: Unknown error" );
+  }
   const auto Item = []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowAudioFrame", "Label" ); };
-  EXPECT_EQ( Text( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowSmell", "Label" ); } ),
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowSmell", "Label" ); } ),
     "CreateItem: Unknown item type FlowSmell" );
-  EXPECT_EQ( Text( EFlowResult::Failed, Item ), "CreateItem: Unknown error" );
+  EXPECT_EQ( TextOf( EFlowResult::Failed, Item ), "CreateItem: Unknown error" );
   m_pServices->m_bNoMemory = true;
-  EXPECT_EQ( Text( EFlowResult::Ok, Item ), "CreateItem: Could not allocate item FlowAudioFrame" );
-  EXPECT_EQ( Text( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateState(); } ), "CreateState: failed to create state" );
-  EXPECT_EQ( Text( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateSharedUserBuffer( 10 ); } ),
+  EXPECT_EQ( TextOf( EFlowResult::Ok, Item ), "CreateItem: Could not allocate item FlowAudioFrame" );
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateState(); } ), "CreateState: failed to create state" );
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateSharedUserBuffer( 10 ); } ),
     "CreateSharedUserBuffer: failed to create buffer" );
   m_pServices->m_bBlockingCalls = false;
-  EXPECT_EQ( Text( EFlowResult::Ok, Wrappers[5].m_Call ), "VFlowNodeUtils: Non blocking node services are not supported" );
+  EXPECT_EQ( TextOf( EFlowResult::Ok, &DoBlockingCall ), "VFlowNodeUtils: Non blocking node services are not supported" );
 }
 
 TEST_F( FlowNode, HasServicesOnlyWhileItRuns )
 {
   const std::string NotInstalled = "VFlowNodeUtils: Services not installed - possible illegal call outside of PreProcessChecked(), "
                                    "ProcessChecked() or PostProcessChecked()";
-  for( const VWrapperCase& rCase : Wrappers )
+  for( const VWrapper& rCase : Wrappers )
   {
-    EXPECT_EQ( Catch( [&] { rCase.m_Call( m_Node ); } ).m_Text, NotInstalled ) << rCase.m_pName;
+    EXPECT_EQ( Catch( [&] { rCase.m_pCall( m_Node ); } ).m_Text, NotInstalled ) << rCase.m_pName;
   }
   EXPECT_EQ( Catch( [&] { m_Node.CreateState(); } ).m_Text, NotInstalled );
   int Calls = 0;
@@ -227,9 +204,8 @@ TEST_F( FlowNode, HasServicesOnlyWhileItRuns )
 
 TEST_F( FlowNode, EndsCleanlyOnAStopAndTheEndOfData )
 {
-  const auto Read = []( VScriptedNode& i_rNode ) { Wrappers[0].m_Call( i_rNode ); };
   const TestSupport::VLogCapture Log( "Flow2Utils" );
-  m_Node.m_PreProcess = m_Node.m_Process = m_Node.m_PostProcess = Read;
+  m_Node.m_PreProcess = m_Node.m_Process = m_Node.m_PostProcess = &Read;
   m_pServices->m_Answer = EFlowResult::Stopping;
   EXPECT_EQ( m_Node.PreProcessChecked( m_pServices ), EFlowResult::Stopping );
   m_pServices->m_Answer = EFlowResult::EndOfData;
@@ -242,7 +218,7 @@ TEST_F( FlowNode, EndsCleanlyOnAStopAndTheEndOfData )
 
 TEST_F( FlowNode, OtherExceptionsPassOutAndLeaveNoServices )
 {
-  m_Node.m_Process = []( VScriptedNode& i_rNode ) { Wrappers[0].m_Call( i_rNode ); };
+  m_Node.m_Process = &Read;
   m_Node.m_PostProcess = []( VScriptedNode& ) { throw std::runtime_error( "broken" ); };
   EXPECT_EQ( m_Node.PreProcessChecked( m_pServices ), EFlowResult::Ok );
   m_pServices->m_Answer = EFlowResult::UnknownPort;
