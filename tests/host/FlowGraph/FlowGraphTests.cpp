@@ -19,18 +19,27 @@ std::vector<double> UpTo( size_t i_Count )
   return Numbers;
 }
 
+uint32_t StayAsleep( uint64_t ) { return EFlowResult::Asleep; }
+
 class FlowGraph : public ::testing::Test
 {
 protected:
-  VFlowNodeId AddFunction( VFunctionNode::VFunction i_Function, uint32_t i_Start = EFlowResult::Ok )
+  VFlowNodeId Add( const std::shared_ptr<KVZ::IFlowNode>& i_pNode )
   {
-    return m_Graph.AddNode( std::make_shared<VFunctionNode>( std::move( i_Function ), i_Start ), { .m_Name = "Function" } );
+    return m_Graph.AddNode( i_pNode, { .m_Name = "Node", .m_QueueLength = QueueLength } );
   }
+  VFlowNodeId AddFunction( VFunctionNode::VFunction i_Function ) { return Add( std::make_shared<VFunctionNode>( std::move( i_Function ) ) ); }
   std::pair<std::shared_ptr<VCollectingNode>, VFlowNodeId> AddCollector()
   {
     auto pNode = std::make_shared<VCollectingNode>();
-    const VFlowNodeId Id = m_Graph.AddNode( pNode, { .m_Name = "Collector", .m_QueueLength = QueueLength } );
-    return { pNode, Id };
+    return { pNode, Add( pNode ) };
+  }
+  // One that the source leads to
+  std::pair<std::shared_ptr<VCollectingNode>, VFlowNodeId> AddConsumer()
+  {
+    auto Collector = AddCollector();
+    EXPECT_TRUE( m_Graph.Connect( { m_Source, 0 }, { Collector.second, 0 } ) );
+    return Collector;
   }
   void WaitForState( VFlowNodeId i_Node, EFlowNodeState i_State )
   {
@@ -51,25 +60,8 @@ protected:
 
   StageHost::VFlowGraph m_Graph;
   const std::shared_ptr<VCountingNode> m_pSource = std::make_shared<VCountingNode>();
-  const VFlowNodeId m_Source = m_Graph.AddNode( m_pSource, { .m_Name = "Source" } );
+  const VFlowNodeId m_Source = Add( m_pSource );
 };
-
-TEST_F( FlowGraph, CarriesStatesInOrderToEveryInputThatAnOutputLeadsTo )
-{
-  const auto [pFirst, First] = AddCollector();
-  const auto [pSecond, Second] = AddCollector();
-  EXPECT_TRUE( m_Graph.Connect( { m_Source, 0 }, { First, 0 } ) );
-  EXPECT_TRUE( m_Graph.Connect( { m_Source, 0 }, { Second, 0 } ) );
-  m_Graph.Start();
-  m_pSource->Allow( 50 );
-  EXPECT_EQ( pFirst->WaitFor( 50 ), UpTo( 50 ) );
-  EXPECT_EQ( pSecond->WaitFor( 50 ), UpTo( 50 ) );
-  EXPECT_EQ( m_Graph.GetStatus( m_Source ).m_StatesWritten, 50u );
-  m_Graph.Stop();
-  EXPECT_EQ( m_Graph.GetStatus( First ).m_State, EFlowNodeState::Idle );
-  EXPECT_EQ( m_Graph.GetFailure(), "" );
-  EXPECT_TRUE( m_pSource->Last().expired() );
-}
 
 TEST_F( FlowGraph, RefusesWhatCannotBeWired )
 {
@@ -87,8 +79,7 @@ TEST_F( FlowGraph, RefusesWhatCannotBeWired )
 
 TEST_F( FlowGraph, AFullQueueHoldsTheSourceBack )
 {
-  const auto [pCollector, Collector] = AddCollector();
-  m_Graph.Connect( { m_Source, 0 }, { Collector, 0 } );
+  const auto [pCollector, Collector] = AddConsumer();
   pCollector->Hold( true );
   m_Graph.Start();
   m_pSource->Allow( 10 );
@@ -101,9 +92,8 @@ TEST_F( FlowGraph, AFullQueueHoldsTheSourceBack )
 
 TEST_F( FlowGraph, IsRewiredWhileItRuns )
 {
-  const auto [pFirst, First] = AddCollector();
+  const auto [pFirst, First] = AddConsumer();
   const auto [pSecond, Second] = AddCollector();
-  m_Graph.Connect( { m_Source, 0 }, { First, 0 } );
   pFirst->Hold( true );
   m_Graph.Start();
   m_pSource->Allow( 4 );
@@ -120,45 +110,47 @@ TEST_F( FlowGraph, IsRewiredWhileItRuns )
   EXPECT_EQ( pFirst->Numbers(), UpTo( 1 ) );
 }
 
-TEST_F( FlowGraph, AConsumerThatStopsIsNoObstacle )
+TEST_F( FlowGraph, CarriesStatesInOrderToEveryInputAndPastAConsumerThatStops )
 {
-  const auto [pFirst, First] = AddCollector();
-  const auto [pSecond, Second] = AddCollector();
-  m_Graph.Connect( { m_Source, 0 }, { First, 0 } );
-  m_Graph.Connect( { m_Source, 0 }, { Second, 0 } );
+  const auto [pFirst, First] = AddConsumer();
+  const auto [pSecond, Second] = AddConsumer();
   m_Graph.Start();
-  m_pSource->Allow( 1 );
-  pFirst->WaitFor( 1 );
-  pSecond->WaitFor( 1 );
+  m_pSource->Allow( 20 );
+  EXPECT_EQ( pFirst->WaitFor( 20 ), UpTo( 20 ) );
+  pSecond->WaitFor( 20 );
   EXPECT_TRUE( m_Graph.StopNode( First ) );
   m_pSource->Allow( 20 );
-  pSecond->WaitFor( 21 );
+  EXPECT_EQ( pSecond->WaitFor( 40 ), UpTo( 40 ) );
   EXPECT_TRUE( m_Graph.StartNode( First ) );
   m_pSource->Allow( 1 );
-  EXPECT_EQ( pFirst->WaitFor( 2 ), ( std::vector<double>{ 0, 21 } ) );
+  EXPECT_EQ( pFirst->WaitFor( 21 ).back(), 40.0 );
   EXPECT_TRUE( m_Graph.RemoveNode( First ) );
   EXPECT_EQ( pFirst.use_count(), 1 );
   m_pSource->Allow( 1 );
-  pSecond->WaitFor( 23 );
+  pSecond->WaitFor( 42 );
+  m_Graph.Stop();
+  EXPECT_EQ( m_Graph.GetStatus( Second ).m_State, EFlowNodeState::Idle );
+  EXPECT_EQ( m_Graph.GetStatus( m_Source ).m_StatesWritten, 42u );
+  EXPECT_TRUE( m_pSource->Last().expired() );
 }
 
 TEST_F( FlowGraph, NothingRunsWhileThereIsNothingToDo )
 {
-  const auto [pCollector, Collector] = AddCollector();
-  m_Graph.Connect( { m_Source, 0 }, { Collector, 0 } );
+  const auto [pCollector, Collector] = AddConsumer();
   m_Graph.Start();
-  m_pSource->Allow( 1 );
-  pCollector->WaitFor( 1 );
-  WaitUntilAsleep( m_Source );
-  WaitUntilAsleep( Collector );
-  const uint64_t Source = m_Graph.GetStatus( m_Source ).m_WakeUps;
-  const uint64_t Sink = m_Graph.GetStatus( Collector ).m_WakeUps;
-  m_pSource->Allow( 1 );
-  pCollector->WaitFor( 2 );
-  WaitUntilAsleep( m_Source );
-  WaitUntilAsleep( Collector );
-  EXPECT_EQ( m_Graph.GetStatus( m_Source ).m_WakeUps, Source + 1 );
-  EXPECT_EQ( m_Graph.GetStatus( Collector ).m_WakeUps, Sink + 1 );
+  std::vector<uint64_t> WakeUps;
+  for( const size_t Count : { 1, 2 } )
+  {
+    m_pSource->Allow( 1 );
+    pCollector->WaitFor( Count );
+    for( const VFlowNodeId Node : { m_Source, Collector } )
+    {
+      WaitUntilAsleep( Node );
+      WakeUps.push_back( m_Graph.GetStatus( Node ).m_WakeUps );
+    }
+  }
+  EXPECT_EQ( WakeUps[2], WakeUps[0] + 1 );
+  EXPECT_EQ( WakeUps[3], WakeUps[1] + 1 );
 }
 
 TEST_F( FlowGraph, WakesTheCallThatATokenBelongsToAndNoOther )
@@ -211,24 +203,21 @@ TEST_F( FlowGraph, TheEndOfDataRunsThroughTheGraph )
     {
       for( int Number = 0; Number < 5; ++Number )
       {
-        i_rNode.Write( 1, i_rNode.MakeNumber( Number ), VFlowLimit::None() );
+        i_rNode.Write( 1, MakeNumber( i_rNode, Number ), VFlowLimit::None() );
       }
       throw Flow2Utils::VFlowFinishedException( "That was all" );
     } );
   const VFlowNodeId Middle = AddFunction(
     []( VFunctionNode& i_rNode )
     {
-      KVZ::VFlowSelection Selection;
-      KVZ::VFlowStatePtr pState;
-      uint32_t Input = 0;
-      i_rNode.Select( { 0, 1 }, {}, VFlowLimit::None(), Selection );
-      EXPECT_TRUE( Selection.m_bInput );
-      EXPECT_EQ( Selection.m_Index, 1u );
-      i_rNode.ReadOneOf( { 1 }, VFlowLimit::None(), Input, pState );
-      i_rNode.Select( {}, { 0, 1 }, VFlowLimit::None(), Selection );
-      EXPECT_FALSE( Selection.m_bInput );
-      EXPECT_EQ( Selection.m_Index, 0u );
-      i_rNode.Write( 0, pState, VFlowLimit::None() );
+      i_rNode.Select( { 0, 1 }, {}, VFlowLimit::None(), i_rNode.m_Selection );
+      EXPECT_TRUE( i_rNode.m_Selection.m_bInput );
+      EXPECT_EQ( i_rNode.m_Selection.m_Index, 1u );
+      i_rNode.ReadOneOf( { 1 }, VFlowLimit::None(), i_rNode.m_Input, i_rNode.m_pState );
+      i_rNode.Select( {}, { 0, 1 }, VFlowLimit::None(), i_rNode.m_Selection );
+      EXPECT_FALSE( i_rNode.m_Selection.m_bInput );
+      EXPECT_EQ( i_rNode.m_Selection.m_Index, 0u );
+      i_rNode.Write( 0, i_rNode.m_pState, VFlowLimit::None() );
     } );
   const auto [pCollector, Collector] = AddCollector();
   m_Graph.Connect( { Source, 1 }, { Middle, 1 } );
@@ -248,7 +237,7 @@ TEST_F( FlowGraph, AnExceptionEndsTheWholeRunWithItsText )
 {
   const VFlowNodeId Other = AddFunction( []( VFunctionNode& i_rNode ) { i_rNode.Sleep( VFlowLimit::None() ); } );
   const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& i_rNode ) { i_rNode.WaitInputConnected( 17, VFlowLimit::None() ); } );
-  const VFlowNodeId Faulty = m_Graph.AddNode( pFaulty, { .m_Name = "Faulty" } );
+  const VFlowNodeId Faulty = Add( pFaulty );
   m_Graph.Start();
   WaitForState( Faulty, EFlowNodeState::Failed );
   WaitForState( Other, EFlowNodeState::Idle );
@@ -260,16 +249,13 @@ TEST_F( FlowGraph, AnExceptionEndsTheWholeRunWithItsText )
 
 TEST_F( FlowGraph, ANodeThatCannotBeStartedLeavesTheOthersAlone )
 {
-  std::atomic<int> Rounds{ 0 };
-  const auto pFaulty = std::make_shared<VFunctionNode>( [&]( VFunctionNode& ) { ++Rounds; }, EFlowResult::Failed );
-  const VFlowNodeId Faulty = m_Graph.AddNode( pFaulty, { .m_Name = "Faulty" } );
-  const auto [pCollector, Collector] = AddCollector();
-  m_Graph.Connect( { m_Source, 0 }, { Collector, 0 } );
+  const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& ) { ADD_FAILURE() << "runs"; }, EFlowResult::Failed );
+  const VFlowNodeId Faulty = Add( pFaulty );
+  const auto [pCollector, Collector] = AddConsumer();
   m_Graph.Start();
   WaitForState( Faulty, EFlowNodeState::Failed );
   m_pSource->Allow( 1 );
   pCollector->WaitFor( 1 );
-  EXPECT_EQ( Rounds, 0 );
   EXPECT_EQ( pFaulty->Ends(), 1 ) << "what it has set up stays";
   EXPECT_EQ( m_Graph.GetFailure(), "" );
 }
@@ -286,7 +272,7 @@ TEST_F( FlowGraph, GivesGlobalItemsToThoseWhoRunAndThoseWhoStartLater )
     // Whoever is asleep in a call that may be rewired hears of the next ones too.
     while( !i_rNode.GlobalItems( VFlowLimit::Zero(), Items ) )
     {
-      i_rNode.DoBlockingCall( []( uint64_t ) -> uint32_t { return EFlowResult::Asleep; }, VFlowLimit::None(), KVZ::EFlowFlags::Rewirable );
+      i_rNode.DoBlockingCall( &StayAsleep, VFlowLimit::None(), KVZ::EFlowFlags::Rewirable );
     }
     Given[Count++].set_value( Items );
   };
@@ -304,33 +290,18 @@ TEST_F( FlowGraph, GivesGlobalItemsToThoseWhoRunAndThoseWhoStartLater )
 TEST_F( FlowGraph, StopsFromEveryWait )
 {
   const VFunctionNode::VFunction Waits[] = {
-    []( VFunctionNode& i_rNode )
-    {
-      KVZ::VFlowStatePtr pState;
-      i_rNode.Read( 0, VFlowLimit::None(), pState );
+    []( VFunctionNode& r ) { r.Read( 0, VFlowLimit::None(), r.m_pState ); },
+    []( VFunctionNode& r ) {
+      r.ReadOneOf( { 0, 1 }, VFlowLimit::None(), r.m_Input, r.m_pState );
     },
-    []( VFunctionNode& i_rNode )
-    {
-      KVZ::VFlowStatePtr pState;
-      uint32_t Input = 0;
-      i_rNode.ReadOneOf( { 0, 1 }, VFlowLimit::None(), Input, pState );
-    },
-    []( VFunctionNode& i_rNode ) { i_rNode.Write( 0, i_rNode.MakeNumber( 1 ), VFlowLimit::None() ); },   // until its own queue is full
-    []( VFunctionNode& i_rNode )
-    {
-      KVZ::VFlowSelection Selection;
-      i_rNode.Select( { 0 }, { 1 }, VFlowLimit::None(), Selection );
-    },
-    []( VFunctionNode& i_rNode ) { i_rNode.Sleep( VFlowLimit::None() ); },
-    []( VFunctionNode& i_rNode ) { i_rNode.Sleep( { 1000000 } ); },
-    []( VFunctionNode& i_rNode ) { i_rNode.DoBlockingCall( []( uint64_t ) -> uint32_t { return EFlowResult::Asleep; }, VFlowLimit::None() ); },
-    []( VFunctionNode& i_rNode )
-    {
-      KVZ::VFlowItemList Items;
-      i_rNode.GlobalItems( VFlowLimit::None(), Items );
-    },
-    []( VFunctionNode& i_rNode ) { i_rNode.WaitInputConnected( 1, VFlowLimit::None() ); },
-    []( VFunctionNode& i_rNode ) { i_rNode.WaitOutputConnected( 1, VFlowLimit::None() ); },
+    []( VFunctionNode& r ) { r.Write( 0, MakeNumber( r, 1 ), VFlowLimit::None() ); },   // until its own queue is full
+    []( VFunctionNode& r ) { r.Select( { 0 }, { 1 }, VFlowLimit::None(), r.m_Selection ); },
+    []( VFunctionNode& r ) { r.Sleep( VFlowLimit::None() ); },
+    []( VFunctionNode& r ) { r.Sleep( { 1000000 } ); },
+    []( VFunctionNode& r ) { r.DoBlockingCall( &StayAsleep, VFlowLimit::None() ); },
+    []( VFunctionNode& r ) { r.GlobalItems( VFlowLimit::None(), r.m_Items ); },
+    []( VFunctionNode& r ) { r.WaitInputConnected( 1, VFlowLimit::None() ); },
+    []( VFunctionNode& r ) { r.WaitOutputConnected( 1, VFlowLimit::None() ); },
   };
   std::vector<VFlowNodeId> Nodes;
   for( const auto& rWait : Waits )
@@ -363,24 +334,21 @@ TEST_F( FlowGraph, WaitsNoLongerThanItsLimit )
   const VFlowNodeId Node = AddFunction(
     [&]( VFunctionNode& i_rNode )
     {
-      KVZ::VFlowStatePtr pState;
-      KVZ::VFlowItemList Items;
-      KVZ::VFlowSelection Selection;
       for( const VFlowLimit Limit : { VFlowLimit::Zero(), VFlowLimit{ 1 } } )
       {
-        EXPECT_FALSE( i_rNode.Read( 0, Limit, pState ) );
+        EXPECT_FALSE( i_rNode.Read( 0, Limit, i_rNode.m_pState ) );
         EXPECT_FALSE( i_rNode.WaitOutputConnected( 0, Limit ) );
-        EXPECT_FALSE( i_rNode.GlobalItems( Limit, Items ) );
-        EXPECT_FALSE( i_rNode.DoBlockingCall( []( uint64_t ) -> uint32_t { return EFlowResult::Asleep; }, Limit ) );
+        EXPECT_FALSE( i_rNode.GlobalItems( Limit, i_rNode.m_Items ) );
+        EXPECT_FALSE( i_rNode.DoBlockingCall( &StayAsleep, Limit ) );
         i_rNode.Sleep( Limit );
       }
       EXPECT_EQ( i_rNode.InputIndex( "Right" ), 1u );
       EXPECT_EQ( i_rNode.OutputIndex( "Upper" ), 0u );
       EXPECT_EQ( i_rNode.CreateSharedUserBuffer( 100 )->Size(), 100u );
-      EXPECT_TRUE( i_rNode.Write( 0, i_rNode.MakeNumber( 1 ), VFlowLimit::None(), KVZ::EFlowFlags::Rewirable ) ) << "let go";
-      EXPECT_THROW( i_rNode.Write( 0, i_rNode.MakeNumber( 1 ), VFlowLimit::None() ), Flow2Utils::VFlowException ) << "not connected";
-      EXPECT_THROW( i_rNode.Select( { 0 }, {}, VFlowLimit::None(), Selection ), Flow2Utils::VFlowException ) << "not connected";
-      EXPECT_THROW( i_rNode.Select( {}, {}, VFlowLimit::None(), Selection ), Flow2Utils::VFlowException ) << "nothing to wait for";
+      EXPECT_TRUE( i_rNode.Write( 0, MakeNumber( i_rNode, 1 ), VFlowLimit::None(), KVZ::EFlowFlags::Rewirable ) ) << "let go";
+      EXPECT_THROW( i_rNode.Write( 0, MakeNumber( i_rNode, 1 ), VFlowLimit::None() ), Flow2Utils::VFlowException ) << "not connected";
+      EXPECT_THROW( i_rNode.Select( { 0 }, {}, VFlowLimit::None(), i_rNode.m_Selection ), Flow2Utils::VFlowException ) << "not connected";
+      EXPECT_THROW( i_rNode.Select( {}, {}, VFlowLimit::None(), i_rNode.m_Selection ), Flow2Utils::VFlowException ) << "nothing to wait for";
       Done.set_value();
       throw Flow2Utils::VFlowFinishedException( "done" );
     } );

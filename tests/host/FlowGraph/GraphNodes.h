@@ -21,6 +21,16 @@ using StageHost::EFlowNodeState;
 using StageHost::VFlowNodeId;
 using StageHost::VFlowNodeStatus;
 
+template<class TNode>
+KVZ::VFlowStatePtr MakeNumber( TNode& io_rNode, double i_Number )
+{
+  const auto pItem = io_rNode.template CreateItemOf<KVZ::VFlowGenericData>( "number" );
+  pItem->m_Values["Number"] = { i_Number };
+  KVZ::VFlowStatePtr pState = io_rNode.CreateState();
+  pState->AddItem( pItem );
+  return pState;
+}
+
 // Runs the test's function round after round. Two inputs, two outputs.
 class VFunctionNode : public Flow2Utils::VFlowNode<VFunctionNode>
 {
@@ -31,23 +41,14 @@ public:
 
   explicit VFunctionNode( VFunction i_Process, uint32_t i_Start = EFlowResult::Ok ) : m_Process( std::move( i_Process ) ), m_Start( i_Start ) {}
 
-  KVZ::VFlowStatePtr MakeNumber( double i_Number )
-  {
-    const auto pItem = CreateItemOf<KVZ::VFlowGenericData>( "number" );
-    pItem->m_Values["Number"] = { i_Number };
-    KVZ::VFlowStatePtr pState = CreateState();
-    pState->AddItem( pItem );
-    return pState;
-  }
-  double NumberOf( const KVZ::IFlowState& i_rState )
-  {
-    double Number = -1.0;
-    ItemOf<KVZ::VFlowGenericData>( i_rState )->GetNumber( "Number", Number );
-    return Number;
-  }
-
   // How often it has been run to its end. Any thread.
   int Ends() const { return m_Ends; }
+
+  // Where the function may put what services bring
+  KVZ::VFlowStatePtr m_pState;
+  uint32_t m_Input = 0;
+  KVZ::VFlowSelection m_Selection;
+  KVZ::VFlowItemList m_Items;
 
 protected:
   uint32_t PreProcess() override { return m_Start; }
@@ -60,11 +61,13 @@ private:
   std::atomic<int> m_Ends{ 0 };
 };
 
-// Writes 0, 1, 2 and so on to its first output, as many as it has been allowed to, and sleeps in between.
+// Writes numbers from the first on to its output, as many as it has been allowed to, and sleeps in between.
 class VCountingNode : public Flow2Utils::VFlowNode<VCountingNode>
 {
 public:
   static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Counting", "Writes numbers", {}, { "Output" } }; }
+
+  explicit VCountingNode( int i_First = 0 ) : m_Next( i_First ) {}
 
   // Any thread.
   void Allow( int i_Count )
@@ -103,10 +106,7 @@ protected:
     {
       return;
     }
-    const KVZ::VFlowStatePtr pState = CreateState();
-    const auto pItem = CreateItemOf<KVZ::VFlowGenericData>( "number" );
-    pItem->m_Values["Number"] = { static_cast<double>( m_Next++ ) };
-    pState->AddItem( pItem );
+    const KVZ::VFlowStatePtr pState = MakeNumber( *this, m_Next++ );
     {
       boost::lock_guard<boost::mutex> Lock( m_Mutex );
       m_pLast = pState;
@@ -133,7 +133,7 @@ private:
     return EFlowResult::Ok;
   }
 
-  int m_Next = 0;   // the node's thread
+  int m_Next;   // the node's thread
   mutable boost::mutex m_Mutex;
   std::shared_ptr<KVZ::IFlowNodeServices> m_pWake GUARDED_BY( m_Mutex );
   uint64_t m_Token GUARDED_BY( m_Mutex ) = 0;
