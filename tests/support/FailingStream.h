@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <limits>
 #include <memory>
+#include <new>
 
 namespace TestSupport
 {
@@ -18,6 +19,7 @@ struct VFault
   uint64_t m_Offset = Never;      // nothing can be stored at this offset and behind it: the disk is full
   uint64_t m_Operation = Never;   // this operation (write, seek, tell or close, counted from 0) fails, later ones work again; streams that
                                   // are given the same count of operations count together
+  bool m_bThrows = false;         // that operation throws instead
 };
 
 class VFailingStream : public UtilsIO::IClosableStream
@@ -54,7 +56,15 @@ public:
   bool Close() override { return !IsFault() && m_pStream->Close(); }
 
 private:
-  bool IsFault() { return ( *m_pOperations )++ == m_Fault.m_Operation; }
+  bool IsFault()
+  {
+    const bool bFault = ( *m_pOperations )++ == m_Fault.m_Operation;
+    if( bFault && m_Fault.m_bThrows )
+    {
+      throw std::bad_alloc();
+    }
+    return bFault;
+  }
 
   const std::unique_ptr<UtilsIO::IClosableStream> m_pStream;
   const VFault m_Fault;

@@ -14,7 +14,7 @@ using namespace TestSupport;
 namespace
 {
 
-// A value of each type. Times count in the base of MOV files, so that all containers can keep the same.
+// A value of each type. Times count in the base of MOV files, so that all containers keep the same.
 VHeader Recording()
 {
   VHeader Settings = MovieHeader( 4, 2 );
@@ -35,33 +35,39 @@ VHeader Recording()
   rAttributes.Set( "Double", 0.1 );
   rAttributes.Set( "Text", std::string( "Bühne 1, \"links\"" ) );
   rAttributes.Set( "Empty", std::string() );
+  rAttributes.Set( "Saturation", std::string( "gives way" ) );
   return Settings;
+}
+
+VHeader OfImages( VHeader i_Header )
+{
+  i_Header.m_Payload = KVZ::IVideoPayload::EImagePNG;
+  i_Header.m_AudioPayload = KVZ::IAudioPayload::ENone;
+  return i_Header;
 }
 
 class Attributes : public testing::Test
 {
 protected:
-  std::string Write( const VContainerRow& i_rRow ) const
+  // The file that holds the attributes: beside images there is one of its own.
+  std::string Write( const VContainerRow& i_rRow, const VHeader& i_rHeader ) const
   {
     const std::string Path = m_Folder.File( std::string( "movie." ) + i_rRow.m_pName );
-    const VHeader Settings = Recording();
     const auto pWriter = MakeWriter( i_rRow.m_Container );
-    EXPECT_TRUE( pWriter->Open( Path ) && Settings.WriteTo( *pWriter ) );
-    EXPECT_TRUE( Settings.WriteFrame( *pWriter, VBytes( 16 ), VBytes( 8 ), 0 ) );
-    EXPECT_TRUE( pWriter->Close() );
-    return Path;
+    EXPECT_TRUE( pWriter->Open( Path ) && i_rHeader.WriteTo( *pWriter ) && pWriter->Close() );
+    return i_rRow.m_Container == Images.m_Container ? m_Folder.File( "movie.tarvovideoattributes" ) : Path;
   }
 
-  // Both blocks as they lie in the file, the internal one first.
-  VBytes ReferenceBlocks() const
+  // Both blocks as the system's own container keeps them, the internal one first.
+  VBytes ReferenceBlocks( const VHeader& i_rHeader ) const
   {
     constexpr std::ptrdiff_t FixedHeader = 48;
-    const VBytes File = VRiffParser::ReadFile( m_Reference );
-    return { File.begin() + FixedHeader, File.begin() + static_cast<std::ptrdiff_t>( VTvidParser( m_Reference ).RecordsStart() ) };
+    const std::string Path = Write( Tvid, i_rHeader );
+    const VBytes File = VRiffParser::ReadFile( Path );
+    return { File.begin() + FixedHeader, File.begin() + static_cast<std::ptrdiff_t>( VTvidParser( Path ).RecordsStart() ) };
   }
 
   const VTemporaryFolder m_Folder;
-  const std::string m_Reference = Write( { "tvid", KVZ::IVideoContainer::ETVID } );
 };
 
 bool IsText( const VTvidParser::VValue& i_rValue, const std::string& i_rText )
@@ -78,29 +84,50 @@ bool IsText( const VTvidParser::VValue& i_rValue, const std::string& i_rText )
   return std::visit( VVisitor{ i_rText }, i_rValue );
 }
 
+struct VKeysRow
+{
+  VContainerRow m_Row;
+  bool m_bTiming;   // and colour
+  bool m_bTimecode;
+};
+
+// Whether there are keys for a timing that nobody has set and for a timecode that is none.
+constexpr VKeysRow KeysOfNoUse[] = { { Tvid, false, false }, { Mov, true, true }, { MP4, true, true }, { Avi, false, true }, { Mkv, true, true },
+  { Images, true, true } };
+
 }
 
-TEST_F( Attributes, OfMovAndMP4AreTheSameBytes )
+TEST_F( Attributes, OfMovAndMP4AreTheSameBytesInATimescaleOfTheirOwn )
 {
+  VHeader Header = Recording();
+  Header.m_Timing = { 30000, 1001, -20020 };
   for( const VContainerRow& rRow : { Mov, MP4 } )
   {
-    const auto File = VMovParser::OfFile( Write( rRow ) );
-    EXPECT_EQ( File.Body( File.Root().Child( "TMSL" ) ), ReferenceBlocks() ) << rRow.m_pName;
+    const auto File = VMovParser::OfFile( Write( rRow, Header ) );
+    EXPECT_EQ( File.Body( File.Root().Child( "TMSL" ) ), ReferenceBlocks( Recording() ) ) << rRow.m_pName;
   }
 }
 
 TEST_F( Attributes, OfAviAreTheSameBytes )
 {
-  const VRiffParser File( VRiffParser::ReadFile( Write( Avi ) ) );
+  const VRiffParser File( VRiffParser::ReadFile( Write( Avi, Recording() ) ) );
   ASSERT_EQ( File.Riffs().back().m_Form, "TMSL" );
-  EXPECT_EQ( File.Content( File.Riffs().back() ), ReferenceBlocks() );
+  EXPECT_EQ( File.Content( File.Riffs().back() ), ReferenceBlocks( Recording() ) );
+}
+
+TEST_F( Attributes, BesideImagesAreTheSameBytesOfTheFormatThatIsCompressed )
+{
+  VHeader Stored = Recording();
+  Stored.m_Video.m_PixelFormat = KVZ::IPixelFormat::ER8G8B8;
+  Stored.m_Audio = {};
+  EXPECT_EQ( VRiffParser::ReadFile( Write( Images, OfImages( Recording() ) ) ), ReferenceBlocks( Stored ) );
 }
 
 TEST_F( Attributes, OfMatroskaAreTheSameValues )
 {
-  const VEbmlParser File( VRiffParser::ReadFile( Write( Mkv ) ) );
+  const VEbmlParser File( VRiffParser::ReadFile( Write( Mkv, Recording() ) ) );
   std::map<std::string, std::string> Tags = ReadTags( File );
-  const VTvidParser Reference( m_Reference );
+  const VTvidParser Reference( Write( Tvid, Recording() ) );
   EXPECT_EQ( Tags.size(), Reference.Internal().size() + Reference.External().size() );
   for( const auto& [pPrefix, rBlock] :
     { std::pair( "Tarvo.Internal.", Reference.Internal() ), std::pair( "Tarvo.External.", Reference.External() ) } )
@@ -110,5 +137,21 @@ TEST_F( Attributes, OfMatroskaAreTheSameValues )
       EXPECT_TRUE( Tags.count( pPrefix + rKey ) == 1 && IsText( rValue, Tags[pPrefix + rKey] ) ) << rKey << " " << Tags[pPrefix + rKey];
     }
   }
-  EXPECT_EQ( Tags["Tarvo.External.Text"], "Bühne 1, \"links\"" );
+}
+
+TEST_F( Attributes, OfNoUseAreLeftOutBySomeContainers )
+{
+  for( const VKeysRow& rKeys : KeysOfNoUse )
+  {
+    SCOPED_TRACE( rKeys.m_Row.m_pName );
+    VHeader Header = MovieHeader( 4, 2 );
+    Header.m_Timing = {};
+    Header.m_Timecode = { KVZ::ITimecodeStandard::ETimecode25, 0, 0, 0, 25 };
+    const bool bImages = rKeys.m_Row.m_Container == Images.m_Container;
+    const VBytes File = VRiffParser::ReadFile( Write( rKeys.m_Row, bImages ? OfImages( Header ) : Header ) );
+    const std::string Text( File.begin(), File.end() );
+    EXPECT_EQ( Text.find( "TicksPerSecond" ) != std::string::npos, rKeys.m_bTiming );
+    EXPECT_EQ( Text.find( "GammaCorrection" ) != std::string::npos, rKeys.m_bTiming );
+    EXPECT_EQ( Text.find( "Timecode.UserBits" ) != std::string::npos, rKeys.m_bTimecode );
+  }
 }

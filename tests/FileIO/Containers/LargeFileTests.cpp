@@ -2,8 +2,10 @@
 #include "Utils/UtilsIO/LargeFile.h"
 #include "tests/FileIO/Containers/MovieWriters.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/MovParser.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/TvidParser.h"
 
 #include <boost/filesystem/operations.hpp>
 #include <gtest/gtest.h>
@@ -73,6 +75,7 @@ struct VLargeCase
 
 // Matroska's segment has a size that its field cannot hold from 32 GiB on.
 constexpr VLargeCase Cases[] = { { Mov, 40 }, { MP4, 40 }, { Avi, 40 }, { Mkv, 40 }, { Mkv, 280 } };
+constexpr VLargeCase OfTvid = { Tvid, 40 };
 
 class LargeFile : public testing::TestWithParam<VLargeCase>
 {
@@ -130,3 +133,49 @@ TEST_P( LargeFile, IsSoughtByFFmpegToItsLastFrame )
 
 INSTANTIATE_TEST_SUITE_P( Containers, LargeFile, testing::ValuesIn( Cases ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_Row.m_pName ) + "_" + std::to_string( i_rInfo.param.m_Frames / 8 ) + "GiB"; } );
+
+class LargeTvid : public LargeFile
+{
+};
+
+// Which FFmpeg does not know.
+TEST_P( LargeTvid, IsIndexedToItsLastFrame )
+{
+  Write();
+  VTvidParser File( m_Path );
+  ASSERT_EQ( File.Frames().size(), OfTvid.m_Frames );
+  for( uint32_t Frame = 0; Frame < OfTvid.m_Frames; ++Frame )
+  {
+    VTvidParser::VFrame Beginning = File.Frames()[Frame];
+    EXPECT_EQ( Beginning.m_VideoSize, ImageBytes );
+    Beginning.m_VideoSize = HeadBytes;
+    EXPECT_EQ( File.Video( Beginning ), Head( Frame ) );
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P( Containers, LargeTvid, testing::Values( OfTvid ) );
+
+// Its bytes are in the file by then, and the frames behind it are found all the same.
+TEST( LargeMovie, AFrameOf4GiBIsRefused )
+{
+  const VLogCapture Log( "MovIO" );
+  const VTemporaryFolder Folder;
+  VHeader Settings = MovieHeader( 65535, 65535 );
+  Settings.m_Video.m_PixelFormat = KVZ::IPixelFormat::EB8G8R8u8;
+  const auto pZeros = std::make_shared<VZeros>( ImageBytes );
+  const auto pWriter = MakeWriter( Mov.m_Container, { MakeHoleFile } );
+  ASSERT_TRUE( pWriter->Open( Folder.File( "large.mov" ) ) && Settings.WriteTo( *pWriter ) );
+  const auto Write = [&]( size_t i_Buffers )
+  {
+    KVZ::VBufferList Video( i_Buffers, pZeros );
+    KVZ::VBufferList Audio = { Buffer( { 7, 8 } ) };
+    return pWriter->WriteFrame( Video, Settings.m_Video, Audio, Settings.m_Audio, 0 );
+  };
+  EXPECT_FALSE( Write( 32 ) );
+  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "Video frames of more than 2^32 bytes are not permitted." } );
+  EXPECT_TRUE( Write( 31 ) );
+  EXPECT_TRUE( pWriter->Close() );
+  const auto File = VMovParser::OfFile( Folder.File( "large.mov" ) );
+  EXPECT_EQ( File.Track( "vide" ).m_Samples.at( 0 ).m_Position, 52 + 32 * ImageBytes );
+  EXPECT_EQ( File.Bytes( File.Track( "soun" ).m_Samples.at( 0 ) ), ( VBytes{ 7, 8 } ) );
+}

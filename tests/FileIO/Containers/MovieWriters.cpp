@@ -1,5 +1,6 @@
 #include "tests/FileIO/Containers/MovieWriters.h"
 
+#include "FileIO/ImageSequenceIO/ImageSequenceWriter.h"
 #include "FileIO/MkvIO/MkvWriter.h"
 #include "FileIO/MovIO/MovWriter.h"
 #include "FileIO/RapidAVI/Writer.h"
@@ -23,6 +24,8 @@ std::shared_ptr<KVZ::IVideoWriter> MakeWriter( KVZ::IVideoContainer::Enum i_Cont
     case KVZ::IVideoContainer::EMP4: return std::make_shared<MovIO::VMovWriter>( i_Container, pEncoder, std::move( i_Parts.m_StreamMaker ) );
     case KVZ::IVideoContainer::EAVI: return std::make_shared<RapidAVI::VRapidAVIWriter>( pEncoder, std::move( i_Parts.m_StreamMaker ), Limits );
     case KVZ::IVideoContainer::EMKV: return std::make_shared<MkvIO::VMkvWriter>( pEncoder, std::move( i_Parts.m_StreamMaker ) );
+    case KVZ::IVideoContainer::EIMAGES:
+      return std::make_shared<ImageSequenceIO::VImageSequenceWriter>( pEncoder, std::move( i_Parts.m_StreamMaker ) );
     default: return std::make_shared<TarvoVideo::VWriter>( pEncoder, std::move( i_Parts.m_StreamMaker ) );
   }
 }

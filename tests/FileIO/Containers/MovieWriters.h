@@ -1,4 +1,4 @@
-// The movie containers beside the system's own, one row each, and the recordings that their common tests write.
+// The containers, one row each, and the recordings that their common tests write.
 #pragma once
 
 #include "tests/support/SmallRecording.h"
@@ -16,6 +16,11 @@ constexpr VContainerRow Mov = { "mov", KVZ::IVideoContainer::EMOV };
 constexpr VContainerRow MP4 = { "mp4", KVZ::IVideoContainer::EMP4 };
 constexpr VContainerRow Avi = { "avi", KVZ::IVideoContainer::EAVI };
 constexpr VContainerRow Mkv = { "mkv", KVZ::IVideoContainer::EMKV };
+constexpr VContainerRow Tvid = { "tvid", KVZ::IVideoContainer::ETVID };
+constexpr VContainerRow Images = { "images", KVZ::IVideoContainer::EIMAGES };
+
+// Parameters of tests are named by their containers.
+inline void PrintTo( const VContainerRow& i_rRow, std::ostream* o_pText ) { *o_pText << i_rRow.m_pName; }
 
 struct VWriterParts
 {

@@ -1,7 +1,11 @@
+#include "FileIO/MkvIO/ElementSetting.h"
+#include "FileIO/MkvIO/Tracks.h"
 #include "tests/FileIO/MkvIO/SmallMovie.h"
+#include "tests/support/ByteBuilder.h"
 #include "tests/support/EbmlParser.h"
 #include "tests/support/LogCapture.h"
 
+#include <ebml/MemIOCallback.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -91,18 +95,19 @@ TEST_F( MkvWriter, ASmallFileHoldsTheseElements )
 
 TEST_F( MkvWriter, InfoTellsScaleDurationAndMakers )
 {
+  const auto In = []( uint32_t i_Id ) { return VEbmlParser::VPath{ Ebml::Segment, Ebml::Info, i_Id }; };
   ASSERT_TRUE( m_Movie.Begin() );
-  EXPECT_EQ( Parse().Real( { Ebml::Segment, Ebml::Info, Ebml::Duration } ), 0.0 );
+  EXPECT_EQ( Parse().Real( In( Ebml::Duration ) ), 0.0 );
   WriteFrames( 7 );
   ASSERT_TRUE( m_Movie.m_Writer.Close() );
   const VEbmlParser File = Parse();
-  EXPECT_EQ( File.Number( { Ebml::Segment, Ebml::Info, Ebml::TimestampScale } ), 1000u );
-  EXPECT_EQ( File.Real( { Ebml::Segment, Ebml::Info, Ebml::Duration } ), 7.0 * Period );
-  EXPECT_EQ( File.Text( { Ebml::Segment, Ebml::Info, Ebml::WritingApp } ), "Tarvo MkvWriter" );
-  EXPECT_EQ( File.Text( { Ebml::Segment, Ebml::Info, Ebml::MuxingApp } ).find( "libebml v" ), 0u );
-  EXPECT_NE( File.Text( { Ebml::Segment, Ebml::Info, Ebml::MuxingApp } ).find( " + zzlibmatroska v" ), std::string::npos );
-  EXPECT_EQ( File.Find( { Ebml::Segment, Ebml::Info, Ebml::SegmentUID } ).m_Size, 16u );
-  EXPECT_EQ( File.Find( { Ebml::Segment, Ebml::Info, Ebml::DateUTC } ).m_Size, 8u );
+  EXPECT_EQ( File.Number( In( Ebml::TimestampScale ) ), 1000u );
+  EXPECT_EQ( File.Real( In( Ebml::Duration ) ), 7.0 * Period );
+  EXPECT_EQ( File.Text( In( Ebml::WritingApp ) ), "Tarvo MkvWriter" );
+  EXPECT_EQ( File.Text( In( Ebml::MuxingApp ) ).find( "libebml v" ), 0u );
+  EXPECT_NE( File.Text( In( Ebml::MuxingApp ) ).find( " + zzlibmatroska v" ), std::string::npos );
+  EXPECT_EQ( File.Find( In( Ebml::SegmentUID ) ).m_Size, 16u );
+  EXPECT_EQ( File.Find( In( Ebml::DateUTC ) ).m_Size, 8u );
 }
 
 TEST_F( MkvWriter, EveryClusterIsInOneSeekHeadAndEveryBlockInTheCues )
@@ -145,43 +150,22 @@ TEST_F( MkvWriter, EveryClusterIsInOneSeekHeadAndEveryBlockInTheCues )
   }
 }
 
-TEST_F( MkvWriter, WithoutFramesThereIsAFileWithoutCues )
-{
-  ASSERT_TRUE( m_Movie.Begin() );
-  EXPECT_TRUE( m_Movie.m_Writer.Close() );
-  EXPECT_FALSE( m_Movie.m_Writer.Close() );
-  const VEbmlParser File = Parse();
-  EXPECT_EQ( Ids( File.Find( { Ebml::Segment } ).m_Children ),
-    ( std::vector<uint32_t>{ Ebml::SeekHead, Ebml::Void, Ebml::Info, Ebml::Tracks, Ebml::Tags } ) );
-  EXPECT_FALSE( File.Find( { Ebml::Segment } ).m_bUnknownSize );
-}
-
-TEST_F( MkvWriter, TagsAreTexts )
+TEST_F( MkvWriter, WithoutFramesThereAreTagsAndNoCues )
 {
   VHeader& rHeader = m_Movie.m_Header;
-  rHeader.m_Timecode = { ITimecodeStandard::ETimecode30Drop, 1, 2, 3, 30 };   // stored though it is none
   rHeader.m_Attributes.Set( "Text", "gr\xC3\xBC\xC3\x9F & <Gott>" );
   rHeader.m_Attributes.Set( "Saturation", "the caller's" );   // gives way
   ASSERT_TRUE( m_Movie.Begin() && m_Movie.m_Writer.Close() );
   const VEbmlParser File = Parse();
+  const VEbmlElement& rSegment = File.Find( { Ebml::Segment } );
+  EXPECT_EQ( Ids( rSegment.m_Children ), ( std::vector<uint32_t>{ Ebml::SeekHead, Ebml::Void, Ebml::Info, Ebml::Tracks, Ebml::Tags } ) );
+  EXPECT_FALSE( rSegment.m_bUnknownSize );
   auto Tags = ReadTags( File );
   EXPECT_EQ( Tags["Tarvo.External.Text"], "gr\xC3\xBC\xC3\x9F & <Gott>" );
   EXPECT_EQ( Tags["Tarvo.External.Saturation"], "1" );
-  EXPECT_EQ( Tags["Tarvo.External.Timecode.Frames"], "30" );
   const auto Targets = File.FindAll( { Ebml::Segment, Ebml::Tags, Ebml::Tag, Ebml::Targets } );
   ASSERT_EQ( Targets.size(), 1u );
   EXPECT_EQ( Ids( Targets[0]->m_Children ), std::vector<uint32_t>{ Ebml::TagAttachmentUID } );
-}
-
-TEST_F( MkvWriter, RefusalsSayWhy )
-{
-  ASSERT_TRUE( m_Movie.Begin() );
-  EXPECT_FALSE( m_Movie.WriteFrame( "ABCDE", "" ) );
-  VDescription Turned;
-  Turned.m_Video = VideoInfo( IPixelFormat::ELuminance8, 2, 2 );
-  EXPECT_FALSE( Turned.WriteFrame( m_Movie.m_Writer, VBytes( 4 ) ) );
-  EXPECT_EQ( m_Log.Texts(),
-    ( std::vector<std::string>{ "Unexpected total size of buffers provided.", "A frame of 2 x 2 pixels does not fit the file's 4 x 1." } ) );
 }
 
 TEST_F( MkvWriter, WithoutSoundThereIsOneTrack )
@@ -197,19 +181,59 @@ TEST_F( MkvWriter, WithoutSoundThereIsOneTrack )
   EXPECT_EQ( ReadTags( File ).at( "Tarvo.Internal.AudioFrameInfo.Present" ), "false" );
 }
 
-TEST_F( MkvWriter, PeriodsThatCannotBeStoredAreRefused )
+TEST_F( MkvWriter, TheCodecIsTold )
 {
-  const auto Begin = [&]( const VTimingRecord& i_rTiming )
+  const auto InTrack = []( uint32_t i_Id ) { return VEbmlParser::VPath{ Ebml::Segment, Ebml::Tracks, Ebml::TrackEntry, i_Id }; };
+  m_Movie.m_Header.m_Video = VideoInfo( IPixelFormat::EU8Y8V8Y8, 0x0102, 0x0304 );
+  ASSERT_TRUE( m_Movie.Begin() );
+  const VEbmlParser File = Parse();
+  EXPECT_EQ( File.Text( InTrack( Ebml::CodecID ) ), "V_MS/VFW/FOURCC" );
+  VLittleEndian BitmapHeader;
+  BitmapHeader.U32( 40 ).U32( 0x0102 ).U32( 0x0304 ).U16( 1 ).U16( 0 ).Raw( "UYVY" ).U32( 0 ).Zeros( 16 );   // planes, bits, FourCC, image size
+  EXPECT_EQ( File.BytesOf( File.Find( InTrack( Ebml::CodecPrivate ) ) ), BitmapHeader.m_Bytes );
+
+  VSmallMovie Compressed;
+  Compressed.m_Header.m_Payload = IVideoPayload::EImageJPEG;
+  Compressed.m_Header.m_Video = VideoInfo( IPixelFormat::EU10Y10V10Y10, 48, 2 );
+  ASSERT_TRUE( Compressed.Begin() );
+  const VEbmlParser JPEGFile( *Compressed.m_pBytes );
+  EXPECT_EQ( JPEGFile.Text( InTrack( Ebml::CodecID ) ), "V_MJPEG" );
+  EXPECT_TRUE( JPEGFile.FindAll( InTrack( Ebml::CodecPrivate ) ).empty() );
+  EXPECT_EQ( ReadTags( JPEGFile ).at( "Tarvo.Internal.VideoFrameInfo.PixelFormat" ), "R8G8B8" ) << "the format that is compressed";
+}
+
+// A codec that no payload of ours selects so far.
+TEST_F( MkvWriter, AColourSpaceStandsAmongThePicturesFields )
+{
+  libmatroska::KaxTracks Tracks;
+  FillVideoTrack( Tracks, VideoInfo(), { "V_UNCOMPRESSED", EFourCCPlace::ColourSpace, "UYVY" }, 1 );
+  libebml::MemIOCallback Memory;
+  Tracks.Render( Memory );
+  const VEbmlParser File( { Memory.GetDataBuffer(), Memory.GetDataBuffer() + Memory.GetDataBufferSize() } );
+  EXPECT_EQ( File.Text( { Ebml::Tracks, Ebml::TrackEntry, Ebml::CodecID } ), "V_UNCOMPRESSED" );
+  EXPECT_EQ( File.Text( { Ebml::Tracks, Ebml::TrackEntry, Ebml::Video, Ebml::UncompressedFourCC } ), "UYVY" );
+  EXPECT_TRUE( File.FindAll( { Ebml::Tracks, Ebml::TrackEntry, Ebml::CodecPrivate } ).empty() );
+}
+
+TEST_F( MkvWriter, RefusalsSayWhy )
+{
+  ASSERT_TRUE( m_Movie.Begin() );
+  EXPECT_FALSE( m_Movie.WriteFrame( "ABCDE", "" ) );
+  VDescription Turned;
+  Turned.m_Video = VideoInfo( IPixelFormat::ELuminance8, 2, 2 );
+  EXPECT_FALSE( Turned.WriteFrame( m_Movie.m_Writer, VBytes( 4 ) ) );
+  const auto TakesRate = []( const VTimingRecord& i_rTiming )
   {
     VSmallMovie Movie;
     Movie.m_Header.m_Timing = i_rTiming;
     return Movie.Begin() && Movie.WriteFrame( "ABCD", "" ) && Movie.WriteFrame( "ABCD", "" ) && Movie.m_Writer.Close();
   };
-  EXPECT_FALSE( Begin( { 0, 1, 0 } ) );
-  EXPECT_FALSE( Begin( { 1, 5, 0 } ) );
-  EXPECT_TRUE( m_Log.Has( "A frame period of 5000000000 ns is longer than the 4294967295 ns that can be stored." ) );
-  EXPECT_TRUE( Begin( { 1, 4, 0 } ) );
-  const VLogCapture Log( "MkvIO" );
-  EXPECT_TRUE( Begin( {} ) );
-  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "The frame rate is not known: all frames are stored at the same time." } );
+  EXPECT_TRUE( TakesRate( { 1, 4, 0 } ) );
+  EXPECT_FALSE( TakesRate( { 1, 5, 0 } ) );
+  EXPECT_FALSE( TakesRate( { 0, 1, 0 } ) );
+  EXPECT_TRUE( TakesRate( {} ) );
+  EXPECT_EQ( m_Log.Texts(),
+    ( std::vector<std::string>{ "Unexpected total size of buffers provided.", "A frame of 2 x 2 pixels does not fit the file's 4 x 1.",
+      "A frame period of 5000000000 ns is longer than the 4294967295 ns that can be stored.", "A rate of 0 ticks a second gives no frame period.",
+      "The frame rate is not known: all frames are stored at the same time." } ) );
 }

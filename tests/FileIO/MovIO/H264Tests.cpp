@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <fstream>
 #include <iterator>
 
@@ -27,74 +28,39 @@ VMovieSettings H264Settings()
 
 VMovWriter::VSpans Spans( const VBytes& i_rBytes ) { return { { i_rBytes.data(), i_rBytes.size() } }; }
 
-// Writes frames of one byte each, of these types in decoding order.
-void WriteTypes( VSmallMovie& io_rMovie, const std::string& i_rTypes )
+// The NAL units of a byte stream (ITU-T H.264, Annex B), without their start codes.
+std::vector<VBytes> SplitUnits( const std::string& i_rStream )
 {
-  ASSERT_TRUE( io_rMovie.Begin() && io_rMovie.m_Writer.SetSPS( Bytes( "sps" ) ) && io_rMovie.m_Writer.SetPPS( Bytes( "pp" ) ) );
-  for( const char Type : i_rTypes )
+  const std::string StartCode( "\0\0\1", 3 );
+  std::vector<VBytes> Units;
+  for( size_t Code = i_rStream.find( StartCode ); Code != std::string::npos; )
   {
-    ASSERT_TRUE( io_rMovie.m_Writer.WriteStoredFrame( Spans( Bytes( std::string( 1, Type ) ) ), Spans( Bytes( "aabb" ) ), Type ) );
-  }
-  ASSERT_TRUE( io_rMovie.m_Writer.Close() );
-}
-
-// One NAL unit of a byte stream (ITU-T H.264, Annex B), without its start code.
-struct VUnit
-{
-  int Type() const { return m_Bytes.at( 0 ) & 0x1F; }
-
-  VBytes m_Bytes;
-};
-
-std::vector<VUnit> SplitUnits( const VBytes& i_rStream )
-{
-  std::vector<VUnit> Units;
-  size_t Zeros = 0;
-  for( const uint8_t Byte : i_rStream )
-  {
-    if( Byte == 1 && Zeros >= 2 )
-    {
-      if( !Units.empty() )
-      {
-        Units.back().m_Bytes.resize( Units.back().m_Bytes.size() - Zeros );
-      }
-      Units.emplace_back();
-    }
-    else if( !Units.empty() )
-    {
-      Units.back().m_Bytes.push_back( Byte );
-    }
-    Zeros = Byte == 0 ? Zeros + 1 : 0;
+    const size_t Begin = Code + StartCode.size();
+    Code = i_rStream.find( StartCode, Begin );
+    VBytes Unit = Bytes( i_rStream.substr( Begin, Code - Begin ) );
+    Unit.erase( std::find_if( Unit.rbegin(), Unit.rend(), []( uint8_t i_Byte ) { return i_Byte != 0; } ).base(), Unit.end() );
+    Units.push_back( Unit );
   }
   return Units;
 }
 
-// Of a slice: the second of the numbers at its start (Exp-Golomb).
-char FrameType( const VUnit& i_rUnit )
+// In streams of x264 every I frame is a key frame and no other frame refers to a B frame.
+char FrameType( const VBytes& i_rSlice )
 {
-  size_t Bit = 8;
-  const auto NextBit = [&]
+  constexpr int KeySlice = 5;
+  const bool bReferredTo = i_rSlice.at( 0 ) >> 5 != 0;
+  return ( i_rSlice.at( 0 ) & 0x1F ) == KeySlice ? 'I' : bReferredTo ? 'P' : 'B';
+}
+
+// 'K' for each of them.
+std::string KeyFrames( const VMovParser& i_rParser )
+{
+  std::string Text;
+  for( const auto& rSample : i_rParser.Track( "vide" ).m_Samples )
   {
-    const int Value = i_rUnit.m_Bytes.at( Bit / 8 ) >> ( 7 - Bit % 8 ) & 1;
-    ++Bit;
-    return Value;
-  };
-  uint32_t Value = 0;
-  for( int Number = 0; Number < 2; ++Number )
-  {
-    int Zeros = 0;
-    while( NextBit() == 0 )
-    {
-      ++Zeros;
-    }
-    Value = 1;
-    for( int Digit = 0; Digit < Zeros; ++Digit )
-    {
-      Value = Value << 1 | static_cast<uint32_t>( NextBit() );
-    }
-    --Value;
+    Text += rSample.m_bKeyFrame ? 'K' : '-';
   }
-  return "PBI"[Value % 5];
+  return Text;
 }
 
 class MovOfH264 : public testing::Test
@@ -107,31 +73,29 @@ protected:
       "-pix_fmt", "yuv420p", "-c:v", "libx264", "-threads", "1", "-x264-params", "slices=1:" + i_rOptions, m_StreamPath } );
     ASSERT_EQ( Run.m_ExitCode, 0 ) << Run.m_Error;
     std::ifstream File( m_StreamPath, std::ios::binary );
-    m_Units = SplitUnits( VBytes( std::istreambuf_iterator<char>( File ), {} ) );
+    m_Units = SplitUnits( std::string( std::istreambuf_iterator<char>( File ), {} ) );
   }
 
   // Gives the types of the frames.
   std::string WriteStream()
   {
-    constexpr int Slice = 1;
-    constexpr int KeySlice = 5;
+    constexpr int LastSlice = 5;
     constexpr int SPS = 7;
     constexpr int PPS = 8;
     VMovWriter Writer( IVideoContainer::EMOV );
     EXPECT_TRUE( Writer.Open( m_Path ) && H264Settings().WriteTo( Writer ) );
     std::string Types;
-    for( const VUnit& rUnit : m_Units )
+    for( const VBytes& rUnit : m_Units )
     {
-      switch( rUnit.Type() )
+      const int Type = rUnit.at( 0 ) & 0x1F;
+      if( Type == SPS || Type == PPS )
       {
-        case SPS: EXPECT_TRUE( Writer.SetSPS( rUnit.m_Bytes ) ); break;
-        case PPS: EXPECT_TRUE( Writer.SetPPS( rUnit.m_Bytes ) ); break;
-        case Slice:
-        case KeySlice:
-          Types += FrameType( rUnit );
-          EXPECT_TRUE( Writer.WriteStoredFrame( Spans( rUnit.m_Bytes ), {}, Types.back() ) );
-          break;
-        default: break;
+        EXPECT_TRUE( Type == SPS ? Writer.SetSPS( rUnit ) : Writer.SetPPS( rUnit ) );
+      }
+      else if( Type <= LastSlice )
+      {
+        Types += FrameType( rUnit );
+        EXPECT_TRUE( Writer.WriteStoredFrame( Spans( rUnit ), {}, Types.back() ) );
       }
     }
     EXPECT_TRUE( Writer.Close() );
@@ -141,7 +105,7 @@ protected:
   const VTemporaryFolder m_Folder;
   const std::string m_StreamPath = m_Folder.File( "stream.h264" );
   const std::string m_Path = m_Folder.File( "movie.mov" );
-  std::vector<VUnit> m_Units;
+  std::vector<VBytes> m_Units;
 };
 
 }
@@ -159,17 +123,7 @@ TEST_F( MovOfH264, PlaysAsTheStreamDoes )
   const VBytes Pictures = DecodeVideo( m_Path, "yuv420p" );
   EXPECT_EQ( Pictures.size(), 12u * 64 * 48 * 3 / 2 );
   EXPECT_EQ( Pictures, DecodeVideo( m_StreamPath, "yuv420p" ) );
-
-  const auto Parser = VMovParser::OfFile( m_Path );
-  std::vector<size_t> KeyFrames;
-  for( const auto& rSample : Parser.Track( "vide" ).m_Samples )
-  {
-    if( rSample.m_bKeyFrame )
-    {
-      KeyFrames.push_back( static_cast<size_t>( &rSample - Parser.Track( "vide" ).m_Samples.data() ) );
-    }
-  }
-  EXPECT_EQ( KeyFrames, ( std::vector<size_t>{ 0, 5, 10 } ) );
+  EXPECT_EQ( KeyFrames( VMovParser::OfFile( m_Path ) ), "K----K----K-" );
 }
 
 // The decoder puts pictures in order by what the stream says; the times in the file are those of streams in which two B frames come behind
@@ -183,36 +137,31 @@ TEST_F( MovOfH264, FramesOfTypeBAreDecodedToo )
   EXPECT_EQ( Bytes( Run.m_Output ), DecodeVideo( m_StreamPath, "yuv420p" ) );
 }
 
-TEST_F( MovOfH264, EachFrameIsShownAtATimeOfItsOwn )
+TEST( MovOfStoredFrames, EachIsShownAtATimeOfItsOwnAndLiesBehindItsParameterSet )
 {
   VSmallMovie Movie( H264Settings() );
-  WriteTypes( Movie, "IBBPBBPBB" );
+  ASSERT_TRUE( Movie.Begin() && Movie.m_Writer.SetSPS( Bytes( "sps" ) ) && Movie.m_Writer.SetPPS( Bytes( "pp" ) ) );
+  for( const char Type : std::string( "IBBPBBPBB" ) )
+  {
+    ASSERT_TRUE( Movie.m_Writer.WriteStoredFrame( Spans( Bytes( std::string( 1, Type ) ) ), Spans( Bytes( "aabb" ) ), Type ) );
+  }
+  ASSERT_TRUE( Movie.m_Writer.Close() );
   const auto Parser = Movie.Parse();
   const auto& rTrack = Parser.Track( "vide" );
   std::vector<uint64_t> Times;
-  std::string KeyFrames;
   for( const auto& rSample : rTrack.m_Samples )
   {
     Times.push_back( rSample.m_ShownTime / 1920 );
-    KeyFrames += rSample.m_bKeyFrame ? 'K' : '-';
   }
   EXPECT_EQ( Times, ( std::vector<uint64_t>{ 3, 1, 2, 6, 4, 5, 9, 7, 8 } ) );
-  EXPECT_EQ( KeyFrames, "K--------" );
+  EXPECT_EQ( KeyFrames( Parser ), "K--------" );
   EXPECT_EQ( rTrack.m_EditStart, 3 * 1920u );
   EXPECT_EQ( rTrack.m_EditDuration, 9 * 1920u );
-  EXPECT_EQ( Parser.Root().Child( "moov" ).Child( "trak" ).Child( "mdia" ).Child( "minf" ).Child( "stbl" ).Tree(),
-    "stsd stts stss ctts stsc stsz co64" );
-}
+  EXPECT_EQ( Parser.Bytes( rTrack.m_Samples.at( 3 ) ), ( VBytes{ 0, 0, 0, 2, 'p', 'p', 0, 0, 0, 1, 'P' } ) );
+  EXPECT_EQ( Parser.Bytes( Parser.Track( "soun" ).m_Samples.at( 3 ) ), Bytes( "aabb" ) );
 
-TEST_F( MovOfH264, AFrameIsStoredBehindItsParameterSet )
-{
-  VSmallMovie Movie( H264Settings() );
-  WriteTypes( Movie, "IP" );
-  const auto Parser = Movie.Parse();
-  const auto& rSamples = Parser.Track( "vide" ).m_Samples;
-  EXPECT_EQ( Parser.Bytes( rSamples.at( 1 ) ), ( VBytes{ 0, 0, 0, 2, 'p', 'p', 0, 0, 0, 1, 'P' } ) );
-  EXPECT_EQ( Parser.Bytes( Parser.Track( "soun" ).m_Samples.at( 1 ) ), Bytes( "aabb" ) );
-  const auto& rStsd = Parser.Root().Child( "moov" ).Child( "trak" ).Child( "mdia" ).Child( "minf" ).Child( "stbl" ).Child( "stsd" );
+  EXPECT_EQ( SampleTable( Parser, 0 ).Tree(), "stsd stts stss ctts stsc stsz co64" );
+  const auto& rStsd = SampleTable( Parser, 0 ).Child( "stsd" );
   const VBytes Description = Parser.Body( rStsd );
   const VBytes Configuration = { 0, 0, 0, 24, 'a', 'v', 'c', 'C',   // size, type
     1, 100, 0, 40, 0xFF,                                            // version, profile, compatibility, level, length of lengths
@@ -221,38 +170,30 @@ TEST_F( MovOfH264, AFrameIsStoredBehindItsParameterSet )
   EXPECT_EQ( Parser.Number( rStsd, 8 ), 86u + 24 );
 }
 
-TEST_F( MovOfH264, ParameterSetsAreTakenWhereTheyBelong )
+TEST( MovOfStoredFrames, WhatDoesNotBelongThereIsRefused )
 {
-  const VLogCapture Log( "MovIO" );
+  const VLogCapture Log;
   VSmallMovie Movie( H264Settings() );
-  EXPECT_TRUE( Movie.m_Writer.SetSPS( Bytes( "first" ) ) );
-  EXPECT_FALSE( Movie.m_Writer.SetPPS( Bytes( "too early" ) ) );
+  VMovWriter& rWriter = Movie.m_Writer;
+  EXPECT_FALSE( rWriter.WriteStoredFrame( {}, {}, 'I' ) );
+  EXPECT_TRUE( rWriter.SetSPS( Bytes( "first" ) ) );
+  EXPECT_FALSE( rWriter.SetPPS( Bytes( "too early" ) ) );
   ASSERT_TRUE( Movie.Begin() );
-  EXPECT_TRUE( Movie.m_Writer.SetSPS( Bytes( "first" ) ) );
-  EXPECT_FALSE( Movie.m_Writer.SetSPS( Bytes( "other" ) ) );
-  EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "SPS has changed mid-way through movie." } );
-  EXPECT_TRUE( Movie.m_Writer.SetPPS( Bytes( "one" ) ) );
-  EXPECT_TRUE( Movie.m_Writer.SetPPS( Bytes( "two" ) ) );
-  EXPECT_FALSE( Movie.m_Writer.SetPPS( VBytes( 65536 ) ) );
-  EXPECT_FALSE( Movie.m_Writer.WriteStoredFrame( Spans( Bytes( "x" ) ), {}, 'A' ) );
-  EXPECT_TRUE( Movie.m_Writer.WriteStoredFrame( Spans( Bytes( "x" ) ), {}, 'I' ) );
-  ASSERT_TRUE( Movie.m_Writer.Close() );
+  EXPECT_TRUE( rWriter.SetSPS( Bytes( "first" ) ) );
+  EXPECT_FALSE( rWriter.SetSPS( Bytes( "other" ) ) );
+  EXPECT_EQ( Log.Texts().back(), "SPS has changed mid-way through movie." );
+  EXPECT_TRUE( rWriter.SetPPS( Bytes( "one" ) ) );
+  EXPECT_TRUE( rWriter.SetPPS( Bytes( "two" ) ) );
+  EXPECT_FALSE( rWriter.SetPPS( VBytes( 65536 ) ) );
+  EXPECT_FALSE( rWriter.WriteStoredFrame( Spans( Bytes( "x" ) ), {}, 'A' ) );
+  EXPECT_TRUE( rWriter.WriteStoredFrame( Spans( Bytes( "x" ) ), {}, 'I' ) );
+  EXPECT_FALSE( Movie.Frame( VBytes( 64 * 48 * 2 ) ) ) << "nothing here makes H.264 of pictures";
+  EXPECT_TRUE( Log.Has( "Unsupported video payload format 'VideoH264'." ) );
+  ASSERT_TRUE( rWriter.Close() );
   const auto Parser = Movie.Parse();
   EXPECT_EQ( Parser.Bytes( Parser.Track( "vide" ).m_Samples.at( 0 ) ), ( VBytes{ 0, 0, 0, 3, 't', 'w', 'o', 0, 0, 0, 1, 'x' } ) );
 
   VSmallMovie Uncompressed;
   ASSERT_TRUE( Uncompressed.Begin() );
   EXPECT_FALSE( Uncompressed.m_Writer.SetPPS( Bytes( "pps" ) ) );
-}
-
-// Nothing here makes H.264 of pictures.
-TEST_F( MovOfH264, PicturesAreRefusedAtTheFirstFrame )
-{
-  const VLogCapture Log;
-  VSmallMovie Movie( H264Settings() );
-  ASSERT_TRUE( Movie.Begin() );
-  EXPECT_TRUE( Log.Texts().empty() );
-  EXPECT_FALSE( Movie.Frame( VBytes( 64 * 48 * 2 ) ) );
-  EXPECT_TRUE( Log.Has( "Unsupported video payload format 'VideoH264'." ) );
-  EXPECT_TRUE( Movie.m_Writer.Close() );
 }

@@ -1,6 +1,7 @@
 #include "FileIO/MovIO/AtomScope.h"
 #include "tests/FileIO/MovIO/SmallMovie.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SparseFile.h"
 
 #include <gtest/gtest.h>
 
@@ -106,19 +107,6 @@ TEST( MovPrimitiveWriter, SmallWritesAreCollectedAndSpansAreNot )
   EXPECT_EQ( Output.m_pBytes->back(), 'a' );
 }
 
-TEST( MovPrimitiveWriter, AFailureIsKept )
-{
-  VOutput Output( { .m_Operation = 0 } );
-  EXPECT_TRUE( Output.m_Out.U32( 1 ).IsOk() );   // collected
-  EXPECT_FALSE( Output.m_Out.Flush() );
-  EXPECT_FALSE( Output.m_Out.Seek( 0 ) );
-  EXPECT_FALSE( Output.m_Out.U32( 2 ).IsOk() );
-  EXPECT_FALSE( Output.m_Out.Write( { { "a", 1 } } ) );
-  EXPECT_FALSE( Output.m_Out.Close() );
-  EXPECT_FALSE( VMovPrimitiveWriter( nullptr ).IsOk() );
-  EXPECT_FALSE( VMovPrimitiveWriter( nullptr ).U32( 1 ).Close() );
-}
-
 TEST( MovAtomScope, AnotherSizeThanTheOneLaidDownIsReportedAndCarriedOn )
 {
   const VLogCapture Log( "MovIO" );
@@ -131,4 +119,39 @@ TEST( MovAtomScope, AnotherSizeThanTheOneLaidDownIsReportedAndCarriedOn )
   ASSERT_TRUE( Output.m_Out.Close() );
   EXPECT_EQ( *Output.m_pBytes, ( VBytes{ 0, 0, 0, 20, 't', 'r', 'a', 'k', 0, 0, 0, 12, 't', 'k', 'h', 'd', 0, 0, 0, 7 } ) );
   EXPECT_EQ( Log.Texts(), std::vector<std::string>{ "The 'tkhd' atom was written but the size was 12, not 92 as expected." } );
+}
+
+TEST( MovAtomScope, AnAtomOf4GiBNamesTheLimit )
+{
+  const VLogCapture Log( "MovIO" );
+  VSparseFile::VPieces Pieces;
+  VMovPrimitiveWriter Out( std::make_shared<WriterSupport::VWatchedStream>( std::make_unique<VSparseFile>( Pieces ) ) );
+  VAtomScope Atom( Out, "co64" );
+  const VBytes MiB( 1024 * 1024 );
+  EXPECT_TRUE( Out.Write( std::vector<KVZ::IOutputStream::VSpan>( 4096, { MiB.data(), MiB.size() } ) ) );
+  EXPECT_FALSE( Atom.Close() );
+  EXPECT_EQ( Log.Texts(),
+    ( std::vector<std::string>{ "The 'co64' atom has 4294967304 bytes, more than the 4294967295 that its size can say.",
+      "Could not write the 'co64' atom." } ) );
+  EXPECT_TRUE( Out.IsOk() );
+}
+
+// Tables that are larger than what is collected: the disk is full in the middle of one.
+TEST( MovAtomScope, OneBadWriteIsTracedThroughTheAtomsAroundIt )
+{
+  constexpr size_t Many = 20000;
+  const VLogCapture Log( "MovIO" );
+  VSmallMovie Movie( VMovieSettings::Silent(), { .m_Offset = 52 + 16 * Many + 100000 } );
+  ASSERT_TRUE( Movie.Begin() );
+  for( size_t Frame = 0; Frame < Many; ++Frame )
+  {
+    ASSERT_TRUE( Movie.Frame( VBytes( 16 ) ) );
+  }
+  EXPECT_FALSE( Movie.m_Writer.Close() );
+  std::vector<std::string> Expected;
+  for( const char* pAtom : { "co64", "stbl", "minf", "mdia", "trak", "moov", "TMSL" } )
+  {
+    Expected.push_back( "Could not write the '" + std::string( pAtom ) + "' atom." );
+  }
+  EXPECT_EQ( Log.Texts(), Expected );
 }

@@ -34,4 +34,9 @@ struct VSmallMovie : TestSupport::VMemoryRecording<VMovWriter>
   TestSupport::VMovParser Parse() const { return TestSupport::VMovParser::OfBytes( *m_pBytes ); }
 };
 
+inline const TestSupport::VMovAtom& SampleTable( const TestSupport::VMovParser& i_rParser, size_t i_Track )
+{
+  return i_rParser.Root().Child( "moov" ).Child( "trak", i_Track ).Child( "mdia" ).Child( "minf" ).Child( "stbl" );
+}
+
 }

@@ -16,8 +16,8 @@ struct VSettings : TestSupport::VHeader
 struct VAviFile : TestSupport::VMemoryRecording<VRapidAVIWriter>
 {
   explicit VAviFile( const TestSupport::VHeader& i_rSettings = VSettings(), const VSegmentLimits& i_rLimits = {},
-    const TestSupport::VFault& i_rFault = {}, std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder = {} )
-    : VMemoryRecording( i_rSettings, i_rFault,
+    std::shared_ptr<VideoEncoding::VVideoFrameEncoder> i_pEncoder = {} )
+    : VMemoryRecording( i_rSettings, {},
         [&]( WriterSupport::VStreamMaker i_Maker ) { return VRapidAVIWriter( std::move( i_pEncoder ), std::move( i_Maker ), i_rLimits ); } )
   {
   }

@@ -26,18 +26,15 @@ protected:
 
 TEST_F( LargeAvi, NumbersThatAFieldCannotHoldAreRefused )
 {
-  const auto WritesHeader = []( const VHeader& i_rSettings ) { return VAviFile( i_rSettings ).Begin(); };
-  VSettings Settings;
-  Settings.m_Video = VideoInfo( IPixelFormat::EB8G8R8u8, 65536, 1 );
-  EXPECT_FALSE( WritesHeader( Settings ) );
-  Settings.m_Video = VideoInfo( IPixelFormat::EB8G8R8u8, 32768, 32768 );
-  EXPECT_FALSE( WritesHeader( Settings ) );
-  Settings.m_Video = VideoInfo( IPixelFormat::EB8G8R8u8, 7680, 4320 );
-  EXPECT_TRUE( WritesHeader( Settings ) );
+  const auto WritesHeader = []( uint32_t i_Width, uint32_t i_Height )
+  { return VAviFile( VSettings( VideoInfo( IPixelFormat::EB8G8R8u8, i_Width, i_Height ) ) ).Begin(); };
+  EXPECT_FALSE( WritesHeader( 65536, 1 ) );
+  EXPECT_FALSE( WritesHeader( 32768, 32768 ) );
   EXPECT_EQ( m_Log.Texts(),
     ( std::vector<std::string>{ "A width in pixels of 65536 cannot be stored: 65535 is the limit.",
       "An image size in bytes of 4294967296 cannot be stored: 4294967295 is the limit." } ) );
   // The data rate is no more than a hint.
+  VSettings Settings( VideoInfo( IPixelFormat::EB8G8R8u8, 7680, 4320 ) );
   Settings.m_Timing.m_FramePeriodInTicks = 2700000;
   VAviFile File( Settings );
   ASSERT_TRUE( File.Begin() );

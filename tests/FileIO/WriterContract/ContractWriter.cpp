@@ -31,11 +31,16 @@ std::shared_ptr<KVZ::IVideoWriter> MakeMovie( VEncoder i_pEncoder, WriterSupport
   return std::make_shared<MovIO::VMovWriter>( Container, std::move( i_pEncoder ), std::move( i_StreamMaker ) );
 }
 
-// Of a width that suits every pixel format
+// With several RIFFs in a file of a few frames
+std::shared_ptr<KVZ::IVideoWriter> MakeAvi( VEncoder i_pEncoder, WriterSupport::VStreamMaker i_StreamMaker )
+{
+  return std::make_shared<RapidAVI::VRapidAVIWriter>( std::move( i_pEncoder ), std::move( i_StreamMaker ), RapidAVI::VSegmentLimits{ 900, 900 } );
+}
+
 VHeader HeaderOf( const VWriterRow& i_rRow )
 {
   VHeader Header;
-  Header.m_Video = VideoInfo( i_rRow.m_PixelFormat, 48, 4 );
+  Header.m_Video = VideoInfo( i_rRow.m_PixelFormat, Width, Height );
   Header.m_Audio = i_rRow.m_bAudio ? KVZ::AudioFrameInfo{ KVZ::IAudioSampleFormat::EInt16, 48000, 2 } : KVZ::AudioFrameInfo();
   Header.m_Timecode = { KVZ::ITimecodeStandard::ETimecode25, 1, 2, 3, 4 };
   Header.m_Payload = i_rRow.m_Payload;
@@ -51,14 +56,32 @@ VEncoder MakeEncoder()
 
 }
 
+using KVZ::IVideoContainer;
+
 const std::vector<VWriterRow> Writers = {
-  { "TVID", "TarvoVideo", Make<TarvoVideo::VWriter>, EKeys::Any },
-  { "MOV", "MovIO", MakeMovie<KVZ::IVideoContainer::EMOV>, EKeys::Counting, false },
-  { "MP4", "MovIO", MakeMovie<KVZ::IVideoContainer::EMP4>, EKeys::Counting, false },
-  { "AVI", "RapidAVI", Make<RapidAVI::VRapidAVIWriter> },
-  { "MKV", "MkvIO", Make<MkvIO::VMkvWriter> },
-  { "IMAGES", "ImageSequenceIO", Make<ImageSequenceIO::VImageSequenceWriter>, EKeys::Set, true, KVZ::IVideoPayload::EImageJPEG,
-    KVZ::IPixelFormat::ER8G8B8, false, false },
+  { .m_pName = "TVID", .m_pCategory = "TarvoVideo", .m_Make = Make<TarvoVideo::VWriter>, .m_Keys = EKeys::Any, .m_Read = ReadTvid },
+  { .m_pName = "MOV",
+    .m_pCategory = "MovIO",
+    .m_Make = MakeMovie<IVideoContainer::EMOV>,
+    .m_bTellsFailedOpen = false,
+    .m_Read = ReadMov,
+    .m_bReadableUnfinished = false },
+  { .m_pName = "MP4",
+    .m_pCategory = "MovIO",
+    .m_Make = MakeMovie<IVideoContainer::EMP4>,
+    .m_bTellsFailedOpen = false,
+    .m_Read = ReadMov,
+    .m_bReadableUnfinished = false },
+  { .m_pName = "AVI", .m_pCategory = "RapidAVI", .m_Make = MakeAvi, .m_Read = ReadAvi },
+  { .m_pName = "MKV", .m_pCategory = "MkvIO", .m_Make = Make<MkvIO::VMkvWriter>, .m_Read = ReadMkv },
+  { .m_pName = "IMAGES",
+    .m_pCategory = "ImageSequenceIO",
+    .m_Make = Make<ImageSequenceIO::VImageSequenceWriter>,
+    .m_Keys = EKeys::Set,
+    .m_Payload = KVZ::IVideoPayload::EImageJPEG,
+    .m_PixelFormat = KVZ::IPixelFormat::ER8G8B8,
+    .m_bAudio = false,
+    .m_bOneFile = false },
 };
 
 void PrintTo( const VWriterRow& i_rRow, std::ostream* o_pText ) { *o_pText << i_rRow.m_pName; }
@@ -75,24 +98,11 @@ VContractWriter::VContractWriter( const VWriterRow& i_rRow, const VFault& i_rFau
 {
 }
 
-VBytes VContractWriter::Picture( uint64_t i_Frame ) const
-{
-  VBytes Bytes( m_Header.ImageBytes() );
-  for( size_t Byte = 0; Byte < Bytes.size(); ++Byte )
-  {
-    Bytes[Byte] = static_cast<uint8_t>( Byte * ( i_Frame + 3 ) + i_Frame );
-  }
-  return Bytes;
-}
+VBytes VContractWriter::Picture( uint64_t i_Frame ) const { return Noise( m_Header.ImageBytes(), static_cast<uint32_t>( i_Frame ) ); }
 
 VBytes VContractWriter::Sound( uint64_t i_Frame ) const
 {
-  VBytes Bytes( m_Header.m_Audio.IsEmpty() ? 0 : 40 );
-  for( size_t Byte = 0; Byte < Bytes.size(); ++Byte )
-  {
-    Bytes[Byte] = static_cast<uint8_t>( 0x80 + Byte + i_Frame * 40 );
-  }
-  return Bytes;
+  return Noise( m_Header.m_Audio.IsEmpty() ? 0 : SoundBytes, static_cast<uint32_t>( 1000 + i_Frame ) );
 }
 
 bool VContractWriter::WriteFrame( uint64_t i_Frame, uint64_t i_Key )
@@ -116,5 +126,6 @@ bool VContractWriter::Holds( const VBytes& i_rBytes ) const
 }
 
 INSTANTIATE_TEST_SUITE_P( All, WriterContract, testing::ValuesIn( Writers ), testing::PrintToStringParamName() );
+INSTANTIATE_TEST_SUITE_P( All, FailingStream, testing::ValuesIn( Writers.begin(), Writers.end() - 1 ), testing::PrintToStringParamName() );
 
 }

@@ -2,9 +2,9 @@
 #pragma once
 
 #include "FileIO/VideoEncoding/VideoFrameEncoder.h"
+#include "tests/FileIO/WriterContract/FoundFrames.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/SmallRecording.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 
@@ -40,6 +40,9 @@ struct VWriterRow
   KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EU8Y8V8Y8;
   bool m_bAudio = true;
   bool m_bOneFile = true;   // otherwise a file a frame, none of which stays open
+  // Of the one file
+  std::optional<VFoundFile> ( *m_Read )( const VBytes& i_rBytes ) = nullptr;
+  bool m_bReadableUnfinished = true;
 };
 
 extern const std::vector<VWriterRow> Writers;
@@ -57,7 +60,8 @@ public:
   uint64_t Operations() const { return m_Operations; }
   const VHeader& Header() const { return m_Header; }
 
-  bool Open() { return m_pWriter->Open( m_Folder.File( m_pFileName ) ); }
+  // A path may be without a folder
+  bool Open() { return m_pWriter->Open( "movie%FRAME%" ); }
   bool Begin() { return Open() && m_Header.WriteTo( *m_pWriter ); }
 
   // Picture and sound of a frame's number, alike in every run.
@@ -70,8 +74,6 @@ public:
   bool Holds( const VBytes& i_rBytes ) const;
 
 private:
-  const char* const m_pFileName = "movie%FRAME%";
-  const VTemporaryFolder m_Folder;
   const VHeader m_Header;
   std::map<std::string, std::shared_ptr<VBytes>> m_Files;
   uint64_t m_Operations = 0;
@@ -82,6 +84,11 @@ class WriterContract : public testing::TestWithParam<VWriterRow>
 {
 protected:
   const VLogCapture m_Log{ GetParam().m_pCategory };
+};
+
+// Of the writers of one file.
+class FailingStream : public WriterContract
+{
 };
 
 }
