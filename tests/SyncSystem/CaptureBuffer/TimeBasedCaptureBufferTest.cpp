@@ -46,15 +46,15 @@ protected:
     return Record;
   }
   uint32_t BufferSession() const { return m_pBuffer->GetCurrentBufferSession().Value(); }
-  bool Logged( const std::string& i_rText )
+  // The next frame opens this sync session in this buffer session, and the log says why.
+  void ExpectOpens( uint32_t i_Session, uint32_t i_BufferSession, const std::string& i_rReason )
   {
-    const bool bFound = m_Log.Has( i_rText );
-    for( const auto& rText : m_Log.Texts() )
-    {
-      if( !bFound ) ADD_FAILURE() << rText;
-    }
     m_Log.Clear();
-    return bFound;
+    Add();
+    EXPECT_EQ( m_Id, i_Session ) << i_rReason;
+    EXPECT_EQ( BufferSession(), i_BufferSession ) << i_rReason;
+    EXPECT_EQ( m_Reading, VTick( 0 ) );
+    EXPECT_TRUE( m_Log.Has( i_rReason ) ) << testing::PrintToString( m_Log.Texts() );
   }
 
   TestSupport::VLogCapture m_Log{ "CaptureBuffer" };
@@ -76,14 +76,11 @@ TEST_F( TimeBasedCaptureBuffer, FirstFrameOpensTheFirstSessions )
 {
   EXPECT_EQ( m_pBuffer->NewestSessionId(), 0u );
   EXPECT_EQ( m_pBuffer->OldestSessionId(), 0u );
-  Add();
-  EXPECT_EQ( BufferSession(), 1u );
-  EXPECT_EQ( m_Id, 1u );
-  EXPECT_EQ( m_Reading, VTick( 0 ) );
+  ExpectOpens( 1, 1, "Test Buffer: Starting first Buffer Session" );
   const auto First = Record( 1 );
   EXPECT_TRUE( First.m_First.IsSamePosition( First.m_Last ) );
   EXPECT_FALSE( First.m_End.IsValid() );
-  EXPECT_TRUE( Logged( "Test Buffer: Starting first Buffer Session" ) );
+  m_Log.Clear();
   Add( 3 );
   EXPECT_EQ( m_Id, 1u );
   EXPECT_EQ( m_Reading, Period * 3 );
@@ -102,11 +99,7 @@ TEST_F( TimeBasedCaptureBuffer, OneTickOffIsADiscontinuity )
 {
   Add( 5 );
   Jump( Timecode, VTick( 1 ) );
-  Add();
-  EXPECT_EQ( m_Id, 2u );
-  EXPECT_EQ( BufferSession(), 1u );
-  EXPECT_EQ( m_Reading, VTick( 0 ) );
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session. Clock Changes: Timecode Discontinuity (21601000 -> 27001001), (1 continuous)" ) );
+  ExpectOpens( 2, 1, "Buffer Test: New Sync Session. Clock Changes: Timecode Discontinuity (21601000 -> 27001001), (1 continuous)" );
   EXPECT_EQ( Record( 1 ).m_End.m_FrameNumber, 5 );
   EXPECT_TRUE( Record( 1 ).m_End.IsSamePosition( Record( 1 ).m_Last ) );
   const std::map<IClock, uint32_t> Continuity = { { Timecode, 2 }, { FrameNumber, 1 }, { Counter, 2 } };
@@ -118,11 +111,9 @@ TEST_F( TimeBasedCaptureBuffer, OneTickOffIsADiscontinuity )
   // All clocks at once: nothing ties the frames together any more.
   Jump( Timecode, VTick( -7 ) );
   Jump( FrameNumber, Period );
-  Add();
-  EXPECT_EQ( m_Id, 3u );
-  EXPECT_EQ( BufferSession(), 2u );
-  EXPECT_TRUE( Logged( "Buffer Test: New Buffer Session. Clock Changes: Timecode Discontinuity (27001001 -> 32400994), "
-                       "FrameNumber Discontinuity (27000000 -> 37800000), (None continuous)" ) );
+  ExpectOpens( 3, 2,
+    "Buffer Test: New Buffer Session. Clock Changes: Timecode Discontinuity (27001001 -> 32400994), "
+    "FrameNumber Discontinuity (27000000 -> 37800000), (None continuous)" );
   EXPECT_EQ( Record( 3 ).m_ContinuousSince.at( FrameNumber ), 3u );
 }
 
@@ -130,66 +121,42 @@ TEST_F( TimeBasedCaptureBuffer, ClocksComeAndGo )
 {
   Add( 2 );
   m_Timing.m_Clocks.m_TickByClock.erase( Timecode );
-  Add();
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session. Clock Changes: Timecode Removed, (1 continuous)" ) );
+  ExpectOpens( 2, 1, "Buffer Test: New Sync Session. Clock Changes: Timecode Removed, (1 continuous)" );
   m_Timing.m_Clocks.Set( Timecode, VTick( 9 ) );
-  Add();
-  EXPECT_EQ( m_Id, 3u );
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session. Clock Changes: Timecode Added, (1 continuous)" ) );
+  ExpectOpens( 3, 1, "Buffer Test: New Sync Session. Clock Changes: Timecode Added, (1 continuous)" );
   EXPECT_EQ( Record( 3 ).m_ContinuousSince.at( Timecode ), 3u );
   EXPECT_EQ( Record( 3 ).m_ContinuousSince.at( FrameNumber ), 1u );
-  // Another clock in place of the only one
   m_Timing.m_Clocks = {};
-  Add();
-  EXPECT_TRUE( Logged( "Buffer Test: New Buffer Session. Clock Changes: Timecode Removed, FrameNumber Removed, (None continuous)" ) );
+  ExpectOpens( 4, 2, "Buffer Test: New Buffer Session. Clock Changes: Timecode Removed, FrameNumber Removed, (None continuous)" );
   Add( 3 );   // without any clock the counter alone carries it
   EXPECT_EQ( m_Id, 4u );
   m_Timing.m_Clocks.Set( Timecode, VTick( 9 ) );
-  Add();
-  EXPECT_TRUE( Logged( "Buffer Test: New Buffer Session. Clock Changes: Timecode Added, (None continuous)" ) );
+  ExpectOpens( 5, 3, "Buffer Test: New Buffer Session. Clock Changes: Timecode Added, (None continuous)" );
 }
 
-TEST_F( TimeBasedCaptureBuffer, PeriodBeatAndCounterClock )
+TEST_F( TimeBasedCaptureBuffer, PeriodBeatCounterClockAndRequestsFromOutside )
 {
   Add( 2 );
   m_Timing.m_BeatPeriod = Period;
   m_Timing.m_BeatOffset = VTick( 1 );
-  Add();
-  EXPECT_EQ( m_Id, 2u );
-  EXPECT_EQ( BufferSession(), 1u );
+  ExpectOpens( 2, 1, "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 0:0 -> 5400000:1)" );
   EXPECT_TRUE( m_Log.Has( "Buffer Test: New Sync Session Created: Id = 2. Period = 5400000 (25Hz), Beat = 5400000:1" ) );
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 0:0 -> 5400000:1)" ) );
   EXPECT_EQ( Record( 2 ).m_ContinuousSince.at( Timecode ), 1u );
   m_Timing.m_BeatOffset = VTick( 2 );
-  Add();
-  EXPECT_TRUE( Logged( "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 5400000:1 -> 5400000:2)" ) );
+  ExpectOpens( 3, 1, "Buffer Test: New Sync Session due to change in beat (Beat [Period:Offset] 5400000:1 -> 5400000:2)" );
   m_Timing.m_Period = VTick( 2700000 );
-  Add();
-  EXPECT_EQ( m_Id, 4u );
-  EXPECT_EQ( BufferSession(), 2u );
-  EXPECT_TRUE( Logged( "Test Buffer: New Buffer Session due to period changing from 5400000 to 2700000" ) );
+  ExpectOpens( 4, 2, "Test Buffer: New Buffer Session due to period changing from 5400000 to 2700000" );
   m_Timing.m_CounterClock = OtherCounter;
-  Add();
-  EXPECT_EQ( m_Id, 5u );
-  EXPECT_EQ( BufferSession(), 3u );
-  EXPECT_TRUE( Logged( "Buffer Test: New Buffer Session due change in counter clock type" ) );
+  ExpectOpens( 5, 3, "Buffer Test: New Buffer Session due change in counter clock type" );
   EXPECT_TRUE( Record( 5 ).m_StartTime.Find( OtherCounter ) == VTick( 0 ) && !Record( 5 ).m_StartTime.Find( Counter ).IsValid() );
-}
 
-TEST_F( TimeBasedCaptureBuffer, SessionsFromOutside )
-{
-  Add( 2 );
   m_pBuffer->StartNewBufferSession();
-  Add();
-  EXPECT_EQ( m_Id, 2u );
-  EXPECT_EQ( BufferSession(), 2u );
-  EXPECT_TRUE( Logged( "Test Buffer: New Sync Session has been forced by external request" ) );
+  ExpectOpens( 6, 4, "Test Buffer: New Sync Session has been forced by external request" );
   m_pBuffer->RequestNewBufferSession();
-  EXPECT_EQ( BufferSession(), 2u );   // only at the next frame
-  Add( 2 );
-  EXPECT_EQ( m_Id, 3u );
-  EXPECT_EQ( BufferSession(), 3u );
-  EXPECT_TRUE( Logged( "Test Buffer: Forcing new Buffer Session" ) );
+  EXPECT_EQ( BufferSession(), 4u );   // only at the next frame
+  ExpectOpens( 7, 5, "Test Buffer: Forcing new Buffer Session" );
+  Add();
+  EXPECT_EQ( m_Id, 7u );
 }
 
 TEST_F( TimeBasedCaptureBuffer, ForcedSessionIsContinuedByAFrameWithItsReadings )
@@ -286,7 +253,7 @@ TEST_F( TimeBasedCaptureBuffer, RecordsLeaveWithTheirFrames )
   m_pBuffer->RequestNewBufferSession();
   Add( 30 );   // memory holds 24
   EXPECT_EQ( m_pBuffer->OldestSessionId(), 2u );
-  EXPECT_TRUE( Logged( "Test Buffer:Session 1 has been removed from buffer. There are 1 sessions remaining" ) );
+  EXPECT_TRUE( m_Log.Has( "Test Buffer:Session 1 has been removed from buffer. There are 1 sessions remaining" ) );
   VToken Token;
   KVZ::ITickInClocks Clocks;
   EXPECT_FALSE( m_pBuffer->FirstPosition( 1, Token, Clocks ) );
