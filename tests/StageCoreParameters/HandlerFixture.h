@@ -5,6 +5,7 @@
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "StageCoreParameters/Parameter.h"
 #include "host/DataStore.h"
+#include "host/Registries.h"
 #include "tests/support/FakeSettingsHost.h"
 #include "tests/support/ManualPostalService.h"
 
@@ -54,7 +55,7 @@ protected:
 
   const std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
-  const std::shared_ptr<TestSupport::VFakeParameterRegistry> m_pRegistry = std::make_shared<TestSupport::VFakeParameterRegistry>();
+  const std::shared_ptr<StageHost::VParameterRegistry> m_pRegistry = std::make_shared<StageHost::VParameterRegistry>();
   const VDataPath m_Device = DeviceSchemas::VideoInput::Path( "vi:0" );
   std::shared_ptr<THandler> m_pHandler;
 };

@@ -4,7 +4,7 @@
 // for a callback that runs on another thread.
 #pragma once
 
-#include "VendorInterfaces/DeckLinkAPI.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
 #include "tests/support/FakeDeckLinkFrames.h"
 
 #include <boost/thread/condition_variable.hpp>
@@ -23,6 +23,9 @@
 
 namespace TestSupport::FakeDeckLink
 {
+
+using VideoInputHAL::TakeReference;
+using VideoInputHAL::VComPointer;
 
 class VDisplayMode : public VObject<IDeckLinkDisplayMode>
 {
@@ -112,7 +115,7 @@ public:
   IDeckLinkInputCallback* Callback() const
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_pCallback;
+    return m_pCallback.get();
   }
   // Until so many callbacks are under way at once.
   void WaitForCallbacks( size_t i_Count )
@@ -127,35 +130,20 @@ public:
     return CallBack(
       [&]( IDeckLinkInputCallback& i_rCallback )
       {
-        auto* const pFrame = new VFrame( i_rFrame );
-        auto* const pAudio = i_rAudio ? new VAudioPacket( *i_rAudio ) : nullptr;
-        i_rCallback.VideoInputFrameArrived( pFrame, pAudio );
-        pFrame->Release();
-        if( pAudio )
-        {
-          pAudio->Release();
-        }
+        const auto pFrame = TakeReference( new VFrame( i_rFrame ) );
+        const auto pAudio = TakeReference( i_rAudio ? new VAudioPacket( *i_rAudio ) : nullptr );
+        i_rCallback.VideoInputFrameArrived( pFrame.get(), pAudio.get() );
       } );
   }
   bool DeliverAudioOnly( const VAudioContent& i_rAudio )
   {
-    return CallBack(
-      [&]( IDeckLinkInputCallback& i_rCallback )
-      {
-        auto* const pAudio = new VAudioPacket( i_rAudio );
-        i_rCallback.VideoInputFrameArrived( nullptr, pAudio );
-        pAudio->Release();
-      } );
+    return CallBack( [&]( IDeckLinkInputCallback& i_rCallback )
+      { i_rCallback.VideoInputFrameArrived( nullptr, TakeReference( new VAudioPacket( i_rAudio ) ).get() ); } );
   }
   bool DeliverFormat( uint32_t i_Mode, uint32_t i_DetectedSignal )
   {
-    return CallBack(
-      [&]( IDeckLinkInputCallback& i_rCallback )
-      {
-        auto* const pMode = new VDisplayMode( i_Mode );
-        i_rCallback.VideoInputFormatChanged( FormatChange::DisplayMode, pMode, i_DetectedSignal );
-        pMode->Release();
-      } );
+    return CallBack( [&]( IDeckLinkInputCallback& i_rCallback )
+      { i_rCallback.VideoInputFormatChanged( FormatChange::DisplayMode, TakeReference( new VDisplayMode( i_Mode ) ).get(), i_DetectedSignal ); } );
   }
 
   HRESULT DoesSupportVideoMode( uint32_t, uint32_t, uint32_t, uint32_t*, IDeckLinkDisplayMode** ) override { return E_NOTIMPL; }
@@ -239,19 +227,9 @@ public:
     {
       return E_FAIL;
     }
-    if( i_pCallback )
-    {
-      i_pCallback->AddRef();
-    }
-    IDeckLinkInputCallback* pFormer = nullptr;
-    {
-      boost::lock_guard<boost::mutex> Lock( m_Mutex );
-      pFormer = std::exchange( m_pCallback, i_pCallback );
-    }
-    if( pFormer )
-    {
-      pFormer->Release();
-    }
+    VComPointer<IDeckLinkInputCallback> pCallback( i_pCallback );   // the former one goes without the lock
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_pCallback.swap( pCallback );
     return S_OK;
   }
   HRESULT GetHardwareReferenceClock( int64_t, int64_t*, int64_t*, int64_t* ) override { return E_NOTIMPL; }
@@ -276,39 +254,31 @@ private:
   bool CallBack( const std::function<void( IDeckLinkInputCallback& )>& i_rCall )
   {
     IDeckLinkInputCallback* pCallback = nullptr;
+    VComPointer<IDeckLinkInputCallback> pHeld;
     {
       boost::lock_guard<boost::mutex> Lock( m_Mutex );
       if( !m_pCallback || m_State != EState::Running )
       {
         return false;
       }
-      pCallback = m_pCallback;
-      if( m_bHoldsCallback )
-      {
-        pCallback->AddRef();
-      }
+      pCallback = m_pCallback.get();
+      pHeld = m_bHoldsCallback ? m_pCallback : nullptr;
       m_InCallback.insert( boost::this_thread::get_id() );
       m_CallbacksChanged.notify_all();
     }
-    AddRef();   // the callback may let the input go
+    const VComPointer<VInput> pSelf( this );   // the callback may let the input go
     i_rCall( *pCallback );
-    if( m_bHoldsCallback )
-    {
-      pCallback->Release();
-    }
-    {
-      boost::lock_guard<boost::mutex> Lock( m_Mutex );
-      m_InCallback.erase( m_InCallback.find( boost::this_thread::get_id() ) );
-      m_CallbacksChanged.notify_all();
-    }
-    Release();
+    pHeld.reset();
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    m_InCallback.erase( m_InCallback.find( boost::this_thread::get_id() ) );
+    m_CallbacksChanged.notify_all();
     return true;
   }
 
   mutable boost::mutex m_Mutex;
   boost::condition_variable m_CallbacksChanged;
   std::vector<std::string> m_Calls;
-  IDeckLinkInputCallback* m_pCallback = nullptr;
+  VComPointer<IDeckLinkInputCallback> m_pCallback;
   std::multiset<boost::thread::id> m_InCallback;
   EState m_State = EState::Stopped;
   bool m_bEnabled = false;
@@ -341,8 +311,7 @@ public:
   HRESULT GetDisplayName( const char** ) override { return E_NOTIMPL; }
 
 private:
-  ~VCard() override { m_pInput->Release(); }
-  VInput* const m_pInput = new VInput;
+  const VComPointer<VInput> m_pInput = TakeReference( new VInput );
 };
 
 class VDiscovery : public VObject<IDeckLinkDiscovery>
@@ -353,34 +322,28 @@ public:
   // On the calling thread; does nothing without a callback.
   void Arrive( VCard& i_rCard ) { CallBack( &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceArrived, i_rCard ); }
   void Remove( VCard& i_rCard ) { CallBack( &IDeckLinkDeviceNotificationCallback::DeckLinkDeviceRemoved, i_rCard ); }
-  IDeckLinkDeviceNotificationCallback* Callback() { return m_pCallback; }
+  IDeckLinkDeviceNotificationCallback* Callback() { return m_pCallback.get(); }
 
   HRESULT InstallDeviceNotifications( IDeckLinkDeviceNotificationCallback* i_pCallback ) override
   {
-    i_pCallback->AddRef();
     m_pCallback = i_pCallback;
     return S_OK;
   }
   HRESULT UninstallDeviceNotifications() override
   {
-    if( auto* const pFormer = std::exchange( m_pCallback, nullptr ) )
-    {
-      pFormer->Release();
-    }
+    m_pCallback = nullptr;
     return S_OK;
   }
 
 private:
   void CallBack( HRESULT ( IDeckLinkDeviceNotificationCallback::*i_pOperation )( IDeckLink* ), VCard& i_rCard )
   {
-    if( auto* const pCallback = m_pCallback )
+    if( const auto pCallback = m_pCallback )
     {
-      pCallback->AddRef();
-      ( pCallback->*i_pOperation )( &i_rCard );
-      pCallback->Release();
+      ( pCallback.get()->*i_pOperation )( &i_rCard );
     }
   }
-  IDeckLinkDeviceNotificationCallback* m_pCallback = nullptr;
+  VComPointer<IDeckLinkDeviceNotificationCallback> m_pCallback;
 };
 
 }

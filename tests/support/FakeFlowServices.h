@@ -20,8 +20,7 @@ public:
   uint32_t m_Answer = KVZ::EFlowResult::Ok;
   bool m_bBlockingCalls = true;
   bool m_bNoMemory = false;
-  uint32_t m_Connected = KVZ::EFlowResult::Ok;   // of waits for a connection
-  KVZ::VFlowItemList m_Global;                   // handed over once, when not empty
+  KVZ::VFlowItemList m_Global;   // handed over once, when not empty
 
   // What has happened
   std::vector<KVZ::VFlowStatePtr> m_Written;
@@ -30,7 +29,6 @@ public:
   std::vector<uint64_t> m_Woken;
   uint64_t m_NextToken = 1;
   uint32_t m_LastCall = 0;   // the last answer of a blocking call's function
-  int m_Calls = 0;           // of blocking calls' functions
 
   uint32_t Read( uint32_t, KVZ::VFlowLimit, KVZ::VFlowStatePtr& ) override { return m_Answer; }
   uint32_t ReadOneOf( const std::vector<uint32_t>&, KVZ::VFlowLimit, uint32_t&, KVZ::VFlowStatePtr& ) override { return m_Answer; }
@@ -53,7 +51,6 @@ public:
     {
       return m_Answer;
     }
-    ++m_Calls;
     m_LastCall = i_rCall( m_NextToken++ );
     return m_LastCall == KVZ::EFlowResult::Asleep ? static_cast<uint32_t>( KVZ::EFlowResult::WouldBlock ) : m_LastCall;
   }
@@ -73,7 +70,7 @@ public:
     return KVZ::EFlowResult::Ok;
   }
   uint32_t WaitInputConnected( uint32_t, KVZ::VFlowLimit ) override { return m_Answer; }
-  uint32_t WaitOutputConnected( uint32_t, KVZ::VFlowLimit ) override { return m_Answer != KVZ::EFlowResult::Ok ? m_Answer : m_Connected; }
+  uint32_t WaitOutputConnected( uint32_t, KVZ::VFlowLimit ) override { return m_Answer; }
   uint32_t InputIndex( const std::string&, uint32_t& ) override { return m_Answer; }
   uint32_t OutputIndex( const std::string&, uint32_t& ) override { return m_Answer; }
   uint32_t CreateItem( const std::string& i_rType, const std::string& i_rLabel, KVZ::VFlowItemPtr& o_rpItem ) override

@@ -4,6 +4,7 @@
 
 #include "StageCoreDataStore/DataReader.h"
 #include "StageCoreDataStore/DataWriter.h"
+#include "StageCoreParameters/ParameterGroup.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 #include "StageCoreRuntime/DebugServices.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
@@ -11,6 +12,7 @@
 #include "host/DataStore.h"
 #include "host/Registries.h"
 #include "tests/support/FakeSettingsHost.h"
+#include "tests/support/HandTime.h"
 
 #include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
@@ -32,16 +34,11 @@ namespace TestSupport
 class VHappenings
 {
 public:
-  struct VEntry
-  {
-    std::string m_Text;
-    std::string m_Thread;   // its name
-  };
-
   void Add( std::string i_Text )
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Entries.push_back( { std::move( i_Text ), DebugServices::GetThreadName() } );
+    m_Texts.push_back( std::move( i_Text ) );
+    m_Threads.push_back( DebugServices::GetThreadName() );
     ++m_Changes;
     m_Changed.notify_all();
   }
@@ -66,19 +63,10 @@ public:
     }
   }
 
-  std::vector<VEntry> Entries() const
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_Entries;
-  }
   std::vector<std::string> Texts() const
   {
-    std::vector<std::string> Texts;
-    for( const VEntry& rEntry : Entries() )
-    {
-      Texts.push_back( rEntry.m_Text );
-    }
-    return Texts;
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    return m_Texts;
   }
   bool Has( const std::string& i_rText ) const
   {
@@ -88,14 +76,15 @@ public:
   // The thread that did it first; empty where nobody did.
   std::string ThreadOf( const std::string& i_rText ) const
   {
-    const auto All = Entries();
-    const auto Found = std::find_if( All.begin(), All.end(), [&]( const VEntry& i_rEntry ) { return i_rEntry.m_Text == i_rText; } );
-    return Found == All.end() ? std::string() : Found->m_Thread;
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    const auto Found = std::find( m_Texts.begin(), m_Texts.end(), i_rText );
+    return Found == m_Texts.end() ? std::string() : m_Threads[static_cast<size_t>( Found - m_Texts.begin() )];
   }
   void Clear()
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_Entries.clear();
+    m_Texts.clear();
+    m_Threads.clear();
   }
 
 private:
@@ -107,7 +96,8 @@ private:
 
   mutable boost::mutex m_Mutex;
   boost::condition_variable_any m_Changed;
-  std::vector<VEntry> m_Entries GUARDED_BY( m_Mutex );
+  std::vector<std::string> m_Texts GUARDED_BY( m_Mutex );
+  std::vector<std::string> m_Threads GUARDED_BY( m_Mutex );   // the name of each one's
   uint64_t m_Changes GUARDED_BY( m_Mutex ) = 0;
 };
 
@@ -166,10 +156,7 @@ public:
       boost::lock_guard<boost::mutex> Lock( m_Mutex );
       m_AllSources.push_back( i_pSource );
     }
-    if( m_OnAdd )
-    {
-      m_OnAdd( Name );
-    }
+    m_OnAdd( Name );
     i_pSource->Temporal().OnRequestNewGlobalSyncSession().SetImmediate(
       [pHappenings = m_pHappenings]( KVZ::VGlobalSyncSessionId ) { pHappenings->Touch(); } );
     {
@@ -180,10 +167,7 @@ public:
   }
   void RemoveSource( const std::shared_ptr<KVZ::ISource>& i_pSource ) override
   {
-    if( m_OnRemove )
-    {
-      m_OnRemove( i_pSource->GetSourceName() );
-    }
+    m_OnRemove( i_pSource->GetSourceName() );
     i_pSource->Temporal().OnRequestNewGlobalSyncSession().Clear();
     m_pHappenings->Add( "RemoveSource " + i_pSource->GetSourceName() );
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
@@ -208,8 +192,8 @@ public:
   }
 
   // Run inside AddSource, before the source is registered, and inside RemoveSource, while it still is. Set before devices come.
-  std::function<void( const std::string& i_rName )> m_OnAdd;
-  std::function<void( const std::string& i_rName )> m_OnRemove;
+  std::function<void( const std::string& i_rName )> m_OnAdd = []( const std::string& ) {};
+  std::function<void( const std::string& i_rName )> m_OnRemove = []( const std::string& ) {};
 
 private:
   const std::shared_ptr<VHappenings> m_pHappenings;
@@ -217,12 +201,6 @@ private:
   mutable boost::mutex m_Mutex;
   std::vector<std::shared_ptr<KVZ::ISource>> m_Sources GUARDED_BY( m_Mutex );
   std::vector<std::weak_ptr<KVZ::ISource>> m_AllSources GUARDED_BY( m_Mutex );
-};
-
-class VSteadyTime : public StageCorePluginInterface::ITimeService
-{
-public:
-  double Now() override { return 1.0; }
 };
 
 class VFakeHost : public StageCorePluginInterface::IStageCoreHost
@@ -237,10 +215,7 @@ public:
   std::shared_ptr<StageCorePluginInterface::IShutdownManager> GetShutdownManager() override { return m_pShutdown; }
   std::shared_ptr<UtilsMemory::VBalancingAllocator> GetBalancingAllocator() override
   {
-    if( m_OnGetAllocator )
-    {
-      m_OnGetAllocator();
-    }
+    m_OnGetAllocator();
     return m_pAllocator;
   }
   std::shared_ptr<IDataStore> GetDataStore() override { return m_pStore; }
@@ -286,12 +261,12 @@ public:
   }
 
   const std::shared_ptr<VHappenings> m_pHappenings = std::make_shared<VHappenings>();
-  std::function<void()> m_OnGetAllocator;   // the engine's first call for a device. Set before devices come
+  std::function<void()> m_OnGetAllocator = [] {};   // the engine's first call for a device. Set before devices come
   const std::shared_ptr<VHeardShutdownManager> m_pShutdown = std::make_shared<VHeardShutdownManager>( m_pHappenings );
   // Blocks of 4 MiB: room for a few frames of standard definition each.
   const std::shared_ptr<UtilsMemory::VBalancingAllocator> m_pAllocator = std::make_shared<UtilsMemory::VBalancingAllocator>( 4u << 20 );
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
-  const std::shared_ptr<VSteadyTime> m_pTime = std::make_shared<VSteadyTime>();
+  const std::shared_ptr<VHandTime> m_pTime = std::make_shared<VHandTime>();
   const std::shared_ptr<StageHost::VFlowNodeRegistry> m_pFlowNodes = std::make_shared<StageHost::VFlowNodeRegistry>();
   const std::shared_ptr<VHeardParameterRegistry> m_pParameters = std::make_shared<VHeardParameterRegistry>( m_pHappenings );
   const std::shared_ptr<StageHost::VHardwareStartEvent> m_pHardwareStart = std::make_shared<StageHost::VHardwareStartEvent>();

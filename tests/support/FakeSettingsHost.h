@@ -1,28 +1,14 @@
-// The host's side of settings, moved by hand: where groups are registered, which folders captures may go to, which clock is the master.
+// The host's side of settings, moved by hand: which folders captures may go to, which clock is the master.
 #pragma once
 
-#include "StageCoreParameters/ParameterGroup.h"
 #include "StageCorePluginInterface/StageCoreHost.h"
 
-#include <algorithm>
 #include <memory>
 #include <string>
 #include <vector>
 
 namespace TestSupport
 {
-
-class VFakeParameterRegistry : public StageCorePluginInterface::IParameterRegistry
-{
-public:
-  void AddParameterGroup( std::shared_ptr<IParameterGroup> i_pGroup ) override { m_Groups.push_back( std::move( i_pGroup ) ); }
-  void RemoveParameterGroup( const std::shared_ptr<IParameterGroup>& i_pGroup ) override
-  {
-    m_Groups.erase( std::remove( m_Groups.begin(), m_Groups.end(), i_pGroup ), m_Groups.end() );
-  }
-
-  std::vector<std::shared_ptr<IParameterGroup>> m_Groups;
-};
 
 class VFakeCaptureTargets : public StageCorePluginInterface::ICaptureTargets
 {
@@ -57,11 +43,8 @@ private:
 class VFakeSourceRegistry : public StageCorePluginInterface::ISourceRegistry
 {
 public:
-  void AddSource( std::shared_ptr<KVZ::ISource> i_pSource ) override { m_Sources.push_back( std::move( i_pSource ) ); }
-  void RemoveSource( const std::shared_ptr<KVZ::ISource>& i_pSource ) override
-  {
-    m_Sources.erase( std::remove( m_Sources.begin(), m_Sources.end(), i_pSource ), m_Sources.end() );
-  }
+  void AddSource( std::shared_ptr<KVZ::ISource> ) override {}
+  void RemoveSource( const std::shared_ptr<KVZ::ISource>& ) override {}
   std::shared_ptr<KVZ::IBaseLineClock> GetMasterClock() override { return m_pClock; }
   KVZ::IMultiCallbackPostal<void()>& GetMasterPeriodChangedCallback() override { return m_PeriodChanged; }
 
@@ -70,8 +53,6 @@ public:
     m_pClock = std::make_shared<VFakeMasterClock>( i_Period );
     m_PeriodChanged();
   }
-
-  std::vector<std::shared_ptr<KVZ::ISource>> m_Sources;
 
 private:
   std::shared_ptr<KVZ::IBaseLineClock> m_pClock;

@@ -45,31 +45,6 @@ struct VPipe
   int m_Ends[2];
 };
 
-[[noreturn]] void RunChild( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions, int i_Output, int i_Error )
-{
-  dup2( open( "/dev/null", O_RDONLY ), STDIN_FILENO );
-  dup2( i_Output, STDOUT_FILENO );
-  dup2( i_Error, STDERR_FILENO );
-  if( i_rOptions.m_FileSizeLimit )
-  {
-    const rlimit Limit = { *i_rOptions.m_FileSizeLimit, *i_rOptions.m_FileSizeLimit };
-    setrlimit( RLIMIT_FSIZE, &Limit );
-    std::signal( SIGXFSZ, SIG_IGN );
-  }
-  for( const std::string& rVariable : i_rOptions.m_Environment )
-  {
-    putenv( const_cast<char*>( rVariable.c_str() ) );
-  }
-  std::vector<char*> Arguments;
-  for( const std::string& rArgument : i_rArguments )
-  {
-    Arguments.push_back( const_cast<char*>( rArgument.c_str() ) );
-  }
-  Arguments.push_back( nullptr );
-  execvp( Arguments.front(), Arguments.data() );
-  _exit( 127 );
-}
-
 // True while the end is open.
 bool Drain( int i_End, std::string& io_rText )
 {
@@ -105,40 +80,65 @@ void Collect( pid_t i_Child, VPipe& i_rOutput, VPipe& i_rError, const VRunOption
       {
         i_rError.CloseEnd( 0 );
       }
-      else if( i_rOptions.m_OnErrorText )
-      {
-        i_rOptions.m_OnErrorText( i_Child, o_rResult.m_Error );
-      }
+      i_rOptions.m_OnErrorText( i_Child, o_rResult.m_Error );
     }
   }
 }
 
 }
 
+pid_t StartProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions, int i_Output, int i_Error )
+{
+  const pid_t Child = fork();
+  if( Child != 0 )
+  {
+    return Child;
+  }
+  dup2( open( "/dev/null", O_RDONLY ), STDIN_FILENO );
+  dup2( i_Output, STDOUT_FILENO );
+  dup2( i_Error, STDERR_FILENO );
+  if( i_rOptions.m_FileSizeLimit )
+  {
+    const rlimit Limit = { *i_rOptions.m_FileSizeLimit, *i_rOptions.m_FileSizeLimit };
+    setrlimit( RLIMIT_FSIZE, &Limit );
+    std::signal( SIGXFSZ, SIG_IGN );
+  }
+  for( const std::string& rVariable : i_rOptions.m_Environment )
+  {
+    putenv( const_cast<char*>( rVariable.c_str() ) );
+  }
+  std::vector<char*> Arguments;
+  for( const std::string& rArgument : i_rArguments )
+  {
+    Arguments.push_back( const_cast<char*>( rArgument.c_str() ) );
+  }
+  Arguments.push_back( nullptr );
+  execvp( Arguments.front(), Arguments.data() );
+  _exit( 127 );
+}
+
+void WaitForProgram( pid_t i_Child, VRunResult& o_rResult )
+{
+  int Status = 0;
+  rusage Usage = {};
+  while( wait4( i_Child, &Status, 0, &Usage ) < 0 && errno == EINTR )
+  {
+  }
+  o_rResult.m_ExitCode = WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
+  o_rResult.m_Signal = WIFSIGNALED( Status ) ? WTERMSIG( Status ) : 0;
+  o_rResult.m_PeakResidentKiB = Usage.ru_maxrss;
+}
+
 VRunResult RunProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions )
 {
   VPipe Output;
   VPipe Error;
-  VRunResult Result;
-  const pid_t Child = fork();
-  if( Child == 0 )
-  {
-    RunChild( i_rArguments, i_rOptions, Output.m_Ends[1], Error.m_Ends[1] );
-  }
+  const pid_t Child = StartProgram( i_rArguments, i_rOptions, Output.m_Ends[1], Error.m_Ends[1] );
   Output.CloseEnd( 1 );
   Error.CloseEnd( 1 );
+  VRunResult Result;
   Collect( Child, Output, Error, i_rOptions, Result );
-
-  int Status = 0;
-  rusage Usage = {};
-  while( wait4( Child, &Status, 0, &Usage ) < 0 && errno == EINTR )
-  {
-  }
-  Result.m_ExitCode = WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
-  Result.m_Signal = WIFSIGNALED( Status ) ? WTERMSIG( Status ) : 0;
-  Result.m_PeakResidentKiB = Usage.ru_maxrss;
-  Result.m_ProcessorSeconds = static_cast<double>( Usage.ru_utime.tv_sec + Usage.ru_stime.tv_sec ) +
-    static_cast<double>( Usage.ru_utime.tv_usec + Usage.ru_stime.tv_usec ) * 1e-6;
+  WaitForProgram( Child, Result );
   return Result;
 }
 

@@ -6,8 +6,6 @@
 #include "tests/support/MemoryFile.h"
 #include "tests/support/TestFrames.h"
 
-#include <gtest/gtest.h>
-
 #include <optional>
 
 namespace TestSupport
@@ -63,62 +61,13 @@ struct VMemoryRecording
     return [this, i_rFault]( const std::string& )
     {
       m_pBytes->clear();
-      return std::make_unique<VFailingStream>( std::make_unique<VMemoryFile>( m_pBytes ), i_rFault, &m_Operations );
+      return std::make_unique<VFailingStream>( std::make_unique<VMemoryFile>( m_pBytes ), i_rFault );
     };
   }
 
   VHeader m_Header;
   const std::shared_ptr<VBytes> m_pBytes = std::make_shared<VBytes>();
-  uint64_t m_Operations = 0;
   TWriter m_Writer;
 };
-
-// What became of a recording that met a fault.
-struct VFaultyRun
-{
-  bool m_bHeader = false;
-  bool m_bClosed = false;
-  size_t m_Written = 0;   // frames whose call gave true
-  bool m_bLaterRefused = true;
-};
-
-// Writes frames, of which i_WriteFrame gives whether the numbered one was taken. Goes on after a failure as no client would.
-template<class TRecording, class TWriteFrame>
-VFaultyRun RunIntoFault( TRecording& io_rRecording, size_t i_Frames, TWriteFrame i_WriteFrame )
-{
-  VFaultyRun Run;
-  Run.m_bHeader = io_rRecording.Begin();
-  bool bFailed = !Run.m_bHeader;
-  for( size_t Frame = 0; Frame < i_Frames; ++Frame )
-  {
-    const bool bWritten = i_WriteFrame( Frame );
-    Run.m_bLaterRefused = Run.m_bLaterRefused && !( bFailed && bWritten );
-    Run.m_Written += bWritten;
-    bFailed = bFailed || !bWritten;
-  }
-  Run.m_bClosed = io_rRecording.m_Writer.Close();
-  return Run;
-}
-
-// Meets a fault at each place of a recording, one after the other: i_pPlace is the offset of a full disk or the operation that fails. i_Make
-// gives a recording for a fault, i_Write writes it, and i_Check looks at what is left behind.
-template<class TMake, class TWrite, class TCheck>
-void MeetEachFault( uint64_t VFault::*i_pPlace, TMake i_Make, TWrite i_Write, TCheck i_Check )
-{
-  auto Whole = i_Make( VFault() );
-  ASSERT_TRUE( i_Write( Whole ).m_bClosed );
-  const uint64_t Places = i_pPlace == &VFault::m_Offset ? Whole.m_pBytes->size() : Whole.m_Operations;
-  ASSERT_GT( Places, 10u );
-  for( uint64_t Place = 0; Place < Places; ++Place )
-  {
-    SCOPED_TRACE( Place );
-    VFault Fault;
-    Fault.*i_pPlace = Place;
-    auto Recording = i_Make( Fault );
-    const VFaultyRun Run = i_Write( Recording );
-    EXPECT_LE( Recording.m_pBytes->size(), Fault.m_Offset );
-    i_Check( Recording, Run, Place );
-  }
-}
 
 }

@@ -1,15 +1,16 @@
 #include "tests/support/system/BackgroundProgram.h"
 
+#include "tests/support/ProgramRun.h"
+
 #include <fcntl.h>
 #include <poll.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <chrono>
 #include <csignal>
-#include <cstdlib>
 #include <stdexcept>
+#include <utility>
 
 namespace SystemTests
 {
@@ -32,25 +33,7 @@ VBackgroundProgram::VBackgroundProgram( const std::vector<std::string>& i_rArgum
   {
     throw std::runtime_error( "no pipe" );
   }
-  std::vector<char*> Arguments;
-  for( const std::string& rArgument : i_rArguments )
-  {
-    Arguments.push_back( const_cast<char*>( rArgument.c_str() ) );
-  }
-  Arguments.push_back( nullptr );
-  m_Child = fork();
-  if( m_Child == 0 )
-  {
-    dup2( open( "/dev/null", O_RDONLY ), STDIN_FILENO );
-    dup2( Ends[1], STDOUT_FILENO );
-    dup2( Ends[1], STDERR_FILENO );
-    for( const std::string& rVariable : i_rEnvironment )
-    {
-      putenv( const_cast<char*>( rVariable.c_str() ) );
-    }
-    execvp( Arguments.front(), Arguments.data() );
-    _exit( 127 );
-  }
+  m_Child = TestSupport::StartProgram( i_rArguments, { .m_Environment = i_rEnvironment }, Ends[1], Ends[1] );
   close( Ends[1] );
   m_Output = Ends[0];
 }
@@ -61,9 +44,7 @@ VBackgroundProgram::~VBackgroundProgram()
   if( m_Child > 0 )
   {
     kill( m_Child, SIGKILL );
-    while( waitpid( m_Child, nullptr, 0 ) < 0 && errno == EINTR )
-    {
-    }
+    WaitForEnd();
   }
 }
 
@@ -94,6 +75,13 @@ bool VBackgroundProgram::WaitFor( const std::string& i_rText, double i_Seconds )
   return true;
 }
 
+int VBackgroundProgram::WaitForEnd()
+{
+  TestSupport::VRunResult Result;
+  TestSupport::WaitForProgram( std::exchange( m_Child, -1 ), Result );
+  return Result.m_ExitCode;
+}
+
 void VBackgroundProgram::Interrupt() const { kill( m_Child, SIGINT ); }
 
 int VBackgroundProgram::WaitForEnd( double i_Seconds )
@@ -106,12 +94,7 @@ int VBackgroundProgram::WaitForEnd( double i_Seconds )
   {
     return -1;
   }
-  int Status = 0;
-  while( waitpid( m_Child, &Status, 0 ) < 0 && errno == EINTR )
-  {
-  }
-  m_Child = -1;
-  return WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
+  return WaitForEnd();
 }
 
 VPrivateDisplay::VPrivateDisplay() : VBackgroundProgram( { "Xvfb", "-displayfd", "1", "-screen", "0", "720x576x24", "-nolisten", "tcp" } )

@@ -29,6 +29,7 @@ public:
   const std::string& Printed() const { return m_Printed; }
 
 private:
+  int WaitForEnd();
   // False at the end of its output or at the deadline.
   bool ReadMore( std::chrono::steady_clock::time_point i_Deadline );
 
