@@ -50,27 +50,15 @@ protected:
   // Streams pictures and sound, and keeps them.
   void Begin( uint32_t i_Mode, uint32_t i_PixelFormat = PixelFormat::YUV8Bit, uint32_t i_Flags = InputFlag::Default )
   {
-    m_Client.m_OnFrame = [this]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
-    {
-      m_Client.m_Seen.push_back( Look( *i_pFrame, i_pPacket ) );
-      const TestSupport::VPixels Pixels = PixelsOf( *i_pFrame );
-      m_Video.insert( m_Video.end(), Pixels.m_pBytes, Pixels.m_pBytes + Pixels.m_RowBytes * static_cast<size_t>( i_pFrame->GetHeight() ) );
-      if( i_pPacket )
-      {
-        void* pBytes = nullptr;
-        EXPECT_EQ( i_pPacket->GetBytes( &pBytes ), S_OK );
-        const uint8_t* pSound = static_cast<const uint8_t*>( pBytes );
-        m_Sound.insert( m_Sound.end(), pSound, pSound + i_pPacket->GetSampleFrameCount() * 2 * 4 );
-      }
-    };
+    m_Client.Record( 2 * 4 );
     Enable( i_Mode, i_PixelFormat, i_Flags );
     ASSERT_EQ( m_pInput->EnableAudioInput( 48000, AudioSampleType::Int32, 2 ), S_OK );
     Start();
   }
 
   const TestSupport::VTemporaryFolder m_Folder;
-  VBytes m_Video;
-  VBytes m_Sound;
+  VBytes& m_rVideo = m_Client.m_Video;
+  VBytes& m_rSound = m_Client.m_Sound;
 };
 
 // The same bytes again without a gap
@@ -107,15 +95,15 @@ TEST_F( DeckLinkClip, PicturesAndSoundArriveUnchangedInEveryFormatAndLoopWithout
   for( const auto& [Format, pCodec, pLayout] : Cases )
   {
     RunFFmpeg( { "-i", Clip, "-map", "0:v", "-c:v", pCodec, "-pix_fmt", pLayout, "-f", "rawvideo", File( "raw" ) } );
-    m_Video.clear();
-    m_Sound.clear();
+    m_rVideo.clear();
+    m_rSound.clear();
 
     // The nearest standard is the clip's own; another format begins it again
     Begin( FourCharacterCode( "hp50" ), Format );
     Step( 2 * ClipFrames );
     m_pInput->StopStreams();
-    ExpectTwice( ReadFile( File( "raw" ) ), m_Video );
-    ExpectTwice( Sound, m_Sound );
+    ExpectTwice( ReadFile( File( "raw" ) ), m_rVideo );
+    ExpectTwice( Sound, m_rSound );
   }
   EXPECT_EQ( m_Client.m_Seen.back().m_StreamTime, ( 2 * ClipFrames - 1 ) * 2700000 );
 }
@@ -125,9 +113,9 @@ TEST_F( DeckLinkClip, WithoutALoopTheSignalIsLostAtTheEndAndMissingSoundIsSilent
   Plug( "decklink:loop=0,input=" + MakeClip( "720x576", "25", 4, 0.06 ) );
   Begin( FourCharacterCode( "pal " ) );
   Step( 4 );
-  ASSERT_EQ( m_Sound.size(), 4u * 1920 * 8 );
-  const auto LastSound = std::find_if( m_Sound.rbegin(), m_Sound.rend(), []( uint8_t i_Byte ) { return i_Byte != 0; } );
-  EXPECT_NEAR( static_cast<double>( m_Sound.rend() - LastSound ), 0.06 * 48000 * 8, 8 );
+  ASSERT_EQ( m_rSound.size(), 4u * 1920 * 8 );
+  const auto LastSound = std::find_if( m_rSound.rbegin(), m_rSound.rend(), []( uint8_t i_Byte ) { return i_Byte != 0; } );
+  EXPECT_NEAR( static_cast<double>( m_rSound.rend() - LastSound ), 0.06 * 48000 * 8, 8 );
   EXPECT_TRUE( m_Client.m_Seen.back().m_bSignal );
   Step();
   EXPECT_FALSE( m_Client.m_Seen.back().m_bSignal );
@@ -145,9 +133,9 @@ TEST_F( DeckLinkClip, AnotherSizeAndRateAreFittedIntoTheStandard )
   Begin( FourCharacterCode( "hp60" ) );
   Step( 57 );
   constexpr size_t PictureBytes = 1280 * 720 * 2;
-  ASSERT_EQ( m_Video.size(), 57 * PictureBytes );
+  ASSERT_EQ( m_rVideo.size(), 57 * PictureBytes );
   EXPECT_TRUE( m_Client.m_Seen[56].m_bSignal );
-  const auto PictureAt = [&]( size_t i_Number ) { return m_Video.data() + i_Number * PictureBytes; };
+  const auto PictureAt = [&]( size_t i_Number ) { return m_rVideo.data() + i_Number * PictureBytes; };
   const auto Equal = [&]( size_t i_A, size_t i_B ) { return std::memcmp( PictureAt( i_A ), PictureAt( i_B ), PictureBytes ) == 0; };
   const TestSupport::VPixels Pixels{ KVZ::IPixelFormat::EU8Y8V8Y8, PictureAt( 20 ), 1280 * 2 };
   for( const uint32_t x : { 0u, 150u, 1130u, 1279u } )
@@ -176,7 +164,8 @@ TEST_F( DeckLinkClip, AFormatEventShowsTheClipInTheNewStandard )
   ASSERT_EQ( m_Client.m_Seen.size(), 4u );
   EXPECT_TRUE( m_Client.m_Seen[3].m_bSignal );
   EXPECT_EQ( m_Client.m_Seen[3].m_Height, 576 );
-  EXPECT_EQ( TestSupport::ReadRamp( { m_Sound.data(), 2 * 960 + 2 * 1920, 2, 4 }, 2 ), 0 ) << "sound that is asked for takes the place of the clip's";
+  EXPECT_EQ( TestSupport::ReadRamp( { m_rSound.data(), 2 * 960 + 2 * 1920, 2, 4 }, 2 ), 0 )
+    << "sound that is asked for takes the place of the clip's";
 }
 
 TEST( ClipInput, WhatCannotBeOpenedIsRefusedWithFFmpegsReason )
@@ -211,31 +200,21 @@ TEST( ClipInput, OptionsAreSplitAsAShellWould )
 
 TEST( ClipInput, NearestStandardGoesBySizeThenRateThenScan )
 {
-  const struct
-  {
-    uint32_t m_Width;
-    uint32_t m_Height;
-    double m_FrameRate;
-    IVideoStandard::Enum m_Nearest;
-    bool m_bInterlaced = false;
-    const char* m_pKind = "decklink";
-  } Cases[] = {
-    { 1920, 1080, 25, IVideoStandard::EHD_1920_1080P_2500 },
-    { 1920, 1080, 25, IVideoStandard::EHD_1920_1080I_5000, true },
-    { 1920, 1080, 30000.0 / 1001, IVideoStandard::EHD_1920_1080P_2997 },
-    { 1920, 1080, 23.976, IVideoStandard::EHD_1920_1080P_2398 },
-    { 1920, 1088, 24, IVideoStandard::EHD_1920_1080P_2400 },
-    { 1280, 720, 25, IVideoStandard::EHD_1280_720P_5000 },
-    { 1280, 720, 25, IVideoStandard::EHD_1280_720P_2500, false, "bluefish444" },
-    { 0, 0, 0, DefaultStandard },
-  };
-  for( const auto& rCase : Cases )
+  const auto Nearest = []( uint32_t i_Width, uint32_t i_Height, double i_Rate, bool i_bInterlaced = false, const char* i_pKind = "decklink" )
   {
     VClipInput Input;
-    Input.m_Width = rCase.m_Width;
-    Input.m_Height = rCase.m_Height;
-    Input.m_FrameRate = rCase.m_FrameRate;
-    Input.m_bInterlaced = rCase.m_bInterlaced;
-    EXPECT_EQ( NearestStandard( *FindCardKind( rCase.m_pKind ), Input ), rCase.m_Nearest );
-  }
+    Input.m_Width = i_Width;
+    Input.m_Height = i_Height;
+    Input.m_FrameRate = i_Rate;
+    Input.m_bInterlaced = i_bInterlaced;
+    return NearestStandard( *FindCardKind( i_pKind ), Input );
+  };
+  EXPECT_EQ( Nearest( 1920, 1080, 25 ), IVideoStandard::EHD_1920_1080P_2500 );
+  EXPECT_EQ( Nearest( 1920, 1080, 25, true ), IVideoStandard::EHD_1920_1080I_5000 );
+  EXPECT_EQ( Nearest( 1920, 1080, 30000.0 / 1001 ), IVideoStandard::EHD_1920_1080P_2997 );
+  EXPECT_EQ( Nearest( 1920, 1080, 23.976 ), IVideoStandard::EHD_1920_1080P_2398 );
+  EXPECT_EQ( Nearest( 1920, 1088, 24 ), IVideoStandard::EHD_1920_1080P_2400 );
+  EXPECT_EQ( Nearest( 1280, 720, 25 ), IVideoStandard::EHD_1280_720P_5000 );
+  EXPECT_EQ( Nearest( 1280, 720, 25, false, "bluefish444" ), IVideoStandard::EHD_1280_720P_2500 );
+  EXPECT_EQ( Nearest( 0, 0, 0 ), DefaultStandard );
 }

@@ -82,8 +82,6 @@ struct VSeen
   int64_t m_Duration = 0;
   std::string m_Timecode;   // of any RP188 packet; empty for none
   uint32_t m_TimecodeFlags = 0;
-  bool m_bPacket = false;
-  long m_Samples = 0;
 };
 
 inline KVZ::IPixelFormat::Enum LayoutOf( uint32_t i_PixelFormat )
@@ -103,7 +101,7 @@ inline TestSupport::VPixels PixelsOf( IDeckLinkVideoInputFrame& i_rFrame )
   return { LayoutOf( i_rFrame.GetPixelFormat() ), static_cast<const uint8_t*>( pBytes ), static_cast<size_t>( i_rFrame.GetRowBytes() ) };
 }
 
-inline VSeen Look( IDeckLinkVideoInputFrame& i_rFrame, IDeckLinkAudioInputPacket* i_pPacket )
+inline VSeen Look( IDeckLinkVideoInputFrame& i_rFrame )
 {
   VSeen Seen;
   Seen.m_Flags = i_rFrame.GetFlags();
@@ -123,8 +121,6 @@ inline VSeen Look( IDeckLinkVideoInputFrame& i_rFrame, IDeckLinkAudioInputPacket
     Seen.m_TimecodeFlags = pTimecode->GetFlags();
     pTimecode->Release();
   }
-  Seen.m_bPacket = i_pPacket != nullptr;
-  Seen.m_Samples = i_pPacket ? i_pPacket->GetSampleFrameCount() : 0;
   return Seen;
 }
 
@@ -172,11 +168,26 @@ public:
     return E_FAIL;   // nobody looks at it
   }
 
-  // Keeps what every frame showed.
-  void Record()
+  // Keeps what every frame showed, with its content where the bytes of a sample of all channels are given.
+  void Record( size_t i_SampleBytes = 0 )
   {
-    m_OnFrame = [this]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
-    { m_Seen.push_back( Look( *i_pFrame, i_pPacket ) ); };
+    m_OnFrame = [this, i_SampleBytes]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* i_pPacket )
+    {
+      m_Seen.push_back( Look( *i_pFrame ) );
+      m_Packets += i_pPacket ? 1 : 0;
+      if( i_SampleBytes > 0 )
+      {
+        void* pSound = nullptr;
+        ASSERT_EQ( i_pPacket->GetBytes( &pSound ), S_OK );
+        Append( m_Sound, pSound, static_cast<size_t>( i_pPacket->GetSampleFrameCount() ) * i_SampleBytes );
+        Append( m_Video, PixelsOf( *i_pFrame ).m_pBytes, static_cast<size_t>( i_pFrame->GetRowBytes() * i_pFrame->GetHeight() ) );
+      }
+    };
+  }
+  static void Append( std::vector<uint8_t>& io_rBytes, const void* i_pMore, size_t i_Size )
+  {
+    const auto* const pMore = static_cast<const uint8_t*>( i_pMore );
+    io_rBytes.insert( io_rBytes.end(), pMore, pMore + i_Size );
   }
 
   std::function<void( uint32_t )> m_OnFormat;
@@ -186,6 +197,9 @@ public:
   uint32_t m_LastEvents = 0;
   uint32_t m_LastDetected = 0;
   std::vector<VSeen> m_Seen;
+  int m_Packets = 0;
+  std::vector<uint8_t> m_Video;
+  std::vector<uint8_t> m_Sound;
 };
 
 // One card in the machine, found through the iterator. Whatever a test does, it must leave nothing behind.

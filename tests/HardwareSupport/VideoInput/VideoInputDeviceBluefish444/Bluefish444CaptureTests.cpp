@@ -105,16 +105,6 @@ TEST_F( Bluefish444Device, ASignalThatGoesTakesItsTimecodeAlong )
   EXPECT_EQ( Fired(), ( VFired{ { "standard", 1 }, { "timecode", 1 } } ) );
 }
 
-TEST_F( Bluefish444Device, AnotherModeIsSetUpBeforeItsFirstFrame )
-{
-  MakeCapturing();
-  m_Card.m_Mode = Mode720p5994;
-  const VReceivedFrame Frame = ResumeUntilFrame();
-  EXPECT_EQ( Frame.m_Period, 2252250 );
-  EXPECT_EQ( Frame.m_Header.m_VideoInfo.m_InterlacedFormat, KVZ::IInterlacedFormat::ENotInterlaced );
-  EXPECT_EQ( Fired(), ( VFired{ { "standard", 1 } } ) );
-}
-
 // A card that is taken out fails every call; one that comes back is used again.
 TEST_F( Bluefish444Device, ALostCardIsALostSignalUntilItComesBack )
 {
