@@ -27,6 +27,15 @@ protected:
   // The writing thread's turn.
   void Write() { m_Rig.m_pWriterService->RunAll(); }
   KVZ::ICaptureStatus Status() { return m_pSource->GetCaptureStatus(); }
+  void ExpectFailed( const std::string& i_rError )
+  {
+    EXPECT_EQ( Status().m_Errors, std::vector<std::string>{ i_rError } );
+    EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
+    EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+  }
+  std::vector<StageCorePluginInterface::VCaptureFileReport> Reports() const { return m_Rig.m_pTargets->Reports(); }
+  std::string CreateError() const { return "Could not create capture file: \"" + m_Rig.Path() + "\""; }
+  std::string WriteError() const { return "Failed attempting to write data to file \"" + m_Rig.Path() + "\""; }
   VFakeFile& File( const std::string& i_rExtension = "tvid" ) { return ( *m_Rig.m_pDisk )[m_Rig.Path( "Take", i_rExtension )]; }
   void UseTwoContainers() { m_Rig.m_pTargets->m_Containers = { KVZ::IVideoContainer::EMOV, KVZ::IVideoContainer::ETVID }; }
 
@@ -51,6 +60,10 @@ TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
     ASSERT_EQ( rFile.m_Sound.at( Index ).size(), 160u );
     EXPECT_EQ( rFile.m_Sound.at( Index )[7], Index + 4 + 7 );
   }
+  SyncSystem::VToken Token{ KVZ::VBufferSessionId( 1 ), 5, nullptr };
+  SyncSystem::VRefCountedToken Frame;
+  ASSERT_TRUE( m_pSource->Buffer()->Read( Token, Frame ) );
+  EXPECT_EQ( rFile.m_Addresses.at( 0 ), VVideoInputDataSource::FrameOf( Frame.Frame() )->Image() ) << "handed on without a copy";
   EXPECT_EQ( rFile.m_Closes, 1 );
   EXPECT_EQ( rFile.m_Timing, ( KVZ::VTimingRecord{ 135000000, 5400000, At( 4 ).Count() } ) );
   EXPECT_EQ( KVZ::ToText( rFile.m_Timecode ), "10:00:00:04" );
@@ -61,8 +74,8 @@ TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
   EXPECT_TRUE( Log.Has( "Writing file with start timecode = 10:0:0:4 . 0" ) );
   EXPECT_TRUE( Log.Has( "Client 1 finished writing 0.4 seconds of data." ) );
 
-  ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
-  const auto Report = m_Rig.m_pTargets->Reports()[0];
+  ASSERT_EQ( Reports().size(), 1u );
+  const auto Report = Reports()[0];
   EXPECT_EQ( Report.m_Path, m_Rig.Path() );
   EXPECT_EQ( Report.m_CaptureSessionId, KVZ::VCaptureSessionId( 3 ) );
   EXPECT_EQ( Report.m_DeviceURN, "vi:0" );
@@ -73,16 +86,6 @@ TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
   EXPECT_EQ( KVZ::ToText( Report.m_StartTimecode ), "10:00:00:04" );
   EXPECT_EQ( Status().m_State, ECaptureState::Complete );
   EXPECT_EQ( Status().m_Failure, ECaptureFailure::None );
-}
-
-TEST_F( BufferClient, HandsTheStoredBytesOnWithoutACopy )
-{
-  Start( 1, 2, 6 );
-  SyncSystem::VToken Token{ KVZ::VBufferSessionId( 1 ), 3, nullptr };
-  SyncSystem::VRefCountedToken Frame;
-  ASSERT_TRUE( m_pSource->Buffer()->Read( Token, Frame ) );
-  Write();
-  EXPECT_EQ( File().m_Addresses.at( 0 ), VVideoInputDataSource::FrameOf( Frame.Frame() )->Image() );
 }
 
 TEST_F( BufferClient, KeepsTheChannelsThatTheTargetAsksFor )
@@ -122,57 +125,45 @@ TEST_F( BufferClient, OneFileThatFailsEndsTheClientAndClosesTheOther )
   EXPECT_EQ( File( "tvid" ).m_Frames.size(), 3u );
   EXPECT_EQ( File( "tvid" ).m_Closes, 1 ) << "playable up to there";
   EXPECT_TRUE( Log.Has( "Error writing capture file with container format 'TVID'." ) );
-  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
-  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Failed attempting to write data to file \"" + m_Rig.Path() + "\"" } ) );
-  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
-  const auto Reports = m_Rig.m_pTargets->Reports();
-  ASSERT_EQ( Reports.size(), 2u );
-  EXPECT_FALSE( Reports[0].m_bFailed );
-  EXPECT_EQ( Reports[0].m_FramesWritten, 4u );
-  EXPECT_TRUE( Reports[1].m_bFailed );
-  EXPECT_EQ( Reports[1].m_FramesWritten, 3u );
-  EXPECT_EQ( Reports[1].m_Error, Status().m_Errors[0] );
+  ExpectFailed( WriteError() );
+  ASSERT_EQ( Reports().size(), 2u );
+  EXPECT_FALSE( Reports()[0].m_bFailed );
+  EXPECT_EQ( Reports()[0].m_FramesWritten, 4u );
+  EXPECT_TRUE( Reports()[1].m_bFailed );
+  EXPECT_EQ( Reports()[1].m_FramesWritten, 3u );
+  EXPECT_EQ( Reports()[1].m_Error, WriteError() );
 }
 
-// Wherever the writer fails, the capture says so once, with the path, and nothing stays open.
+// Wherever the writer fails, or memory runs out beside it, the capture says so once and nothing stays open.
 TEST_F( BufferClient, AFailureAnywhereIsTold )
 {
-  for( uint64_t Call = 0; Call <= 6; ++Call )
+  const uint64_t AtClose = VFakeFile::Never;
+  const struct
   {
-    SCOPED_TRACE( Call );
+    uint64_t m_FailingCall;
+    uint64_t m_FramesWritten;
+    std::string m_Error;
+    bool m_bThrows = false;
+  } Cases[] = { { 0, 0, CreateError() }, { 1, 0, WriteError() }, { 2, 0, WriteError() }, { 3, 1, WriteError() }, { 4, 2, WriteError() },
+    { 5, 3, WriteError() }, { AtClose, 3, WriteError() }, { 3, 1, "A frame could not be prepared for its files: std::bad_alloc", true } };
+  for( uint32_t Id = 1; const auto& rCase : Cases )
+  {
+    SCOPED_TRACE( Id );
     m_Rig.m_pDisk->clear();
-    File().m_FailingCall = Call == 6 ? VFakeFile::Never : Call;
-    File().m_bCloseFails = Call == 6;
-    File().m_IncompleteFrames = Call == 6 ? 1 : 0;
-    const size_t ReportsBefore = m_Rig.m_pTargets->Reports().size();
-    Start( static_cast<uint32_t>( Call + 1 ), 0, 4 );
+    File().m_FailingCall = rCase.m_FailingCall;
+    File().m_bThrows = rCase.m_bThrows;
+    File().m_bCloseFails = rCase.m_FailingCall == AtClose;
+    File().m_IncompleteFrames = rCase.m_FailingCall == AtClose ? 1 : 0;   // the last of four is not whole
+    Start( Id, 0, 4 );
     Write();
-    const std::string Expected = Call == 0 ? "Could not create capture file: \"" + m_Rig.Path() + "\""
-                                           : "Failed attempting to write data to file \"" + m_Rig.Path() + "\"";
-    EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ Expected } ) );
-    EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
-    EXPECT_EQ( Status().m_State, ECaptureState::Complete );
+    ExpectFailed( rCase.m_Error );
     EXPECT_FALSE( File().m_bOpen );
-    EXPECT_EQ( File().m_Closes, Call == 0 ? 0 : 1 );
-    ASSERT_EQ( m_Rig.m_pTargets->Reports().size(), ReportsBefore + 1 );
-    const auto Report = m_Rig.m_pTargets->Reports().back();
-    EXPECT_TRUE( Report.m_bFailed );
-    EXPECT_EQ( Report.m_Error, Expected );
-    EXPECT_EQ( Report.m_FramesWritten, Call < 2 ? 0 : std::min<uint64_t>( Call - 2, 3 ) ) << "the last of four is not whole";
+    EXPECT_EQ( File().m_Closes, rCase.m_FailingCall == 0 ? 0 : 1 );
+    ASSERT_EQ( Reports().size(), Id++ );
+    EXPECT_TRUE( Reports().back().m_bFailed );
+    EXPECT_EQ( Reports().back().m_Error, rCase.m_Error );
+    EXPECT_EQ( Reports().back().m_FramesWritten, rCase.m_FramesWritten );
   }
-}
-
-TEST_F( BufferClient, MemoryThatRunsOutBesideAWriterEndsTheCapture )
-{
-  File().m_FailingCall = 2 + 1;
-  File().m_bThrows = true;
-  Start( 1, 0, 4 );
-  Write();
-  EXPECT_EQ( Status().m_Errors.size(), 1u );
-  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
-  EXPECT_EQ( Status().m_State, ECaptureState::Complete );
-  EXPECT_EQ( File().m_Closes, 1 );
-  EXPECT_EQ( m_Rig.m_pTargets->Reports().at( 0 ).m_FramesWritten, 1u );
 }
 
 TEST_F( BufferClient, FailingToMakeOneOfTwoFilesWritesNeither )
@@ -181,11 +172,11 @@ TEST_F( BufferClient, FailingToMakeOneOfTwoFilesWritesNeither )
   File( "tvid" ).m_FailingCall = 0;
   Start( 1, 0, 4 );
   Write();
-  EXPECT_EQ( Status().m_Errors, ( std::vector<std::string>{ "Could not create capture file: \"" + m_Rig.Path() + "\"" } ) );
+  ExpectFailed( CreateError() );
   EXPECT_EQ( File( "mov" ).m_Closes, 1 );
   EXPECT_TRUE( File( "mov" ).m_Frames.empty() );
-  EXPECT_FALSE( m_Rig.m_pTargets->Reports().at( 0 ).m_bFailed );
-  EXPECT_TRUE( m_Rig.m_pTargets->Reports().at( 1 ).m_bFailed );
+  EXPECT_FALSE( Reports().at( 0 ).m_bFailed );
+  EXPECT_TRUE( Reports().at( 1 ).m_bFailed );
 }
 
 TEST_F( BufferClient, AnotherFormatInMidCaptureEndsItAndNamesBoth )
@@ -199,8 +190,8 @@ TEST_F( BufferClient, AnotherFormatInMidCaptureEndsItAndNamesBoth )
   EXPECT_EQ( File().m_Closes, 1 );
   EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
   EXPECT_EQ( Status().m_Errors,
-    ( std::vector<std::string>{ "Failed attempting to write data to file \"" + m_Rig.Path() +
-      "\": the format of the frames changed from 8 x 4 U8Y8V8Y8, 4 channels of Int16 at 48000 Hz to 16 x 4 R8G8B8, 4 channels of Int16 at 48000 Hz" } ) );
+    std::vector<std::string>{ WriteError() +
+      ": the format of the frames changed from 8 x 4 U8Y8V8Y8, 4 channels of Int16 at 48000 Hz to 16 x 4 R8G8B8, 4 channels of Int16 at 48000 Hz" } );
 
   m_Rig.OnStrand( *m_pSource, [&] { m_pSource->EndCapture( VTick::Open() ); } );
   m_Rig.m_Format = {};
@@ -213,7 +204,7 @@ TEST_F( BufferClient, AnotherFormatInMidCaptureEndsItAndNamesBoth )
   EXPECT_NE( Status().m_Errors[0].find( "to 8 x 4 U8Y8V8Y8 without audio" ), std::string::npos ) << Status().m_Errors[0];
 }
 
-TEST_F( BufferClient, ACancelledWaitMakesNoFile )
+TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWrittenIfAnything )
 {
   const TestSupport::VLogCapture Log( "VideoInputDataSource" );
   Start( 1, 20, 30 );
@@ -222,23 +213,19 @@ TEST_F( BufferClient, ACancelledWaitMakesNoFile )
   EXPECT_EQ( Log.Texts(), ( std::vector<std::string>{ "Client 1 cancelled after writing 0 seconds of data." } ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
   EXPECT_TRUE( m_Rig.m_pDisk->empty() );
-  EXPECT_TRUE( m_Rig.m_pTargets->Reports().empty() );
-}
+  EXPECT_TRUE( Reports().empty() );
 
-TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWritten )
-{
-  const TestSupport::VLogCapture Log( "VideoInputDataSource" );
-  Start( 1, 0, 30 );
+  Start( 2, 0, 30 );
   Write();
   m_Rig.Cancel( *m_pSource );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelling );
   m_Rig.DeliverMany( 2 );
   Write();
-  EXPECT_TRUE( Log.Has( "Client 1 cancelled after writing 0.4 seconds of data." ) );
+  EXPECT_TRUE( Log.Has( "Client 2 cancelled after writing 0.4 seconds of data." ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
   EXPECT_EQ( File().m_Frames.size(), 10u );
   EXPECT_EQ( File().m_Closes, 1 );
-  EXPECT_EQ( m_Rig.m_pTargets->Reports().at( 0 ).m_FramesWritten, 10u );
+  EXPECT_EQ( Reports().at( 0 ).m_FramesWritten, 10u );
 }
 
 TEST_F( BufferClient, TargetsThatCannotBeHadAreTold )
@@ -257,7 +244,7 @@ TEST_F( BufferClient, TargetsThatCannotBeHadAreTold )
   Write();
   EXPECT_TRUE( Log.Has( "Unsupported video container format for capture." ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Idle );
-  EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+  EXPECT_EQ( Reports().size(), 1u );
 }
 
 TEST_F( BufferClient, ASourceThatGoesClosesItsFile )
@@ -268,9 +255,9 @@ TEST_F( BufferClient, ASourceThatGoesClosesItsFile )
   m_Rig.m_pSource.reset();
   m_pSource.reset();
   EXPECT_EQ( File().m_Closes, 1 );
-  EXPECT_EQ( m_Rig.m_pTargets->Reports().at( 0 ).m_FramesWritten, 10u );
+  EXPECT_EQ( Reports().at( 0 ).m_FramesWritten, 10u );
   Write();
-  EXPECT_EQ( m_Rig.m_pTargets->Reports().size(), 1u );
+  EXPECT_EQ( Reports().size(), 1u );
 }
 
 }
