@@ -16,6 +16,7 @@
 
 using KVZ::Variant;
 using VTexts = std::vector<std::string>;
+using VPaths = std::vector<VDataPath>;
 
 namespace
 {
@@ -36,9 +37,11 @@ protected:
     VDevice Device;
     const VDataPath Path{ "VideoInput", i_rURN };
     Device.m_pGroup = std::make_shared<VParameterGroup>( m_pStore, Path, VDataPath{ "Attributes" } + Path );
-    Device.m_pName = Make( Path, "Name" );
-    Device.m_pPayload = Make( Path, "Payload" );
-    Device.m_pStatus = Make( Path, "Status" );
+    const auto Make = [&]( const char* i_pKey )
+    { return KVZ::MakeShared<VParameter>( m_pStore, GetParameterChecker<std::string>(), Path + "Settings", i_pKey ); };
+    Device.m_pName = Make( "Name" );
+    Device.m_pPayload = Make( "Payload" );
+    Device.m_pStatus = Make( "Status" );
     Device.m_pStatus->SetReadOnly( true );
     for( const auto& pParameter : { Device.m_pName, Device.m_pPayload, Device.m_pStatus } )
     {
@@ -53,15 +56,6 @@ protected:
   {
     Variant Value;
     return i_pParameter->GetValue( Value ) ? Value.ToText() : "none";
-  }
-  static VTexts Texts( const std::vector<VDataPath>& i_rPaths )
-  {
-    VTexts Result;
-    for( const VDataPath& rPath : i_rPaths )
-    {
-      Result.push_back( rPath.ToString() );
-    }
-    return Result;
   }
   static VTexts Texts( const std::vector<StageHost::VSettingChange>& i_rChanges )
   {
@@ -78,12 +72,6 @@ protected:
   StageHost::VParameterRegistry m_Registry;
   StageHost::VDeviceSettings m_Settings{ m_pStore, m_Registry };
   std::string m_Error;
-
-private:
-  std::shared_ptr<VParameter> Make( const VDataPath& i_rDevice, const std::string& i_rKey ) const
-  {
-    return KVZ::MakeShared<VParameter>( m_pStore, GetParameterChecker<std::string>(), i_rDevice + "Settings", i_rKey );
-  }
 };
 
 }
@@ -99,14 +87,13 @@ TEST_F( Settings, ResetGoesBackAtOnceToTheDefaultThatIsAllowed )
   VTexts Heard;
   First.m_pName->GetValueChangedCallback().AddImmediate( [&] { Heard.push_back( Text( First.m_pName ) ); } );
 
-  EXPECT_EQ( Texts( m_Settings.Reset( "VideoInput.vi:0", m_Error ) ),
-    ( VTexts{ "VideoInput.vi:0.Settings.Name", "VideoInput.vi:0.Settings.Payload" } ) );
+  EXPECT_EQ( m_Settings.Reset( "VideoInput.vi:0", m_Error ), ( VPaths{ m_Path + "Name", m_Path + "Payload" } ) );
   EXPECT_EQ( Heard, VTexts{ "default" } );
   EXPECT_EQ( Text( First.m_pPayload ), "a" );
   EXPECT_EQ( Text( First.m_pStatus ), "set" );
   EXPECT_EQ( Text( Second.m_pName ), "set" );
 
-  EXPECT_EQ( Texts( m_Settings.Reset( "VideoInput.vi:1.Settings.Name", m_Error ) ), ( VTexts{ "VideoInput.vi:1.Settings.Name" } ) );
+  EXPECT_EQ( m_Settings.Reset( "VideoInput.vi:1.Settings.Name", m_Error ), ( VPaths{ { "VideoInput", "vi:1", "Settings", "Name" } } ) );
   EXPECT_EQ( Text( Second.m_pName ), "none" ) << "there is no default";
   EXPECT_EQ( Text( Second.m_pPayload ), "set" );
 

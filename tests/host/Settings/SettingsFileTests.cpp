@@ -75,18 +75,19 @@ protected:
 
 }
 
+// A proposal too: the device then has its own say about it.
 TEST_F( SettingsFile, ValuesComeBackAsTheyWere )
 {
-  const double Ratio = 12.0 / 11.0;
-  const int64_t Offset = std::numeric_limits<int64_t>::min();
-  Put( "Ratio", Ratio );
-  Put( "Offset", Offset );
+  Put( "Ratio", 12.0 / 11.0 );
+  Put( "Offset", std::numeric_limits<int64_t>::min() );
   Put( "Odd", std::numeric_limits<double>::infinity() );
   Put( "Name", std::string( "C1 \"left\"\n\xc3\xa9.*" ) );
   Put( "Enabled", false );
   Put( "Format", KVZ::IPixelFormat::EU10Y10V10Y10 );
   Put( "Number", std::string( "5" ) );
-  const VTexts Keys = { "Ratio", "Offset", "Odd", "Name", "Enabled", "Format", "Number" };
+  Put( "Gain", 1, DataFlags::VerifyRequired );
+  VDataVerifyWriter( m_Store ).SetProposedValue( m_Device + "Gain", Variant::Make( 2 ) );
+  const VTexts Keys = { "Ratio", "Offset", "Odd", "Name", "Enabled", "Format", "Number", "Gain" };
   ASSERT_TRUE( Save( Keys ) ) << m_Error;
 
   // What is not the user's is never kept.
@@ -95,32 +96,17 @@ TEST_F( SettingsFile, ValuesComeBackAsTheyWere )
   ASSERT_TRUE( Save( { "Status", "Password" } ) ) << m_Error;
   EXPECT_EQ( ReadJson()["settings"].size(), Keys.size() );
   EXPECT_EQ( Restore(), VTexts() );
+  const VDataVerifyReader Reader( m_Restored );
   for( const std::string& rKey : Keys )
   {
-    EXPECT_EQ( VDataReader( m_Restored ).GetValue( m_Device + rKey ), VDataReader( m_Store ).GetValue( m_Device + rKey ) ) << rKey;
+    EXPECT_EQ( Reader.GetValue( m_Device + rKey ), VDataReader( m_Store ).GetValue( m_Device + rKey ) ) << rKey;
+    EXPECT_EQ( Reader.IsSettled( m_Device + rKey ), rKey != "Gain" ) << rKey;
   }
+  Variant Proposed;
+  EXPECT_TRUE( Reader.GetProposedValue( m_Device + "Gain", Proposed ) );
+  EXPECT_EQ( Proposed, Variant::Make( 2 ) );
   EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Format"]["value"], "U10Y10V10Y10" ) << "names, not numbers";
   EXPECT_EQ( ReadJson()["settings"]["VideoInput.vi:0.Settings.Enabled"]["value"], false );
-}
-
-// The device then has its own say about the proposal.
-TEST_F( SettingsFile, AVerifiedValueKeepsBothFormsAndWaits )
-{
-  {
-    VDataVerifyWriter Writer( m_Store );
-    Writer.SetValueFlags( m_Device + "Gain", DataFlags::VerifyRequired );
-    Writer.SetVerifiedValue( m_Device + "Gain", Variant::Make( 1 ) );
-    Writer.SetProposedValue( m_Device + "Gain", Variant::Make( 2 ) );
-  }
-  ASSERT_TRUE( Save( { "Gain" } ) ) << m_Error;
-  EXPECT_EQ( Restore(), VTexts() );
-  Variant Verified;
-  Variant Proposed;
-  const VDataVerifyReader Reader( m_Restored );
-  EXPECT_TRUE( Reader.GetVerifiedValue( m_Device + "Gain", Verified ) && Reader.GetProposedValue( m_Device + "Gain", Proposed ) );
-  EXPECT_EQ( Verified, Variant::Make( 1 ) );
-  EXPECT_EQ( Proposed, Variant::Make( 2 ) );
-  EXPECT_FALSE( Reader.IsSettled( m_Device + "Gain" ) );
 }
 
 TEST_F( SettingsFile, WhatTheFileCannotHoldIsRefusedAndTheFileStays )
@@ -140,32 +126,28 @@ TEST_F( SettingsFile, WhatIsUnknownStaysInTheFile )
 {
   ASSERT_TRUE( SaveName( "A" ) );
   Put( "Gain", 3 );
-  WriteFile( R"({ "note": [ 1, null ], "settings": {
+  VJson Document = VJson::parse( R"({ "note": [ 1, null ], "settings": {
     "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
     "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "B", "who": "me" },
     "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
     "VideoInput..vi:0.Settings.Name": { "type": "string", "value": "not the place of Name" },
     "Attributes.VideoInput.vi:0.Settings.Name.Max": { "type": "string", "value": "A" },
     "": 5 } })" );
+  WriteFile( Document.dump() );
   EXPECT_EQ( Restore().size(), 5u );
   EXPECT_EQ( Text( "Name" ), "B" );
   EXPECT_EQ( VDataReader( m_Restored ).CountValues( VDataPath{ "Attributes" } ), 0u );
   EXPECT_FALSE( VDataReader( m_Restored ).Exists( m_Device + "Old" ) );
 
   ASSERT_TRUE( Save( { "Name", "Gain" } ) ) << m_Error;
-  VJson Expected = VJson::parse( R"({ "note": [ 1, null ], "version": 1, "settings": {
-    "VideoInput.vi:7.Settings.Lens": { "type": "Lens.Enum", "value": "Wide" },
-    "VideoInput.vi:0.Settings.Name": { "type": "string", "value": "A", "who": "me" },
-    "VideoInput.vi:0.Settings.Old": { "type": "uint32", "value": -1 },
-    "VideoInput..vi:0.Settings.Name": { "type": "string", "value": "not the place of Name" },
-    "Attributes.VideoInput.vi:0.Settings.Name.Max": { "type": "string", "value": "A" },
-    "VideoInput.vi:0.Settings.Gain": { "type": "int32", "value": 3 },
-    "": 5 } })" );
-  EXPECT_EQ( ReadJson(), Expected );
+  Document["version"] = 1;
+  Document["settings"]["VideoInput.vi:0.Settings.Name"]["value"] = "A";
+  Document["settings"]["VideoInput.vi:0.Settings.Gain"] = { { "type", "int32" }, { "value", 3 } };
+  EXPECT_EQ( ReadJson(), Document );
 
   ASSERT_TRUE( m_File.Remove( { m_Device + "Name" }, m_Error ) ) << m_Error;
-  Expected["settings"].erase( "VideoInput.vi:0.Settings.Name" );
-  EXPECT_EQ( ReadJson(), Expected );
+  Document["settings"].erase( "VideoInput.vi:0.Settings.Name" );
+  EXPECT_EQ( ReadJson(), Document );
 }
 
 TEST_F( SettingsFile, ADamagedFileIsSetAsideOnce )
