@@ -5,6 +5,7 @@
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/FakeHost.h"
 
+#include <boost/algorithm/string/join.hpp>
 #include <gtest/gtest.h>
 
 namespace
@@ -35,12 +36,7 @@ public:
   void AddCommand( const std::string& i_rKey, const std::vector<std::string>& i_rSections, const std::string& i_rText,
     const std::string& i_rShortcut ) override
   {
-    std::string Sections;
-    for( const std::string& rSection : i_rSections )
-    {
-      Sections += "[" + rSection + "]";
-    }
-    m_Calls.push_back( "AddCommand " + i_rKey + " " + Sections + " " + i_rText + " (" + i_rShortcut + ")" );
+    m_Calls.push_back( "AddCommand " + i_rKey + " [" + boost::join( i_rSections, "][" ) + "] " + i_rText + " (" + i_rShortcut + ")" );
   }
 
   std::vector<std::string> m_Calls;

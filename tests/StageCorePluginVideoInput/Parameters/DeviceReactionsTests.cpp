@@ -131,19 +131,17 @@ TEST_F( VReactions, APixelFormatThatIsNoLongerOfferedGivesWayToTheFirst )
 TEST_F( VReactions, TheTimecodeSourceDefaultsToTheWidestThatThereIs )
 {
   using E = ITimecodeSource;
-  struct VCase
-  {
-    std::set<E::Enum> m_Sources;
-    E::Enum m_Default;
+  const std::pair<std::set<E::Enum>, E::Enum> Cases[] = {
+    { { E::ERP188_LTC, E::ERP188_Any, E::EAny }, E::EAny }, { { E::ERP188_LTC, E::ERP188_Any }, E::ERP188_Any },
+    { { E::EVITC_Field2, E::ESerial }, E::EVITC_Field2 },
+    { { E::EUnspecified, E::EAny, static_cast<E::Enum>( 9000 ) }, E::EAny },   // two of the same label: no list
   };
-  for( const VCase& rCase : { VCase{ { E::ERP188_LTC, E::ERP188_Any, E::EAny }, E::EAny }, VCase{ { E::ERP188_LTC, E::ERP188_Any }, E::ERP188_Any },
-         VCase{ { E::EVITC_Field2, E::ESerial }, E::EVITC_Field2 },
-         VCase{ { E::EUnspecified, E::EAny, static_cast<E::Enum>( 9000 ) }, E::EAny } } )   // two of the same label: no list
+  for( const auto& [Sources, Default] : Cases )
   {
     VDataWriter( *m_pStore ).RemoveValue( Keys::TimecodeSource( m_Device ) );
-    m_pDevice->m_TimecodeSources = rCase.m_Sources;
+    m_pDevice->m_TimecodeSources = Sources;
     Create();
-    EXPECT_EQ( Value<E::Enum>( "TimecodeSource" ), rCase.m_Default );
+    EXPECT_EQ( Value<E::Enum>( "TimecodeSource" ), Default );
   }
 }
 
