@@ -125,7 +125,7 @@ TEST( PixelFormatConverter, ConvertsEachRowAsTheReferenceDoes )
   }
 }
 
-VBytes SwappedBytes( VBytes i_Pairs )
+VBytes Swapped( VBytes i_Pairs )
 {
   for( size_t Byte = 0; Byte < i_Pairs.size(); Byte += 2 )
   {
@@ -134,62 +134,63 @@ VBytes SwappedBytes( VBytes i_Pairs )
   return i_Pairs;
 }
 
-TEST( PixelFormatConverter, MakesYuvOfColours )
-{
-  const VBytes Colours = {
-    255, 255, 255,   // Y 65535 * 255 / 65536, U and V in the middle
-    255, 255, 255,   //
-    255, 0, 0,       // U: (8388608 - 9642 * 255) / 65536
-    255, 0, 0,       // V: 284, limited
-    0, 255, 0,       // U: (8388608 - 18930 * 255) / 65536
-    0, 255, 0,       // V: -4, limited
-    0, 0, 255,       // U: (8388608 + 28573 * 255) / 65536
-    0, 0, 255,       // V: (8388608 - 6554 * 255) / 65536
-  };
-  const VBytes Expected = { 128, 254, 128, 254, 90, 76, 255, 76, 54, 149, 0, 149, 239, 29, 102, 29 };
-  EXPECT_EQ( Expected, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EU8Y8V8Y8, { 8, 1 } ) );
-  const VBytes Swapped = SwappedBytes( Expected );
-  EXPECT_EQ( Swapped, Convert( IPixelFormat::ER8G8B8, Colours, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
-  EXPECT_EQ( Swapped, Convert( IPixelFormat::EU8Y8V8Y8, Expected, IPixelFormat::EY8U8Y8V8, { 8, 1 } ) );
-}
+const VBytes Colours = {
+  255, 255, 255,   // Y 65535 * 255 / 65536, U and V in the middle
+  255, 255, 255,   //
+  255, 0, 0,       // U: (8388608 - 9642 * 255) / 65536
+  255, 0, 0,       // V: 284, limited
+  0, 255, 0,       // U: (8388608 - 18930 * 255) / 65536
+  0, 255, 0,       // V: -4, limited
+  0, 0, 255,       // U: (8388608 + 28573 * 255) / 65536
+  0, 0, 255,       // V: (8388608 - 6554 * 255) / 65536
+};
+const VBytes YuvOfColours = { 128, 254, 128, 254, 90, 76, 255, 76, 54, 149, 0, 149, 239, 29, 102, 29 };
+const VBytes Pairs = {
+  128, 128, 255, 255,   // R: 128 + 91947 * 127 / 65536, limited; G: 2446024 / 65536; and with Y 255: 10769032 / 65536
+  0, 16, 0, 235,        // R and B limited; G: 9923584 / 65536; then R: 3631744 / 65536, G limited, B: 553216 / 65536
+};
 
-TEST( PixelFormatConverter, MakesColoursOfYuv )
+// A row of each.
+const struct VExample
 {
-  const VBytes Pairs = {
-    128, 128, 255, 255,   // R: 128 + 91947 * 127 / 65536, limited; G: 2446024 / 65536; and with Y 255: 10769032 / 65536
-    0, 16, 0, 235,        // R and B limited; G: 9923584 / 65536; then R: 3631744 / 65536, G limited, B: 553216 / 65536
-  };
-  const VBytes Expected = { 255, 37, 128, 255, 164, 255, 0, 151, 0, 55, 255, 8 };
-  EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::ER8G8B8, { 4, 1 } ) );
-  const VBytes BlueFirst = { 128, 37, 255, 255, 255, 164, 255, 255, 0, 151, 0, 255, 8, 255, 55, 255 };
-  EXPECT_EQ( BlueFirst, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EB8G8R8u8, { 4, 1 } ) );
-}
+  IPixelFormat::Enum m_Source;
+  VBytes m_Pixels;
+  IPixelFormat::Enum m_Target;
+  VBytes m_Expected;
+} Examples[] = {
+  { IPixelFormat::ER8G8B8, Colours, IPixelFormat::EU8Y8V8Y8, YuvOfColours },
+  { IPixelFormat::ER8G8B8, Colours, IPixelFormat::EY8U8Y8V8, Swapped( YuvOfColours ) },
+  { IPixelFormat::EU8Y8V8Y8, YuvOfColours, IPixelFormat::EY8U8Y8V8, Swapped( YuvOfColours ) },
+  { IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::ER8G8B8, { 255, 37, 128, 255, 164, 255, 0, 151, 0, 55, 255, 8 } },
+  { IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EB8G8R8u8, { 128, 37, 255, 255, 255, 164, 255, 255, 0, 151, 0, 255, 8, 255, 55, 255 } },
+  // The last pixel of three has its own U, and the V of the pair before; one alone has the V in the middle.
+  { IPixelFormat::EU8Y8V8Y8, { 128, 100, 200, 100, 90, 100 }, IPixelFormat::ER8G8B8, { 201, 48, 100, 201, 48, 100, 201, 61, 32 } },
+  { IPixelFormat::EY8U8Y8V8, { 100, 90 }, IPixelFormat::ER8G8B8, { 100, 113, 32 } },
+  // U 1023, Y 512, V 0; Y 1023. R: (8388608 - 22986 * 512) / 65536; G: 11497988 / 65536; B: 128 + 28999 * 511 / 65536; then R: 4991999 / 65536
+  { IPixelFormat::EU10Y10V10Y10, { 0xFF, 0x03, 0x08, 0x00, 0xFF, 0x03 }, IPixelFormat::ER8G8B8, { 0, 175, 255, 76, 255, 255 } },
+  { IPixelFormat::ER8G8B8u8, { 1, 2, 251, 9, 255, 255, 255, 0 }, IPixelFormat::ELuminance8, { 84, 255 } },
+  { IPixelFormat::EU8Y8V8Y8, { 1, 7, 2, 9 }, IPixelFormat::ELuminance8, { 7, 9 } },
+  { IPixelFormat::EY8U8Y8V8, { 7, 1, 9, 2 }, IPixelFormat::ELuminance8, { 7, 9 } },
+  { IPixelFormat::ELuminance8, { 7, 9 }, IPixelFormat::EU8Y8V8Y8, { 128, 7, 128, 9 } },
+  { IPixelFormat::ELuminance8, { 7 }, IPixelFormat::ER8G8B8u8, { 7, 7, 7, 255 } },
+  { IPixelFormat::ER5G6B5, { 0x47, 0xCD }, IPixelFormat::ER8G8B8, { 0xC8, 0xA8, 0x38 } },   // 11001 101010 00111
+};
 
-// A row of three: the last pixel has its own U, and the V of the pair before.
-TEST( PixelFormatConverter, GivesALonePixelTheVBeforeIt )
+TEST( PixelFormatConverter, GivesExactlyTheseBytes )
 {
-  const VBytes Three = Convert( IPixelFormat::EU8Y8V8Y8, { 128, 100, 200, 100, 90, 100 }, IPixelFormat::ER8G8B8, { 3, 1 } );
-  const VBytes Four = Convert( IPixelFormat::EU8Y8V8Y8, { 128, 100, 200, 100, 90, 100, 200, 100 }, IPixelFormat::ER8G8B8, { 4, 1 } );
-  EXPECT_EQ( VBytes( Four.begin(), Four.begin() + 9 ), Three );
-  const VBytes One = Convert( IPixelFormat::EY8U8Y8V8, { 100, 90 }, IPixelFormat::ER8G8B8, { 1, 1 } );
-  EXPECT_EQ( Convert( IPixelFormat::EY8U8Y8V8, { 100, 90, 100, 128 }, IPixelFormat::ER8G8B8, { 2, 1 } )[0], One[0] );
-}
-
-TEST( PixelFormatConverter, MakesGrey )
-{
-  EXPECT_EQ( ( VBytes{ 84, 255 } ), Convert( IPixelFormat::ER8G8B8u8, { 1, 2, 251, 9, 255, 255, 255, 0 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
-  EXPECT_EQ( ( VBytes{ 7, 9 } ), Convert( IPixelFormat::EU8Y8V8Y8, { 1, 7, 2, 9 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
-  EXPECT_EQ( ( VBytes{ 7, 9 } ), Convert( IPixelFormat::EY8U8Y8V8, { 7, 1, 9, 2 }, IPixelFormat::ELuminance8, { 2, 1 } ) );
-  EXPECT_EQ( ( VBytes{ 128, 7, 128, 9 } ), Convert( IPixelFormat::ELuminance8, { 7, 9 }, IPixelFormat::EU8Y8V8Y8, { 2, 1 } ) );
-  EXPECT_EQ( ( VBytes{ 7, 7, 7, 255 } ), Convert( IPixelFormat::ELuminance8, { 7 }, IPixelFormat::ER8G8B8u8, { 1, 1 } ) );
-  // 11001 101010 00111
-  EXPECT_EQ( ( VBytes{ 0xC8, 0xA8, 0x38 } ), Convert( IPixelFormat::ER5G6B5, { 0x47, 0xCD }, IPixelFormat::ER8G8B8, { 1, 1 } ) );
+  for( const VExample& rExample : Examples )
+  {
+    const VSize Size = { static_cast<uint32_t>( rExample.m_Expected.size() / SizeOf( rExample.m_Target, { 1, 1 } ) ), 1 };
+    VBytes Source = rExample.m_Pixels;
+    Source.resize( SizeOf( rExample.m_Source, Size ) );
+    EXPECT_EQ( rExample.m_Expected, Convert( rExample.m_Source, Source, rExample.m_Target, Size ) ) << "example " << &rExample - Examples;
+  }
 }
 
 // Seven pixels: a group of six, one of one, and zeros up to 48.
 TEST( PixelFormatConverter, PacksTenBits )
 {
-  const VBytes Pairs = { 0xFF, 0x01, 0xFF, 0x02, 0x03, 0xFE, 0x04, 0x05, 0x87, 0x06, 0x08, 0xFF, 0x10, 0x20 };
+  const VBytes Seven = { 0xFF, 0x01, 0xFF, 0x02, 0x03, 0xFE, 0x04, 0x05, 0x87, 0x06, 0x08, 0xFF, 0x10, 0x20 };
   VBytes Expected = {
     0xFC, 0x13, 0x00, 0x3F,   // U 0xFF, Y 0x01, V 0xFF less two bits
     0x08, 0x30, 0x00, 0x3F,   // Y 0x02, U 0x03, Y 0xFE less two bits
@@ -198,24 +199,12 @@ TEST( PixelFormatConverter, PacksTenBits )
     0x40, 0x00, 0x02, 0x00,   // U 0x10, Y 0x20
   };
   Expected.resize( 128 );
-  EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Pairs, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
-
-  EXPECT_EQ( Expected, Convert( IPixelFormat::EY8U8Y8V8, SwappedBytes( Pairs ), IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EU8Y8V8Y8, Seven, IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
+  EXPECT_EQ( Expected, Convert( IPixelFormat::EY8U8Y8V8, Swapped( Seven ), IPixelFormat::EU10Y10V10Y10, { 7, 1 } ) );
 
   const VBytes Kept = { 0xFF, 0x01, 0xFC, 0x02, 0x03, 0xFC, 0x04, 0x05, 0x84, 0x06, 0x08, 0xFC, 0x10, 0x20 };
   EXPECT_EQ( Kept, Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::EU8Y8V8Y8, { 7, 1 } ) );
   EXPECT_EQ( ( VBytes{ 1, 2, 0xFC, 5, 6, 0xFC, 0x20 } ), Convert( IPixelFormat::EU10Y10V10Y10, Expected, IPixelFormat::ELuminance8, { 7, 1 } ) );
-}
-
-TEST( PixelFormatConverter, MakesColoursOfTenBits )
-{
-  VBytes Row = { 0xFF, 0x03, 0x08, 0x00, 0xFF, 0x03 };   // U 1023, Y 512, V 0; Y 1023
-  Row.resize( 128 );
-  const VBytes Expected = {
-    0, 175, 255,    // R: (8388608 - 22986 * 512) / 65536; G: 11497988 / 65536; B: 128 + 28999 * 511 / 65536
-    76, 255, 255,   // R: (16760832 - 22986 * 512) / 65536
-  };
-  EXPECT_EQ( Expected, Convert( IPixelFormat::EU10Y10V10Y10, Row, IPixelFormat::ER8G8B8, { 2, 1 } ) );
 }
 
 TEST( PixelFormatConverter, AssertsPairsOfTenBitPixels )
