@@ -40,15 +40,19 @@ TEST( OpenGLFailure, RefusesOtherFormatsShortBuffersAndImagesWiderThanTextures )
   EXPECT_TRUE( Run( 16 * 8 * 3, Target.size() ) );
 }
 
-// Where OpenGL is wanted for the lens alone, the software converter takes what it cannot do, and says what is missing.
-TEST( OpenGLFailure, LeavesOtherOutputsToSoftwareWhereItMay )
+// Where OpenGL is wanted for the lens alone, the software converter takes what has none and what OpenGL cannot do, and says what is missing then.
+TEST( OpenGLFailure, LeavesToSoftwareWhatItMay )
 {
   const TestSupport::VLogCapture Log( "CoreVideoUtilsOpenGL" );
   VPixelFormatConverterOpenGL Converter( { EUse::LensAlone } );
   const VImage Image = MakeNoise( IPixelFormat::ER8G8B8, 48, 16 );
-  EXPECT_TRUE( Convert( Converter, Image, IPixelFormat::EU8Y8V8Y8 ) );
-  EXPECT_EQ( 0u, Log.Count( LensText ) );
+  const VBytes Software = InSoftware( Image, IPixelFormat::EB8G8R8u8 );   // with fourth bytes of 255
+  EXPECT_EQ( Software, Convert( Converter, Image, IPixelFormat::EB8G8R8u8 ) );
   SetLens( Converter, Lens );
+  const std::optional<VBytes> Drawn = Convert( Converter, Image, IPixelFormat::EB8G8R8u8 );
+  EXPECT_EQ( Corrected( Image, IPixelFormat::EB8G8R8u8, Lens ), Drawn );
+  EXPECT_NE( Software, Drawn );
+  EXPECT_EQ( 0u, Log.Count( LensText ) );
   EXPECT_EQ( InSoftware( Image, IPixelFormat::EU8Y8V8Y8 ), Convert( Converter, Image, IPixelFormat::EU8Y8V8Y8 ) );
   EXPECT_EQ( 1u, Log.Count( LensText ) );
 }

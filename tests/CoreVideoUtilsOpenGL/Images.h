@@ -122,9 +122,9 @@ inline void SetLens( VPixelFormatConverterOpenGL& i_rConverter, const VLensDisto
   i_rConverter.SetLensCorrectionEnabled( true );
 }
 
-inline VBytes Corrected( const VImage& i_rImage, IPixelFormat::Enum i_Target, const VLensDistortionRecord& i_rLens, EUse i_Use = EUse::Always )
+inline VBytes Corrected( const VImage& i_rImage, IPixelFormat::Enum i_Target, const VLensDistortionRecord& i_rLens )
 {
-  VPixelFormatConverterOpenGL Converter( { i_Use } );
+  VPixelFormatConverterOpenGL Converter( {} );
   SetLens( Converter, i_rLens );
   return Convert( Converter, i_rImage, i_Target ).value_or( VBytes() );
 }
