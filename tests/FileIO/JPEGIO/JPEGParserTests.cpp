@@ -93,17 +93,14 @@ TEST_F( JPEGParser, ListsWhatTurboJPEGWrites )
   EXPECT_EQ( PositionOf( m_Segments[1] ), 2u );
   EXPECT_EQ( LengthOf( m_Segments[1] ), 18u );   // JFIF, without a thumbnail
   EXPECT_EQ( PositionOf( m_Segments.back() ), Colour.size() - 2 );
-
-  ASSERT_TRUE( Parse( MakeJPEG( 61, 33, TJSAMP_GRAY ) ) );
-  EXPECT_EQ( Markers( m_Segments ), "D8 E0 DB C0 C4 C4 DA D9 " );
+  std::vector<VJPEGSegment> FromMemory;
+  ASSERT_TRUE( ParseJPEGSegments( Colour.data(), Colour.size(), FromMemory ) );
+  EXPECT_EQ( Markers( FromMemory ), Markers( m_Segments ) );
 
   const VBytes Progressive = MakeJPEG( 61, 33, TJSAMP_420, TJFLAG_PROGRESSIVE );
-  std::vector<VJPEGSegment> FromMemory;
   ASSERT_TRUE( Parse( Progressive ) );
   ExpectInside( Progressive );
   EXPECT_GT( std::count_if( m_Segments.begin(), m_Segments.end(), []( const VJPEGSegment& r ) { return r.m_Marker == 0xDA; } ), 5 );
-  ASSERT_TRUE( ParseJPEGSegments( Progressive.data(), Progressive.size(), FromMemory ) );
-  EXPECT_EQ( Markers( FromMemory ), Markers( m_Segments ) );
 }
 
 TEST_F( JPEGParser, EntropyCodedDataIsSkipped )
