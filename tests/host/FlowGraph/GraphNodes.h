@@ -72,18 +72,13 @@ public:
   // Any thread.
   void Allow( int i_Count )
   {
-    std::shared_ptr<KVZ::IFlowNodeServices> pServices;
-    uint64_t Token = 0;
+    std::function<void()> Wake = [] {};
     {
       boost::lock_guard<boost::mutex> Lock( m_Mutex );
       m_Allowed += i_Count;
-      std::swap( Token, m_Token );
-      pServices = m_pWake;
+      Wake.swap( m_Wake );
     }
-    if( pServices )
-    {
-      pServices->Wake( Token );
-    }
+    Wake();
   }
   // The last state; it is held by nobody else once it has been read and let go.
   std::weak_ptr<KVZ::IFlowState> Last() const
@@ -93,12 +88,6 @@ public:
   }
 
 protected:
-  uint32_t PreProcess() override
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_pWake = Services();
-    return EFlowResult::Ok;
-  }
   void Process() override
   {
     WaitOutputConnected( 0, VFlowLimit::None() );
@@ -113,30 +102,29 @@ protected:
     }
     Write( 0, pState, VFlowLimit::None(), KVZ::EFlowFlags::Rewirable );
   }
-  void PostProcess() override
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    m_pWake.reset();
-    m_Token = 0;
-  }
 
 private:
   uint32_t TakeTurn( uint64_t i_Token )
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    if( m_Allowed == 0 )
+    if( m_Allowed > 0 )
     {
-      m_Token = i_Token;
-      return EFlowResult::Asleep;
+      --m_Allowed;
+      return EFlowResult::Ok;
     }
-    --m_Allowed;
-    return EFlowResult::Ok;
+    m_Wake = [pServices = std::weak_ptr( Services() ), i_Token]
+    {
+      if( const auto pRunning = pServices.lock() )
+      {
+        pRunning->Wake( i_Token );
+      }
+    };
+    return EFlowResult::Asleep;
   }
 
   int m_Next;   // the node's thread
   mutable boost::mutex m_Mutex;
-  std::shared_ptr<KVZ::IFlowNodeServices> m_pWake GUARDED_BY( m_Mutex );
-  uint64_t m_Token GUARDED_BY( m_Mutex ) = 0;
+  std::function<void()> m_Wake GUARDED_BY( m_Mutex ) = [] {};
   int m_Allowed GUARDED_BY( m_Mutex ) = 0;
   std::weak_ptr<KVZ::IFlowState> m_pLast GUARDED_BY( m_Mutex );
 };
