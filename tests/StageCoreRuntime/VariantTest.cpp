@@ -1,4 +1,6 @@
 #include "StageCoreRuntime/Variant.h"
+#include "StageCoreDataStoreTypes/GreyscaleMode.h"
+#include "StageCoreDataStoreTypes/MaskGrid.h"
 #include "tests/support/AssertionCapture.h"
 
 #include <gtest/gtest.h>
@@ -9,70 +11,13 @@
 #include <limits>
 #include <set>
 
-namespace VariantTest
-{
-enum EFruit : int32_t
-{
-  None = -1,
-  Apple = 0,
-  Pear = 5,
-};
-
-struct VGrid
-{
-  std::string m_DeviceURN;
-  uint32_t m_TileSizeX = 0;
-  std::vector<uint32_t> m_RunLengths;
-  std::vector<std::string> m_Names;
-  bool m_bOn = false;
-  EFruit m_Fruit = None;
-  bool operator==( const VGrid& ) const = default;
-};
-}
-
-namespace KVZ
-{
-template<>
-struct VSchemaOf<VariantTest::EFruit>
-{
-  static const ISchema* Get()
-  {
-    return IO::GetUniqueSchema( "VariantTest.Fruit", "Fruit.",
-      std::vector<ISchema::VEntry>{ { -1, "None", "Nothing." }, { 0, "Apple", "Round." }, { 5, "Pear", "Less round." } } );
-  }
-};
-
-template<>
-struct VSchemaOf<VariantTest::VGrid>
-{
-  static const ISchema* Get()
-  {
-    return IO::GetUniqueSchema( "VariantTest.Grid", "",
-      std::vector<ISchema::VField>{ { "DeviceURN", VSchemaOf<std::string>::Get() }, { "TileSizeX", VSchemaOf<uint32_t>::Get() },
-        { "RunLengths", VSchemaOf<std::vector<uint32_t>>::Get() }, { "Names", VSchemaOf<std::vector<std::string>>::Get() },
-        { "On", VSchemaOf<bool>::Get() }, { "Fruit", VSchemaOf<VariantTest::EFruit>::Get() } } );
-  }
-
-  template<class TGrid, class TVisitor>
-  static void Visit( TGrid& i_rGrid, TVisitor& i_rVisitor )
-  {
-    i_rVisitor( i_rGrid.m_DeviceURN );
-    i_rVisitor( i_rGrid.m_TileSizeX );
-    i_rVisitor( i_rGrid.m_RunLengths );
-    i_rVisitor( i_rGrid.m_Names );
-    i_rVisitor( i_rGrid.m_bOn );
-    i_rVisitor( i_rGrid.m_Fruit );
-  }
-};
-}
-
 namespace
 {
-using namespace VariantTest;
+using CoreTarvoTypesUtils::EGreyscaleMode;
 using KVZ::ISchema;
 using KVZ::Variant;
 
-VGrid ExampleGrid() { return { "vi:0", 4, { 1, 0xffffffff }, { "", "a \"b\"" }, true, Pear }; }
+VMaskGrid ExampleGrid() { return { "vi:\"0\"", 4, 5, 480, 270, { 1, 0xffffffff } }; }
 
 TEST( Schema, IsUniqueAcrossThreads )
 {
@@ -149,37 +94,38 @@ TEST( Variant, PlainValuesComeBackFromBytesAndText )
 
 TEST( Variant, EnumerationsGoByName )
 {
-  const Variant Value = Variant::Make( Pear );
-  EXPECT_EQ( Value.Bytes(), ( Variant::VBytes{ 5, 0, 0, 0 } ) );
-  EXPECT_EQ( Value.ToText(), "Pear" );
-  EXPECT_EQ( Variant::FromText( Value.Schema(), "Pear" ), Value );
-  EXPECT_EQ( Variant::FromText( Value.Schema(), "pear" ), std::nullopt );
+  const Variant Value = Variant::Make( EGreyscaleMode::EOnly );
+  EXPECT_EQ( Value.Bytes(), ( Variant::VBytes{ 2, 0, 0, 0 } ) );
+  EXPECT_EQ( Value.ToText(), "Only" );
+  EXPECT_EQ( Variant::FromText( Value.Schema(), "Only" ), Value );
+  EXPECT_EQ( Variant::FromText( Value.Schema(), "only" ), std::nullopt );
   EXPECT_EQ( Variant::FromText( Value.Schema(), "" ), std::nullopt );
-  EXPECT_EQ( Variant::MakeEnumeration( Value.Schema(), 3 ).ToText(), "3" );
+  EXPECT_EQ( Variant::MakeEnumeration( Value.Schema(), 9 ).ToText(), "9" );
   int32_t Number = 0;
   EXPECT_FALSE( Variant().Get( Number ) );
   EXPECT_TRUE( Value.GetEnumeration( Number ) );
   // The bytes fit, the schema does not.
   EXPECT_FALSE( Value.Get( Number ) );
   EXPECT_FALSE( Variant::Make( int32_t( 1 ) ).GetEnumeration( Number ) );
-  EXPECT_EQ( Number, 5 );
+  EXPECT_EQ( Number, 2 );
 }
 
 TEST( Variant, RecordsComeBackAndBrokenOnesAreRefused )
 {
   const Variant Value = Variant::Make( ExampleGrid() );
-  VGrid Read;
+  VMaskGrid Read;
   ASSERT_TRUE( Value.Get( Read ) );
   EXPECT_EQ( Read, ExampleGrid() );
-  EXPECT_EQ( Value.ToText(), R"({DeviceURN: "vi:0", TileSizeX: 4, RunLengths: [1, 4294967295], Names: ["", "a \"b\""], On: true, Fruit: Pear})" );
+  EXPECT_EQ( Value.ToText(), R"({DeviceURN: "vi:\"0\"", TileSizeX: 4, TileSizeY: 5, GridSizeX: 480, GridSizeY: 270, RunLengths: [1, 4294967295]})" );
+  EXPECT_EQ( Variant::Make( std::vector<std::string>{ "", "a" } ).ToText(), R"(["", "a"])" );
 
   for( size_t Size = 0; Size < Value.Bytes().size(); ++Size )
   {
     SCOPED_TRACE( Size );
     const Variant Short( Value.Schema(), Variant::VBytes( Value.Bytes().begin(), Value.Bytes().begin() + static_cast<std::ptrdiff_t>( Size ) ) );
-    VGrid Untouched;
+    VMaskGrid Untouched;
     EXPECT_FALSE( Short.Get( Untouched ) );
-    EXPECT_EQ( Untouched, VGrid() );
+    EXPECT_EQ( Untouched, VMaskGrid() );
     EXPECT_EQ( Short.ToText(), "?" );
   }
   Variant::VBytes Long = Value.Bytes();
@@ -203,7 +149,7 @@ TEST( Variant, TextThatIsNoValueIsRefused )
   EXPECT_EQ( Parse( ISchema::EBool, "maybe" ), std::nullopt );
   EXPECT_EQ( Parse( ISchema::EDouble, "1,5" ), std::nullopt );
   EXPECT_EQ( Variant::FromText( nullptr, "1" ), std::nullopt );
-  EXPECT_EQ( Variant::FromText( KVZ::VSchemaOf<VGrid>::Get(), "{}" ), std::nullopt );
+  EXPECT_EQ( Variant::FromText( KVZ::VSchemaOf<VMaskGrid>::Get(), "{}" ), std::nullopt );
 }
 
 TEST( Variant, LabelledListsHoldValuesOfOneSchema )
@@ -211,8 +157,9 @@ TEST( Variant, LabelledListsHoldValuesOfOneSchema )
   const std::vector<std::vector<KVZ::VLabelledVariant>> Lists = {
     { { "Default", Variant::Make( "" ) }, { "Disk", Variant::Make( "/mnt/a" ) } },
     { { "Two", Variant::Make( uint32_t( 2 ) ) }, { "", Variant::Make( uint32_t( 16 ) ) } },
-    { { "A pear", Variant::Make( Pear ) } },
-    { { "A grid", Variant::Make( ExampleGrid() ) }, { "Another", Variant::Make( VGrid() ) } },
+    { { "A mode", Variant::Make( EGreyscaleMode::EOnly ) } },
+    { { "On", Variant::Make( true ) } },
+    { { "A grid", Variant::Make( ExampleGrid() ) }, { "Another", Variant::Make( VMaskGrid() ) } },
   };
   for( const auto& rChoices : Lists )
   {
