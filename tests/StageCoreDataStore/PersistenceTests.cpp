@@ -1,6 +1,7 @@
 // Values and items on their way from one store to another.
 #include "StageCoreDataStore/DataStoreIntrospectionUtils.h"
-#include "tests/StageCoreDataStore/FaultyStore.h"
+#include "host/DataStore.h"
+#include "tests/StageCoreDataStore/FaultyWriter.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -62,17 +63,19 @@ protected:
   bool Copy( const VDataPath& i_rPath, uint32_t i_Options ) { return CopyTo( i_rPath, i_rPath, i_Options ); }
   bool CopyTo( const VDataPath& i_rFrom, const VDataPath& i_rTo, uint32_t i_Options )
   {
-    VDataVerifyWriter Writer( m_Target );
-    return DataStorePersistence::CopyValues( { VDataVerifyReader( m_Source ), i_rFrom }, { Writer, i_rTo }, i_Options );
+    VFaultyWriter Writer( m_Target, m_Faults );
+    return DataStorePersistence::CopyValues( { VFaultyWriter( m_Source, m_SourceFaults ), i_rFrom }, { Writer, i_rTo }, i_Options );
   }
   bool CopyItem( const KVZ::ISchema* i_pSchema, uint32_t i_Options )
   {
-    VDataVerifyWriter Writer( m_Target );
+    VFaultyWriter Writer( m_Target, m_Faults );
     return DataStoreIntrospectionUtils::CopyItem( { VDataVerifyReader( m_Source ), m_Item }, { Writer, m_Item }, *i_pSchema, i_Options );
   }
 
-  VFaultyStore m_Source;
-  VFaultyStore m_Target;
+  StageHost::VDataStore m_Source;
+  StageHost::VDataStore m_Target;
+  VFaults m_SourceFaults;   // of copied values
+  VFaults m_Faults;         // of the store that is written
   const VDataPath m_Path{ "A", "B" };
   const VDataPath m_Item{ "Items", "One" };
   TestSupport::VLogCapture m_Log{ "DataStore" };
@@ -159,11 +162,11 @@ TEST_F( Persistence, AFailureEndsTheCopyAndKeepsWhatIsThere )
     Put( m_Source, { "A", "A" }, 1 );
     Put( m_Source, m_Path, 2, rCase.m_bVerify ? DataFlags::VerifyRequired : 0 );
     Put( m_Source, { "A", "C" }, 3 );
-    VFaultyStore& rFaulty = rCase.m_bSource ? m_Source : m_Target;
-    rFaulty.m_Faults = { rCase.m_pFault };
+    ( rCase.m_bSource ? m_SourceFaults : m_Faults ) = { rCase.m_pFault };
     m_Log.Clear();
     EXPECT_FALSE( Copy( { "A" }, rCase.m_Options ) );
-    rFaulty.m_Faults.clear();
+    m_SourceFaults.clear();
+    m_Faults.clear();
     EXPECT_EQ( m_Log.Texts().empty() ? "" : m_Log.Texts().back(), rCase.m_pText );
     EXPECT_EQ( Verified( m_Target, { "A", "A" } ), 1 );
     EXPECT_FALSE( VDataReader( m_Target ).Exists( VDataPath{ "A", "C" } ) );
@@ -178,9 +181,9 @@ TEST_F( Persistence, RemovalLeavesWhatIsReadOnlyOrNotSaved )
   Put( m_Source, { "A", "D" }, 4 );
   Put( m_Source, { "A", "E" }, 5, DataFlags::VerifyRequired );
   Put( m_Source, { "B" }, 6 );
-  m_Source.m_Faults = { "Remove A.D" };
+  m_Faults = { "Remove A.D" };
   {
-    VDataWriter Writer( m_Source );
+    VFaultyWriter Writer( m_Source, m_Faults );
     EXPECT_FALSE( DataStorePersistence::RemoveParameterValues( Writer, VDataPath{ "A" } ) );
     std::vector<VDataPath> Left;
     Writer.GetValuePaths( VDataPath(), Left );
@@ -222,7 +225,7 @@ TEST_F( Persistence, AnItemThatIsThereIsLeftAlone )
   EXPECT_EQ( m_Log.Texts(), ( VTexts{ "Skipping copy of already present item 'Items.One'." } ) );
   EXPECT_EQ( VDataReader( m_Target ).CountValues( m_Item ), 1u );
 
-  m_Target.m_Faults = { "SetProposed Items.One.Inner.X" };
+  m_Faults = { "SetProposed Items.One.Inner.X" };
   EXPECT_FALSE( CopyItem( PairSchema(), 0 ) );
   EXPECT_EQ( Verified( m_Target, m_Item + VDataPath{ "Id" } ), 1 );
   EXPECT_EQ( Verified( m_Target, m_Item + VDataPath{ "Inner", "Y" } ), 30 ) << "the copy ends at the first failure";

@@ -1,7 +1,6 @@
 // The engine between a fake host and virtual cards that are stepped by hand. The thread that steps is the vendor's thread.
 #include "StageCorePluginVideoInput/VideoInputEngine.h"
 
-#include "Core/VideoInterface/Schemas.h"
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "cards/common/VirtualCardControl.h"
@@ -21,7 +20,6 @@
 namespace
 {
 
-using KVZ::IVideoStandard;
 using TestSupport::VFakeHost;
 using EStatus = VideoInputHAL::IVideoInputDevice::EStatus;
 using VTexts = std::vector<std::string>;
@@ -96,23 +94,23 @@ protected:
     m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->m_pHappenings->Has( i_rText ); } );
   }
   // Every device is enabled unless somebody has said otherwise: it starts as soon as it is wired.
-  void WaitForStatus( const std::string& i_rURN, EStatus::Enum i_Status )
+  void WaitUntilCapturing( const std::string& i_rURN )
   {
     const VDataPath Path = DeviceSchemas::VideoInput::Status( DeviceSchemas::VideoInput::Path( i_rURN ) );
-    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->Setting<EStatus::Enum>( Path ) == i_Status; } );
+    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->Setting<EStatus::Enum>( Path ) == EStatus::ECapturing; } );
   }
   // The device finds its signal, and the source begins a session with the next frame.
-  void StartCard( VirtualCards::VCardId i_Card, const std::string& i_rURN )
+  void StartCard( VirtualCards::VCardId i_Card )
   {
-    WaitForStatus( i_rURN, EStatus::ECapturing );
+    WaitUntilCapturing( "vi:0" );
     EXPECT_TRUE( Control().Step( i_Card, 1 ) );
-    const auto pSource = m_pHost->m_pSources->Find( i_rURN );
+    const auto pSource = m_pHost->m_pSources->Find( "vi:0" );
     m_pHost->m_pHappenings->WaitUntil( [&] { return pSource->Temporal().GetSourceSyncStatus().m_bEnabled; } );
   }
   // Of the present session.
-  uint64_t FramesOf( const std::string& i_rURN )
+  uint64_t Frames()
   {
-    const auto Status = m_pHost->m_pSources->Find( i_rURN )->Temporal().GetSourceSyncStatus();
+    const auto Status = m_pHost->m_pSources->Find( "vi:0" )->Temporal().GetSourceSyncStatus();
     return Status.m_Session.m_Id == 0 ? 0 : Status.m_LatestCounterFrames + 1;
   }
   // Frames that the card has handed to its client.
@@ -177,16 +175,16 @@ TEST_F( VideoInputEngine, FramesReachTheSourceUntilItIsTakenOut )
 {
   const auto Card = AddCard();
   MakeAndFindCards();
-  StartCard( Card, "vi:0" );
+  StartCard( Card );
   Control().Step( Card, 6 );
-  EXPECT_EQ( FramesOf( "vi:0" ), 6u );
+  EXPECT_EQ( Frames(), 6u );
 
   EXPECT_TRUE( m_pEngine->StopCapture( "vi:0" ) );
   Control().Step( Card, 3 );
-  EXPECT_EQ( FramesOf( "vi:0" ), 6u );
+  EXPECT_EQ( Frames(), 6u );
   EXPECT_TRUE( m_pEngine->StartCapture( "vi:0" ) );
   EXPECT_FALSE( m_pEngine->StartCapture( "vi:1" ) );
-  StartCard( Card, "vi:0" );
+  StartCard( Card );
   m_pHost->m_pSources->m_OnRemove = [&]( const std::string& )
   {
     const uint64_t Before = Delivered( Card );
@@ -214,7 +212,7 @@ TEST_F( VideoInputEngine, FlowNodesFindTheSourcesOfTheMoment )
   };
   EXPECT_FALSE( Starts() );
   m_pHost->m_pHardwareStart->Fire();
-  WaitForStatus( "vi:0", EStatus::ECapturing );
+  WaitUntilCapturing( "vi:0" );
   EXPECT_TRUE( Starts() );
   m_pEngine.reset();
   EXPECT_FALSE( Starts() );
@@ -227,7 +225,7 @@ TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )
   AddCard();
   AddCard();
   WaitFor( "AddSource vi:2" );
-  WaitForStatus( "vi:2", EStatus::ECapturing );
+  WaitUntilCapturing( "vi:2" );
   EXPECT_EQ( Sources( "AddSource" ), ( VTexts{ "AddSource vi:0", "AddSource vi:1", "AddSource vi:2" } ) );
   m_pHost->m_pHappenings->Clear();
   m_pEngine.reset();
@@ -263,7 +261,7 @@ TEST_F( VideoInputEngine, MayEndInMidStream )
     SetUp();
     const auto Card = AddCard();
     MakeAndFindCards();
-    StartCard( Card, "vi:0" );
+    StartCard( Card );
     std::promise<void> Streaming;
     std::atomic<bool> bEnd{ false };
     boost::thread Vendor(

@@ -16,16 +16,7 @@ using KVZ::Variant;
 using StageHost::VDataStore;
 
 using VNames = std::vector<std::string>;
-
-VNames ToTexts( const std::vector<VDataPath>& i_rPaths )
-{
-  VNames Texts;
-  for( const VDataPath& rPath : i_rPaths )
-  {
-    Texts.push_back( rPath.ToString() );
-  }
-  return Texts;
-}
+using VPaths = std::vector<VDataPath>;
 
 class DataStore : public testing::Test
 {
@@ -146,16 +137,16 @@ TEST_F( DataStore, ListsWhatItHolds )
   Listen( { "VideoInput", "*", "Settings" }, Ignored );
 
   VNames Names;
-  std::vector<VDataPath> Paths;
+  VPaths Paths;
   VDataWriter Writer( m_Store );
   EXPECT_TRUE( Writer.GetChildNames( VDataPath(), Names ) );
   EXPECT_EQ( Names, ( VNames{ "Camera", "VideoInput" } ) );
   EXPECT_TRUE( Writer.GetChildNames( VDataPath{ "VideoInput" }, Names ) );
   EXPECT_EQ( Names, ( VNames{ "vi:0", "vi:1" } ) );
   EXPECT_TRUE( Writer.GetValuePaths( VDataPath{ "VideoInput", "vi:0" }, Paths ) );
-  EXPECT_EQ( ToTexts( Paths ), ( VNames{ "VideoInput.vi:0.Hardware.Status", "VideoInput.vi:0.Settings.UserId" } ) );
+  EXPECT_EQ( Paths, ( VPaths{ { "VideoInput", "vi:0", "Hardware", "Status" }, { "VideoInput", "vi:0", "Settings", "UserId" } } ) );
   EXPECT_TRUE( Writer.GetMatches( VDataPath{ "VideoInput", "*", "Settings", "UserId" }, Paths ) );
-  EXPECT_EQ( ToTexts( Paths ), ( VNames{ "VideoInput.vi:0.Settings.UserId", "VideoInput.vi:1.Settings.UserId" } ) );
+  EXPECT_EQ( Paths, ( VPaths{ { "VideoInput", "vi:0", "Settings", "UserId" }, { "VideoInput", "vi:1", "Settings", "UserId" } } ) );
   EXPECT_EQ( Writer.CountValues( VDataPath{ "VideoInput" } ), 3u );
 
   EXPECT_TRUE( Writer.RemoveBranch( VDataPath{ "VideoInput", "vi:0" } ) );
