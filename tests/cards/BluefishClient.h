@@ -86,10 +86,10 @@ struct VDecoded
 };
 
 // One card with a clock moved by hand. Whatever a test does, it must leave nothing behind.
-class VBluefishFixture : public VOneCardFixture
+class VBluefishFixture : public VCardsFixture
 {
 protected:
-  VBluefishFixture() : VOneCardFixture( ControlOf( VIRTUAL_BLUEFISH ) ) {}
+  VBluefishFixture() : VCardsFixture( ControlOf( VIRTUAL_BLUEFISH ) ) {}
 
   void Plug( const std::string& i_rText, int i_Card = 1 )
   {
@@ -168,7 +168,7 @@ protected:
   void TearDown() override
   {
     Functions().bfcDetach( m_Object.m_Handle );
-    Control().RemoveCard( m_Card );
+    RemoveCards();
     EXPECT_EQ( Control().ReferencesHeld(), 1 ) << "the fixture's own";
     EXPECT_EQ( Control().ReleaseErrors(), m_ErrorsBefore );
   }

@@ -1,4 +1,4 @@
-// One card of a virtual library, moved by hand through the library's control.
+// Cards of a virtual library, moved by hand through the library's control.
 #pragma once
 
 #include "cards/common/VirtualCardControl.h"
@@ -7,6 +7,7 @@
 
 #include <dlfcn.h>
 #include <string>
+#include <vector>
 
 inline VirtualCards::IVirtualCardControl& ControlOf( const char* i_pLibrary )
 {
@@ -14,18 +15,27 @@ inline VirtualCards::IVirtualCardControl& ControlOf( const char* i_pLibrary )
   return *reinterpret_cast<VirtualCards::GetVirtualCardControlFunction*>( dlsym( pLibrary, VirtualCards::GetVirtualCardControlName ) )();
 }
 
-class VOneCardFixture : public testing::Test
+class VCardsFixture : public testing::Test
 {
 protected:
-  explicit VOneCardFixture( VirtualCards::IVirtualCardControl& i_rControl ) : m_rControl( i_rControl ) {}
+  explicit VCardsFixture( VirtualCards::IVirtualCardControl& i_rControl ) : m_rControl( i_rControl ) {}
 
   VirtualCards::IVirtualCardControl& Control() const { return m_rControl; }
 
+  // From now on the card that is meant.
   void AddCard( const std::string& i_rText, bool i_bManualClock = true )
   {
     std::string Error;
     m_Card = Control().AddCard( i_rText.c_str(), { i_bManualClock }, Error );
     ASSERT_NE( m_Card, 0u ) << Error;
+    m_Cards.push_back( m_Card );
+  }
+  void RemoveCards()
+  {
+    for( const VirtualCards::VCardId Card : m_Cards )
+    {
+      Control().RemoveCard( Card );
+    }
   }
 
   void Step( uint64_t i_Frames = 1 ) { ASSERT_TRUE( Control().Step( m_Card, i_Frames ) ); }
@@ -45,4 +55,5 @@ protected:
 
   VirtualCards::IVirtualCardControl& m_rControl;
   VirtualCards::VCardId m_Card = 0;
+  std::vector<VirtualCards::VCardId> m_Cards;
 };

@@ -203,10 +203,10 @@ public:
 };
 
 // One card in the machine, found through the iterator. Whatever a test does, it must leave nothing behind.
-class VCardFixture : public VOneCardFixture
+class VCardFixture : public VCardsFixture
 {
 protected:
-  VCardFixture() : VOneCardFixture( DeckLinkControl() ) {}
+  VCardFixture() : VCardsFixture( DeckLinkControl() ) {}
 
   void Plug( const std::string& i_rText, bool i_bManualClock = true )
   {
@@ -263,7 +263,7 @@ protected:
     EXPECT_EQ( m_Client.m_References, 1 );
     m_pInput.reset();
     m_pCard.reset();
-    Control().RemoveCard( m_Card );
+    RemoveCards();
     EXPECT_EQ( Control().ReferencesHeld(), 0 );
     EXPECT_EQ( Control().CallbacksInFlight(), 0 );
   }

@@ -33,48 +33,43 @@ public:
   std::vector<IDeckLink*> m_Arrived;
 };
 
-class DeckLinkDiscovery : public testing::Test
+class DeckLinkDiscovery : public VCardsFixture
 {
 protected:
-  VCardId Add()
-  {
-    std::string Error;
-    m_Cards.push_back( DeckLinkControl().AddCard( "decklink", { true }, Error ) );
-    EXPECT_NE( m_Cards.back(), 0u ) << Error;
-    return m_Cards.back();
-  }
+  DeckLinkDiscovery() : VCardsFixture( DeckLinkControl() ) {}
 
-  std::string NameOf( VCardId i_Card ) { return "+DeckLink Virtual (" + std::to_string( i_Card ) + ")"; }
+  std::string Add()
+  {
+    AddCard( "decklink" );
+    return "+DeckLink Virtual (" + std::to_string( m_Card ) + ")";
+  }
 
   void TearDown() override
   {
-    for( const VCardId Card : m_Cards )
-    {
-      DeckLinkControl().RemoveCard( Card );
-    }
-    EXPECT_EQ( DeckLinkControl().ReferencesHeld(), 0 );
+    RemoveCards();
+    EXPECT_EQ( Control().ReferencesHeld(), 0 );
     EXPECT_EQ( m_Watcher.m_References, 1 );
   }
 
   VWatcher m_Watcher;
-  std::vector<VCardId> m_Cards;
 };
 
 }
 
 TEST_F( DeckLinkDiscovery, ReportsCardsThatAreThereAndThoseThatComeLater )
 {
-  const VCardId First = Add();
+  const std::string First = Add();
+  const VCardId FirstCard = m_Card;
   const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), S_OK );
-  EXPECT_EQ( m_Watcher.m_News, std::vector<std::string>( { NameOf( First ) } ) );
+  EXPECT_EQ( m_Watcher.m_News, std::vector<std::string>( { First } ) );
   EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), E_ACCESSDENIED );
 
-  const VCardId Second = Add();
-  EXPECT_EQ( m_Watcher.m_News.back(), NameOf( Second ) );
-  EXPECT_TRUE( DeckLinkControl().RemoveCard( First ) );
+  const std::string Second = Add();
+  EXPECT_EQ( m_Watcher.m_News.back(), Second );
+  EXPECT_TRUE( Control().RemoveCard( FirstCard ) );
   EXPECT_EQ( m_Watcher.m_News.back(), "-1" ) << "the same pointer that arrived";
-  EXPECT_FALSE( DeckLinkControl().RemoveCard( First ) );
+  EXPECT_FALSE( Control().RemoveCard( FirstCard ) );
 
   EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_OK );
   EXPECT_EQ( pDiscovery->UninstallDeviceNotifications(), S_FALSE );
@@ -92,28 +87,27 @@ TEST_F( DeckLinkDiscovery, ACardThatWasTakenOutComesBackAsANewOne )
     pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
     pInput->StartStreams();
   };
-  std::string Error;
   const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   pDiscovery->InstallDeviceNotifications( &m_Watcher );
   m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard ) { pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
-  const VCardId Card = Add();
+  Add();
   Stream();
-  EXPECT_TRUE( DeckLinkControl().Step( Card, 3 ) );
+  Step( 3 );
   const VPointer<IDeckLinkInput> pFirst = std::move( pInput );
-  EXPECT_TRUE( DeckLinkControl().RunEvent( Card, R"({ "do": "remove" })", Error ) ) << Error;
-  EXPECT_TRUE( DeckLinkControl().Step( Card, 2 ) );
+  Event( R"({ "do": "remove" })" );
+  Step( 2 );
   EXPECT_EQ( Client.m_FrameCalls, 3 );
   EXPECT_EQ( m_Watcher.m_News.size(), 2u );
   EXPECT_EQ( pFirst->StartStreams(), E_FAIL );
   EXPECT_EQ( pFirst->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 ), E_FAIL );
 
-  EXPECT_TRUE( DeckLinkControl().RunEvent( Card, R"({ "do": "arrive" })", Error ) ) << Error;
-  EXPECT_TRUE( DeckLinkControl().Step( Card, 1 ) );
+  Event( R"({ "do": "arrive" })" );
+  Step( 1 );
   ASSERT_NE( pInput, nullptr );
   EXPECT_NE( pInput.get(), pFirst.get() );
   EXPECT_EQ( m_Watcher.m_News.size(), 3u );
   Stream();
-  EXPECT_TRUE( DeckLinkControl().Step( Card, 2 ) );
+  Step( 2 );
   EXPECT_EQ( Client.m_FrameCalls, 5 );
   pInput->SetCallback( nullptr );
   pFirst->SetCallback( nullptr );

@@ -2,6 +2,7 @@
 // shows as a test that does not end; a lost object or a race, in the sanitizers' runs.
 #include "tests/HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/DeckLinkFixture.h"
 
+#include <boost/thread/scoped_thread.hpp>
 #include <boost/thread/thread.hpp>
 
 #include <future>
@@ -10,6 +11,8 @@ namespace
 {
 
 using namespace DeckLinkAPI;
+
+using VThread = boost::scoped_thread<boost::join_if_joinable>;
 
 // Stops the first thread that comes by until the test lets it go on.
 class VGate
@@ -55,13 +58,13 @@ TEST_F( DeckLinkDevice, StartCaptureWaitsForTheFrameThatIsUnderWay )
     Input().m_OnStopStreams = [&] { Stopping.set_value(); };
     Input().m_OnStartStreams = [&] { EXPECT_TRUE( bFrameEnded ); };
 
-    boost::thread Vendor( [&] { Input().DeliverFrame( {} ); } );
-    Gate.WaitReached();
-    boost::thread Starter( [&] { EXPECT_TRUE( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, 2 ).Succeeded() ); } );
-    Stopping.get_future().wait();
-    Gate.Open();
-    Vendor.join();
-    Starter.join();
+    {
+      const VThread Vendor( [&] { Input().DeliverFrame( {} ); } );
+      Gate.WaitReached();
+      const VThread Starter( [&] { EXPECT_TRUE( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, 2 ).Succeeded() ); } );
+      Stopping.get_future().wait();
+      Gate.Open();
+    }
     EXPECT_EQ( Input().Calls(), ( VCalls{ "StopStreams", "EnableVideoInput ntsc 2vuy 1", "EnableAudioInput 48000 16 2", "StartStreams" } ) );
     Input().m_OnStopStreams = nullptr;
     Input().m_OnStartStreams = nullptr;
@@ -108,41 +111,39 @@ TEST_F( DeckLinkDevice, StartsFramesAndChangesOfFormatMixFreely )
 {
   InitialiseAndCapture();
   std::atomic<bool> bEnd{ false };
-  boost::thread Frames(
-    [&]
+  const auto DeliverFrames = [&]
+  {
+    for( uint8_t Count = 0; !bEnd; ++Count )
     {
-      for( uint8_t Count = 0; !bEnd; ++Count )
-      {
-        Input().DeliverFrame( { .m_Flags = Count % 16 == 0 ? FrameFlag::NoInputSource : 0 } );
-      }
-    } );
-  boost::thread Formats(
-    [&]
+      Input().DeliverFrame( { .m_Flags = Count % 16 == 0 ? FrameFlag::NoInputSource : 0 } );
+    }
+  };
+  const auto ChangeFormats = [&]
+  {
+    while( !bEnd )
     {
-      while( !bEnd )
-      {
-        DeliverFormat( Hp25 );
-        DeliverFormat( Hp60 );
-      }
-    } );
-  std::atomic<int> Failures{ 0 };
-  const auto Start = [&]
+      DeliverFormat( Hp25 );
+      DeliverFormat( Hp60 );
+    }
+  };
+  const auto StartAndStop = [&]
   {
     for( int Count = 0; Count < 300; ++Count )
     {
-      Failures += m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, Count % 2 == 0 ? 2 : 0 ).Succeeded() ? 0 : 1;
+      EXPECT_TRUE( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, Count % 2 == 0 ? 2 : 0 ).Succeeded() );
       m_pDevice->GetVideoStandard();
       m_pDevice->GetTimecode();
       m_pDevice->StopCapture();
     }
   };
-  boost::thread Starter( Start );
-  Start();
-  Starter.join();
-  bEnd = true;
-  Frames.join();
-  Formats.join();
-  EXPECT_EQ( Failures, 0 );
+  {
+    const VThread Frames( DeliverFrames );
+    const VThread Formats( ChangeFormats );
+    boost::thread Starter( StartAndStop );
+    StartAndStop();
+    Starter.join();
+    bEnd = true;
+  }
   EXPECT_TRUE( Input().IsRunning() );
 }
 
@@ -191,18 +192,15 @@ TEST_F( DeckLinkDevice, CallbacksThatWaitForTheLockOutliveTheDevice )
   InitialiseAndCapture();
   VGate Gate;
   m_pReceiver->m_OnFrame = [&] { Gate.Pass(); };
-  boost::thread First( [&] { Input().DeliverFrame( {} ); } );
-  Gate.WaitReached();
-  boost::thread Second( [&] { Input().DeliverFrame( {} ); } );
-  boost::thread Third( [&] { DeliverFormat( Hp60 ); } );
-  Input().WaitForCallbacks( 3 );
-
-  boost::thread End( [&] { m_pDevice.reset(); } );
-  Gate.Open();
-  First.join();
-  Second.join();
-  Third.join();
-  End.join();
+  {
+    const VThread First( [&] { Input().DeliverFrame( {} ); } );
+    Gate.WaitReached();
+    const VThread Second( [&] { Input().DeliverFrame( {} ); } );
+    const VThread Third( [&] { DeliverFormat( Hp60 ); } );
+    Input().WaitForCallbacks( 3 );
+    const VThread End( [&] { m_pDevice.reset(); } );
+    Gate.Open();
+  }
   EXPECT_FALSE( Input().IsRunning() );
   EXPECT_FALSE( Input().DeliverFrame( {} ) );
 }
@@ -216,12 +214,12 @@ TEST_F( DeckLinkDevice, ARuntimeThatBorrowsTheCallbackDoesNotLoseItUnderACall )
   {
     VGate Gate;
     m_pReceiver->m_OnFrame = [&] { Gate.Pass(); };
-    boost::thread Vendor( [&] { Input().DeliverFrame( {} ); } );
-    Gate.WaitReached();
-    boost::thread End( [&] { m_pDevice.reset(); } );
-    Gate.Open();
-    Vendor.join();
-    End.join();
+    {
+      const VThread Vendor( [&] { Input().DeliverFrame( {} ); } );
+      Gate.WaitReached();
+      const VThread End( [&] { m_pDevice.reset(); } );
+      Gate.Open();
+    }
     m_pDevice = MakeDevice( 1 );
     InitialiseAndCapture();
   }
