@@ -1,6 +1,5 @@
 // Ten minutes, also at 29.97, where sound has a changing number of samples a frame: whether each frame still meets its own samples at the end.
 #include "tests/FileIO/Containers/MovieWriters.h"
-#include "tests/support/MovParser.h"
 #include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/RampReader.h"
@@ -125,35 +124,33 @@ struct VLongCase
 };
 
 // At 29.97 FFmpeg takes every single sample of a MOV file for a frame of its own, which takes it minutes.
-constexpr VLongCase ForFFmpeg[] = { { Mov, Every40ms }, { MP4, Every40ms }, { Avi, Drop2997 }, { Mkv, Drop2997 } };
-
-void Write( const std::string& i_rPath, const VLongCase& i_rCase )
-{
-  VHeader Settings = MovieHeader( Width, Height );
-  Settings.m_Timing.m_FramePeriodInTicks = i_rCase.m_Rate.m_PeriodInTicks;
-  Settings.m_Timecode = { i_rCase.m_Rate.m_Timecode, 1 };
-  const auto pWriter = MakeWriter( i_rCase.m_Row.m_Container, { .m_RiffBytes = RiffBytes } );
-  ASSERT_TRUE( pWriter->Open( i_rPath ) && Settings.WriteTo( *pWriter ) );
-  for( uint32_t Frame = 0; Frame < i_rCase.m_Rate.m_FramesInTenMinutes; ++Frame )
-  {
-    ASSERT_TRUE( Settings.WriteFrame( *pWriter, Picture( Frame ), Sound( i_rCase.m_Rate, Frame ), Frame ) );
-  }
-  ASSERT_TRUE( pWriter->Close() );
-}
+constexpr VLongCase Cases[] = { { Mov, Every40ms }, { Avi, Drop2997 }, { Mkv, Drop2997 } };
 
 class LongRecording : public testing::TestWithParam<VLongCase>
 {
 protected:
-  void CheckContent() const
+  void Write() const
   {
-    const VBytes Pictures = DecodeVideo( m_Path, "uyvy422" );
-    const size_t PictureBytes = Width * Height * 2;
-    ASSERT_EQ( Pictures.size(), m_Rate.m_FramesInTenMinutes * PictureBytes );
+    VHeader Settings = MovieHeader( Width, Height );
+    Settings.m_Timing.m_FramePeriodInTicks = m_Rate.m_PeriodInTicks;
+    Settings.m_Timecode = { m_Rate.m_Timecode, 1 };
+    const auto pWriter = MakeWriter( GetParam().m_Row.m_Container, { .m_RiffBytes = RiffBytes } );
+    ASSERT_TRUE( pWriter->Open( m_Path ) && Settings.WriteTo( *pWriter ) );
     for( uint32_t Frame = 0; Frame < m_Rate.m_FramesInTenMinutes; ++Frame )
     {
-      const VBytes Expected = Picture( Frame );
-      ASSERT_TRUE( std::equal( Expected.begin(), Expected.end(), Pictures.begin() + static_cast<std::ptrdiff_t>( Frame * PictureBytes ) ) ) << Frame;
+      ASSERT_TRUE( Settings.WriteFrame( *pWriter, Picture( Frame ), Sound( m_Rate, Frame ), Frame ) );
     }
+    ASSERT_TRUE( pWriter->Close() );
+  }
+
+  void CheckContent() const
+  {
+    VBytes Pictures;
+    for( uint32_t Frame = 0; Frame < m_Rate.m_FramesInTenMinutes; ++Frame )
+    {
+      Append( Pictures, Picture( Frame ) );
+    }
+    ASSERT_TRUE( DecodeVideo( m_Path, "uyvy422" ) == Pictures );
     const VBytes Samples = DecodeAudio( m_Path, "s16le" );
     ASSERT_EQ( Samples.size(), SamplesBefore( m_Rate, m_Rate.m_FramesInTenMinutes ) * sizeof( int16_t ) );
     const auto First = ReadRamp( { Samples.data(), Samples.size() / sizeof( int16_t ), 1 }, 1 );
@@ -169,7 +166,7 @@ protected:
 
 TEST_P( LongRecording, KeepsEveryFrameWithItsSound )
 {
-  Write( m_Path, GetParam() );
+  Write();
   CheckContent();
   const VTimes Times = AskTimes( m_Path );
   ASSERT_EQ( Times.m_Frames.size(), m_Rate.m_FramesInTenMinutes );
@@ -184,26 +181,4 @@ TEST_P( LongRecording, KeepsEveryFrameWithItsSound )
   }
 }
 
-INSTANTIATE_TEST_SUITE_P( Containers, LongRecording, testing::ValuesIn( ForFFmpeg ),
-  []( const auto& i_rInfo ) { return i_rInfo.param.m_Row.m_pName; } );
-
-TEST( LongMovie, KeepsEveryFrameWithItsSoundAt2997 )
-{
-  const VTemporaryFolder Folder;
-  Write( Folder.File( "long.mov" ), { Mov, Drop2997 } );
-  const auto File = VMovParser::OfFile( Folder.File( "long.mov" ) );
-  const VMovTrack& rVideo = File.Track( "vide" );
-  const VMovTrack& rSound = File.Track( "soun" );
-  ASSERT_EQ( rVideo.m_Samples.size(), Drop2997.m_FramesInTenMinutes );
-  ASSERT_EQ( rSound.m_Samples.size(), Drop2997.m_FramesInTenMinutes );
-  ASSERT_EQ( rVideo.m_Timescale, rSound.m_Timescale );
-  const auto UnitsASample = static_cast<int64_t>( rSound.m_Timescale / 48000 );
-  for( uint32_t Frame = 0; Frame < Drop2997.m_FramesInTenMinutes; ++Frame )
-  {
-    const auto Shown = static_cast<int64_t>( rVideo.m_Samples[Frame].m_DecodeTime );
-    ASSERT_EQ( Shown * 30000, int64_t{ Frame } * 1001 * rVideo.m_Timescale ) << Frame;
-    ASSERT_LT( std::abs( static_cast<int64_t>( rSound.m_Samples[Frame].m_DecodeTime ) - Shown ), UnitsASample ) << Frame;
-    ASSERT_TRUE( File.Bytes( rVideo.m_Samples[Frame] ) == Picture( Frame ) ) << Frame;
-    ASSERT_TRUE( File.Bytes( rSound.m_Samples[Frame] ) == Sound( Drop2997, Frame ) ) << Frame;
-  }
-}
+INSTANTIATE_TEST_SUITE_P( Containers, LongRecording, testing::ValuesIn( Cases ), []( const auto& i_rInfo ) { return i_rInfo.param.m_Row.m_pName; } );

@@ -17,7 +17,7 @@ constexpr VContainerRow MP4 = { "mp4", KVZ::IVideoContainer::EMP4 };
 constexpr VContainerRow Avi = { "avi", KVZ::IVideoContainer::EAVI };
 constexpr VContainerRow Mkv = { "mkv", KVZ::IVideoContainer::EMKV };
 constexpr VContainerRow Tvid = { "tvid", KVZ::IVideoContainer::ETVID };
-constexpr VContainerRow Images = { "images", KVZ::IVideoContainer::EIMAGES };
+constexpr VContainerRow Images = { "%FRAME%", KVZ::IVideoContainer::EIMAGES };
 
 // Parameters of tests are named by their containers.
 inline void PrintTo( const VContainerRow& i_rRow, std::ostream* o_pText ) { *o_pText << i_rRow.m_pName; }

@@ -1,15 +1,10 @@
 // What programs of others make of our files.
-#include "FileIO/VideoEncoding/ImageCompressors.h"
-#include "FileIO/VideoEncoding/VideoFrameEncoder.h"
-#include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/FileIO/Containers/MovieWriters.h"
 #include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
-
-#include <fstream>
 
 using namespace KVZ;
 using namespace Containers;
@@ -122,12 +117,7 @@ constexpr VPixelCase PixelCases[] = {
   { Mov, IPixelFormat::EU8Y8V8Y8, "uyvy422" },
   { Mov, IPixelFormat::EY8U8Y8V8, "yuyv422" },
   { Mov, IPixelFormat::EU10Y10V10Y10, "v210" },
-  { MP4, IPixelFormat::ER8G8B8, "rgb24" },
-  { MP4, IPixelFormat::EB8G8R8, "bgr24" },
-  { MP4, IPixelFormat::ER8G8B8u8, "rgba" },
-  { MP4, IPixelFormat::EB8G8R8u8, "bgra" },
   { MP4, IPixelFormat::EU8Y8V8Y8, "uyvy422" },
-  { MP4, IPixelFormat::EY8U8Y8V8, "yuyv422" },
   { Avi, IPixelFormat::ELuminance8, "rgb24", 50, 3 },
   { Avi, IPixelFormat::EBayerRG8, "rgb24", 50, 3 },
   { Avi, IPixelFormat::EBayerGB8, "rgb24", 50, 3 },
@@ -183,19 +173,20 @@ struct VImageCase
 {
   VContainerRow m_Row;
   IVideoPayload::Enum m_Payload;
+  const char* m_pExtension;
   IPixelFormat::Enum m_Format;
   const char* m_pDecoded;
 };
 
 // JPEG with two sets of tables and with one.
 constexpr VImageCase ImageCases[] = {
-  { Mov, IVideoPayload::EImageJPEG, IPixelFormat::ER8G8B8, "yuvj444p" },
-  { Mov, IVideoPayload::EImagePNG, IPixelFormat::ER8G8B8, "rgb24" },
-  { Mov, IVideoPayload::EImageTIFF, IPixelFormat::ER8G8B8, "rgb24" },
-  { Avi, IVideoPayload::EImageJPEG, IPixelFormat::ER8G8B8, "yuvj444p" },
-  { Avi, IVideoPayload::EImageJPEG, IPixelFormat::ELuminance8, "gray" },
-  { Mkv, IVideoPayload::EImageJPEG, IPixelFormat::ELuminance8, "gray" },
-  { Mkv, IVideoPayload::EImageJPEG, IPixelFormat::ER8G8B8u8, "yuvj444p" },
+  { Mov, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ER8G8B8, "yuvj444p" },
+  { Mov, IVideoPayload::EImagePNG, "png", IPixelFormat::ER8G8B8, "rgb24" },
+  { Mov, IVideoPayload::EImageTIFF, "tiff", IPixelFormat::ER8G8B8, "rgb24" },
+  { Avi, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ER8G8B8, "yuvj444p" },
+  { Avi, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ELuminance8, "gray" },
+  { Mkv, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ELuminance8, "gray" },
+  { Mkv, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ER8G8B8u8, "yuvj444p" },
 };
 
 // What a program tells of one and the same recording in each container.
@@ -278,9 +269,6 @@ TEST( OutsideReaders, DecodeTheSamplesThatWereWritten )
 
 TEST( OutsideReaders, DecodeImagesAsInFilesOfTheirOwn )
 {
-  VideoEncoding::VEncoderParts Parts;
-  Parts.m_Compressors = VideoEncoding::ImageCompressors();
-  const VideoEncoding::VVideoFrameEncoder Encoder( VideoEncoding::EConverter::Software, Parts );
   for( const VImageCase& rCase : ImageCases )
   {
     SCOPED_TRACE( std::string( rCase.m_Row.m_pName ) + " " + ToName( rCase.m_Payload ) + " of " + ToName( rCase.m_Format ) );
@@ -289,17 +277,10 @@ TEST( OutsideReaders, DecodeImagesAsInFilesOfTheirOwn )
     VOutsideFile File( rCase.m_Row );
     File.Write( Header );
     File.ExpectAnswers( { { "streams.stream.0.nb_read_frames", "7" } } );
-    VBytes Expected;
-    for( uint32_t Frame = 0; Frame < FewFrames; ++Frame )
-    {
-      VBufferList List{ Buffer( Image( Header, Frame ) ) };
-      KVZ::IStandardBufferAllocator Allocator( "Test" );
-      ASSERT_TRUE( Encoder.Encode( Allocator, List, Header.m_Video, rCase.m_Payload, rCase.m_Format ) );
-      const std::string Path = File.m_Folder.File( "image" );
-      std::ofstream( Path, std::ios::binary )
-        .write( reinterpret_cast<const char*>( List.front()->Data() ), static_cast<std::streamsize>( List.front()->Size() ) );
-      Append( Expected, DecodeVideo( Path, rCase.m_pDecoded ) );
-    }
+    VOutsideFile Sequence( Images );
+    Header.m_AudioPayload = IAudioPayload::ENone;
+    Sequence.Write( Header );
+    const VBytes Expected = DecodeVideo( Sequence.m_Folder.File( std::string( "movie.%08d." ) + rCase.m_pExtension ), rCase.m_pDecoded );
     EXPECT_FALSE( Expected.empty() );
     EXPECT_TRUE( DecodeVideo( File.m_Path, rCase.m_pDecoded ) == Expected );
   }

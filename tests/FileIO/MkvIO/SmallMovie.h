@@ -20,8 +20,7 @@ struct VDescription : TestSupport::VHeader
 
 struct VSmallMovie : TestSupport::VMemoryRecording<VMkvWriter>
 {
-  explicit VSmallMovie( const VDescription& i_rDescription = {}, const TestSupport::VFault& i_rFault = {} )
-    : VMemoryRecording( i_rDescription, i_rFault, []( WriterSupport::VStreamMaker i_Maker ) { return VMkvWriter( {}, std::move( i_Maker ) ); } )
+  VSmallMovie() : VMemoryRecording( VDescription(), {}, []( WriterSupport::VStreamMaker i_Maker ) { return VMkvWriter( {}, std::move( i_Maker ) ); } )
   {
   }
 

@@ -6,6 +6,8 @@
 #include "tests/support/MovParser.h"
 #include "tests/support/RiffParser.h"
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <stdexcept>
 
