@@ -4,8 +4,8 @@
 #include "tests/CoreVideoUtils/GuardedBytes.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/Threads.h"
 
-#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -302,21 +302,16 @@ TEST( PixelFormatConverter, ConvertsOnSeveralThreads )
 
   VPixelFormatConverter Shared;
   std::atomic<int> Wrong{ 0 };
-  boost::thread_group Threads;
-  for( int Thread = 0; Thread < 3; ++Thread )
-  {
-    Threads.create_thread(
-      [&]
+  TestSupport::RunOnThreads( 3,
+    [&]( uint32_t )
+    {
+      for( int Round = 0; Round < 50; ++Round )
       {
-        for( int Round = 0; Round < 50; ++Round )
-        {
-          Shared.SetColourCorrection( Round % 2 == 0 ? KVZ::VColourRecord() : Strong );
-          const VBytes Result = Convert( Shared, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
-          Wrong += Result != Expected[0] && Result != Expected[1];
-        }
-      } );
-  }
-  Threads.join_all();
+        Shared.SetColourCorrection( Round % 2 == 0 ? KVZ::VColourRecord() : Strong );
+        const VBytes Result = Convert( Shared, IPixelFormat::EBayerRG8, Source, IPixelFormat::ER8G8B8, Size );
+        Wrong += Result != Expected[0] && Result != Expected[1];
+      }
+    } );
   EXPECT_EQ( 0, Wrong );
 }
 

@@ -2,11 +2,10 @@
 #include "CoreVideoUtilsOpenGL/FrameUpload.h"
 #include "tests/CoreVideoUtilsOpenGL/Images.h"
 #include "tests/support/AssertionCapture.h"
+#include "tests/support/Threads.h"
 
 #include <QtGui/QGuiApplication>
 #include <QtGui/QSurfaceFormat>
-
-#include <boost/thread/thread.hpp>
 
 #include <algorithm>
 #include <atomic>
@@ -175,20 +174,15 @@ TEST( OpenGLAgreement, HoldsForFramesFromSeveralThreads )
 {
   VPixelFormatConverterOpenGL Converter( {} );
   std::atomic<int> Wrong{ 0 };
-  boost::thread_group Threads;
-  for( uint32_t Thread = 0; Thread < 4; ++Thread )
-  {
-    Threads.create_thread(
-      [&, Thread]
+  TestSupport::RunOnThreads( 4,
+    [&]( uint32_t i_Thread )
+    {
+      const VImage Image = MakeNoise( i_Thread % 2 == 0 ? IPixelFormat::EBayerRG8 : IPixelFormat::ER8G8B8, 32 + 16 * ( i_Thread / 2 ), 24 );
+      const VBytes Expected = InSoftware( Image, IPixelFormat::EB8G8R8 );
+      for( int Round = 0; Round < 10; ++Round )
       {
-        const VImage Image = MakeNoise( Thread % 2 == 0 ? IPixelFormat::EBayerRG8 : IPixelFormat::ER8G8B8, 32 + 16 * ( Thread / 2 ), 24 );
-        const VBytes Expected = InSoftware( Image, IPixelFormat::EB8G8R8 );
-        for( int Round = 0; Round < 10; ++Round )
-        {
-          Wrong += LargestDifference( Expected, Convert( Converter, Image, IPixelFormat::EB8G8R8 ).value_or( VBytes() ) ) > 1 ? 1 : 0;
-        }
-      } );
-  }
-  Threads.join_all();
+        Wrong += LargestDifference( Expected, Convert( Converter, Image, IPixelFormat::EB8G8R8 ).value_or( VBytes() ) ) > 1 ? 1 : 0;
+      }
+    } );
   EXPECT_EQ( 0, Wrong );
 }

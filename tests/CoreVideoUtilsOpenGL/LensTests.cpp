@@ -13,43 +13,33 @@ namespace
 
 using VPoint = std::array<double, 2>;
 
-VPoint Mix( const VPoint& i_rA, const VPoint& i_rB, double i_Part )
-{
-  return { i_rA[0] + ( i_rB[0] - i_rA[0] ) * i_Part, i_rA[1] + ( i_rB[1] - i_rA[1] ) * i_Part };
-}
-
-// How far the mesh's triangles lead points of one cell away from where they belong: the middles of the three sides and of the triangles.
-double ErrorOfCell( const VLens& i_rLens, const VPoint& i_rFrom, const VPoint& i_rTo )
-{
-  const std::array<VPoint, 4> Corners = { i_rFrom, { i_rTo[0], i_rFrom[1] }, { i_rFrom[0], i_rTo[1] }, i_rTo };
-  double Largest = 0.0;
-  const auto Check = [&]( size_t i_A, size_t i_B, double i_Part )
-  {
-    const VPoint Drawn = Mix( Undistort( i_rLens, Corners[i_A] ), Undistort( i_rLens, Corners[i_B] ), i_Part );
-    const VPoint True = Undistort( i_rLens, Mix( Corners[i_A], Corners[i_B], i_Part ) );
-    Largest = std::max( Largest, std::hypot( Drawn[0] - True[0], Drawn[1] - True[1] ) );
-  };
-  for( const double Part : { 0.25, 0.5, 0.75 } )
-  {
-    Check( 0, 1, Part );
-    Check( 0, 2, Part );
-    Check( 1, 2, Part );
-    Check( 1, 3, Part );
-    Check( 2, 3, Part );
-  }
-  return Largest;
-}
-
+// How far the mesh's triangles lead points away from where they belong, at most: along all sides.
 double ErrorOfMesh( const VLens& i_rLens, uint32_t i_Width, uint32_t i_Height )
 {
   const VMeshCells Cells = CellsFor( i_rLens, i_Width, i_Height );
-  const VPoint Cell = { 1.0 * i_Width / Cells.m_Columns, 1.0 * i_Height / Cells.m_Rows };
+  const auto At = [&]( double i_Column, double i_Row ) {
+    return Undistort( i_rLens, { i_Column * i_Width / Cells.m_Columns, i_Row * i_Height / Cells.m_Rows } );
+  };
   double Largest = 0.0;
-  for( uint32_t Row = 0; Row < Cells.m_Rows; ++Row )
+  const auto Check = [&]( double i_Column, double i_Row, double i_AcrossColumns, double i_AcrossRows )
   {
-    for( uint32_t Column = 0; Column < Cells.m_Columns; ++Column )
+    const VPoint A = At( i_Column, i_Row );
+    const VPoint B = At( i_Column + i_AcrossColumns, i_Row + i_AcrossRows );
+    for( const double Part : { 0.25, 0.5, 0.75 } )
     {
-      Largest = std::max( Largest, ErrorOfCell( i_rLens, { Column * Cell[0], Row * Cell[1] }, { ( Column + 1 ) * Cell[0], ( Row + 1 ) * Cell[1] } ) );
+      const VPoint True = At( i_Column + Part * i_AcrossColumns, i_Row + Part * i_AcrossRows );
+      Largest = std::max( Largest, std::hypot( A[0] + ( B[0] - A[0] ) * Part - True[0], A[1] + ( B[1] - A[1] ) * Part - True[1] ) );
+    }
+  };
+  for( uint32_t Row = 0; Row <= Cells.m_Rows; ++Row )
+  {
+    for( uint32_t Column = 0; Column <= Cells.m_Columns; ++Column )
+    {
+      const double Right = Column < Cells.m_Columns ? 1.0 : 0.0;
+      const double Down = Row < Cells.m_Rows ? 1.0 : 0.0;
+      Check( Column, Row, Right, 0.0 );
+      Check( Column, Row, 0.0, Down );
+      Check( Column + Right, Row, -Right, Down );
     }
   }
   return Largest;

@@ -4,8 +4,8 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/Threads.h"
 
-#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -168,19 +168,14 @@ TEST( ImageFiles, RefusalsSayWhy )
 TEST( ImageFiles, SeveralThreadsAtOnce )
 {
   std::atomic<int> Good{ 0 };
-  boost::thread_group Threads;
-  for( uint32_t Number = 0; Number < 4; ++Number )
-  {
-    Threads.create_thread(
-      [&Good, Number]
+  TestSupport::RunOnThreads( 4,
+    [&]( uint32_t i_Thread )
+    {
+      for( uint32_t Round = 0; Round < 6; ++Round )
       {
-        for( uint32_t Round = 0; Round < 6; ++Round )
-        {
-          const IPixelFormat::Enum Format = Round % 2 ? IPixelFormat::ER8G8B8 : IPixelFormat::ELuminance8;
-          Good += ComesBack( Kinds[( Number + Round / 2 ) % 2], MakeImage( Format, 64 + Number, 48, Number * 10 + Round ) );
-        }
-      } );
-  }
-  Threads.join_all();
+        const IPixelFormat::Enum Format = Round % 2 ? IPixelFormat::ER8G8B8 : IPixelFormat::ELuminance8;
+        Good += ComesBack( Kinds[( i_Thread + Round / 2 ) % 2], MakeImage( Format, 64 + i_Thread, 48, i_Thread * 10 + Round ) );
+      }
+    } );
   EXPECT_EQ( Good, 24 );
 }

@@ -9,9 +9,9 @@
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/Threads.h"
 #include "tests/support/TurboJPEG.h"
 
-#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -229,27 +229,25 @@ TEST_F( VideoFrameEncoder, RefusalsSayWhy )
 TEST_F( VideoFrameEncoder, TheArgumentChoosesTheConverter )
 {
   std::string Made;
-  for( const EConverter Converter : { EConverter::OpenGLFirst, EConverter::Software, EConverter::OpenGLSecond } )
+  const auto Maker = [&Made]( char i_Name )
   {
-    m_Parts.m_ConverterMakers[Converter] = [&Made, Converter]
+    return [&Made, i_Name]
     {
-      Made += std::to_string( static_cast<int>( Converter ) );
+      Made += i_Name;
       return nullptr;
     };
-  }
+  };
+  m_Parts.m_ConverterMakers = { { EConverter::OpenGLFirst, Maker( '1' ) }, { EConverter::Software, Maker( '2' ) },
+    { EConverter::OpenGLSecond, Maker( '3' ) } };
+  VEncoderParts WithoutOpenGL;
+  WithoutOpenGL.m_ConverterMakers = { { EConverter::Software, Maker( 's' ) } };
   for( const int Argument : { 1, 2, 3, 0, 17 } )
   {
     VVideoFrameEncoder( static_cast<EConverter>( Argument ), m_Parts );
+    VVideoFrameEncoder( static_cast<EConverter>( Argument ), WithoutOpenGL );
   }
-  EXPECT_EQ( Made, "12333" );
-  m_Parts.m_ConverterMakers.erase( EConverter::OpenGLFirst );
-  m_Parts.m_ConverterMakers.erase( EConverter::OpenGLSecond );
-  for( const int Argument : { 1, 2, 3 } )
-  {
-    VVideoFrameEncoder( static_cast<EConverter>( Argument ), m_Parts );
-  }
-  EXPECT_EQ( Made, "12333222" );
-  EXPECT_EQ( 2u, m_Log.Count( "There is no OpenGL in this build: pixel formats are converted in software." ) );
+  EXPECT_EQ( Made, "1s2s3s3s3s" );
+  EXPECT_EQ( 4u, m_Log.Count( "There is no OpenGL in this build: pixel formats are converted in software." ) );
 }
 
 TEST_F( VideoFrameEncoder, OneServesSeveralThreads )
@@ -269,19 +267,14 @@ TEST_F( VideoFrameEncoder, OneServesSeveralThreads )
   }
   std::atomic<uint32_t> Next{ 0 };
   std::atomic<uint32_t> Equal{ 0 };
-  boost::thread_group Threads;
-  for( int Number = 0; Number < 4; ++Number )
-  {
-    Threads.create_thread(
-      [&]
+  RunOnThreads( 4,
+    [&]( uint32_t )
+    {
+      for( uint32_t Frame = Next++; Frame < Frames; Frame = Next++ )
       {
-        for( uint32_t Frame = Next++; Frame < Frames; Frame = Next++ )
-        {
-          Equal += Compressed( Frame ) == Alone[Frame];
-        }
-      } );
-  }
-  Threads.join_all();
+        Equal += Compressed( Frame ) == Alone[Frame];
+      }
+    } );
   EXPECT_EQ( Equal, Frames );
 }
 
