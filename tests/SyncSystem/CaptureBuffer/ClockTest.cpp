@@ -20,18 +20,6 @@ TEST( Clock, OrderIsTypeThenUnsignedSourceThenIndex )
   EXPECT_STREQ( ClockName( static_cast<IClock::EType>( 2 ) ), "InvalidClockType" );
 }
 
-TEST( Clock, AbsentClockReadsInvalid )
-{
-  ITickInClocks Ticks;
-  EXPECT_FALSE( Ticks.Find( Counter ).IsValid() );
-  Ticks.Set( Counter, VTick( 0 ) );
-  Ticks.Set( Timecode, VTick( 10 ) );
-  EXPECT_EQ( Ticks.Find( Counter ), VTick( 0 ) );
-  EXPECT_FALSE( Ticks.Find( FrameNumber ).IsValid() );
-  EXPECT_EQ( Ticks.m_TickByClock.rbegin()->first, Counter );
-  EXPECT_EQ( Shifted( Ticks, VTick( -3 ) ).Find( Timecode ), VTick( 7 ) );
-}
-
 // Every fault at once; they are taken away, and the last ones put in, in the order in which they are told.
 TEST( SourceSyncSession, SaysWhichRuleFailsFirst )
 {

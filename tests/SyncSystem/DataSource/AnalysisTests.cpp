@@ -1,4 +1,4 @@
-// How late frames came, published one state a frame where somebody wants it.
+// When frames came, and how late: told of a session, and published one state a frame where somebody wants it.
 #include "host/FlowGraphState.h"
 #include "tests/SyncSystem/DataSource/TestSource.h"
 
@@ -15,7 +15,7 @@ double NumberOf( const KVZ::VFlowStatePtr& i_pState, const char* i_pName )
   return Number;
 }
 
-TEST( DeliveryAnalysis, PublishesAStateForEachTimedFrame )
+TEST( DeliveryAnalysis, TimesASessionAndPublishesAStateForEachTimedFrame )
 {
   const TestSupport::VFrameMemory Memory( 50, 4 );
   std::vector<KVZ::VFlowStatePtr> Published;
@@ -27,11 +27,17 @@ TEST( DeliveryAnalysis, PublishesAStateForEachTimedFrame )
   const auto pSource = KVZ::MakeShared<VTestSource>( Settings );
 
   pSource->AddMany( 2 );
-  EXPECT_TRUE( Published.empty() ) << "frames without a time";
+  EXPECT_TRUE( Published.empty() ) << "a time of 0 is no time";
+  EXPECT_FALSE( pSource->GetSourceTimingInfo() );
   pSource->m_Now = 100.0;
   pSource->AddMany( 40 );
   const size_t Steady = Published.size();
   EXPECT_GE( Steady, 38u );
+  const auto Info = pSource->GetSourceTimingInfo();
+  ASSERT_TRUE( Info );
+  EXPECT_EQ( Info->m_SessionId, 1u );
+  EXPECT_NEAR( Info->m_StartTime, 100.0, 1e-6 ) << "of the session's first frame, though that was not timed";
+  EXPECT_NEAR( Info->m_SecondsPerSample, 0.04, 1e-9 );
   pSource->m_Now = 100.004;   // from here on later
   pSource->AddMany( 1 );
   ASSERT_EQ( Published.size(), Steady + 1 );

@@ -95,27 +95,4 @@ TEST( DataSourceReading, ChangesOverWhenANewSessionHasStarted )
   EXPECT_EQ( Read.m_pInfo->m_Id, KVZ::VGlobalSyncSessionId( 2 ) );
 }
 
-TEST( DataSourceReading, TheNextFrameWakesASleeperOnceWithItsToken )
-{
-  VSourceRig Rig;
-  std::vector<uint64_t> Woken;
-  Rig.m_pSource->OnNewFrames().Set( [&]( uint64_t i_Token ) { Woken.push_back( i_Token ); } );
-  Rig.m_pSource->AddMany( 1 );
-  Rig.Join( 1, VTick( 0 ) );
-  VReadFrames Read;
-  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 41, Read ), EReadResult::Frames );
-  Rig.m_pSource->AddMany( 1 );
-  Rig.m_pService->RunAll();
-  EXPECT_TRUE( Woken.empty() ) << "nobody slept";
-
-  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 42, Read ), EReadResult::Frames );
-  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 43, Read ), EReadResult::Asleep );
-  Rig.m_pSource->AddMany( 2 );
-  EXPECT_TRUE( Woken.empty() ) << "the wake goes through the strand";
-  Rig.m_pService->RunAll();
-  EXPECT_EQ( Woken, ( std::vector<uint64_t>{ 43 } ) );
-  EXPECT_EQ( Rig.m_pSource->ReadFramesOrSleep( Plenty, 44, Read ), EReadResult::Frames );
-  EXPECT_EQ( Indices( Read ), ( std::vector<int64_t>{ 2, 3 } ) );
-}
-
 }

@@ -112,21 +112,6 @@ TEST( DataSourceSessions, TellsItsPlaceAndForgetsSessionsWhoseFramesHaveGone )
   EXPECT_EQ( Rig.m_pSource->GetOldestGlobalSyncSession(), VGlobalSyncSessionId( 2 ) );
 }
 
-TEST( DataSourceSessions, TimesItsFrames )
-{
-  VSourceRig Rig;
-  EXPECT_FALSE( Rig.m_pSource->GetSourceTimingInfo() );
-  Rig.m_pSource->AddMany( 5 );
-  EXPECT_FALSE( Rig.m_pSource->GetSourceTimingInfo() ) << "a time of 0 is no time";
-  Rig.m_pSource->m_Now = 500.0;
-  Rig.m_pSource->AddMany( 20 );
-  const auto Info = Rig.m_pSource->GetSourceTimingInfo();
-  ASSERT_TRUE( Info );
-  EXPECT_EQ( Info->m_SessionId, 1u );
-  EXPECT_NEAR( Info->m_StartTime, 500.0, 1e-6 ) << "of the session's first frame, though that was not timed";
-  EXPECT_NEAR( Info->m_SecondsPerSample, 0.04, 1e-9 );
-}
-
 // An engine that answers a request on the source's own strand.
 TEST( DataSourceSessions, ACallerOnTheStrandIsAnsweredInPlace )
 {

@@ -8,6 +8,7 @@
 #include "tests/support/LogCapture.h"
 
 #include <cmath>
+#include <cstring>
 
 namespace
 {
@@ -44,16 +45,6 @@ protected:
     m_pServices->m_Written.clear();
     EXPECT_EQ( m_pNode->ProcessChecked(), EFlowResult::Ok );
     return std::exchange( m_pServices->m_Written, {} );
-  }
-  // All that waits, and the node asleep after it.
-  std::vector<VFlowStatePtr> Drain()
-  {
-    std::vector<VFlowStatePtr> All;
-    for( std::vector<VFlowStatePtr> States = Round(); !States.empty(); States = Round() )
-    {
-      All.insert( All.end(), States.begin(), States.end() );
-    }
-    return All;
   }
   template<class TItem>
   static const TItem& Item( const VFlowStatePtr& i_pState )
@@ -180,11 +171,17 @@ TEST_F( FlowNodeVideoInput, SleepsUntilTheNextFrame )
   EXPECT_TRUE( m_pServices->m_Woken.empty() );
   const uint64_t Token = m_pServices->m_NextToken - 1;
   m_Rig.DeliverMany( 3 );
+  EXPECT_TRUE( m_pServices->m_Woken.empty() ) << "the wake goes through the strand";
   m_Rig.m_pStrand->RunAll();
   EXPECT_EQ( m_pServices->m_Woken, ( std::vector<uint64_t>{ Token } ) ) << "the first of them wakes, the others find it awake";
   EXPECT_EQ( Indices( Round() ), ( std::vector<int64_t>{ 1, 2, 3 } ) );
   EXPECT_EQ( m_pServices->m_WriteFlags.back(), 2u );
+  m_Rig.DeliverMany( 1 );
+  m_Rig.m_pStrand->RunAll();
+  EXPECT_EQ( m_pServices->m_Woken.size(), 1u ) << "nobody slept";
+  Round();
 
+  EXPECT_TRUE( Round().empty() );
   m_pNode->PostProcessChecked();
   m_Rig.DeliverMany( 1 );
   m_Rig.m_pStrand->RunAll();
@@ -230,7 +227,7 @@ TEST_F( FlowNodeVideoInput, AStallCostsAllButTenFramesEvenlySpread )
 TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
 {
   Begin();
-  Drain();
+  Round();
   m_Rig.DeliverMany( 8 );
   std::vector<VFlowStatePtr> Held = Round();
   ASSERT_EQ( Held.size(), 8u );
@@ -242,10 +239,8 @@ TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
   for( size_t Index = 0; Index < Held.size(); ++Index )
   {
     const auto& rVideo = Item<KVZ::VFlowVideoFrame>( Held[Index] );
-    for( size_t Byte = 0; Byte < rVideo.m_pBuffer->Size(); ++Byte )
-    {
-      ASSERT_EQ( rVideo.m_pBuffer->Data()[Byte], static_cast<uint8_t>( 1 + Index ) );
-    }
+    const std::vector<uint8_t> Expected( rVideo.m_pBuffer->Size(), static_cast<uint8_t>( 1 + Index ) );
+    ASSERT_EQ( std::memcmp( rVideo.m_pBuffer->Data(), Expected.data(), Expected.size() ), 0 );
   }
 
   // One buffer alone keeps its frame as well, also when node and source have gone.
@@ -270,7 +265,7 @@ TEST_F( FlowNodeVideoInput, TakesItsDeviceFromGlobalItemsToo )
   const auto pOther = Other.Make();
   m_pSources->Insert( "vi:1", pOther );
   Begin();
-  Drain();
+  Round();
   Other.DeliverMany( 1 );
   Other.Join( *pOther, 1 );
 
