@@ -52,7 +52,27 @@ const VRefusalCase RefusalCases[] = {
   // What the device does not offer
   { "UnknownPixelFormat", Ready + VArguments{ "--pixel-format", "XYZ" }, 2, { "--pixel-format XYZ", "U8Y8V8Y8" } },
   { "UnknownAudioFormat", Ready + VArguments{ "--audio-format", "Float" }, 2, { "--audio-format Float", "Int16", "Int32" } },
-  { "PayloadOfAnotherContainer", Ready + VArguments{ "--video", "jpeg" }, 2, { "--video jpeg", "tvid takes uncompressed" } },
+  // What a container does not take, or a payload does not have
+  { "UncompressedImages", Ready + VArguments{ "--container", "images", "--video", "uncompressed" }, 2,
+    { "--video uncompressed", "images", "jpeg, png, tiff" } },
+  { "ImagesWithSound", Ready + VArguments{ "--container", "images", "--audio", "uncompressed" }, 2, { "--audio uncompressed", "images takes none" } },
+  { "ImagesWithChannels", Ready + VArguments{ "--container", "images", "--audio-channels", "2" }, 2, { "--audio-channels 2", "images takes 0" } },
+  { "ImagesWithSamples", Ready + VArguments{ "--container", "images", "--audio-format", "Int16" }, 2, { "--audio-format Int16", "images" } },
+  { "PngInTvid", Ready + VArguments{ "--container", "tvid", "--video", "png" }, 2, { "--video png", "tvid takes uncompressed" } },
+  { "TiffInAvi", Ready + VArguments{ "--container", "avi", "--video", "tiff" }, 2, { "--video tiff", "avi takes uncompressed, jpeg" } },
+  { "QualityOfNothing", Ready + VArguments{ "--quality", "90" }, 2, { "--quality 90", "jpeg" } },
+  { "QualityOfPng", Ready + VArguments{ "--container", "images", "--video", "png", "--quality", "90" }, 2, { "--quality 90", "jpeg" } },
+  { "NoQuality", Ready + VArguments{ "--container", "images", "--quality", "0" }, 2, { "--quality", "1 to 100" } },
+  { "TooMuchQuality", Ready + VArguments{ "--container", "images", "--quality", "101" }, 2, { "--quality", "1 to 100" } },
+  { "PixelsOfAnotherContainer", Ready + VArguments{ "--container", "avi", "--pixel-format", "U10Y10V10Y10" }, 2,
+    { "--pixel-format U10Y10V10Y10", "avi", "B8G8R8u8" } },
+  { "PixelsThatCannotBeHad", Ready + VArguments{ "--pixel-format", "Luminance6" }, 2, { "--pixel-format Luminance6", "vi:0", "R8G8B8" } },
+  { "PixelsOfAnImage", Ready + VArguments{ "--container", "images", "--pixel-format", "R8G8B8" }, 2,
+    { "--pixel-format R8G8B8", "vi:0", "U8Y8V8Y8" } },
+  { "ChannelsOfAnotherContainer", Ready + VArguments{ "--container", "avi", "--audio-channels", "5" }, 2,
+    { "--audio-channels 5", "0, 1, 2, 3, 4, 8" } },
+  { "BurnInOfWhat", Ready + VArguments{ "--burn-in", "name" }, 2, { "--burn-in", "timecode" } },
+  // Devices
   { "UnknownDevice", Ready + VArguments{ "--device", "vi:7" }, 4, { "vi:7", "vi:0" } },
   { "NoDevice", Five, 4, { "--card" } },
   // The card's text

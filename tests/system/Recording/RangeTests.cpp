@@ -121,9 +121,9 @@ TEST_P( PreRollTest, BeginsThatLongBeforeTheRequest )
   const std::vector<int64_t> Newest = NumbersBehind( "(Lastest tick is ", Result.m_Run.m_Error );
   ASSERT_EQ( 1u, Starts.size() ) << Describe( Result.m_Run );
   ASSERT_EQ( 1u, Newest.size() );
-  // Frames that arrive between the host's request and the source's answer make the distance larger, at most by what fits in a second
+  // Frames that arrive between the host's request and the source's answer make the distance larger, at most by what fits in some seconds
   EXPECT_GE( Newest[0] - Starts[0], PreRoll - Period );
-  EXPECT_LT( Newest[0] - Starts[0], PreRoll + 4 * 135000000 );
+  EXPECT_LT( Newest[0] - Starts[0], PreRoll + 20 * int64_t{ 135000000 } );
 
   const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
   ASSERT_EQ( static_cast<size_t>( FrameCount ), Frames.size() );

@@ -39,7 +39,7 @@ const VPairCase PairCases[] = {
 };
 
 // The cards of one program are made one after another; their first frames are that far apart, at most.
-constexpr int64_t StartSpread = 135000000 / 4;
+constexpr int64_t StartSpread = 135000000;
 
 }
 
