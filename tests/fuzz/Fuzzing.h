@@ -1,4 +1,4 @@
-// What every fuzzer here needs: silence, and a way to stop at what must not be.
+// What every fuzzer here needs: silence, and a way to stop at what must not be. For the one file of a fuzzer.
 #pragma once
 
 #include "StageCoreRuntime/GlobalLog.h"
@@ -6,16 +6,15 @@
 #include <cstdio>
 #include <cstdlib>
 
+// Refusals are what most inputs end in; writing each to the console would take nearly all the time.
+extern "C" int LLVMFuzzerInitialize( int*, char*** )
+{
+  KVZ::ConfigureLog( { .m_ConsoleLevel = KVZ::LogLevel::None } );
+  return 0;
+}
+
 namespace Fuzzing
 {
-
-// Refusals are what most inputs end in; writing each to the console would take nearly all the time.
-inline void SilenceLog()
-{
-  KVZ::VLogOptions Options;
-  Options.m_ConsoleLevel = KVZ::LogLevel::None;
-  KVZ::ConfigureLog( Options );
-}
 
 // Ends the program, with the input kept, where a property does not hold.
 inline void Require( bool i_bHolds, const char* i_pProperty )

@@ -33,12 +33,6 @@ bool AreEqual( const std::vector<VJPEGSegment>& i_rA, const std::vector<VJPEGSeg
 
 }
 
-extern "C" int LLVMFuzzerInitialize( int*, char*** )
-{
-  Fuzzing::SilenceLog();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput( const uint8_t* i_pData, size_t i_Size )
 {
   const std::vector<uint8_t> Image( i_pData, i_pData + i_Size );

@@ -39,12 +39,6 @@ uint64_t Walk( TarvoVideo::VReader& io_rReader, uint64_t i_Size )
 
 }
 
-extern "C" int LLVMFuzzerInitialize( int*, char*** )
-{
-  Fuzzing::SilenceLog();
-  return 0;
-}
-
 extern "C" int LLVMFuzzerTestOneInput( const uint8_t* i_pData, size_t i_Size )
 {
   const std::vector<uint8_t> File( i_pData, i_pData + i_Size );

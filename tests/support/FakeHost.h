@@ -143,8 +143,8 @@ private:
   const std::shared_ptr<VHappenings> m_pHappenings;
 };
 
-// Any thread. Without a master clock.
-class VHeardSourceRegistry : public StageCorePluginInterface::ISourceRegistry
+// Any thread.
+class VHeardSourceRegistry : public VFakeSourceRegistry
 {
 public:
   explicit VHeardSourceRegistry( std::shared_ptr<VHappenings> i_pHappenings ) : m_pHappenings( std::move( i_pHappenings ) ) {}
@@ -173,8 +173,6 @@ public:
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     m_Sources.erase( std::remove( m_Sources.begin(), m_Sources.end(), i_pSource ), m_Sources.end() );
   }
-  std::shared_ptr<KVZ::IBaseLineClock> GetMasterClock() override { return nullptr; }
-  KVZ::IMultiCallbackPostal<void()>& GetMasterPeriodChangedCallback() override { return m_PeriodChanged; }
 
   // Null for a source that is not registered.
   std::shared_ptr<KVZ::ISource> Find( const std::string& i_rName ) const
@@ -197,7 +195,6 @@ public:
 
 private:
   const std::shared_ptr<VHappenings> m_pHappenings;
-  NotificationSystem::VMultiCallbackPostal<void()> m_PeriodChanged;
   mutable boost::mutex m_Mutex;
   std::vector<std::shared_ptr<KVZ::ISource>> m_Sources GUARDED_BY( m_Mutex );
   std::vector<std::weak_ptr<KVZ::ISource>> m_AllSources GUARDED_BY( m_Mutex );

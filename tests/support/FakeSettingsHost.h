@@ -40,6 +40,7 @@ private:
   const KVZ::VTick m_Period;
 };
 
+// Without a master clock until its period is set.
 class VFakeSourceRegistry : public StageCorePluginInterface::ISourceRegistry
 {
 public:

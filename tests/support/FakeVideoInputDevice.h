@@ -52,9 +52,6 @@ public:
   std::set<KVZ::IPixelFormat::Enum> m_PixelFormats = { KVZ::IPixelFormat::EU8Y8V8Y8, KVZ::IPixelFormat::ER8G8B8 };
   std::set<KVZ::ITimecodeSource::Enum> m_TimecodeSources = { KVZ::ITimecodeSource::ERP188_LTC, KVZ::ITimecodeSource::ERP188_Any,
     KVZ::ITimecodeSource::EAny };
-  std::set<KVZ::IAudioSampleFormat::Enum> m_AudioFormats = { KVZ::IAudioSampleFormat::EInt16, KVZ::IAudioSampleFormat::EInt32 };
-  std::set<uint32_t> m_AudioRates = { 48000 };
-  std::set<uint32_t> m_AudioChannelCounts = { 2, 8, 16 };
   std::map<std::string, VideoInputHAL::VDeviceControl> m_Controls;   // by the name of the parameter
 
   // What the device has been told
@@ -82,9 +79,12 @@ public:
   KVZ::ITimecode GetTimecode() const override { return m_Timecode; }
   void GetSupportedPixelFormats( std::set<KVZ::IPixelFormat::Enum>& o_rFormats ) const override { o_rFormats = m_PixelFormats; }
   void GetSupportedTimecodeSources( std::set<KVZ::ITimecodeSource::Enum>& o_rSources ) const override { o_rSources = m_TimecodeSources; }
-  void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& o_rFormats ) const override { o_rFormats = m_AudioFormats; }
-  void GetSupportedAudioSampleRates( std::set<uint32_t>& o_rRates ) const override { o_rRates = m_AudioRates; }
-  void GetSupportedAudioChannelCounts( std::set<uint32_t>& o_rCounts ) const override { o_rCounts = m_AudioChannelCounts; }
+  void GetSupportedAudioSampleFormats( std::set<KVZ::IAudioSampleFormat::Enum>& o_rFormats ) const override
+  {
+    o_rFormats = { KVZ::IAudioSampleFormat::EInt16, KVZ::IAudioSampleFormat::EInt32 };
+  }
+  void GetSupportedAudioSampleRates( std::set<uint32_t>& o_rRates ) const override { o_rRates = { 48000 }; }
+  void GetSupportedAudioChannelCounts( std::set<uint32_t>& o_rCounts ) const override { o_rCounts = { 2, 8, 16 }; }
 
   VideoInputHAL::VDeviceResult StartCapture( KVZ::IPixelFormat::Enum i_PixelFormat, KVZ::ITimecodeSource::Enum i_TimecodeSource,
     KVZ::IAudioSampleFormat::Enum i_AudioFormat, uint32_t i_AudioChannels ) override

@@ -102,8 +102,8 @@ void VTvidParser::ReadHeader()
 void VTvidParser::ReadDescription()
 {
   m_Width = static_cast<uint32_t>( Number( "VideoFrameInfo.ImageWidth" ) );
-  m_Height = static_cast<uint32_t>( Number( "VideoFrameInfo.ImageHeight" ) );
-  m_ImageSize = ImageSize( Text( "VideoFrameInfo.PixelFormat" ), m_Width, m_Height );
+  const auto Height = static_cast<uint64_t>( Number( "VideoFrameInfo.ImageHeight" ) );
+  m_ImageSize = ImageSize( Text( "VideoFrameInfo.PixelFormat" ), m_Width, Height );
   if( Number( "AudioFrameInfo.Present" ) != 0 )
   {
     m_Channels = static_cast<uint32_t>( Number( "AudioFrameInfo.Channels" ) );
@@ -165,36 +165,24 @@ std::vector<uint16_t> VTvidParser::Audio( const VFrame& i_rFrame ) const
   return Samples;
 }
 
-const VTvidParser::VValue* VTvidParser::Find( const std::string& i_rKey ) const
+const VTvidParser::VValue& VTvidParser::Find( const std::string& i_rKey ) const
 {
-  for( const VAttributes* pBlock : { &m_Internal, &m_External } )
-  {
-    const auto Found = pBlock->find( i_rKey );
-    if( Found != pBlock->end() )
-    {
-      return &Found->second;
-    }
-  }
-  return nullptr;
+  const VAttributes& rBlock = m_Internal.count( i_rKey ) != 0 ? m_Internal : m_External;
+  Require( rBlock.count( i_rKey ) != 0, "no " + i_rKey, m_RecordsStart );
+  return rBlock.at( i_rKey );
 }
 
 int64_t VTvidParser::Number( const std::string& i_rKey ) const
 {
-  const VValue* const pValue = Find( i_rKey );
-  Require( pValue && pValue->index() <= 2, "no whole number " + i_rKey, m_RecordsStart );
-  if( const auto* const pUnsigned = std::get_if<uint64_t>( pValue ) )
+  const VValue& rValue = Find( i_rKey );
+  if( const auto* const pUnsigned = std::get_if<uint64_t>( &rValue ) )
   {
     return static_cast<int64_t>( *pUnsigned );
   }
-  const auto* const pSigned = std::get_if<int64_t>( pValue );
-  return pSigned ? *pSigned : std::get<bool>( *pValue );
+  const auto* const pSigned = std::get_if<int64_t>( &rValue );
+  return pSigned ? *pSigned : std::get<bool>( rValue );
 }
 
-std::string VTvidParser::Text( const std::string& i_rKey ) const
-{
-  const VValue* const pValue = Find( i_rKey );
-  Require( pValue && std::holds_alternative<std::string>( *pValue ), "no text " + i_rKey, m_RecordsStart );
-  return std::get<std::string>( *pValue );
-}
+std::string VTvidParser::Text( const std::string& i_rKey ) const { return std::get<std::string>( Find( i_rKey ) ); }
 
 }

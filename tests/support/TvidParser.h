@@ -35,13 +35,11 @@ public:
   bool IsFinished() const { return m_bFinished; }
   const VAttributes& Internal() const { return m_Internal; }
   const VAttributes& External() const { return m_External; }
-  // Of whichever block holds the key; throws where none does.
+  // Of whichever block holds the key; throws where none does, or the value is of another kind.
   int64_t Number( const std::string& i_rKey ) const;
   std::string Text( const std::string& i_rKey ) const;
-  bool Has( const std::string& i_rKey ) const { return Find( i_rKey ) != nullptr; }
 
   uint32_t Width() const { return m_Width; }
-  uint32_t Height() const { return m_Height; }
   uint32_t Channels() const { return m_Channels; }
   const std::vector<VFrame>& Frames() const { return m_Frames; }
   uint64_t FileSize() const { return m_File.Size(); }
@@ -62,7 +60,7 @@ private:
   void ReadIndex();
   void WalkRecords();
   bool ReadRecord( uint64_t i_Key, uint64_t i_Position, uint64_t i_Limit );
-  const VValue* Find( const std::string& i_rKey ) const;
+  const VValue& Find( const std::string& i_rKey ) const;
 
   const VFileBytes m_File;
   uint64_t m_Cursor = 0;
@@ -70,7 +68,6 @@ private:
   VAttributes m_Internal;
   VAttributes m_External;
   uint32_t m_Width = 0;
-  uint32_t m_Height = 0;
   uint32_t m_Channels = 0;   // 0: no audio
   uint64_t m_ImageSize = 0;
   uint64_t m_IndexPosition = 0;
