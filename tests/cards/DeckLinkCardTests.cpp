@@ -36,40 +36,6 @@ TEST_F( DeckLinkCard, WhatARealCardRefuses )
   EXPECT_EQ( m_pInput->StartStreams(), E_UNEXPECTED );
 }
 
-TEST_F( DeckLinkCard, ModesAndTheirSupport )
-{
-  Plug( "decklink" );
-  IDeckLinkDisplayModeIterator* pIterator = nullptr;
-  ASSERT_EQ( m_pInput->GetDisplayModeIterator( &pIterator ), S_OK );
-  std::set<uint32_t> Codes;
-  for( IDeckLinkDisplayMode* pMode = nullptr; pIterator->Next( &pMode ) == S_OK; pMode->Release() )
-  {
-    EXPECT_TRUE( Codes.insert( pMode->GetDisplayMode() ).second );
-    int64_t Duration = 0;
-    int64_t TimeScale = 0;
-    EXPECT_EQ( pMode->GetFrameRate( &Duration, &TimeScale ), S_OK );
-    EXPECT_GT( TimeScale / Duration, 22 );
-    if( pMode->GetDisplayMode() == FourCharacterCode( "Hi59" ) )
-    {
-      const char* pName = nullptr;
-      EXPECT_EQ( pMode->GetName( &pName ), S_OK );
-      EXPECT_EQ( TakeText( pName ), "1080i59.94" );
-      EXPECT_EQ( pMode->GetHeight(), 1080 );
-      EXPECT_EQ( Duration * 30000, TimeScale * 1001 );
-      EXPECT_EQ( pMode->GetFieldDominance(), FieldDominance::UpperFieldFirst );
-      EXPECT_EQ( pMode->GetFlags(), DisplayModeFlag::Rec709 );
-    }
-  }
-  EXPECT_EQ( pIterator->Release(), 0u );
-  EXPECT_EQ( Codes.size(), 36u );
-
-  uint32_t Support = 9;
-  EXPECT_EQ( m_pInput->DoesSupportVideoMode( Mode1080p25, PixelFormat::YUV10Bit, InputFlag::FormatDetection, &Support, nullptr ), S_OK );
-  EXPECT_EQ( Support, ModeSupport::Yes );
-  EXPECT_EQ( m_pInput->DoesSupportVideoMode( Mode1080p25, PixelFormat::RGB12Bit, 0, &Support, nullptr ), S_OK );
-  EXPECT_EQ( Support, ModeSupport::No );
-}
-
 TEST_F( DeckLinkCard, InterfacesAreOneObjectAndRefuseTheUnknown )
 {
   Plug( "decklink" );

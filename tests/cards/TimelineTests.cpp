@@ -52,47 +52,40 @@ std::vector<VCardEvent> Events( const std::string& i_rScript )
   return Events.value_or( std::vector<VCardEvent>() );
 }
 
-struct VRateCase
-{
-  IVideoStandard::Enum m_Standard;
-  int m_Nominal;
-  int m_FramesPerLabel;
-  bool m_bDropFrame;
-};
-
-class TimecodeAtRate : public testing::TestWithParam<VRateCase>
-{
-};
-
 }
 
-TEST_P( TimecodeAtRate, CountsAsAPersonWouldThroughMidnight )
+TEST( SignalTimeline, LabelsCountAsAPersonWouldThroughMidnight )
 {
-  const VRateCase& rCase = GetParam();
-  VTimecodeLabel Expected{ 23, 48, 58, 20, rCase.m_bDropFrame };
-  VSignalTimeline Signal( rCase.m_Standard, Expected, {} );
-  const int Labels = 20 * 60 * rCase.m_Nominal;
-  for( int Label = 0; Label < Labels; ++Label )
+  const struct
   {
-    for( int Field = 0; Field < rCase.m_FramesPerLabel; ++Field )
+    IVideoStandard::Enum m_Standard;
+    int m_Nominal;
+    int m_FramesPerLabel;
+    bool m_bDropFrame = false;
+  } Rates[] = { { IVideoStandard::EHD_1920_1080P_2398, 24, 1 }, { IVideoStandard::EHD_1920_1080P_2400, 24, 1 },
+    { IVideoStandard::EHD_1920_1080P_2500, 25, 1 }, { IVideoStandard::EHD_1920_1080P_2997, 30, 1 },
+    { IVideoStandard::EHD_1920_1080P_2997, 30, 1, true }, { IVideoStandard::EHD_1920_1080P_3000, 30, 1 },
+    { IVideoStandard::EHD_1920_1080P_4800, 24, 2 }, { IVideoStandard::EHD_1920_1080P_5000, 25, 2 }, { IVideoStandard::EHD_1920_1080P_5994, 30, 2 },
+    { IVideoStandard::EHD_1920_1080P_5994, 30, 2, true }, { IVideoStandard::EHD_1920_1080P_6000, 30, 2 } };
+  for( const auto& rRate : Rates )
+  {
+    SCOPED_TRACE( KVZ::ToName( rRate.m_Standard ) + ( rRate.m_bDropFrame ? " drop-frame" : "" ) );
+    VTimecodeLabel Expected{ 23, 48, 58, 20, rRate.m_bDropFrame };
+    VSignalTimeline Signal( rRate.m_Standard, Expected, {} );
+    for( int Label = 0; Label < 20 * 60 * rRate.m_Nominal; ++Label )
     {
-      const VSignalFrame Frame = Signal.Next();
-      ASSERT_TRUE( Frame.m_Timecode );
-      ASSERT_TRUE( Carries( Frame, Expected ) ) << KVZ::ToText( Frame.m_Timecode->m_Label ) << " as label " << Label;
-      ASSERT_EQ( Frame.m_Timecode->m_bFieldMark, Field == 1 );
+      for( int Field = 0; Field < rRate.m_FramesPerLabel; ++Field )
+      {
+        const VSignalFrame Frame = Signal.Next();
+        ASSERT_TRUE( Frame.m_Timecode );
+        ASSERT_TRUE( Carries( Frame, Expected ) ) << KVZ::ToText( Frame.m_Timecode->m_Label ) << " as label " << Label;
+        ASSERT_EQ( Frame.m_Timecode->m_bFieldMark, Field == 1 );
+      }
+      CountUp( Expected, rRate.m_Nominal );
     }
-    CountUp( Expected, rCase.m_Nominal );
+    EXPECT_EQ( Expected.m_Hours, 0 );
   }
-  EXPECT_EQ( Expected.m_Hours, 0 );
 }
-
-INSTANTIATE_TEST_SUITE_P( Rates, TimecodeAtRate,
-  testing::Values( VRateCase{ IVideoStandard::EHD_1920_1080P_2398, 24, 1, false }, VRateCase{ IVideoStandard::EHD_1920_1080P_2400, 24, 1, false },
-    VRateCase{ IVideoStandard::EHD_1920_1080P_2500, 25, 1, false }, VRateCase{ IVideoStandard::EHD_1920_1080P_2997, 30, 1, false },
-    VRateCase{ IVideoStandard::EHD_1920_1080P_2997, 30, 1, true }, VRateCase{ IVideoStandard::EHD_1920_1080P_3000, 30, 1, false },
-    VRateCase{ IVideoStandard::EHD_1920_1080P_4800, 24, 2, false }, VRateCase{ IVideoStandard::EHD_1920_1080P_5000, 25, 2, false },
-    VRateCase{ IVideoStandard::EHD_1920_1080P_5994, 30, 2, false }, VRateCase{ IVideoStandard::EHD_1920_1080P_5994, 30, 2, true },
-    VRateCase{ IVideoStandard::EHD_1920_1080P_6000, 30, 2, false } ) );
 
 // 29.97 frames a second: five hold 8008 samples.
 TEST( SignalTimeline, SamplesFollowTheCadence )

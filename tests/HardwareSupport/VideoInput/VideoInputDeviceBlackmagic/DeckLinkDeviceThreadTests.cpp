@@ -147,21 +147,16 @@ TEST_F( DeckLinkDevice, StartsFramesAndChangesOfFormatMixFreely )
   EXPECT_TRUE( Input().IsRunning() );
 }
 
-TEST_F( DeckLinkDevice, DestructionEndsTheStreamsAndDetaches )
+TEST_F( DeckLinkDevice, ItsEndEndsTheStreamsAndDetaches )
 {
   InitialiseAndCapture();
-  m_pDevice.reset();
+  m_pDevice->Close();
   EXPECT_EQ( Input().Calls(), ( VCalls{ "StopStreams", "DisableVideoInput" } ) );
   EXPECT_EQ( Input().Callback(), nullptr );
   EXPECT_EQ( m_pCard->References(), 1u );
   EXPECT_EQ( Input().References(), 1u );
   EXPECT_EQ( m_pAllocator.use_count(), 1 );
-}
-
-TEST_F( DeckLinkDevice, AClosedDeviceRefusesToStart )
-{
-  InitialiseAndCapture();
-  m_pDevice->Close();
+  // Whoever still holds it cannot start it again
   EXPECT_EQ( m_pDevice->GetStatus(), VDevice::EStatus::EReady );
   EXPECT_FALSE( m_pDevice->StartCapture( UYVY, AnyTimecode, Int16, 0 ).Succeeded() );
   EXPECT_EQ( m_Log.Texts(), ( VCalls{ "Could not find requested mode." } ) );
