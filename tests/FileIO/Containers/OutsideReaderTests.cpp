@@ -71,10 +71,6 @@ public:
     {
       EXPECT_EQ( Answers[rKey], rValue ) << rKey;
     }
-    if( m_Row.m_Container == IVideoContainer::EMKV )
-    {
-      CheckByMkvToolNix();
-    }
   }
 
   const VContainerRow m_Row;
@@ -82,22 +78,6 @@ public:
   const std::string m_Path = m_Folder.File( std::string( "movie." ) + m_Row.m_pName );
   VBytes m_Images;
   VBytes m_Sound;
-
-private:
-  // Matroska's own tools, which read every element, have nothing to complain of.
-  void CheckByMkvToolNix() const
-  {
-    const VRunResult Info = RunProgram( { "mkvinfo", "--all", "--check-mode", m_Path } );
-    EXPECT_EQ( Info.m_ExitCode, 0 ) << Info.m_Error << Info.m_Output;
-    for( const char* pWord : { "(Unknown element", "Warning", "warning", "Error", "error", "damaged" } )
-    {
-      EXPECT_EQ( Info.m_Output.find( pWord ), std::string::npos ) << Info.m_Output.substr( Info.m_Output.find( pWord ), 200 );
-    }
-    const VRunResult Merge = RunProgram( { "mkvmerge", "-J", m_Path } );
-    EXPECT_EQ( Merge.m_ExitCode, 0 ) << Merge.m_Output;
-    EXPECT_NE( Merge.m_Output.find( "\"warnings\": []" ), std::string::npos ) << Merge.m_Output;
-    EXPECT_NE( Merge.m_Output.find( "\"errors\": []" ), std::string::npos ) << Merge.m_Output;
-  }
 };
 
 struct VPixelCase
@@ -189,39 +169,6 @@ constexpr VImageCase ImageCases[] = {
   { Mkv, IVideoPayload::EImageJPEG, "jpg", IPixelFormat::ER8G8B8u8, "yuvj444p" },
 };
 
-// What a program tells of one and the same recording in each container.
-struct VTold
-{
-  VContainerRow m_Row;
-  int32_t m_Timecode;
-  std::map<std::string, std::string> m_FFprobe;
-  std::map<std::string, std::string> m_MediaInfo;   // by template
-};
-
-const std::vector<VTold> Told = {
-  { Mov, ITimecodeStandard::ETimecode30Drop,
-    { { "format.nb_streams", "3" }, { "format.tags.major_brand", "qt  " }, { "streams.stream.0.codec_tag_string", "2vuy" },
-      { "streams.stream.0.avg_frame_rate", "30000/1001" }, { "streams.stream.0.time_base", "1/240000" },
-      { "streams.stream.0.duration_ts", "56056" },   // 7 x 8008
-      { "streams.stream.0.tags.timecode", "10:11:12;13" }, { "streams.stream.0.tags.encoder", "Uncompressed 8-bit 4:2:2" },
-      { "streams.stream.1.duration_ts", "56035" },   // 7 x 1601 x 5
-      { "streams.stream.2.codec_tag_string", "tmcd" }, { "streams.stream.2.tags.timecode", "10:11:12;13" } },
-    { { "General;%Format% %Format_Profile% %VideoCount% %AudioCount%", "MPEG-4 QuickTime 1 1" }, { "Video;%CodecID% %Duration%", "2vuy 234" },
-      { "Audio;%Channels% %BitDepth% %SamplingRate% %CodecID%", "1 16 48000 lpcm" },
-      { "Other;%Type% %TimeCode_FirstFrame%", "Time code 10:11:12;13" } } },
-  { MP4, ITimecodeStandard::ETimecode30Drift, { { "format.tags.major_brand", "mp42" }, { "streams.stream.2.tags.timecode", "10:11:12:13" } }, {} },
-  { Avi, ITimecodeStandard::ETimecode30Drop,
-    { { "format.format_name", "avi" }, { "streams.stream.0.codec_tag_string", "UYVY" }, { "streams.stream.0.duration", "0.233567" },
-      { "streams.stream.0.nb_frames", "7" }, { "streams.stream.1.nb_frames", "11207" } },
-    {} },
-  { Mkv, ITimecodeStandard::ETimecode30Drop,
-    { { "format.format_name", "matroska,webm" }, { "format.duration", "0.233562" },
-      { "format.tags.Tarvo_Internal_VideoFrameInfo_PixelFormat", "U8Y8V8Y8" }, { "format.tags.Tarvo_External_FramePeriodInTicks", "4504500" },
-      { "streams.stream.0.codec_tag_string", "UYVY" }, { "streams.stream.0.avg_frame_rate", "30000/1001" } },
-    { { "General;%Format% %Format_Version% %Encoded_Application%", "Matroska Version 1 Tarvo MkvWriter" },
-      { "Video;%CodecID%", "V_MS/VFW/FOURCC / UYVY" }, { "Audio;%Channels% %BitDepth% %SamplingRate% %CodecID%", "1 16 48000 A_PCM/INT/LIT" } } },
-};
-
 }
 
 TEST( OutsideReaders, DecodeThePixelsThatWereWritten )
@@ -283,23 +230,6 @@ TEST( OutsideReaders, DecodeImagesAsInFilesOfTheirOwn )
     const VBytes Expected = DecodeVideo( Sequence.m_Folder.File( std::string( "movie.%08d." ) + rCase.m_pExtension ), rCase.m_pDecoded );
     EXPECT_FALSE( Expected.empty() );
     EXPECT_TRUE( DecodeVideo( File.m_Path, rCase.m_pDecoded ) == Expected );
-  }
-}
-
-TEST( OutsideReaders, TellWhatWasRecorded )
-{
-  for( const VTold& rTold : Told )
-  {
-    SCOPED_TRACE( rTold.m_Row.m_pName );
-    VHeader Header = Header2997();
-    Header.m_Timecode.m_Standard = rTold.m_Timecode;
-    VOutsideFile File( rTold.m_Row );
-    File.Write( Header );
-    File.ExpectAnswers( rTold.m_FFprobe );
-    for( const auto& [rTemplate, rText] : rTold.m_MediaInfo )
-    {
-      EXPECT_EQ( AskMediaInfo( File.m_Path, rTemplate ), rText );
-    }
   }
 }
 

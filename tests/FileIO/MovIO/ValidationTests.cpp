@@ -2,6 +2,7 @@
 #include "FileIO/MovIO/TrackValidation.h"
 #include "Utils/UtilsIO/StreamAdapters.h"
 #include "tests/FileIO/MovIO/SmallMovie.h"
+#include "tests/support/ByteBuilder.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 
@@ -56,15 +57,11 @@ VBytes MakeFile( const VMovieSettings& i_rSettings, size_t i_Frames )
 
 }
 
-TEST( MovTrackValidation, ATrackThatAgreesWithItselfHasNoMessages )
-{
-  EXPECT_EQ( MessagesOf( GoodTrack(), 48000, true ), VTexts{} );
-  EXPECT_EQ( GetPeriodInBaseTicks( GoodTrack() ), 43200000u );
-}
-
-TEST( MovTrackValidation, AnEmptyTrackIsInvalid )
+TEST( MovTrackValidation, OnlyATrackWithSamplesIsValid )
 {
   VTrack Track = GoodTrack();
+  EXPECT_EQ( MessagesOf( Track, 48000, true ), VTexts{} );
+  EXPECT_EQ( GetPeriodInBaseTicks( Track ), 43200000u );
   Track.m_ChunkCount = 0;
   EXPECT_EQ( MessagesOf( Track, 48000, false ), VTexts{ "Video track (1) has no chunks." } );
   Track.m_SampleCount = 0;
@@ -108,17 +105,13 @@ TEST( MovFileCheck, FilesOfTheWriterAreRight )
   EXPECT_EQ( CheckBytes( MakeFile( Settings, 3 ) ), VTexts{} );
 }
 
-TEST( MovFileCheck, EmptyTracksAreTold )
-{
-  EXPECT_EQ( CheckBytes( MakeFile( {}, 0 ) ), ( VTexts{ "Video track (1) has no samples.", "Audio track (2) has no samples." } ) );
-}
-
 TEST( MovFileCheck, FilesThatAreNotFinishedOrDamagedAreTold )
 {
   VSmallMovie Unfinished;
   ASSERT_TRUE( Unfinished.Begin() && Unfinished.Frame( VBytes( 16 ) ) );
   EXPECT_EQ( CheckBytes( *Unfinished.m_pBytes ), VTexts{ "The 'mdat' atom at 32 has no valid size." } );
   EXPECT_EQ( CheckBytes( {} ), VTexts{ "The file has no tracks: it was not finished." } );
+  EXPECT_EQ( CheckBytes( MakeFile( {}, 0 ) ), ( VTexts{ "Video track (1) has no samples.", "Audio track (2) has no samples." } ) );
 
   // Cut short anywhere it is never right, and never more is read than there is.
   const VBytes Whole = MakeFile( {}, 1 );
@@ -132,9 +125,7 @@ TEST( MovFileCheck, FilesThatAreNotFinishedOrDamagedAreTold )
   VBytes Deep;
   for( uint32_t Size = 800000; Size != 0; Size -= 8 )
   {
-    const VBytes Header = { 0, static_cast<uint8_t>( Size >> 16 ), static_cast<uint8_t>( Size >> 8 ), static_cast<uint8_t>( Size ), 'm', 'o', 'o',
-      'v' };
-    Deep.insert( Deep.end(), Header.begin(), Header.end() );
+    Append( Deep, VBigEndian().Atom( Size, "moov" ).m_Bytes );
   }
   EXPECT_EQ( CheckBytes( Deep ), VTexts{ "The atoms at 136 lie too deep in each other." } );
   const VTemporaryFolder Folder;

@@ -130,15 +130,10 @@ TEST_F( AviWriter, ARiffTakesFramesUntilItHasReachedItsLimit )
   EXPECT_EQ( Layout,
     ( std::vector<std::string>{ "AVI : 00db 01wb 00db 01wb 00db 01wb 00db ix00 ix01", "AVIX: 01wb 00db 01wb 00db ix00 ix01",
       "AVIX: 01wb 00db 01wb 00db ix00 ix01", "AVIX: 01wb 00db 01wb ix00 ix01", "TMSL:" } ) );
-  EXPECT_EQ( Parser.TotalFrames(), 9u );
-  EXPECT_EQ( Parser.StreamLength( 0 ), 9u );
-  EXPECT_EQ( Parser.StreamLength( 1 ), 9u );
-  EXPECT_EQ( Parser.CountIndexed( 0 ), 9u );
-  EXPECT_EQ( Parser.CountIndexed( 1 ), 9u );
-  for( uint32_t Frame = 0; Frame < 9; ++Frame )
+  for( const size_t Stream : { 0u, 1u } )
   {
-    EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 0 ).at( Frame ) ), Noise( 8, Frame ) );
-    EXPECT_EQ( Parser.Riff().Content( Parser.Chunks( 1 ).at( Frame ) ), Noise( 2, Frame ) );
+    EXPECT_EQ( Parser.StreamLength( Stream ), 9u );
+    EXPECT_EQ( Parser.CountIndexed( Stream ), 9u );
   }
 }
 
