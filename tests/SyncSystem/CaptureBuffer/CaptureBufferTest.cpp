@@ -41,6 +41,7 @@ TEST_F( CaptureBuffer, ErrorsOfAClientAreTheCapturesUntilTheNextOne )
   const uint32_t Client = m_pBuffer->RegisterClient( [] {} );
   Add( 4 );
   ASSERT_TRUE( m_pBuffer->StartCapture( { VCaptureSessionId( 1 ), CaptureSessionType::Streamed, {}, At( 1 ), At( 3 ), 0, {} } ) );
+  EXPECT_FALSE( m_pBuffer->FailCapture( { VCaptureSessionId( 2 ), CaptureSessionType::Streamed, {}, {}, {}, 8, {} } ) ) << "one capture at a time";
   EXPECT_FALSE( m_pBuffer->ClientFinished( 99, 0, {}, true ) );
   ASSERT_TRUE( m_pBuffer->ClientFinished( Client, ECaptureFailure::ReportedErrors, Errors[0], true ) );
   EXPECT_EQ( Status().m_Errors, Errors );
