@@ -111,15 +111,13 @@ TEST_F( FlowWatcher, FindsWhatIsWrongWithAState )
   };
   for( const VTestState& rBad : Bad )
   {
-    VFlowWatcher Watcher( m_pTime );
-    Watcher.PreProcessChecked( m_pServices );
-    m_pServices->m_pNext = Make( { .m_Frame = 10, .m_Session = &rBad == &Bad[6] ? 2u : 1u } );
-    Watcher.ProcessChecked();
-    m_pServices->m_pNext = Make( rBad );
-    Watcher.ProcessChecked();
-    EXPECT_EQ( Watcher.GetFigures().m_Faults, 1u ) << "case " << &rBad - Bad;
-    EXPECT_NE( Watcher.GetFigures().m_FirstFault, "" );
+    m_Watcher.BeginAnew();
+    Give( { .m_Frame = 10, .m_Session = &rBad == &Bad[6] ? 2u : 1u } );
+    const VWatchFigures Figures = Give( rBad );
+    EXPECT_EQ( Figures.m_Faults, 1u ) << "case " << &rBad - Bad;
+    EXPECT_NE( Figures.m_FirstFault, "" );
   }
+  m_Watcher.BeginAnew();
   EXPECT_EQ( Give( std::make_shared<StageHost::VFlowState>() ).m_Faults, 1u ) << "an empty state";
 }
 
