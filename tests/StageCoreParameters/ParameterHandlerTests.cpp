@@ -1,9 +1,9 @@
 #include "StageCoreParameters/CaptureDeviceParameterHandler.h"
 
 #include "Core/VideoInterface/Schemas.h"
-#include "tests/StageCoreParameters/HandlerFixture.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/ParameterHandlerFixture.h"
 
 namespace
 {
@@ -30,7 +30,7 @@ private:
   bool m_bChanged = false;
 };
 
-class ParameterHandler : public VHandlerFixtureOf<VCaptureDeviceParameterHandler>
+class ParameterHandler : public TestSupport::VParameterHandlerFixture<VCaptureDeviceParameterHandler>
 {
 protected:
   void Create( VCaptureDeviceParameterHandler::VContainers i_Containers = VCaptureDeviceParameterHandler::AllContainers() )

@@ -2,8 +2,8 @@
 #pragma once
 
 #include "StageCorePluginVideoInput/VideoInputDeviceParameterHandler.h"
-#include "tests/StageCoreParameters/HandlerFixture.h"
 #include "tests/support/FakeVideoInputDevice.h"
+#include "tests/support/ParameterHandlerFixture.h"
 
 #include <optional>
 #include <utility>
@@ -23,7 +23,7 @@ public:
   std::optional<int64_t> m_Adjustment;
 };
 
-class VHandlerFixture : public VHandlerFixtureOf<VVideoInputDeviceParameterHandler>
+class VHandlerFixture : public TestSupport::VParameterHandlerFixture<VVideoInputDeviceParameterHandler>
 {
 protected:
   // Makes the handler and lets its first reactions run.

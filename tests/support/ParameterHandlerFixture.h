@@ -15,8 +15,11 @@
 #include <string>
 #include <vector>
 
+namespace TestSupport
+{
+
 template<class THandler>
-class VHandlerFixtureOf : public testing::Test
+class VParameterHandlerFixture : public testing::Test
 {
 protected:
   // As another part of the program does.
@@ -53,9 +56,11 @@ protected:
     return Labels;
   }
 
-  const std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
+  const std::shared_ptr<VManualPostalService> m_pService = std::make_shared<VManualPostalService>();
   const std::shared_ptr<StageHost::VDataStore> m_pStore = std::make_shared<StageHost::VDataStore>();
   const std::shared_ptr<StageHost::VParameterRegistry> m_pRegistry = std::make_shared<StageHost::VParameterRegistry>();
   const VDataPath m_Device = DeviceSchemas::VideoInput::Path( "vi:0" );
   std::shared_ptr<THandler> m_pHandler;
 };
+
+}
