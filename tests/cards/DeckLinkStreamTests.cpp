@@ -96,20 +96,6 @@ TEST_F( DeckLinkStream, AClientThatInsistsOnTheWrongColourSpaceIsToldAgainAndAga
   EXPECT_EQ( m_Client.m_FormatCalls, 4 ) << "one that does not answer is told once";
 }
 
-TEST_F( DeckLinkStream, PausedStreamsGoOnInTheirOwnTime )
-{
-  Play( "decklink:pattern=counter" );
-  Step();
-  EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
-  Step( 2 );
-  EXPECT_EQ( m_pInput->PauseStreams(), S_OK );
-  Step();
-  ASSERT_EQ( m_Client.m_Seen.size(), 2u );
-  EXPECT_EQ( m_Client.m_Seen[1].m_StreamTime, 3 * 5400000 );
-  EXPECT_EQ( m_pInput->StopStreams(), S_OK );
-  EXPECT_EQ( m_pInput->PauseStreams(), E_ACCESSDENIED );
-}
-
 TEST_F( DeckLinkStream, TimecodeAnswersByTheSignalsPlaces )
 {
   using namespace TimecodeFormat;

@@ -6,6 +6,8 @@
 
 #include <gtest/gtest.h>
 
+#include <list>
+
 namespace
 {
 
@@ -19,9 +21,9 @@ class Bluefish444Driver : public ::testing::Test
 protected:
   void TearDown() override
   {
-    for( const auto& pCard : m_Cards )
+    for( Fake::VCard& rCard : m_Cards )
     {
-      pCard->Freely();
+      rCard.Freely();
     }
     m_pDriver.reset();
     m_Arrived.clear();
@@ -31,10 +33,10 @@ protected:
 
   Fake::VCard& AddCard( uint32_t i_Streams = 0x10 )
   {
-    m_Cards.push_back( std::make_unique<Fake::VCard>() );
-    Fake::Cards().push_back( m_Cards.back().get() );
-    m_Cards.back()->m_Properties[Property::CardFeatureStreamInfo] = i_Streams;
-    return *m_Cards.back();
+    Fake::VCard& rCard = m_Cards.emplace_back();
+    Fake::Cards().push_back( &rCard );
+    rCard.m_Properties[Property::CardFeatureStreamInfo] = i_Streams;
+    return rCard;
   }
 
   VTexts Discover( const BlueVelvet::VFlatFunctions* i_pFunctions = &Fake::Functions() )
@@ -50,7 +52,7 @@ protected:
     return Names;
   }
 
-  std::vector<std::unique_ptr<Fake::VCard>> m_Cards;
+  std::list<Fake::VCard> m_Cards;
   std::shared_ptr<VideoInputHAL::VBluefish444Driver> m_pDriver;
   std::vector<std::shared_ptr<VideoInputHAL::IVideoInputDevice>> m_Arrived;
   TestSupport::VLogCapture m_Log{ "VideoInputDeviceBluefish444", 6 };
@@ -102,7 +104,7 @@ TEST_F( Bluefish444Driver, ItsEndClosesItsDevices )
 {
   AddCard();
   Discover();
-  m_Cards.front()->Freely();
+  m_Cards.front().Freely();
   m_pDriver.reset();
   EXPECT_EQ( Fake::Objects(), 0 );
   EXPECT_EQ( m_Arrived.front()->StartCapture( KVZ::IPixelFormat::EU8Y8V8Y8, KVZ::ITimecodeSource::EAny, KVZ::IAudioSampleFormat::EInt16, 0 ).m_Code,
