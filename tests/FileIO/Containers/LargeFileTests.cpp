@@ -74,8 +74,7 @@ struct VLargeCase
 };
 
 // Matroska's segment has a size that its field cannot hold from 32 GiB on.
-constexpr VLargeCase Cases[] = { { Mov, 40 }, { MP4, 40 }, { Avi, 40 }, { Mkv, 40 }, { Mkv, 280 } };
-constexpr VLargeCase OfTvid = { Tvid, 40 };
+constexpr VLargeCase Cases[] = { { Mov, 40 }, { MP4, 40 }, { Avi, 40 }, { Mkv, 40 }, { Mkv, 280 }, { Tvid, 40 } };
 
 class LargeFile : public testing::TestWithParam<VLargeCase>
 {
@@ -115,7 +114,7 @@ protected:
 
 }
 
-TEST_P( LargeFile, IsSoughtByFFmpegToItsLastFrame )
+TEST_P( LargeFile, IsReadToItsLastFrame )
 {
   Write();
   const uint32_t Frames = GetParam().m_Frames;
@@ -124,6 +123,14 @@ TEST_P( LargeFile, IsSoughtByFFmpegToItsLastFrame )
   for( const uint32_t Frame : { Frames - 1, Frames / 2 } )
   {
     SCOPED_TRACE( Frame );
+    if( GetParam().m_Row.m_Container == Tvid.m_Container )   // which FFmpeg does not know
+    {
+      VTvidParser File( m_Path );
+      const VTvidParser::VFrame& rFound = File.Frames().at( Frame );
+      EXPECT_EQ( File.Video( { 0, rFound.m_VideoPosition, HeadBytes } ), Head( Frame ) );
+      EXPECT_EQ( File.Video( { 0, rFound.m_AudioPosition, rFound.m_AudioSize } ), Sound( Frame ) );
+      continue;
+    }
     EXPECT_EQ( Seek( Frame, { "-map", "0:v", "-frames:v", "1", "-vf", "crop=32:1:0:0", "-pix_fmt", "uyvy422", "-f", "rawvideo", "-" } ),
       Head( Frame ) );
     const VBytes Samples = Seek( Frame, { "-map", "0:a", "-t", "0.04", "-f", "s16le", "-" } );
@@ -133,27 +140,6 @@ TEST_P( LargeFile, IsSoughtByFFmpegToItsLastFrame )
 
 INSTANTIATE_TEST_SUITE_P( Containers, LargeFile, testing::ValuesIn( Cases ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_Row.m_pName ) + "_" + std::to_string( i_rInfo.param.m_Frames / 8 ) + "GiB"; } );
-
-class LargeTvid : public LargeFile
-{
-};
-
-// Which FFmpeg does not know.
-TEST_P( LargeTvid, IsIndexedToItsLastFrame )
-{
-  Write();
-  VTvidParser File( m_Path );
-  ASSERT_EQ( File.Frames().size(), OfTvid.m_Frames );
-  for( uint32_t Frame = 0; Frame < OfTvid.m_Frames; ++Frame )
-  {
-    VTvidParser::VFrame Beginning = File.Frames()[Frame];
-    EXPECT_EQ( Beginning.m_VideoSize, ImageBytes );
-    Beginning.m_VideoSize = HeadBytes;
-    EXPECT_EQ( File.Video( Beginning ), Head( Frame ) );
-  }
-}
-
-INSTANTIATE_TEST_SUITE_P( Containers, LargeTvid, testing::Values( OfTvid ) );
 
 // Its bytes are in the file by then, and the frames behind it are found all the same.
 TEST( LargeMovie, AFrameOf4GiBIsRefused )

@@ -65,36 +65,6 @@ VNumbers StartOf( const ITimecode& i_rTimecode, uint32_t i_Period = 5400000 )
   return { Parser.Number( rMdat, 0 ), Parser.Number( rStsd, 28 ), Parser.Number( rStsd, 40, 1 ), rTrack.m_EditStart };
 }
 
-struct VRefusal
-{
-  void ( *m_Change )( VMovieSettings& o_rSettings );
-  std::string m_Message;
-};
-
-const VRefusal Refusals[] = {
-  { []( VMovieSettings& o_rSettings ) {
-     o_rSettings.m_Timing = { 0, 1, 0 };
-   },
-    "A frame period of 1 ticks of 1/0 s cannot be represented in 32 bits at 1080000000 Hz." },
-  { []( VMovieSettings& o_rSettings ) { o_rSettings.m_Timing.m_FramePeriodInTicks = 0x20000000; },   // eight base ticks each
-    "A frame period of 536870912 ticks of 1/135000000 s cannot be represented in 32 bits at 1080000000 Hz." },
-  { []( VMovieSettings& o_rSettings ) { o_rSettings.m_Timecode.m_Days = 2000; }, "Timecode cannot be represented as 32 bit frame count." },
-  { []( VMovieSettings& o_rSettings ) { o_rSettings.m_Timecode.m_Days = -1; }, "Timecode cannot be represented as 32 bit frame count." },
-  { []( VMovieSettings& o_rSettings )
-    {
-      o_rSettings.m_Timing = { 1080000000, 1500000001, 0 };
-      o_rSettings.m_Payload = IVideoPayload::EVideoH264;   // whose frames are shown three periods later
-    },
-    "Video frame period, timecode period or audio sample period cannot be represented in 32 bits." },
-  { []( VMovieSettings& o_rSettings ) { o_rSettings.m_Video.m_ImageWidth = 65536; },
-    "An image of 65536 x 2 pixels is larger than the 65535 x 65535 that the file can say." },
-  { []( VMovieSettings& o_rSettings ) {
-     o_rSettings.m_Audio = { IAudioSampleFormat::EUInt8, 96000, 1 };
-   },
-    "A sample rate of 96000 is more than the 65535 that the file can say of 8-bit samples." },
-  { []( VMovieSettings& o_rSettings ) { o_rSettings.m_Audio.m_Channels = 17; }, "Cannot support 17 channels of audio." },
-};
-
 }
 
 TEST_F( MovWriter, EveryPeriodIsAWholeNumberOfUnits )
@@ -113,20 +83,35 @@ TEST_F( MovWriter, EveryPeriodIsAWholeNumberOfUnits )
 
 TEST_F( MovWriter, WhatNoFieldCanHoldIsRefusedByName )
 {
-  for( const VRefusal& rRefusal : Refusals )
+  const auto Refusal = [&]( const VMovieSettings& i_rSettings )
   {
-    VMovieSettings Settings;
-    rRefusal.m_Change( Settings );
-    VSmallMovie Movie( Settings );
-    EXPECT_FALSE( Movie.Begin() );
-    EXPECT_EQ( m_Log.Texts().back(), rRefusal.m_Message );
-    EXPECT_FALSE( Movie.m_Writer.Close() );
+    VSmallMovie Movie( i_rSettings );
+    EXPECT_FALSE( Movie.Begin() || Movie.m_Writer.Close() );
+    return m_Log.Texts().back();
+  };
+  VMovieSettings Settings = WithTimes( 0x20000000, VStandard::ETimecode25, 48000 );   // eight base ticks each
+  EXPECT_EQ( Refusal( Settings ), "A frame period of 536870912 ticks of 1/135000000 s cannot be represented in 32 bits at 1080000000 Hz." );
+  Settings.m_Timing = { 0, 1, 0 };
+  EXPECT_EQ( Refusal( Settings ), "A frame period of 1 ticks of 1/0 s cannot be represented in 32 bits at 1080000000 Hz." );
+  Settings.m_Timing = { 1080000000, 1500000001, 0 };
+  Settings.m_Video.m_ImageWidth = 65535;
+  EXPECT_TRUE( VSmallMovie( Settings ).Begin() );
+  Settings.m_Payload = IVideoPayload::EVideoH264;   // whose frames are shown three periods later
+  EXPECT_EQ( Refusal( Settings ), "Video frame period, timecode period or audio sample period cannot be represented in 32 bits." );
+  for( const int32_t Days : { 2000, -1 } )
+  {
+    Settings = {};
+    Settings.m_Timecode.m_Days = Days;
+    EXPECT_EQ( Refusal( Settings ), "Timecode cannot be represented as 32 bit frame count." );
   }
-  EXPECT_EQ( m_Log.Texts().size(), std::size( Refusals ) );
-  VMovieSettings Largest;
-  Largest.m_Timing = { 1080000000, 1500000001, 0 };
-  Largest.m_Video.m_ImageWidth = 65535;
-  EXPECT_TRUE( VSmallMovie( Largest ).Begin() );
+  Settings = {};
+  Settings.m_Video.m_ImageWidth = 65536;
+  EXPECT_EQ( Refusal( Settings ), "An image of 65536 x 2 pixels is larger than the 65535 x 65535 that the file can say." );
+  Settings = {};
+  Settings.m_Audio = { IAudioSampleFormat::EUInt8, 96000, 1 };
+  EXPECT_EQ( Refusal( Settings ), "A sample rate of 96000 is more than the 65535 that the file can say of 8-bit samples." );
+  Settings.m_Audio.m_Channels = 17;
+  EXPECT_EQ( Refusal( Settings ), "Cannot support 17 channels of audio." );
   EXPECT_FALSE( VMovWriter( IVideoContainer::EAVI ).Open( "memory" ) );
   EXPECT_EQ( m_Log.Texts().back(), "Container must be MOV or MP4." );
 }

@@ -107,12 +107,7 @@ VBytes VContractWriter::Sound( uint64_t i_Frame ) const
 
 bool VContractWriter::WriteFrame( uint64_t i_Frame, uint64_t i_Key )
 {
-  KVZ::VFrameSet Frame{ Buffer( Picture( i_Frame ) ), m_Header.m_Video, {}, m_Header.m_Audio };
-  if( !m_Header.m_Audio.IsEmpty() )
-  {
-    Frame.m_Audio.push_back( Buffer( Sound( i_Frame ) ) );
-  }
-  return m_pWriter->WriteFrame( Frame, i_Key );
+  return m_Header.WriteFrame( *m_pWriter, Picture( i_Frame ), Sound( i_Frame ), i_Key );
 }
 
 bool VContractWriter::Holds( const VBytes& i_rBytes ) const
