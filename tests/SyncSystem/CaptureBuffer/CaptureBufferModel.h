@@ -149,10 +149,7 @@ public:
       Activate( std::numeric_limits<int64_t>::max() );
       m_Start = m_End = {};
     }
-    else if( m_State == EState::Capturing )
-    {
-      m_End = { m_Current, m_Last };
-    }
+    else if( m_State == EState::Capturing ) m_End = { m_Current, m_Last };
     m_State = AnyActive() ? EState::Cancelling : EState::Cancelled;
     return true;
   }
@@ -203,10 +200,20 @@ public:
   bool Find( VPosition i_Position, size_t& o_rBlock ) const
   {
     if( Locate( i_Position ) != EWhere::Inside ) return false;
-    const VSession& rSession = m_Sessions.at( i_Position.m_Session );
-    o_rBlock = rSession.m_Frames[static_cast<size_t>( i_Position.m_Number - Low( rSession ) )].m_Block;
+    const VSession* pSession = FindSession( i_Position.m_Session );
+    o_rBlock = pSession->m_Frames[static_cast<size_t>( i_Position.m_Number - Low( *pSession ) )].m_Block;
     return true;
   }
+
+  const VSession* FindSession( uint32_t i_Session ) const
+  {
+    const auto Found = m_Sessions.find( i_Session );
+    return Found == m_Sessions.end() ? nullptr : &Found->second;
+  }
+
+  // Numbers of the oldest and newest frame; of a session without frames, those around the live end
+  int64_t Low( const VSession& i_rSession ) const { return i_rSession.m_Frames.empty() ? m_Last + 1 : i_rSession.m_Frames.front().m_Number; }
+  int64_t High( const VSession& i_rSession ) const { return i_rSession.m_Frames.empty() ? m_Last : i_rSession.m_Frames.back().m_Number; }
 
   void Pin( size_t i_Block ) { ++m_Pins[i_Block]; }
   void Unpin( size_t i_Block ) { --m_Pins[i_Block]; }
@@ -278,7 +285,8 @@ private:
   {
     const size_t Held = m_Live.size();
     for( const VFrame& rFrame : std::exchange( m_Retired, {} ) ) Drop( rFrame );
-    const int64_t Limit = this->Limit();
+    const int64_t Protected = m_bStreamed ? Slowest() : m_Start.m_Number;
+    const int64_t Limit = Is( EState::Capturing | EState::Captured | EState::Cancelling ) ? Protected : m_Last + 1;
     while( m_Live.size() == Held && !m_Sessions.empty() )
     {
       auto& [Id, rSession] = *m_Sessions.begin();
@@ -304,27 +312,11 @@ private:
     if( m_CurrentBlock == i_rFrame.m_Block ) m_CurrentBlock = NoBlock;
   }
 
-  const VSession* FindSession( uint32_t i_Session ) const
-  {
-    const auto Found = m_Sessions.find( i_Session );
-    return Found == m_Sessions.end() ? nullptr : &Found->second;
-  }
-
   void RemoveSession( uint32_t i_Session )
   {
     m_Sessions.erase( i_Session );
     m_RemovedSessions.push_back( i_Session );
   }
-
-  int64_t Limit() const
-  {
-    if( !Is( EState::Capturing | EState::Captured | EState::Cancelling ) ) return m_Last + 1;
-    return m_bStreamed ? Slowest() : m_Start.m_Number;
-  }
-
-  // Numbers of the oldest and newest frame; of a session without frames, those around the live end
-  int64_t Low( const VSession& i_rSession ) const { return i_rSession.m_Frames.empty() ? m_Last + 1 : i_rSession.m_Frames.front().m_Number; }
-  int64_t High( const VSession& i_rSession ) const { return i_rSession.m_Frames.empty() ? m_Last : i_rSession.m_Frames.back().m_Number; }
 
   // Capture
   bool Is( uint32_t i_Mask ) const { return ( m_State & i_Mask ) != 0; }
@@ -373,7 +365,7 @@ private:
 
   bool AnyActive() const
   {
-    return std::any_of( m_Clients.begin(), m_Clients.end(), []( const auto& i_rEntry ) { return i_rEntry.second.m_bActive; } );
+    return std::ranges::any_of( m_Clients, []( const auto& i_rEntry ) { return i_rEntry.second.m_bActive; } );
   }
 
   void Leave( VClient& i_rClient )

@@ -48,7 +48,8 @@ public:
         m_ReadyStart = ToPosition( i_rStart );
         m_ReadyEnd = ToPosition( i_rEnd );
       } );
-    if( Chance( 3 ) ) SetDrainLimit( Pick( 4 ) );
+    if( Chance( 3 ) ) m_Model.m_DrainLimit = Pick( 4 );
+    m_pBuffer->SetDataDrainLimit( m_Model.m_DrainLimit );
   }
   ~VRandomRun()
   {
@@ -72,19 +73,17 @@ public:
   }
 
 private:
-  struct VReader
-  {
-    VRefCountedToken m_Frame;
-    size_t m_Block = 0;
-    int m_Notified = 0;
-    bool m_bAsleep = true;
-    bool m_bToldFinished = false;
-  };
-
   struct VPin
   {
     VRefCountedToken m_Frame;
-    size_t m_Block;
+    size_t m_Block = 0;
+  };
+
+  struct VReader : VPin
+  {
+    int m_Notified = 0;
+    bool m_bAsleep = true;
+    bool m_bToldFinished = false;
   };
 
   size_t Pick( size_t i_Bound ) { return std::uniform_int_distribution<size_t>( 0, i_Bound - 1 )( m_Random ); }
@@ -96,10 +95,9 @@ private:
     if( Chance( 10 ) ) return {};
     const uint32_t Newest = m_Model.m_Current;
     const uint32_t Session = Chance( 2 ) ? Newest : static_cast<uint32_t>( std::max<int64_t>( 1, Newest + 1 - static_cast<int64_t>( Pick( 4 ) ) ) );
-    const auto Found = m_Model.m_Sessions.find( Session );
-    const bool bFrames = Found != m_Model.m_Sessions.end() && !Found->second.m_Frames.empty();
-    const int64_t Low = bFrames ? Found->second.m_Frames.front().m_Number : m_Model.m_Last + 1;
-    const int64_t High = bFrames ? Found->second.m_Frames.back().m_Number : m_Model.m_Last;
+    const VCaptureBufferModel::VSession* pSession = m_Model.FindSession( Session );
+    const int64_t Low = pSession ? m_Model.Low( *pSession ) : m_Model.m_Last + 1;
+    const int64_t High = pSession ? m_Model.High( *pSession ) : m_Model.m_Last;
     return { Session, Low - 3 + static_cast<int64_t>( Pick( static_cast<size_t>( High - Low + 10 ) ) ) };
   }
 
@@ -111,12 +109,6 @@ private:
   }
 
   uint32_t PickId() { return Chance( 6 ) ? static_cast<uint32_t>( Pick( m_Model.m_Id + 3 ) ) : m_Model.m_Id; }
-
-  void SetDrainLimit( uint64_t i_Limit )
-  {
-    m_pBuffer->SetDataDrainLimit( i_Limit );
-    m_Model.m_DrainLimit = i_Limit;
-  }
 
   void Add()
   {
@@ -146,13 +138,9 @@ private:
       EndToken = { StartToken.m_BufferSession, StartToken.m_FrameNumber + static_cast<int64_t>( Pick( 12 ) ), nullptr };
     VCaptureBufferModel::VRequest Request{ Chance( 4 ) ? PickId() : m_Model.m_Id + 1, !Chance( 4 ), ToPosition( StartToken ), ToPosition( EndToken ),
       Chance( 5 ) ? uint32_t{ ECaptureFailure::ReportedErrors } : 0 };
-    VCaptureRequest Real;
-    Real.m_Id = KVZ::VCaptureSessionId( Request.m_Id );
-    Real.m_Type = Request.m_bStreamed ? CaptureSessionType::Streamed : CaptureSessionType::Reservation;
-    Real.m_Info.m_CaptureSessionId = Real.m_Id;
-    Real.m_Start = StartToken;
-    Real.m_End = EndToken;
-    Real.m_Failure = Request.m_Failure;
+    const KVZ::VCaptureSessionId Id( Request.m_Id );
+    const VCaptureRequest Real{ Id, Request.m_bStreamed ? CaptureSessionType::Streamed : CaptureSessionType::Reservation, { Id, {}, 0, 0 },
+      StartToken, EndToken, Request.m_Failure, {} };
     ASSERT_EQ( m_pBuffer->StartCapture( Real ), m_Model.Start( Request ) );
   }
 
@@ -244,7 +232,7 @@ private:
   void PinSomewhere()
   {
     VToken Token = PickToken();
-    VPin Pin{ {}, 0 };
+    VPin Pin;
     const bool bThere = m_Model.Find( ToPosition( Token ), Pin.m_Block );
     ASSERT_EQ( m_pBuffer->Read( Token, Pin.m_Frame ), bThere );
     if( !bThere ) return;

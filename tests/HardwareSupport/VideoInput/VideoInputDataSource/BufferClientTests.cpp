@@ -90,7 +90,7 @@ TEST_F( BufferClient, WritesTheRangeAndSaysWhatAReaderNeeds )
 
 TEST_F( BufferClient, KeepsTheChannelsThatTheTargetAsksFor )
 {
-  m_Rig.m_pTargets->m_Channels = 3;
+  m_Rig.m_pTargets->m_Target.m_AudioChannels = 3;
   Start( 1, 2, 4 );
   Write();
   EXPECT_EQ( File().m_Audio.m_Channels, 3u );
@@ -104,7 +104,7 @@ TEST_F( BufferClient, KeepsTheChannelsThatTheTargetAsksFor )
   }
   EXPECT_EQ( File().m_Sound.at( 0 ), Expected );
 
-  m_Rig.m_pTargets->m_Channels = 0;
+  m_Rig.m_pTargets->m_Target.m_AudioChannels = 0;
   m_Rig.m_pDisk->clear();
   Start( 2, 2, 4 );
   Write();

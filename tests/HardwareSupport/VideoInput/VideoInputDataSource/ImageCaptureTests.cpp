@@ -217,7 +217,7 @@ TEST_F( ConvertedCapture, ThreadsWriteAndDrawEveryFrameBeforeTheFileIsClosed )
   m_Rig.m_Format.m_Width = 140;
   m_Rig.m_Format.m_Height = 60;
   m_Rig.m_Format.m_PixelFormat = KVZ::IPixelFormat::ELuminance8;
-  m_Rig.m_pTargets->m_bBurnInTimecode = true;
+  m_Rig.m_pTargets->m_Target.m_bBurnInTimecode = true;
   Make( true );
   Start( 30 );
   while( Status().m_State != ECaptureState::Complete )
@@ -242,7 +242,7 @@ TEST_F( ConvertedCapture, ThreadsWriteAndDrawEveryFrameBeforeTheFileIsClosed )
 
 TEST_F( ConvertedCapture, UncompressedVideoIsStoredInTheFormatThatIsWantedOrNotAtAll )
 {
-  m_Rig.m_pTargets->m_PixelFormat = KVZ::IPixelFormat::ELuminance8;
+  m_Rig.m_pTargets->m_Target.m_PixelFormat = KVZ::IPixelFormat::ELuminance8;
   Make( false, { IVideoContainer::ETVID } );
   Start( 5 );
   ClientsTurn();
@@ -253,7 +253,7 @@ TEST_F( ConvertedCapture, UncompressedVideoIsStoredInTheFormatThatIsWantedOrNotA
   EXPECT_EQ( rFile.m_Frames.at( 3 ), std::vector<uint8_t>( 32, 3 ) );
 
   m_Rig.m_pDisk->clear();
-  m_Rig.m_pTargets->m_PixelFormat = KVZ::IPixelFormat::EBayerGB6;
+  m_Rig.m_pTargets->m_Target.m_PixelFormat = KVZ::IPixelFormat::EBayerGB6;
   Start( 5 );
   ClientsTurn();
   EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );

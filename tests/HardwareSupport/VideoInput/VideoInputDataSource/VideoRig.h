@@ -46,10 +46,10 @@ public:
   bool GetTarget( const KVZ::ICaptureHeader& i_rHeader, const std::string&, int32_t i_Container,
     StageCorePluginInterface::VCaptureTarget& o_rTarget ) override
   {
-    o_rTarget = { m_Folder, i_rHeader.m_Name, KVZ::GetFileExtension( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) ), "Label", i_Container,
-      KVZ::IVideoPayload::EUncompressed, KVZ::IAudioPayload::EUncompressed, m_Channels };
-    o_rTarget.m_PixelFormat = m_PixelFormat;
-    o_rTarget.m_bBurnInTimecode = m_bBurnInTimecode;
+    o_rTarget = m_Target;
+    o_rTarget.m_BaseName = i_rHeader.m_Name;
+    o_rTarget.m_Extension = KVZ::GetFileExtension( static_cast<KVZ::IVideoContainer::Enum>( i_Container ) );
+    o_rTarget.m_Container = i_Container;
     return i_Container != m_RefusedContainer;
   }
   void OnFileFinished( const StageCorePluginInterface::VCaptureFileReport& i_rReport ) override
@@ -68,10 +68,7 @@ public:
 
   std::vector<int32_t> m_Containers{ KVZ::IVideoContainer::ETVID };
   int32_t m_RefusedContainer = -1;
-  std::string m_Folder;
-  uint32_t m_Channels = 0xFFFFFFFFu;
-  KVZ::IPixelFormat::Enum m_PixelFormat = KVZ::IPixelFormat::EUnspecified;
-  bool m_bBurnInTimecode = false;
+  StageCorePluginInterface::VCaptureTarget m_Target{ {}, {}, {}, "Label", 0, KVZ::IVideoPayload::EUncompressed, KVZ::IAudioPayload::EUncompressed };
 
 private:
   mutable boost::mutex m_Mutex;
@@ -112,7 +109,7 @@ struct VFrameFormat
 class VVideoRig
 {
 public:
-  explicit VVideoRig( size_t i_Frames = 80 ) : m_Memory( i_Frames / 4, 4, 9000 ) { m_pTargets->m_Folder = m_Folder.File( "takes" ); }
+  explicit VVideoRig( size_t i_Frames = 80 ) : m_Memory( i_Frames / 4, 4, 9000 ) { m_pTargets->m_Target.m_Folder = m_Folder.File( "takes" ); }
 
   // Any source class with the constructor of a data source, for the rig's device or another one, which a manager knows.
   template<class TSource = VTestVideoSource>
