@@ -44,7 +44,6 @@ TEST( RecordLimits, AreToldAtTheStartWhereTheyAreNear )
     "vi:0: With these settings the index of an AVI file is full after 5.7 hours. The recording is to be longer. Players will not seek to frames "
     "that come later." );
   const VLimitNotice Far( "vi:1", { 25 * 3600.0, "a MOV file" } );
-  EXPECT_FALSE( Far.IsNear() );
   EXPECT_EQ( Far.AtStart( 86400.0 ), "" );
   EXPECT_EQ( Far.AtStart( 90001.0 ),
     "vi:1: With these settings a MOV file is full after 25.0 hours. The recording is to be longer. No frame is stored that comes later." );
