@@ -3,7 +3,7 @@
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/BlackmagicDeckLinkDevice.h"
 #include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
-#include "tests/HardwareSupport/VideoInput/VideoInputHAL/CaptureDeviceFixture.h"
+#include "tests/support/CaptureDeviceFixture.h"
 #include "tests/support/FakeDeckLink.h"
 
 #include <optional>

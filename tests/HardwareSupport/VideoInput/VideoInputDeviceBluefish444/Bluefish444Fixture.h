@@ -2,7 +2,7 @@
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputDeviceBluefish444/Bluefish444Device.h"
-#include "tests/HardwareSupport/VideoInput/VideoInputHAL/CaptureDeviceFixture.h"
+#include "tests/support/CaptureDeviceFixture.h"
 #include "tests/support/FakeBlueVelvet.h"
 
 namespace Fake = TestSupport::FakeBlueVelvet;
