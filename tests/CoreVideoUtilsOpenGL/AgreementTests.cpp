@@ -108,18 +108,6 @@ TEST( OpenGLAgreement, MakesLuminanceOfTheMean )
   EXPECT_EQ( InSoftware( Grey, IPixelFormat::ELuminance8 ), InOpenGL( Grey, IPixelFormat::ELuminance8 ) );
 }
 
-// Two pixels of Y 403 and V 515, U in the middle. Red: 403 / 4 + 1.403 * 3 / 4, which is 101.8. Cut to eight bits before it were 100.
-TEST( OpenGLAgreement, KeepsTenBits )
-{
-  VImage Image = MakeImage( IPixelFormat::EU10Y10V10Y10, 2, 1 );
-  const std::array<uint32_t, 2> Words = { 512u | 403u << 10 | 515u << 20, 403u };
-  std::copy_n( reinterpret_cast<const uint8_t*>( Words.data() ), sizeof( Words ), Image.m_Bytes.begin() );
-  const VBytes Colour = InOpenGL( Image, IPixelFormat::ER8G8B8 );
-  ASSERT_EQ( 6u, Colour.size() );
-  EXPECT_EQ( 102, Colour[0] );
-  EXPECT_EQ( 102, Colour[3] );
-}
-
 // A host has an application object of its own, with windows and on another thread, and wants OpenGL ES.
 TEST( OpenGLAgreement, HoldsForOpenGLESInAHostWithWindows )
 {
