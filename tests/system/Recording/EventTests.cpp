@@ -14,8 +14,8 @@ namespace
 {
 
 constexpr uint32_t Every = 100;           // frames from event to event
-constexpr uint32_t TheOnly = 6 * Every;   // of an event that comes once: late enough for a slow machine to be recording
-constexpr uint64_t FarBeyond = 1500;      // frames of a recording that meets it
+constexpr uint32_t TheOnly = 4 * Every;   // of an event that comes once: late enough for a slow machine to be recording
+constexpr uint64_t FarBeyond = 1000;      // frames of a recording that meets it
 
 constexpr int FailureEndMoved = 2;
 
@@ -89,7 +89,7 @@ protected:
 
 TEST_P( EventTest, SignalLostAndBackEndsTheCaptureAtItsLastFrame )
 {
-  constexpr uint32_t Absence = 2 * Every;   // a second of real time, in which a busy machine too takes notice
+  constexpr uint32_t Absence = Every;   // a second of real time, in which a busy machine too takes notice
   const VRecordResult Result = RecordEvents( { { { "frame", TheOnly }, { "do", "signal-loss" }, { "frames", Absence } } }, FarBeyond );
   ExpectEndedEarly( Result, FailureEndMoved, Absence );
   EXPECT_TRUE( Says( Result, "stagehost: vi:0: The signal was interrupted or changed after " ) ) << Describe( Result.m_Run );
