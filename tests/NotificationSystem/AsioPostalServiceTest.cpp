@@ -3,11 +3,11 @@
 #include "StageCoreRuntime/DebugServices.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/ManualPostalService.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
 
 #include <boost/thread/barrier.hpp>
-#include <boost/thread/thread.hpp>
 
 #include <future>
 #include <stdexcept>
@@ -108,24 +108,22 @@ TEST( AsioPostalService, StandsPostsFromSeveralThreadsAcrossRestarts )
   constexpr int Posts = 500;
   VAsioPostalService Service( "Busy" );
   int Ran = 0;   // one worker at a time, so no lock
-  boost::thread_group Threads;
-  for( int Thread = 0; Thread < 2; ++Thread )
+  const auto Restart = [&]
   {
-    Threads.create_thread(
-      [&]
-      {
-        for( int Post = 0; Post < Posts; ++Post )
-        {
-          Service.Post( [&Ran] { ++Ran; } );
-        }
-      } );
-  }
-  for( int Round = 0; Round < 20; ++Round )
+    for( int Round = 0; Round < 20; ++Round )
+    {
+      Service.Stop();
+      Service.Start( 1 );
+    }
+  };
+  const auto Post = [&]
   {
-    Service.Stop();
-    Service.Start( 1 );
-  }
-  Threads.join_all();
+    for( int Number = 0; Number < Posts; ++Number )
+    {
+      Service.Post( [&Ran] { ++Ran; } );
+    }
+  };
+  TestSupport::RunOnThreads( 3, [&]( uint32_t i_Thread ) { i_Thread == 0 ? Restart() : Post(); } );
   Service.Stop();
   EXPECT_EQ( Ran, 2 * Posts );
 }

@@ -1,10 +1,9 @@
 #include "NotificationSystem/MultiCallback.h"
 #include "NotificationSystem/WeakBinder.h"
 #include "tests/support/ManualPostalService.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
-
-#include <boost/thread/thread.hpp>
 
 namespace
 {
@@ -161,28 +160,27 @@ TEST( MultiCallbackPostal, StandsSubscribersThatComeAndGoWhileItFires )
   std::atomic<unsigned int> Permanent{ 0 };
   std::atomic<unsigned int> Passing{ 0 };
   Callbacks.AddImmediate( [&]( unsigned int ) { ++Permanent; } );
-  boost::thread_group Threads;
-  for( int Thread = 0; Thread < 2; ++Thread )
-  {
-    Threads.create_thread(
-      [&]
-      {
-        for( int Round = 0; Round < Rounds; ++Round )
-        {
-          auto pSubscriber = std::make_shared<int>( 0 );
-          void* pHandle = Callbacks.Add( [&]( unsigned int ) { ++Passing; } );
-          Callbacks.Add( BindWeak( pSubscriber, []( int&, unsigned int ) {} ), nullptr );
-          pSubscriber.reset();
-          EXPECT_EQ( Callbacks.Remove( pHandle ), 1u );
-        }
-      } );
-  }
-  for( int Round = 0; Round < Rounds; ++Round )
+  const auto Fire = [&]
   {
     EXPECT_TRUE( Callbacks( 1 ) );
     pService->RunAll();
-  }
-  Threads.join_all();
+  };
+  const auto ComeAndGo = [&]
+  {
+    auto pSubscriber = std::make_shared<int>( 0 );
+    void* pHandle = Callbacks.Add( [&]( unsigned int ) { ++Passing; } );
+    Callbacks.Add( BindWeak( pSubscriber, []( int&, unsigned int ) {} ), nullptr );
+    pSubscriber.reset();
+    EXPECT_EQ( Callbacks.Remove( pHandle ), 1u );
+  };
+  const auto Repeat = [&]( uint32_t i_Thread )
+  {
+    for( int Round = 0; Round < Rounds; ++Round )
+    {
+      i_Thread == 0 ? Fire() : ComeAndGo();
+    }
+  };
+  TestSupport::RunOnThreads( 3, Repeat );
   Callbacks( 1 );
   EXPECT_EQ( Permanent, Rounds + 1u );
   EXPECT_EQ( Callbacks.Count(), 1u );

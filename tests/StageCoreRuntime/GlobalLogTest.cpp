@@ -2,10 +2,9 @@
 #include "StageCoreRuntime/LogRepeats.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
-
-#include <boost/thread/thread.hpp>
 
 #include <algorithm>
 #include <fstream>
@@ -193,25 +192,23 @@ TEST( Log, StandsSeveralThreadsWhileItIsReconfigured )
 {
   constexpr int Messages = 500;
   const VLogCapture Capture( "GlobalLogTest.Threads" );
-  boost::thread_group Threads;
-  for( int Thread = 0; Thread < 2; ++Thread )
+  const auto Reconfigure = []
   {
-    Threads.create_thread(
-      []
-      {
-        for( int Message = 0; Message < Messages; ++Message )
-        {
-          KVZ_LOG( "GlobalLogTest.Threads", 6, "%1%", Message );
-          KVZ_LOG( KVZ::LogCategory( "GlobalLogTest.New" + std::to_string( Message ) ), 6, "%1%", Message );
-        }
-      } );
-  }
-  for( int Round = 0; Round < 50; ++Round )
+    for( int Round = 0; Round < 50; ++Round )
+    {
+      const VLogCapture Passing( "GlobalLogTest.New7" );
+      KVZ::ConfigureLog( { .m_CategoryLevels = { { "GlobalLogTest.New8", Round % 3 } } } );
+    }
+  };
+  const auto Write = []
   {
-    const VLogCapture Passing( "GlobalLogTest.New7" );
-    KVZ::ConfigureLog( { .m_CategoryLevels = { { "GlobalLogTest.New8", Round % 3 } } } );
-  }
-  Threads.join_all();
+    for( int Message = 0; Message < Messages; ++Message )
+    {
+      KVZ_LOG( "GlobalLogTest.Threads", 6, "%1%", Message );
+      KVZ_LOG( KVZ::LogCategory( "GlobalLogTest.New" + std::to_string( Message ) ), 6, "%1%", Message );
+    }
+  };
+  TestSupport::RunOnThreads( 3, [&]( uint32_t i_Thread ) { i_Thread == 0 ? Reconfigure() : Write(); } );
   KVZ::ConfigureLog( {} );
   EXPECT_EQ( Capture.Texts().size(), 2u * Messages );
 }

@@ -2,11 +2,11 @@
 #include "StageCoreDataStoreTypes/GreyscaleMode.h"
 #include "StageCoreDataStoreTypes/MaskGrid.h"
 #include "tests/support/AssertionCapture.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
 
 #include <boost/thread/barrier.hpp>
-#include <boost/thread/thread.hpp>
 
 #include <limits>
 #include <set>
@@ -25,22 +25,17 @@ TEST( Schema, IsUniqueAcrossThreads )
   constexpr int NameCount = 50;
   boost::barrier Barrier( ThreadCount );
   std::array<std::vector<const ISchema*>, ThreadCount> Found;
-  boost::thread_group Threads;
-  for( auto& rFound : Found )
+  const auto Ask = [&]( uint32_t i_Thread )
   {
-    Threads.create_thread(
-      [&]
-      {
-        Barrier.wait();
-        for( int Name = 0; Name < NameCount; ++Name )
-        {
-          const std::vector<ISchema::VEntry> Entries{ { Name, "N", "" } };
-          rFound.push_back( KVZ::IO::GetUniqueSchema( "VariantTest.Unique" + std::to_string( Name ), "", Entries ) );
-        }
-        rFound.push_back( KVZ::IO::GetUniquePodSchema( ISchema::EDouble ) );
-      } );
-  }
-  Threads.join_all();
+    Barrier.wait();
+    for( int Name = 0; Name < NameCount; ++Name )
+    {
+      const std::vector<ISchema::VEntry> Entries{ { Name, "N", "" } };
+      Found[i_Thread].push_back( KVZ::IO::GetUniqueSchema( "VariantTest.Unique" + std::to_string( Name ), "", Entries ) );
+    }
+    Found[i_Thread].push_back( KVZ::IO::GetUniquePodSchema( ISchema::EDouble ) );
+  };
+  TestSupport::RunOnThreads( ThreadCount, Ask );
   for( const auto& rFound : Found )
   {
     EXPECT_EQ( rFound, Found[0] );

@@ -1,9 +1,8 @@
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
-
-#include <boost/thread/thread.hpp>
 
 #include <cstring>
 #include <limits>
@@ -32,17 +31,16 @@ TEST( StandardBufferAllocator, BuffersThatOneThreadReleasesReachTheOthers )
   constexpr uint8_t Mark = 0x5A;
   IStandardBufferAllocator Allocator( "Test" );
   std::vector<std::shared_ptr<KVZ::IBuffer>> Buffers;
-  boost::thread Other(
-    [&]
+  const auto MarkAll = [&]( uint32_t )
+  {
+    while( Buffers.size() < Count )
     {
-      while( Buffers.size() < Count )
-      {
-        Buffers.push_back( Allocator.Allocate( 1 ) );
-        Buffers.back()->Data()[0] = Mark;
-      }
-      Buffers.clear();
-    } );
-  Other.join();
+      Buffers.push_back( Allocator.Allocate( 1 ) );
+      Buffers.back()->Data()[0] = Mark;
+    }
+    Buffers.clear();
+  };
+  TestSupport::RunOnThreads( 1, MarkAll );
   for( size_t Index = 0; Index < 16; ++Index )
   {
     Buffers.push_back( Allocator.Allocate( 1 ) );
@@ -55,22 +53,17 @@ TEST( StandardBufferAllocator, BuffersOutliveTheirAllocatorAndMayBeReleasedByAny
   std::vector<std::shared_ptr<KVZ::IBuffer>> Buffers;
   {
     IStandardBufferAllocator Allocator( "Test" );
-    boost::thread_group Threads;
-    for( uint8_t Thread = 0; Thread < 4; ++Thread )
+    const auto Use = [&Allocator]( uint32_t i_Thread )
     {
-      Threads.create_thread(
-        [&Allocator, Thread]
-        {
-          for( size_t Round = 0; Round < 2000; ++Round )
-          {
-            const size_t Size = 1 + Round % 300;
-            const auto pBuffer = Allocator.Allocate( Size );
-            std::memset( pBuffer->Data(), Thread, Size );
-            EXPECT_EQ( pBuffer->Data()[Size - 1], Thread );
-          }
-        } );
-    }
-    Threads.join_all();
+      for( size_t Round = 0; Round < 2000; ++Round )
+      {
+        const size_t Size = 1 + Round % 300;
+        const auto pBuffer = Allocator.Allocate( Size );
+        std::memset( pBuffer->Data(), static_cast<int>( i_Thread ), Size );
+        EXPECT_EQ( pBuffer->Data()[Size - 1], i_Thread );
+      }
+    };
+    TestSupport::RunOnThreads( 4, Use );
     for( size_t Count = 0; Count < 40; ++Count )
     {
       Buffers.push_back( Allocator.Allocate( 100 ) );
