@@ -29,22 +29,20 @@ std::string Content( const std::string& i_rPath )
 }
 
 // An image is its payload's letter and the pixels; pixels that begin with '!' cannot be compressed.
-VideoEncoding::VCompressor FakeCompressor( char i_Letter )
-{
-  return [i_Letter]( const VideoEncoding::VCompressionInput& i_rInput, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& )
-  {
-    o_rOutput.assign( i_rInput.m_pPixels, i_rInput.m_pPixels + i_rInput.m_Size );
-    o_rOutput.insert( o_rOutput.begin(), static_cast<uint8_t>( i_Letter ) );
-    return i_rInput.m_pPixels[0] != '!';
-  };
-}
-
 std::shared_ptr<VideoEncoding::VVideoFrameEncoder> FakeEncoder()
 {
   VideoEncoding::VEncoderParts Parts;
-  Parts.m_Compressors[IVideoPayload::EImageJPEG] = FakeCompressor( 'J' );
-  Parts.m_Compressors[IVideoPayload::EImagePNG] = FakeCompressor( 'P' );
-  Parts.m_Compressors[IVideoPayload::EImageTIFF] = FakeCompressor( 'T' );
+  for( const auto& [Payload, Letter] :
+    { std::pair( IVideoPayload::EImageJPEG, 'J' ), std::pair( IVideoPayload::EImagePNG, 'P' ), std::pair( IVideoPayload::EImageTIFF, 'T' ) } )
+  {
+    Parts.m_Compressors[Payload] =
+      [Letter = Letter]( const VideoEncoding::VCompressionInput& i_rInput, UtilsMemory::VByteVector& o_rOutput, UtilsMemory::VByteVector& )
+    {
+      o_rOutput.assign( i_rInput.m_pPixels, i_rInput.m_pPixels + i_rInput.m_Size );
+      o_rOutput.insert( o_rOutput.begin(), static_cast<uint8_t>( Letter ) );
+      return i_rInput.m_pPixels[0] != '!';
+    };
+  }
   return std::make_shared<VideoEncoding::VVideoFrameEncoder>( VideoEncoding::EConverter::Software, Parts );
 }
 
