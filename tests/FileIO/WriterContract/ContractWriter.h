@@ -41,7 +41,7 @@ struct VWriterRow
   bool m_bAudio = true;
   bool m_bOneFile = true;   // otherwise a file a frame, none of which stays open
   // Of the one file
-  std::optional<VFoundFile> ( *m_Read )( const VBytes& i_rBytes ) = nullptr;
+  std::optional<VFound> ( *m_Read )( const VBytes& i_rBytes ) = nullptr;
   bool m_bReadableUnfinished = true;
 };
 

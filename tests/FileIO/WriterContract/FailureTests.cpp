@@ -55,8 +55,8 @@ bool CheckLeftBehind( VContractWriter& io_rContract, const VRun& i_rRun, const V
   EXPECT_LE( Found->m_Frames.size(), Kept + 1 );
   for( const auto& [Key, rFrame] : Found->m_Frames )
   {
-    EXPECT_EQ( rFrame.m_Picture, io_rContract.Picture( Key ) );
-    EXPECT_TRUE( rFrame.m_Sound == io_rContract.Sound( Key ) || ( Key >= Kept && rFrame.m_Sound.empty() ) ) << "frame " << Key;
+    EXPECT_EQ( rFrame.m_Video, io_rContract.Picture( Key ) );
+    EXPECT_TRUE( rFrame.m_Audio == io_rContract.Sound( Key ) || ( Key >= Kept && rFrame.m_Audio.empty() ) ) << "frame " << Key;
   }
   return Found->m_bFinished;
 }

@@ -1,6 +1,5 @@
 #include "tests/FileIO/WriterContract/FoundFrames.h"
 
-#include "tests/FileIO/TarvoVideo/SmallFile.h"
 #include "tests/support/ByteBuilder.h"
 #include "tests/support/EbmlParser.h"
 #include "tests/support/MovParser.h"
@@ -19,13 +18,13 @@ using namespace TestSupport;
 namespace
 {
 
-void AddPicture( VFoundFile& io_rFile, const VBytes& i_rPicture ) { io_rFile.m_Frames[io_rFile.m_Frames.size()].m_Picture = i_rPicture; }
+void AddPicture( VFound& io_rFile, const VBytes& i_rPicture ) { io_rFile.m_Frames[io_rFile.m_Frames.size()].m_Video = i_rPicture; }
 
-void AddSound( VFoundFile& io_rFile, const VBytes& i_rSound )
+void AddSound( VFound& io_rFile, const VBytes& i_rSound )
 {
   if( !io_rFile.m_Frames.empty() )
   {
-    io_rFile.m_Frames.rbegin()->second.m_Sound = i_rSound;
+    io_rFile.m_Frames.rbegin()->second.m_Audio = i_rSound;
   }
 }
 
@@ -62,24 +61,14 @@ bool IsWholeMkv( const VEbmlParser& i_rFile, size_t i_Size )
 
 }
 
-std::optional<VFoundFile> ReadTvid( const VBytes& i_rBytes )
+std::optional<VFound> ReadTvid( const VBytes& i_rBytes )
 {
-  const TarvoVideo::VFound Found = TarvoVideo::ReadAll( i_rBytes );
-  if( !Found.m_Error.empty() )
-  {
-    return {};
-  }
-  VFoundFile File;
-  File.m_bFinished = Found.m_bFinished;
-  for( const auto& [Key, rContent] : Found.m_Frames )
-  {
-    File.m_Frames[Key] = { rContent.m_Video, rContent.m_Audio };
-  }
-  return File;
+  const VFound File = TarvoVideo::ReadAll( i_rBytes );
+  return File.m_Error.empty() ? std::optional( File ) : std::nullopt;
 }
 
 // What comes behind the tables, and may be cut off, is no hindrance.
-std::optional<VFoundFile> ReadMov( const VBytes& i_rBytes )
+std::optional<VFound> ReadMov( const VBytes& i_rBytes )
 try
 {
   VBytes Whole = i_rBytes;
@@ -91,7 +80,7 @@ try
     Whole.resize( std::min( Whole.size(), static_cast<size_t>( Moov - Whole.begin() ) - 4 + Size ) );
   }
   const auto Parser = VMovParser::OfBytes( Whole );
-  VFoundFile File;
+  VFound File;
   File.m_bFinished = true;
   for( size_t Frame = 0; Frame < Parser.Track( "vide" ).m_Samples.size(); ++Frame )
   {
@@ -106,11 +95,11 @@ catch( const std::runtime_error& )
 }
 
 // In the indexes other numbers follow the ids.
-std::optional<VFoundFile> ReadAvi( const VBytes& i_rBytes )
+std::optional<VFound> ReadAvi( const VBytes& i_rBytes )
 {
   const VBytes PictureHead = VLittleEndian().Raw( "00db" ).U32( PictureBytes ).m_Bytes;
   const VBytes SoundHead = VLittleEndian().Raw( "01wb" ).U32( SoundBytes ).m_Bytes;
-  VFoundFile File;
+  VFound File;
   File.m_bFinished = IsWholeAvi( i_rBytes );
   for( auto Chunk = i_rBytes.begin(); i_rBytes.end() - Chunk >= static_cast<std::ptrdiff_t>( PictureHead.size() + SoundBytes ); ++Chunk )
   {
@@ -128,11 +117,11 @@ std::optional<VFoundFile> ReadAvi( const VBytes& i_rBytes )
   return File;
 }
 
-std::optional<VFoundFile> ReadMkv( const VBytes& i_rBytes )
+std::optional<VFound> ReadMkv( const VBytes& i_rBytes )
 try
 {
   const VEbmlParser Parser( i_rBytes );
-  VFoundFile File;
+  VFound File;
   File.m_bFinished = IsWholeMkv( Parser, i_rBytes.size() );
   for( const VMatroskaBlock& rBlock : ReadBlocks( Parser ) )
   {
