@@ -20,4 +20,14 @@ void RunOnThreads( uint32_t i_Count, const TFunction& i_rFunction )
   Threads.join_all();
 }
 
+// Returns when the condition holds, asking it again and again. For what other threads bring about and tell nobody.
+template<class TCondition>
+void WaitUntil( const TCondition& i_rCondition )
+{
+  while( !i_rCondition() )
+  {
+    boost::this_thread::yield();
+  }
+}
+
 }

@@ -1,14 +1,14 @@
-// The engine between a fake host and virtual cards that are stepped by hand. The thread that steps is the vendor's thread.
+// The engine between a host that listens and virtual cards that are stepped by hand. The thread that steps is the vendor's thread.
 #include "StageCorePluginVideoInput/VideoInputEngine.h"
 
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "cards/common/VirtualCardControl.h"
+#include "tests/StageCorePluginVideoInput/Engine/ListeningHost.h"
 #include "tests/support/FakeFlowServices.h"
-#include "tests/support/FakeHost.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/Threads.h"
 
-#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
 #include <dlfcn.h>
@@ -20,11 +20,9 @@
 namespace
 {
 
-using TestSupport::VFakeHost;
+using TestSupport::WaitUntil;
 using EStatus = VideoInputHAL::IVideoInputDevice::EStatus;
 using VTexts = std::vector<std::string>;
-
-const std::string EngineThread = "Video Input Engine0";
 
 // Loaded before anybody looks for the vendor's library, which is then this one: it has the same file name.
 VirtualCards::IVirtualCardControl& Control()
@@ -44,7 +42,8 @@ protected:
   void SetUp() override
   {
     ASSERT_NE( &Control(), nullptr );
-    m_pHost = std::make_unique<VFakeHost>();
+    m_Heard.Clear();
+    m_pHost = std::make_unique<VListeningHost>();
   }
   // What came from the card has gone back when engine and host have ended.
   void TearDown() override
@@ -76,10 +75,13 @@ protected:
     m_pEngine.reset();
     if( m_pHost )
     {
-      const auto Sources = m_pHost->m_pSources->AllSources();
+      const auto Sources = m_pHost->m_pSources->m_All;
       m_pHost->m_pShutdown->Shutdown();
       m_pHost.reset();
-      VFakeHost::WaitForEnd( Sources );
+      for( const auto& pSource : Sources )   // a call that was posted to its thread may be its last owner for a moment
+      {
+        WaitUntil( [&] { return pSource.expired(); } );
+      }
     }
   }
   VirtualCards::VCardId AddCard()
@@ -91,28 +93,30 @@ protected:
   }
   void WaitFor( const std::string& i_rText )
   {
-    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->m_pHappenings->Has( i_rText ); } );
+    WaitUntil( [&] { return m_Heard.Has( i_rText ); } );
   }
   // Every device is enabled unless somebody has said otherwise: it starts as soon as it is wired.
   void WaitUntilCapturing( const std::string& i_rURN )
   {
     const VDataPath Path = DeviceSchemas::VideoInput::Status( DeviceSchemas::VideoInput::Path( i_rURN ) );
-    m_pHost->m_pHappenings->WaitUntil( [&] { return m_pHost->Setting<EStatus::Enum>( Path ) == EStatus::ECapturing; } );
+    const auto IsCapturing = [&]
+    {
+      EStatus::Enum Status{};
+      return GetTyped( VDataReader( *m_pHost->GetDataStore() ), Path, Status ) && Status == EStatus::ECapturing;
+    };
+    WaitUntil( IsCapturing );
   }
   // The device finds its signal, and the source begins a session with the next frame.
   void StartCard( VirtualCards::VCardId i_Card )
   {
     WaitUntilCapturing( "vi:0" );
     EXPECT_TRUE( Control().Step( i_Card, 1 ) );
-    const auto pSource = m_pHost->m_pSources->Find( "vi:0" );
-    m_pHost->m_pHappenings->WaitUntil( [&] { return pSource->Temporal().GetSourceSyncStatus().m_bEnabled; } );
+    WaitUntil( [this] { return Status().m_bEnabled; } );
   }
-  // Of the present session.
-  uint64_t Frames()
-  {
-    const auto Status = m_pHost->m_pSources->Find( "vi:0" )->Temporal().GetSourceSyncStatus();
-    return Status.m_Session.m_Id == 0 ? 0 : Status.m_LatestCounterFrames + 1;
-  }
+  // Of the only source.
+  KVZ::ISourceTemporal::ISourceSyncStatus Status() { return m_pHost->m_pSources->GetSources().at( 0 )->Temporal().GetSourceSyncStatus(); }
+  // Of its present session.
+  uint64_t Frames() { return Status().m_Session.m_Id == 0 ? 0 : Status().m_LatestCounterFrames + 1; }
   // Frames that the card has handed to its client.
   static uint64_t Delivered( VirtualCards::VCardId i_Card )
   {
@@ -122,12 +126,13 @@ protected:
   }
   VTexts Sources( const std::string& i_rVerb ) const
   {
-    VTexts Found = m_pHost->m_pHappenings->Texts();
+    VTexts Found = m_Heard.Texts();
     std::erase_if( Found, [&]( const std::string& i_rText ) { return !i_rText.starts_with( i_rVerb ); } );
     return Found;
   }
 
-  std::unique_ptr<VFakeHost> m_pHost;
+  TestSupport::VLogCapture m_Heard{ "Host" };
+  std::unique_ptr<VListeningHost> m_pHost;
   std::unique_ptr<VVideoInputEngine> m_pEngine;
   std::vector<VirtualCards::VCardId> m_Cards;
 };
@@ -135,19 +140,21 @@ protected:
 TEST_F( VideoInputEngine, IsBuiltInOrderAndHandsItsOwnShutdownObjectOverLast )
 {
   m_pEngine = std::make_unique<VVideoInputEngine>( *m_pHost );
-  EXPECT_EQ( m_pHost->m_pHappenings->Texts(),
-    ( VTexts{ "AddShutdownObject VVideoInputDeviceManager", "SetFileFilters 2 *.avi *.mov *.mp4 *.tvid *.mkv", "AddParameterGroup System.VideoInput",
-      "AddShutdownObject VVideoInputSystemParameterHandler", "AddShutdownObject VVideoInputEngine" } ) );
+  EXPECT_EQ( m_Heard.Texts(),
+    ( VTexts{ "AddShutdownObject KVZ::Detail::VShutdownObject<VideoInputHAL::VVideoInputDeviceManager>",
+      "SetFileFilters 2 *.avi *.mov *.mp4 *.tvid *.mkv", "AddParameterGroup System.VideoInput",
+      "AddShutdownObject KVZ::Detail::VShutdownObject<VVideoInputSystemParameterHandler>",
+      "AddShutdownObject KVZ::Detail::VShutdownObject<VVideoInputEngine::VImpl>" } ) );
   EXPECT_TRUE( m_pHost->m_pParameters->GetGroups().front()->GetParameters().empty() );
 
   // Without cards nothing comes, and nothing goes.
-  m_pHost->m_pHappenings->Clear();
+  m_Heard.Clear();
   m_pEngine->Start();
   m_pHost->m_pHardwareStart->Fire();
   EXPECT_FALSE( m_pEngine->StartCapture( "vi:0" ) );
   EXPECT_FALSE( m_pEngine->StopCapture( "vi:0" ) );
   m_pEngine.reset();
-  EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "RemoveParameterGroup System.VideoInput" } ) );
+  EXPECT_EQ( m_Heard.Texts(), ( VTexts{ "RemoveParameterGroup System.VideoInput" } ) );
 }
 
 TEST_F( VideoInputEngine, AStartOfHardwareAfterItsEndDoesNothing )
@@ -163,12 +170,11 @@ TEST_F( VideoInputEngine, WiresADeviceOnItsOwnThreadAndRegistersItsSourceLast )
 {
   AddCard();
   MakeAndStart();
-  m_pHost->m_pHappenings->Clear();
+  m_Heard.Clear();
+  m_pHost->m_pSources->m_OnAdd = []( const std::string& ) { EXPECT_EQ( DebugServices::GetThreadName(), "Video Input Engine0" ); };
   m_pHost->m_pHardwareStart->Fire();   // finds the card on this thread
   WaitFor( "AddSource vi:0" );
-  EXPECT_EQ( m_pHost->m_pHappenings->Texts(), ( VTexts{ "AddParameterGroup VideoInput.vi:0", "AddSource vi:0" } ) );
-  EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "AddParameterGroup VideoInput.vi:0" ), EngineThread );
-  EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "AddSource vi:0" ), EngineThread );
+  EXPECT_EQ( m_Heard.Texts(), ( VTexts{ "AddParameterGroup VideoInput.vi:0", "AddSource vi:0" } ) );
 }
 
 TEST_F( VideoInputEngine, FramesReachTheSourceUntilItIsTakenOut )
@@ -192,7 +198,7 @@ TEST_F( VideoInputEngine, FramesReachTheSourceUntilItIsTakenOut )
     EXPECT_EQ( Delivered( Card ), Before );
   };
   m_pEngine.reset();
-  EXPECT_TRUE( m_pHost->m_pHappenings->Has( "RemoveSource vi:0" ) );
+  EXPECT_TRUE( m_Heard.Has( "RemoveSource vi:0" ) );
 }
 
 // Nodes may be made before their device is there and outlive the engine.
@@ -200,7 +206,7 @@ TEST_F( VideoInputEngine, FlowNodesFindTheSourcesOfTheMoment )
 {
   AddCard();
   MakeAndStart();
-  const auto pFactory = m_pHost->m_pFlowNodes->Find( "VideoInputDataSource" );
+  const auto pFactory = m_pHost->FlowNodes().Find( "VideoInputDataSource" );
   const auto pNode = pFactory->CreateNode();
   pNode->ParameterTexts() = { { "DeviceURN", "vi:0" } };
   const auto pServices = std::make_shared<TestSupport::VFakeFlowServices>();
@@ -227,9 +233,9 @@ TEST_F( VideoInputEngine, TakesItsSourcesOutInTheOrderInWhichTheyCame )
   WaitFor( "AddSource vi:2" );
   WaitUntilCapturing( "vi:2" );
   EXPECT_EQ( Sources( "AddSource" ), ( VTexts{ "AddSource vi:0", "AddSource vi:1", "AddSource vi:2" } ) );
-  m_pHost->m_pHappenings->Clear();
+  m_Heard.Clear();
   m_pEngine.reset();
-  EXPECT_EQ( m_pHost->m_pHappenings->Texts(),
+  EXPECT_EQ( m_Heard.Texts(),
     ( VTexts{ "RemoveParameterGroup VideoInput.vi:0", "RemoveParameterGroup VideoInput.vi:1", "RemoveParameterGroup VideoInput.vi:2",
       "RemoveSource vi:0", "RemoveSource vi:1", "RemoveSource vi:2", "RemoveParameterGroup System.VideoInput" } ) );
 }
@@ -293,10 +299,10 @@ TEST_F( VideoInputEngine, MayEndWhileADeviceArrives )
   for( int Round = 0; Round < 10; ++Round )
   {
     SCOPED_TRACE( Round );
-    m_pHost = std::make_unique<VFakeHost>();
+    SetUp();
     std::promise<void> Reached;
     std::promise<void> Opened;
-    m_pHost->m_OnGetAllocator = [&]
+    m_pHost->m_pSources->m_OnAdd = [&]( const std::string& )
     {
       Reached.set_value();
       Opened.get_future().wait();
@@ -309,18 +315,18 @@ TEST_F( VideoInputEngine, MayEndWhileADeviceArrives )
     boost::thread Host(
       [&]
       {
-        DebugServices::SetThreadName( "Host" );
+        const boost::thread::id Id = boost::this_thread::get_id();
+        pSources->m_OnRemove = [Id]( const std::string& ) { EXPECT_EQ( boost::this_thread::get_id(), Id ); };
         Ending.set_value();
-        m_pEngine.reset();
-        bEnded = true;
-        EXPECT_EQ( m_pHost->m_pHappenings->ThreadOf( "RemoveSource vi:0" ), "Host" );
         End();
+        bEnded = true;
       } );
     Ending.get_future().wait();
     EXPECT_FALSE( bEnded );   // it has to wait for the arrival
     Opened.set_value();
     Host.join();
-    EXPECT_EQ( pSources->Find( "vi:0" ), nullptr );
+    EXPECT_TRUE( pSources->GetSources().empty() );
+    EXPECT_TRUE( m_Heard.Has( "RemoveSource vi:0" ) );
   }
 }
 

@@ -2,8 +2,8 @@
 
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "StageCorePluginInterface/HardwareRegistry.h"
+#include "host/StandAloneHost.h"
 #include "tests/support/AssertionCapture.h"
-#include "tests/support/FakeHost.h"
 
 #include <boost/algorithm/string/join.hpp>
 #include <gtest/gtest.h>
@@ -12,7 +12,7 @@ namespace
 {
 
 using StageCorePluginInterface::IHardwareManager;
-using TestSupport::VFakeHost;
+using StageHost::VStandAloneHost;
 
 // Writes down each call with its arguments.
 class VWrittenRegistry : public StageCorePluginInterface::IHardwareRegistry
@@ -53,27 +53,27 @@ public:
 
 TEST( Plugin, WithoutAnEngineEachRegistrationAssertsAndRegistersNothing )
 {
-  VFakeHost Host;
+  VStandAloneHost Host( {} );
   VWrittenHardware Hardware;
   TestSupport::VAssertionCapture Assertions;
   VStageCorePluginVideoInput Plugin;
   EXPECT_FALSE( Plugin.RegisterHardware( nullptr, Hardware ) );
   EXPECT_EQ( Assertions.Expressions(), ( std::vector<std::string>{ "m_pEngine != nullptr" } ) );
   EXPECT_TRUE( Hardware.m_pRegistry->m_Calls.empty() );
-  Plugin.RegisterFlowNodeFactories( *Host.m_pFlowNodes );
+  Plugin.RegisterFlowNodeFactories( *Host.GetFlowNodeRegistry() );
   EXPECT_EQ( Assertions.Expressions().size(), 2u );
 }
 
 TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
 {
-  VFakeHost Host;
+  VStandAloneHost Host( {} );
   VWrittenHardware Hardware;
   VStageCorePluginVideoInput Plugin;
   ASSERT_TRUE( Plugin.Initialise( Host ) );
-  EXPECT_EQ( Host.m_pFlowNodes->Count(), 1u ) << "the engine's own";
-  EXPECT_TRUE( Plugin.RegisterFlowNodeFactories( *Host.m_pFlowNodes ) );
-  EXPECT_EQ( Host.m_pFlowNodes->Count(), 2u );
-  EXPECT_NE( Host.m_pFlowNodes->Find( "VideoInputDataSource" ), nullptr );
+  EXPECT_EQ( Host.FlowNodes().Count(), 1u ) << "the engine's own";
+  EXPECT_TRUE( Plugin.RegisterFlowNodeFactories( *Host.GetFlowNodeRegistry() ) );
+  EXPECT_EQ( Host.FlowNodes().Count(), 2u );
+  EXPECT_NE( Host.FlowNodes().Find( "VideoInputDataSource" ), nullptr );
   EXPECT_TRUE( Plugin.RegisterHardware( nullptr, Hardware ) );
   EXPECT_EQ( Hardware.m_pRegistry->m_Calls,
     ( std::vector<std::string>{
@@ -84,7 +84,7 @@ TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
       "AddCommand Devices:SelectAllCameras [Video Inputs] Select All Cameras (Ctrl+Shift+A)",
     } ) );
 
-  const VDataReader Reader( *Host.m_pStore );
+  const VDataReader Reader( *Host.GetDataStore() );
   const auto& rIsOurs = Hardware.m_pRegistry->m_Predicate;
   EXPECT_TRUE( rIsOurs( Reader, VDataPath{ "VideoInput" } ) );
   EXPECT_TRUE( rIsOurs( Reader, DeviceSchemas::Enabled( DeviceSchemas::VideoInput::Path( "vi:0" ) ) ) );
@@ -95,20 +95,20 @@ TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
 
 TEST( Plugin, ItsEngineLivesAsLongAsTheHostHoldsTheManagerOrAnotherReplacesIt )
 {
-  VFakeHost Host;
+  VStandAloneHost Host( {} );
   VWrittenHardware Hardware;
   auto pPlugin = std::make_unique<VStageCorePluginVideoInput>();
   EXPECT_TRUE( pPlugin->Initialise( Host ) );
-  const auto First = Host.m_pParameters->GetGroups();
+  const auto First = Host.Parameters().GetGroups();
   EXPECT_TRUE( pPlugin->Initialise( Host ) );
-  EXPECT_EQ( Host.m_pParameters->GetGroups().size(), 1u );
-  EXPECT_NE( Host.m_pParameters->GetGroups(), First );
+  EXPECT_EQ( Host.Parameters().GetGroups().size(), 1u );
+  EXPECT_NE( Host.Parameters().GetGroups(), First );
 
   pPlugin->RegisterHardware( nullptr, Hardware );
   pPlugin.reset();
-  EXPECT_EQ( Host.m_pParameters->GetGroups().size(), 1u );
+  EXPECT_EQ( Host.Parameters().GetGroups().size(), 1u );
   Hardware.m_pRegistry->m_pManager.reset();
-  EXPECT_TRUE( Host.m_pParameters->GetGroups().empty() );
+  EXPECT_TRUE( Host.Parameters().GetGroups().empty() );
 }
 
 }
