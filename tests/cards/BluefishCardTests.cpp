@@ -2,15 +2,7 @@
 #include "tests/cards/BluefishClient.h"
 
 using namespace BluefishTests;
-
-namespace
-{
-
-class BluefishCard : public VBluefishFixture
-{
-};
-
-}
+using BluefishCard = VBluefishFixture;
 
 TEST_F( BluefishCard, CardsAreCountedAsTheyComeAndGo )
 {

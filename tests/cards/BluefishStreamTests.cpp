@@ -2,13 +2,10 @@
 #include "tests/cards/BluefishClient.h"
 
 using namespace BluefishTests;
+using BluefishStream = VBluefishFixture;
 
 namespace
 {
-
-class BluefishStream : public VBluefishFixture
-{
-};
 
 constexpr uint32_t Mode576i = 0;
 constexpr uint32_t Mode720p50 = 16;

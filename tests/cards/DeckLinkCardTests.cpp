@@ -2,15 +2,7 @@
 #include "tests/cards/DeckLinkClient.h"
 
 using namespace CardsTests;
-
-namespace
-{
-
-class DeckLinkCard : public VCardFixture
-{
-};
-
-}
+using DeckLinkCard = VCardFixture;
 
 TEST_F( DeckLinkCard, WhatARealCardRefuses )
 {
@@ -39,12 +31,12 @@ TEST_F( DeckLinkCard, WhatARealCardRefuses )
 TEST_F( DeckLinkCard, InterfacesAreOneObjectAndRefuseTheUnknown )
 {
   Plug( "decklink" );
-  const VPointer<IUnknown> pFromCard = Query<IUnknown>( *m_pCard, IID_IUnknown );
-  const VPointer<IUnknown> pFromInput = Query<IUnknown>( *m_pInput, IID_IUnknown );
+  const VComPointer<IUnknown> pFromCard = QueryInterface<IUnknown>( *m_pCard, IID_IUnknown );
+  const VComPointer<IUnknown> pFromInput = QueryInterface<IUnknown>( *m_pInput, IID_IUnknown );
   EXPECT_EQ( pFromCard.get(), pFromInput.get() );
-  const VPointer<IDeckLinkAttributes> pAttributes = Query<IDeckLinkAttributes>( *m_pInput, IID_IDeckLinkAttributes );
+  const VComPointer<IDeckLinkAttributes> pAttributes = QueryInterface<IDeckLinkAttributes>( *m_pInput, IID_IDeckLinkAttributes );
   ASSERT_NE( pAttributes, nullptr );
-  EXPECT_EQ( Query<IDeckLink>( *pAttributes, IID_IDeckLink ).get(), m_pCard.get() );
+  EXPECT_EQ( QueryInterface<IDeckLink>( *pAttributes, IID_IDeckLink ).get(), m_pCard.get() );
   bool bDetects = false;
   EXPECT_EQ( pAttributes->GetFlag( AttributeId::SupportsInputFormatDetection, &bDetects ), S_OK );
   EXPECT_TRUE( bDetects );

@@ -1,7 +1,7 @@
 // A client of the virtual library as a program with the vendor's kit would be: through the exported names and the interfaces alone.
 #pragma once
 
-#include "VendorInterfaces/DeckLinkAPI.h"
+#include "HardwareSupport/VideoInput/VideoInputDeviceBlackmagic/ComPointer.h"
 #include "tests/cards/CardFixture.h"
 #include "tests/support/CounterReader.h"
 #include "tests/support/RampReader.h"
@@ -13,7 +13,6 @@
 #include <atomic>
 #include <cstdlib>
 #include <functional>
-#include <memory>
 #include <string>
 #include <vector>
 
@@ -22,6 +21,9 @@ namespace CardsTests
 
 using namespace DeckLinkAPI;
 using namespace VirtualCards;
+using VideoInputHAL::QueryInterface;
+using VideoInputHAL::TakeReference;
+using VideoInputHAL::VComPointer;
 
 constexpr int64_t Scale = 135000000;
 constexpr uint32_t Mode1080p25 = FourCharacterCode( "Hp25" );
@@ -37,20 +39,6 @@ TFunction* Exported( const char* i_pName )
 
 inline IVirtualCardControl& DeckLinkControl() { return ControlOf( VIRTUAL_DECKLINK ); }
 
-struct VReleaser
-{
-  void operator()( IUnknown* i_pObject ) const { i_pObject->Release(); }
-};
-template<class TInterface>
-using VPointer = std::unique_ptr<TInterface, VReleaser>;
-
-template<class TInterface>
-VPointer<TInterface> Query( IUnknown& i_rObject, REFIID i_Id )
-{
-  void* pFound = nullptr;
-  return VPointer<TInterface>( i_rObject.QueryInterface( i_Id, &pFound ) == S_OK ? static_cast<TInterface*>( pFound ) : nullptr );
-}
-
 inline std::string TakeText( const char* i_pText )
 {
   const std::string Text = i_pText ? i_pText : "(null)";
@@ -58,15 +46,14 @@ inline std::string TakeText( const char* i_pText )
   return Text;
 }
 
-inline VPointer<IDeckLinkDiscovery> MakeDiscovery()
+// An object of one of the library's factories
+template<class TInterface>
+VComPointer<TInterface> Make( const char* i_pFactory )
 {
-  return VPointer<IDeckLinkDiscovery>( Exported<IDeckLinkDiscovery*()>( "CreateDeckLinkDiscoveryInstance_0001" )() );
+  return TakeReference( Exported<TInterface*()>( i_pFactory )() );
 }
 
-inline VPointer<IDeckLinkIterator> MakeIterator()
-{
-  return VPointer<IDeckLinkIterator>( Exported<IDeckLinkIterator*()>( "CreateDeckLinkIteratorInstance_0002" )() );
-}
+inline VComPointer<IDeckLinkDiscovery> MakeDiscovery() { return Make<IDeckLinkDiscovery>( "CreateDeckLinkDiscoveryInstance_0001" ); }
 
 // What a frame callback saw
 struct VSeen
@@ -212,9 +199,9 @@ protected:
   {
     AddCard( i_rText, i_bManualClock );
     IDeckLink* pCard = nullptr;
-    ASSERT_EQ( MakeIterator()->Next( &pCard ), S_OK );
-    m_pCard.reset( pCard );
-    m_pInput = Query<IDeckLinkInput>( *m_pCard, IID_IDeckLinkInput );
+    ASSERT_EQ( Make<IDeckLinkIterator>( "CreateDeckLinkIteratorInstance_0002" )->Next( &pCard ), S_OK );
+    m_pCard = TakeReference( pCard );
+    m_pInput = QueryInterface<IDeckLinkInput>( *m_pCard, IID_IDeckLinkInput );
     ASSERT_NE( m_pInput, nullptr );
     ASSERT_EQ( m_pInput->SetCallback( &m_Client ), S_OK );
   }
@@ -269,8 +256,8 @@ protected:
   }
 
   VClient m_Client;
-  VPointer<IDeckLink> m_pCard;
-  VPointer<IDeckLinkInput> m_pInput;
+  VComPointer<IDeckLink> m_pCard;
+  VComPointer<IDeckLinkInput> m_pInput;
 };
 
 }

@@ -60,7 +60,7 @@ TEST_F( DeckLinkDiscovery, ReportsCardsThatAreThereAndThoseThatComeLater )
 {
   const std::string First = Add();
   const VCardId FirstCard = m_Card;
-  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  const VComPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), S_OK );
   EXPECT_EQ( m_Watcher.m_News, std::vector<std::string>( { First } ) );
   EXPECT_EQ( pDiscovery->InstallDeviceNotifications( &m_Watcher ), E_ACCESSDENIED );
@@ -80,20 +80,20 @@ TEST_F( DeckLinkDiscovery, ReportsCardsThatAreThereAndThoseThatComeLater )
 TEST_F( DeckLinkDiscovery, ACardThatWasTakenOutComesBackAsANewOne )
 {
   VClient Client;
-  VPointer<IDeckLinkInput> pInput;
+  VComPointer<IDeckLinkInput> pInput;
   const auto Stream = [&]
   {
     pInput->SetCallback( &Client );
     pInput->EnableVideoInput( Mode1080p25, PixelFormat::YUV8Bit, 0 );
     pInput->StartStreams();
   };
-  const VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  const VComPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   pDiscovery->InstallDeviceNotifications( &m_Watcher );
-  m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard ) { pInput = Query<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
+  m_Watcher.m_OnArrival = [&]( IDeckLink* i_pCard ) { pInput = QueryInterface<IDeckLinkInput>( *i_pCard, IID_IDeckLinkInput ); };
   Add();
   Stream();
   Step( 3 );
-  const VPointer<IDeckLinkInput> pFirst = std::move( pInput );
+  const VComPointer<IDeckLinkInput> pFirst = std::move( pInput );
   Event( R"({ "do": "remove" })" );
   Step( 2 );
   EXPECT_EQ( Client.m_FrameCalls, 3 );
@@ -115,7 +115,7 @@ TEST_F( DeckLinkDiscovery, ACardThatWasTakenOutComesBackAsANewOne )
 
 TEST_F( DeckLinkDiscovery, AnArrivalMayUninstallOrAddMore )
 {
-  VPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
+  VComPointer<IDeckLinkDiscovery> pDiscovery = MakeDiscovery();
   m_Watcher.m_OnArrival = [&]( IDeckLink* )
   {
     if( m_Watcher.m_News.size() == 1 )
@@ -142,13 +142,13 @@ TEST_F( DeckLinkDiscovery, AllGenerationsOfTheFactoriesFindTheCards )
   for( const char* pName :
     { "CreateDeckLinkDiscoveryInstance_0001", "CreateDeckLinkDiscoveryInstance_0002", "CreateDeckLinkDiscoveryInstance_0003" } )
   {
-    const VPointer<IDeckLinkDiscovery> pDiscovery( Exported<IDeckLinkDiscovery*()>( pName )() );
+    const auto pDiscovery = Make<IDeckLinkDiscovery>( pName );
     pDiscovery->InstallDeviceNotifications( &m_Watcher );
   }
   EXPECT_EQ( m_Watcher.m_News.size(), 3u * 2 );
   for( const char* pName : { "CreateDeckLinkIteratorInstance_0002", "CreateDeckLinkIteratorInstance_0003", "CreateDeckLinkIteratorInstance_0004" } )
   {
-    const VPointer<IDeckLinkIterator> pIterator( Exported<IDeckLinkIterator*()>( pName )() );
+    const auto pIterator = Make<IDeckLinkIterator>( pName );
     int Count = 0;
     for( IDeckLink* pCard = nullptr; pIterator->Next( &pCard ) == S_OK; pCard->Release() )
     {

@@ -2,15 +2,7 @@
 #include "tests/cards/DeckLinkClient.h"
 
 using namespace CardsTests;
-
-namespace
-{
-
-class DeckLinkStream : public VCardFixture
-{
-};
-
-}
+using DeckLinkStream = VCardFixture;
 
 TEST_F( DeckLinkStream, FramesFollowEachOtherInEveryFormat )
 {
@@ -155,11 +147,11 @@ TEST_F( DeckLinkStream, PacketsComeOnlyWithSoundThatIsEnabledAndThere )
 TEST_F( DeckLinkStream, FramesThatAreKeptStayAsTheyWere )
 {
   Plug( "decklink:pattern=counter" );
-  std::vector<VPointer<IDeckLinkVideoInputFrame>> Kept;
+  std::vector<VComPointer<IDeckLinkVideoInputFrame>> Kept;
   m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
   {
     EXPECT_EQ( i_pFrame->AddRef(), 2u );
-    Kept.emplace_back( i_pFrame );
+    Kept.emplace_back( i_pFrame, false );
   };
   Enable();
   Start();

@@ -7,17 +7,8 @@
 #include <boost/thread/thread.hpp>
 
 using namespace CardsTests;
-
-namespace
-{
-
-class DeckLinkThreads : public VCardFixture
-{
-protected:
-  using VThread = boost::scoped_thread<boost::join_if_joinable>;
-};
-
-}
+using DeckLinkThreads = VCardFixture;
+using VThread = boost::scoped_thread<boost::join_if_joinable>;
 
 TEST_F( DeckLinkThreads, OnlyStopWaitsForARunningCallback )
 {
@@ -108,10 +99,9 @@ TEST_F( DeckLinkThreads, CardsComeAndGoWhileTheyRunAndFramesAreGivenBackElsewher
 {
   Plug( "decklink:standard=SD_720_576I_5000,speed=100", false );
   boost::mutex Mutex;
-  std::vector<VPointer<IDeckLinkVideoInputFrame>> Kept;
+  std::vector<VComPointer<IDeckLinkVideoInputFrame>> Kept;
   m_Client.m_OnFrame = [&]( IDeckLinkVideoInputFrame* i_pFrame, IDeckLinkAudioInputPacket* )
   {
-    i_pFrame->AddRef();
     const boost::lock_guard<boost::mutex> Lock( Mutex );
     Kept.emplace_back( i_pFrame );
   };
@@ -119,7 +109,7 @@ TEST_F( DeckLinkThreads, CardsComeAndGoWhileTheyRunAndFramesAreGivenBackElsewher
   Start();
   for( size_t Given = 0; Given < 300; )
   {
-    std::vector<VPointer<IDeckLinkVideoInputFrame>> Mine;
+    std::vector<VComPointer<IDeckLinkVideoInputFrame>> Mine;
     {
       const boost::lock_guard<boost::mutex> Lock( Mutex );
       Mine.swap( Kept );
