@@ -70,7 +70,7 @@ TEST_F( VParameters, TheFirstAppearanceCountsOnceWithASignalToo )
 TEST_F( VParameters, SavedSettingsSurviveAndAreApplied )
 {
   m_pDevice->SetSignal( IVideoStandard::EHD_1920_1080P_2500 );
-  m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  SetMasterPeriod( 1350000 );
   Save( DeviceSchemas::Enabled( m_Device ), false );
   Save( DeviceSchemas::UserId( m_Device ), uint32_t{ 42 } );
   Save( Keys::PixelFormat( m_Device ), IPixelFormat::EU8Y8V8Y8 );

@@ -5,7 +5,7 @@
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "NotificationSystem/AsioPostalService.h"
 
-#include <thread>
+#include <boost/thread/thread.hpp>
 
 namespace
 {
@@ -230,13 +230,11 @@ TEST_F( VReactions, UsersOnOtherThreadsNeverLeaveAWishUnanswered )
       EXPECT_TRUE( pParameter->SetValue( i_rFirst ) && pParameter->SetValue( i_rSecond ) );
     }
   };
-  std::thread Users[] = { std::thread( Toggle, "Enabled", Variant::Make( true ), Variant::Make( false ) ),
-    std::thread( Toggle, "AudioChannelCount", Variant::Make<uint32_t>( 2 ), Variant::Make<uint32_t>( 8 ) ),
-    std::thread( Toggle, "UseTimecodeForSync", Variant::Make( true ), Variant::Make( false ) ) };
-  for( std::thread& rUser : Users )
-  {
-    rUser.join();
-  }
+  boost::thread Enabler( Toggle, "Enabled", Variant::Make( true ), Variant::Make( false ) );
+  boost::thread Listener( Toggle, "AudioChannelCount", Variant::Make<uint32_t>( 2 ), Variant::Make<uint32_t>( 8 ) );
+  Toggle( "UseTimecodeForSync", Variant::Make( true ), Variant::Make( false ) );
+  Enabler.join();
+  Listener.join();
   pService->Stop();
   EXPECT_TRUE( VDataReader( *m_pStore ).IsSettled( DeviceSchemas::Enabled( m_Device ) ) );
   EXPECT_FALSE( Value<bool>( "Enabled" ) );
@@ -254,7 +252,7 @@ TEST_F( VReactions, NothingReactsOnceTheHandlerHasGone )
   EXPECT_EQ( m_pDevice->m_Stops, 0 );
   EXPECT_TRUE( m_pRegistry->GetGroups().empty() );
   EXPECT_EQ( m_pDevice->GetVideoStandardChangedCallback().Count(), 0u );
-  m_pSources->SetMasterPeriod( KVZ::VTick( 1350000 ) );
+  SetMasterPeriod( 1350000 );
   m_pDevice->SetPixelFormats( { IPixelFormat::ELuminance8 } );
   m_pTargets->SetAliases( {} );
   m_pService->RunAll();

@@ -1,9 +1,8 @@
-#include "StageCoreParameters/CaptureDeviceParameterHandler.h"
+// Where captures go, and in what form.
+#include "tests/StageCorePluginVideoInput/Parameters/HandlerFixture.h"
 
 #include "Core/VideoInterface/Schemas.h"
 #include "tests/support/AssertionCapture.h"
-#include "tests/support/LogCapture.h"
-#include "tests/support/ParameterHandlerFixture.h"
 
 namespace
 {
@@ -12,9 +11,10 @@ using KVZ::IAudioPayload;
 using KVZ::IVideoContainer;
 using KVZ::IVideoPayload;
 using Labels = std::vector<std::string>;
+using VCaptureParameters = VHandlerFixture;
 
 // Whose list changes while it is being read.
-class VRestlessFolders : public TestSupport::VFakeCaptureTargets
+class VRestlessFolders : public VFakeCaptureTargets
 {
 public:
   void GetFolderAliases( std::vector<std::string>& o_rAliases ) override
@@ -30,22 +30,9 @@ private:
   bool m_bChanged = false;
 };
 
-class ParameterHandler : public TestSupport::VParameterHandlerFixture<VCaptureDeviceParameterHandler>
-{
-protected:
-  void Create( VCaptureDeviceParameterHandler::VContainers i_Containers = VCaptureDeviceParameterHandler::AllContainers() )
-  {
-    m_pHandler = KVZ::MakeShared<VCaptureDeviceParameterHandler>( m_pService, m_pStore, m_pRegistry, m_pFolders, m_Device, "vi:0", "Model",
-      std::move( i_Containers ) );
-    m_pService->RunAll();
-  }
-
-  std::shared_ptr<TestSupport::VFakeCaptureTargets> m_pFolders = std::make_shared<TestSupport::VFakeCaptureTargets>();
-};
-
 }
 
-TEST_F( ParameterHandler, AnUnknownKeyIsAnAssertion )
+TEST_F( VCaptureParameters, AnUnknownKeyIsAnAssertion )
 {
   Create();
   TestSupport::VAssertionCapture Assertions;
@@ -53,7 +40,7 @@ TEST_F( ParameterHandler, AnUnknownKeyIsAnAssertion )
   EXPECT_EQ( Assertions.Expressions(), Labels{ "pParameter" } );
 }
 
-TEST_F( ParameterHandler, PayloadsFollowTheContainer )
+TEST_F( VCaptureParameters, PayloadsFollowTheContainer )
 {
   Create();
   EXPECT_EQ( Value<IVideoContainer::Enum>( "VideoContainer" ), IVideoContainer::ETVID );
@@ -71,7 +58,7 @@ TEST_F( ParameterHandler, PayloadsFollowTheContainer )
   EXPECT_EQ( Value<IVideoPayload::Enum>( "VideoPayload" ), IVideoPayload::EImageJPEG ) << "still allowed, so it stays";
 }
 
-TEST_F( ParameterHandler, OnlyContainersThatCanBeWrittenAreOffered )
+TEST_F( VCaptureParameters, OnlyContainersThatCanBeWrittenAreOffered )
 {
   Save( DeviceSchemas::VideoContainer( m_Device ), IVideoContainer::EMKV );
   Create( { IVideoContainer::EMOV, IVideoContainer::EAVI } );
@@ -80,7 +67,7 @@ TEST_F( ParameterHandler, OnlyContainersThatCanBeWrittenAreOffered )
   EXPECT_FALSE( Set( "VideoContainer", IVideoContainer::ETVID ) );
 }
 
-TEST_F( ParameterHandler, AFolderThatHasGoneGivesWayToTheDefaultOne )
+TEST_F( VCaptureParameters, AFolderThatHasGoneGivesWayToTheDefaultOne )
 {
   const std::string Message = "Device vi:0 is using an invalid capture folder [ Fast Disk ], reverting to default capture folder.";
   TestSupport::VLogCapture Log( "Capture" );
@@ -92,7 +79,7 @@ TEST_F( ParameterHandler, AFolderThatHasGoneGivesWayToTheDefaultOne )
   EXPECT_TRUE( Set( "CaptureDirectory", std::string( "Fast Disk" ) ) );
   EXPECT_FALSE( Set( "CaptureDirectory", std::string( "Slow Disk" ) ) );
 
-  m_pFolders->SetAliases( { "Default", "None", "Other", "Other" } );
+  m_pTargets->SetAliases( { "Default", "None", "Other", "Other" } );
   m_pService->RunAll();
   EXPECT_EQ( Value<std::string>( "CaptureDirectory" ), "Default" );
   EXPECT_EQ( LabelsOf( "CaptureDirectory" ), ( Labels{ "None", "Default", "Other" } ) );
@@ -100,9 +87,9 @@ TEST_F( ParameterHandler, AFolderThatHasGoneGivesWayToTheDefaultOne )
   EXPECT_EQ( Log.Lines()[0].m_Level, 3 );
 }
 
-TEST_F( ParameterHandler, AFolderThatComesWhileTheyAreReadIsOffered )
+TEST_F( VCaptureParameters, AFolderThatComesWhileTheyAreReadIsOffered )
 {
-  m_pFolders = std::make_shared<VRestlessFolders>();
+  m_pTargets = std::make_shared<VRestlessFolders>();
   Create();
   EXPECT_EQ( LabelsOf( "CaptureDirectory" ), ( Labels{ "None", "Other" } ) );
 }
