@@ -111,6 +111,18 @@ protected:
     return Count;
   }
 
+  // A frame passes while the client is busy; the card's thread waits for it.
+  boost::thread PassOne()
+  {
+    const uint64_t Passed = Counters().m_FramesPassed;
+    boost::thread Card( [this] { EXPECT_TRUE( Control().Step( m_Card, 1 ) ); } );
+    while( Counters().m_FramesPassed == Passed )
+    {
+      boost::this_thread::yield();
+    }
+    return Card;
+  }
+
   // Names a buffer as drivers do.
   void Name( uint32_t i_Buffer )
   {

@@ -148,12 +148,7 @@ TEST_F( BluefishStream, ACardIsNotTakenOutUnderABusyClient )
   const auto First = CounterIn( 0, Mode576i );
   Sync();
   Event( R"({"do": "remove"})" );
-  const uint64_t Passed = Counters().m_FramesPassed;
-  boost::thread Card( [&] { EXPECT_TRUE( Control().Step( m_Card, 1 ) ); } );
-  while( Counters().m_FramesPassed == Passed )
-  {
-    boost::this_thread::yield();
-  }
+  boost::thread Card = PassOne();
   for( int Reading = 0; Reading < 20; ++Reading )
   {
     EXPECT_EQ( CounterIn( 1, Mode576i ), *First + 1 );
@@ -169,12 +164,7 @@ TEST_F( BluefishStream, ALossOfSignalWaitsUntilTheClientKnows )
   EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode576i );
   Event( R"({"do": "signal-loss", "frames": 1})" );
   Sync();
-  const uint64_t Passed = Counters().m_FramesPassed;
-  boost::thread Card( [&] { EXPECT_TRUE( Control().Step( m_Card, 1 ) ); } );
-  while( Counters().m_FramesPassed == Passed )
-  {
-    boost::this_thread::yield();
-  }
+  boost::thread Card = PassOne();
   EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), NoSignal );
   Card.join();
   EXPECT_EQ( m_Object.Query( Property::VideoInputSignalVideoMode ), Mode576i );

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "HardwareSupport/VideoInput/VideoInputHAL/VideoInputDevice.h"
+#include "tests/support/ManualPostalService.h"
 
 #include <map>
 #include <memory>
@@ -137,6 +138,26 @@ private:
   NotificationSystem::VMultiCallbackPostal<void()> m_PixelFormatsChanged;
   NotificationSystem::VMultiCallbackPostal<void()> m_StandardChanged;
   NotificationSystem::VMultiCallbackPostal<void()> m_TimecodeChanged;
+};
+
+// Announces on the caller's thread. The service of its own, which nothing runs here, must not come between it and the manager: devices of the first
+// driver have their places before the second begins.
+class VFakeVideoInputDriver : public VideoInputHAL::IVideoInputDriver
+{
+public:
+  VDeviceCallback& GetDeviceArrivedCallback() override { return m_DeviceArrived; }
+  void StartDiscovery() override
+  {
+    for( const auto& pDevice : m_OnDiscovery )
+    {
+      m_DeviceArrived( pDevice );
+    }
+  }
+
+  std::vector<std::shared_ptr<VideoInputHAL::IVideoInputDevice>> m_OnDiscovery;
+  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<VideoInputHAL::IVideoInputDevice> )> m_DeviceArrived{
+    std::make_shared<VManualPostalService>()
+  };
 };
 
 }

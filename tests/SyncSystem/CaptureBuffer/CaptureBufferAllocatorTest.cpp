@@ -44,28 +44,6 @@ TEST( CaptureBufferAllocator, LargestRequestFitsWhateverTheAlignment )
   EXPECT_EQ( Memory.m_Allocator.MaxAllocation(), 1024u - 64 - 16 );
 }
 
-TEST( CaptureBufferAllocator, PinnedBlockStaysUntilUnpinned )
-{
-  VMemory Memory( 2 );
-  void* pPinned = Memory.m_Allocator.Allocate( 600 );
-  void* pSecond = Memory.m_Allocator.Allocate( 600 );
-  Memory.m_Allocator.Pin( pPinned, true );
-  Memory.m_Allocator.Pin( pPinned, true );
-  EXPECT_TRUE( Memory.m_Allocator.IsPinned( pPinned ) );
-  EXPECT_FALSE( Memory.m_Allocator.IsPinned( pSecond ) );
-  Memory.m_Allocator.Pin( pPinned, false );
-  Memory.m_Allocator.Free( pPinned );
-  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 2u );
-  EXPECT_FALSE( Memory.m_Allocator.ReleaseIfUnpinned() );
-  Memory.m_Allocator.Pin( pPinned, false );
-  EXPECT_TRUE( Memory.m_Allocator.ReleaseIfUnpinned() );
-  EXPECT_FALSE( Memory.m_Allocator.ReleaseIfUnpinned() );
-  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 1u );
-  Memory.m_pClient->Free( pSecond );   // through any holder, and the current block goes back as well
-  EXPECT_EQ( Memory.m_pClient->GetHeldBlocks(), 0u );
-  EXPECT_EQ( Memory.m_Allocator.GetReleasedBlocks(), 2u );
-}
-
 TEST( CaptureBufferAllocator, LinkedAllocationsHaveOneLast )
 {
   VMemory Memory( 2 );

@@ -55,23 +55,12 @@ TEST_F( CaptureBuffer, ErrorsOfAClientAreTheCapturesUntilTheNextOne )
   EXPECT_TRUE( Read.m_Errors.empty() );
 }
 
-TEST_F( CaptureBuffer, PinnedFrameOutlivesItsSessionAndItsOwners )
+TEST_F( CaptureBuffer, PinnedFrameOutlivesItsOwners )
 {
   Add( 2 );
   VToken Token = At( 1 );
-  VRefCountedToken Pinned, Copy;
+  VRefCountedToken Pinned;
   ASSERT_TRUE( m_pBuffer->Read( Token, Pinned ) );
-  m_pBuffer->StartNewBufferSession();
-  Add( 60 );
-  std::vector<KVZ::VBufferSessionId> Sessions;
-  EXPECT_EQ( m_pBuffer->GetBufferSessions( Sessions ), 1u );
-  EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );
-  EXPECT_FALSE( m_pBuffer->Read( Token, Copy ) );   // it has left the buffer, whoever holds it
-  Copy = Pinned;
-  Pinned = Copy;
-  Copy.Clear();
-  Add( 60 );
-  EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );
   m_pBuffer.reset();
   m_Memory = TestSupport::VFrameMemory( 1, 1 );
   EXPECT_TRUE( NumberedPayload( Pinned.Frame() ).Holds( 1 ) );

@@ -35,7 +35,6 @@ struct VFakeFile
   KVZ::AudioFrameInfo m_Audio;
   KVZ::VTimingRecord m_Timing;
   KVZ::ITimecode m_Timecode;
-  KVZ::IVideoPayload::Enum m_VideoPayload{};
   KVZ::IAudioPayload::Enum m_AudioPayload{};
   std::string m_CaptureName;
   KVZ::VCameraHardwareRecord m_Camera;
@@ -66,14 +65,13 @@ public:
   }
   bool IsOpen() const override { return m_pFile && m_pFile->m_bOpen; }
   bool WriteHeader( const KVZ::VideoFrameInfo& i_rVideoInfo, const KVZ::AudioFrameInfo& i_rAudioInfo, const KVZ::VTimingRecord& i_rTiming,
-    const KVZ::ITimecode& i_rTimecode, const KVZ::VColourRecord&, const KVZ::IVideoAttributes& i_rAttributes, KVZ::IVideoPayload::Enum i_VideoPayload,
+    const KVZ::ITimecode& i_rTimecode, const KVZ::VColourRecord&, const KVZ::IVideoAttributes& i_rAttributes, KVZ::IVideoPayload::Enum,
     KVZ::IAudioPayload::Enum i_AudioPayload ) override
   {
     m_pFile->m_Video = i_rVideoInfo;
     m_pFile->m_Audio = i_rAudioInfo;
     m_pFile->m_Timing = i_rTiming;
     m_pFile->m_Timecode = i_rTimecode;
-    m_pFile->m_VideoPayload = i_VideoPayload;
     m_pFile->m_AudioPayload = i_AudioPayload;
     i_rAttributes.Get( "Capture.Name", m_pFile->m_CaptureName );
     m_pFile->m_Camera.ReadAttributes( i_rAttributes );

@@ -64,12 +64,6 @@ protected:
     m_pSource = m_Rig.Make<VTestTriggeredSource>( Options );
     m_pSource->OnRequestNewGlobalSyncSession().Set( [this]( KVZ::VGlobalSyncSessionId ) { ++m_Requests; } );
   }
-  template<class TFunction>
-  void OnStrand( TFunction i_Function )
-  {
-    m_pSource->PostToStrand( i_Function );
-    m_Rig.m_pStrand->RunAll();
-  }
 
   VVideoRig m_Rig;
   VHandTimer* m_pTimer = nullptr;
@@ -80,7 +74,7 @@ protected:
 TEST_F( TriggeredSource, RunsOnceItsFramesHaveStoppedForFiveSeconds )
 {
   EXPECT_FALSE( m_Rig.Deliver() ) << "nothing has been armed";
-  OnStrand( [this] { m_pSource->ArmGlobalSyncSession(); } );
+  m_Rig.OnStrand( *m_pSource, [this] { m_pSource->ArmGlobalSyncSession(); } );
   EXPECT_EQ( m_pSource->GetState(), VVideoInputDataSourceTriggered::Armed );
   for( int Count = 0; Count < 12; ++Count )
   {
@@ -120,7 +114,7 @@ TEST_F( TriggeredSource, OffersASessionOfItsOwnPeriod )
 {
   const TestSupport::VLogCapture Log( "Hal.vi:0" );
   boost::optional<KVZ::ISourceSyncSession> Session;
-  OnStrand( [&] { Session = m_pSource->DeclareGlobalSyncSession( KVZ::VGlobalSyncSessionId( 1 ), nullptr ); } );
+  m_Rig.OnStrand( *m_pSource, [&] { Session = m_pSource->DeclareGlobalSyncSession( KVZ::VGlobalSyncSessionId( 1 ), nullptr ); } );
   ASSERT_TRUE( Session );
   EXPECT_EQ( Session->m_Period, VTick( 2700000 ) );
   EXPECT_EQ( Session->m_BeatPeriod, VTick( 2700000 ) );

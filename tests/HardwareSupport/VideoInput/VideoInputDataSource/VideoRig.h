@@ -9,7 +9,6 @@
 #include "tests/support/FakeVideoInputDevice.h"
 #include "tests/support/FrameMemory.h"
 #include "tests/support/HandTime.h"
-#include "tests/support/ManualPostalService.h"
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
@@ -76,18 +75,6 @@ private:
   NotificationSystem::VMultiCallbackPostal<void()> m_Changed;
 };
 
-class VOneDeviceDriver : public VideoInputHAL::IVideoInputDriver
-{
-public:
-  explicit VOneDeviceDriver( std::shared_ptr<VideoInputHAL::IVideoInputDevice> i_pDevice ) : m_pDevice( std::move( i_pDevice ) ) {}
-  VDeviceCallback& GetDeviceArrivedCallback() override { return m_Arrived; }
-  void StartDiscovery() override { m_Arrived( m_pDevice ); }
-
-private:
-  const std::shared_ptr<VideoInputHAL::IVideoInputDevice> m_pDevice;
-  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<VideoInputHAL::IVideoInputDevice> )> m_Arrived;
-};
-
 class VTestVideoSource : public VVideoInputDataSource
 {
 public:
@@ -117,8 +104,10 @@ public:
     std::shared_ptr<VideoInputHAL::IVideoInputDevice> i_pDevice = nullptr )
   {
     const auto pDevice = i_pDevice ? i_pDevice : m_pDevice;
+    const auto pDriver = std::make_shared<TestSupport::VFakeVideoInputDriver>();
+    pDriver->m_OnDiscovery = { pDevice };
     m_pManager = KVZ::MakeShared<VideoInputHAL::VVideoInputDeviceManager>(
-      std::vector<VideoInputHAL::VDriverMaker>{ [pDevice] { return std::make_shared<VOneDeviceDriver>( pDevice ); } } );
+      std::vector<VideoInputHAL::VDriverMaker>{ [pDriver] { return pDriver; } } );
     m_pManager->StartDiscovery();
     m_pFrames = std::make_shared<VideoInputHAL::VVideoInputDataSourceAllocator>( m_Memory.m_pAllocator );
     auto pFactory = std::make_shared<KVZ::VVideoWriterFactory>();
@@ -190,8 +179,8 @@ public:
     }
   }
 
-  template<class TFunction>
-  void OnStrand( VTestVideoSource& i_rSource, TFunction i_Function )
+  template<class TSource, class TFunction>
+  void OnStrand( TSource& i_rSource, TFunction i_Function )
   {
     i_rSource.PostToStrand( i_Function );
     m_pStrand->RunAll();

@@ -2,7 +2,6 @@
 
 #include "tests/support/FakeVideoInputDevice.h"
 #include "tests/support/LogCapture.h"
-#include "tests/support/ManualPostalService.h"
 
 #include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
@@ -14,33 +13,14 @@ namespace
 
 using namespace VideoInputHAL;
 using TestSupport::VFakeVideoInputDevice;
+using TestSupport::VFakeVideoInputDriver;
 using VDevices = std::vector<std::shared_ptr<IVideoInputDevice>>;
-
-// Announces on the caller's thread. The service of its own, which nothing runs here, must not come between it and the manager: devices of the first
-// driver have their places before the second begins.
-class VPlainDriver : public IVideoInputDriver
-{
-public:
-  VDeviceCallback& GetDeviceArrivedCallback() override { return m_DeviceArrived; }
-  void StartDiscovery() override
-  {
-    for( const auto& pDevice : m_OnDiscovery )
-    {
-      m_DeviceArrived( pDevice );
-    }
-  }
-
-  VDevices m_OnDiscovery;
-  NotificationSystem::VMultiCallbackPostal<void( std::shared_ptr<IVideoInputDevice> )> m_DeviceArrived{
-    std::make_shared<TestSupport::VManualPostalService>()
-  };
-};
 
 class VideoInputDeviceManager : public ::testing::Test
 {
 protected:
-  std::shared_ptr<VPlainDriver> m_pFirst = std::make_shared<VPlainDriver>();
-  std::shared_ptr<VPlainDriver> m_pSecond = std::make_shared<VPlainDriver>();
+  std::shared_ptr<VFakeVideoInputDriver> m_pFirst = std::make_shared<VFakeVideoInputDriver>();
+  std::shared_ptr<VFakeVideoInputDriver> m_pSecond = std::make_shared<VFakeVideoInputDriver>();
   std::shared_ptr<VVideoInputDeviceManager> m_pManager = KVZ::MakeShared<VVideoInputDeviceManager>(
     std::vector<VDriverMaker>{ [this] { return m_pFirst; }, [this] { return m_pSecond; } } );
   std::shared_ptr<TestSupport::VManualPostalService> m_pListenerService = std::make_shared<TestSupport::VManualPostalService>();
@@ -139,7 +119,7 @@ TEST_F( VideoInputDeviceManager, AnArrivalAfterTheManagersEndDoesNothing )
 TEST_F( VideoInputDeviceManager, ArrivalsOnSeveralThreadsWhileOthersReadGetIndicesOfTheirOwn )
 {
   constexpr int PerDriver = 100;
-  const auto Announce = []( VPlainDriver& i_rDriver )
+  const auto Announce = []( VFakeVideoInputDriver& i_rDriver )
   {
     for( int Count = 0; Count < PerDriver; ++Count )
     {
