@@ -1,8 +1,7 @@
 // The wrappers' words for every result, and the three checked calls around them.
-#include "Flow2/Flow2Utils/FlowNode.h"
-
 #include "Flow2/Flow2Utils/FlowException.h"
 #include "tests/support/FakeFlowServices.h"
+#include "tests/support/FunctionNode.h"
 #include "tests/support/LogCapture.h"
 
 #include <gtest/gtest.h>
@@ -17,57 +16,30 @@ using Flow2Utils::VFlowFinishedException;
 using KVZ::EFlowResult;
 using KVZ::VFlowLimit;
 using TestSupport::VFakeFlowServices;
+using TestSupport::VFunctionNode;
 
-// Runs what the test puts in.
-class VScriptedNode : public Flow2Utils::VFlowNode<VScriptedNode>
-{
-public:
-  using VScript = std::function<void( VScriptedNode& )>;
-
-  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Scripted", "Runs a function", { "In" }, { "Out" } }; }
-
-  VScript m_PreProcess = []( VScriptedNode& ) {};
-  VScript m_Process = m_PreProcess;
-  VScript m_PostProcess = m_PreProcess;
-
-  // Where the wrappers put what they bring
-  KVZ::VFlowStatePtr m_pState;
-  uint32_t m_Index = 0;
-  KVZ::VFlowSelection m_Selection;
-  KVZ::VFlowItemList m_Items;
-
-protected:
-  uint32_t PreProcess() override
-  {
-    m_PreProcess( *this );
-    return EFlowResult::Ok;
-  }
-  void Process() override { m_Process( *this ); }
-  void PostProcess() override { m_PostProcess( *this ); }
-};
-
-bool Read( VScriptedNode& i_rNode ) { return i_rNode.Read( 7, VFlowLimit::Zero(), i_rNode.m_pState ); }
-bool ReadOneOf( VScriptedNode& i_rNode ) { return i_rNode.ReadOneOf( { 0 }, VFlowLimit::Zero(), i_rNode.m_Index, i_rNode.m_pState ); }
-bool Write( VScriptedNode& i_rNode ) { return i_rNode.Write( 0, nullptr, VFlowLimit::Zero() ); }
-bool Select( VScriptedNode& i_rNode ) { return i_rNode.Select( { 0 }, { 0 }, VFlowLimit::Zero(), i_rNode.m_Selection ); }
-bool Sleep( VScriptedNode& i_rNode )
+bool Read( VFunctionNode& i_rNode ) { return i_rNode.Read( 7, VFlowLimit::Zero(), i_rNode.m_pState ); }
+bool ReadOneOf( VFunctionNode& i_rNode ) { return i_rNode.ReadOneOf( { 0 }, VFlowLimit::Zero(), i_rNode.m_Index, i_rNode.m_pState ); }
+bool Write( VFunctionNode& i_rNode ) { return i_rNode.Write( 0, nullptr, VFlowLimit::Zero() ); }
+bool Select( VFunctionNode& i_rNode ) { return i_rNode.Select( { 0 }, { 0 }, VFlowLimit::Zero(), i_rNode.m_Selection ); }
+bool Sleep( VFunctionNode& i_rNode )
 {
   i_rNode.Sleep( VFlowLimit::Zero() );
   return false;
 }
-bool DoBlockingCall( VScriptedNode& i_rNode )
+bool DoBlockingCall( VFunctionNode& i_rNode )
 {
   return i_rNode.DoBlockingCall( []( uint64_t ) { return 0u; }, VFlowLimit::Zero() );
 }
-bool GlobalItems( VScriptedNode& i_rNode ) { return i_rNode.GlobalItems( VFlowLimit::Zero(), i_rNode.m_Items ); }
-bool WaitInputConnected( VScriptedNode& i_rNode ) { return i_rNode.WaitInputConnected( 3, VFlowLimit::Zero() ); }
-bool WaitOutputConnected( VScriptedNode& i_rNode ) { return i_rNode.WaitOutputConnected( 4, VFlowLimit::Zero() ); }
+bool GlobalItems( VFunctionNode& i_rNode ) { return i_rNode.GlobalItems( VFlowLimit::Zero(), i_rNode.m_Items ); }
+bool WaitInputConnected( VFunctionNode& i_rNode ) { return i_rNode.WaitInputConnected( 3, VFlowLimit::Zero() ); }
+bool WaitOutputConnected( VFunctionNode& i_rNode ) { return i_rNode.WaitOutputConnected( 4, VFlowLimit::Zero() ); }
 
 // All say "Detected that node is stopping", and "Unexpected Error" of what they have no words for.
 constexpr struct VWrapper
 {
   const char* m_pName;
-  bool ( *m_pCall )( VScriptedNode& );
+  bool ( *m_pCall )( VFunctionNode& );
   const char* m_pEndOfData;
   const char* m_pUnknown;
 } Wrappers[] = {
@@ -111,16 +83,16 @@ class FlowNode : public ::testing::Test
 {
 protected:
   // Runs the call inside Process, where the services are installed, and gives what it threw.
-  VThrown ThrownBy( const VScriptedNode::VScript& i_rCall )
+  VThrown ThrownBy( const VFunctionNode::VFunction& i_rCall )
   {
     VThrown Thrown;
-    m_Node.m_Process = [&]( VScriptedNode& i_rNode ) { Thrown = Catch( [&] { i_rCall( i_rNode ); } ); };
+    m_Node.m_Process = [&]( VFunctionNode& i_rNode ) { Thrown = Catch( [&] { i_rCall( i_rNode ); } ); };
     EXPECT_EQ( m_Node.PreProcessChecked( m_pServices ), EFlowResult::Ok );
     EXPECT_EQ( m_Node.ProcessChecked(), EFlowResult::Ok );
     EXPECT_EQ( m_Node.PostProcessChecked(), EFlowResult::Ok );
     return Thrown;
   }
-  std::string TextOf( uint32_t i_Answer, const VScriptedNode::VScript& i_rCall )
+  std::string TextOf( uint32_t i_Answer, const VFunctionNode::VFunction& i_rCall )
   {
     m_pServices->m_Answer = i_Answer;
     return ThrownBy( i_rCall ).m_Text;
@@ -133,7 +105,7 @@ protected:
     EXPECT_EQ( Thrown.m_bFinished, i_bFinished && i_pText );
   }
 
-  VScriptedNode m_Node;
+  VFunctionNode m_Node;
   const std::shared_ptr<VFakeFlowServices> m_pServices = std::make_shared<VFakeFlowServices>();
 };
 
@@ -147,7 +119,7 @@ TEST_F( FlowNode, EveryWrapperHasItsWordsForEveryResult )
     Expect( rCase, EFlowResult::UnknownPort, rCase.m_pUnknown, false );
     Expect( rCase, 0x80004005u, nullptr, false );
     bool bAnswer = true;
-    EXPECT_EQ( TextOf( EFlowResult::WouldBlock, [&]( VScriptedNode& i_rNode ) { bAnswer = rCase.m_pCall( i_rNode ); } ), "" )
+    EXPECT_EQ( TextOf( EFlowResult::WouldBlock, [&]( VFunctionNode& i_rNode ) { bAnswer = rCase.m_pCall( i_rNode ); } ), "" )
       << "a timeout is no exception";
     EXPECT_FALSE( bAnswer );
   }
@@ -159,8 +131,8 @@ TEST_F( FlowNode, WrappersWithResultsOfTheirOwn )
   EXPECT_EQ( TextOf( EFlowResult::Failed, &Write ), "Write: Failed" );
   EXPECT_EQ( TextOf( EFlowResult::NotConnected, &Select ), "Select: NotConnected" );
   EXPECT_EQ( TextOf( EFlowResult::Failed, &Select ), "Select: Failed" );
-  const auto Input = []( VScriptedNode& i_rNode ) { i_rNode.InputIndex( "Left" ); };
-  const auto Output = []( VScriptedNode& i_rNode ) { i_rNode.OutputIndex( "Right" ); };
+  const auto Input = []( VFunctionNode& i_rNode ) { i_rNode.InputIndex( "Left" ); };
+  const auto Output = []( VFunctionNode& i_rNode ) { i_rNode.OutputIndex( "Right" ); };
   EXPECT_EQ( TextOf( EFlowResult::UnknownName, Input ), "InputIndex: Unknown input name Left" );
   EXPECT_EQ( TextOf( EFlowResult::UnknownName, Output ), "OutputIndex: Unknown output name Right" );
   for( const uint32_t Answer : { EFlowResult::Failed, EFlowResult::WouldBlock } )   // no index came, so there is none to go on with
@@ -168,14 +140,14 @@ TEST_F( FlowNode, WrappersWithResultsOfTheirOwn )
     EXPECT_EQ( TextOf( Answer, Input ), "InputIndex: Unknown error" );
     EXPECT_EQ( TextOf( Answer, Output ), "OutputIndex: Unknown error" );
   }
-  const auto Item = []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowAudioFrame", "Label" ); };
-  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateItem( "FlowSmell", "Label" ); } ),
+  const auto Item = []( VFunctionNode& i_rNode ) { i_rNode.CreateItem( "FlowAudioFrame", "Label" ); };
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VFunctionNode& i_rNode ) { i_rNode.CreateItem( "FlowSmell", "Label" ); } ),
     "CreateItem: Unknown item type FlowSmell" );
   EXPECT_EQ( TextOf( EFlowResult::Failed, Item ), "CreateItem: Unknown error" );
   m_pServices->m_bNoMemory = true;
   EXPECT_EQ( TextOf( EFlowResult::Ok, Item ), "CreateItem: Could not allocate item FlowAudioFrame" );
-  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateState(); } ), "CreateState: failed to create state" );
-  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VScriptedNode& i_rNode ) { i_rNode.CreateSharedUserBuffer( 10 ); } ),
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VFunctionNode& i_rNode ) { i_rNode.CreateState(); } ), "CreateState: failed to create state" );
+  EXPECT_EQ( TextOf( EFlowResult::Ok, []( VFunctionNode& i_rNode ) { i_rNode.CreateSharedUserBuffer( 10 ); } ),
     "CreateSharedUserBuffer: failed to create buffer" );
   m_pServices->m_bBlockingCalls = false;
   EXPECT_EQ( TextOf( EFlowResult::Ok, &DoBlockingCall ), "VFlowNodeUtils: Non blocking node services are not supported" );
@@ -191,12 +163,12 @@ TEST_F( FlowNode, HasServicesOnlyWhileItRuns )
   }
   EXPECT_EQ( Catch( [&] { m_Node.CreateState(); } ).m_Text, NotInstalled );
   int Calls = 0;
-  m_Node.m_PreProcess = m_Node.m_PostProcess = [&]( VScriptedNode& i_rNode )
+  m_Node.m_PreProcess = m_Node.m_PostProcess = [&]( VFunctionNode& i_rNode )
   {
     ++Calls;
     EXPECT_NE( i_rNode.CreateState(), nullptr );
   };
-  EXPECT_EQ( ThrownBy( []( VScriptedNode& i_rNode ) { i_rNode.CreateState(); } ).m_Text, "" );
+  EXPECT_EQ( ThrownBy( []( VFunctionNode& i_rNode ) { i_rNode.CreateState(); } ).m_Text, "" );
   EXPECT_EQ( Calls, 2 );
   EXPECT_EQ( Catch( [&] { m_Node.CreateState(); } ).m_Text, NotInstalled );
   EXPECT_EQ( m_pServices.use_count(), 1 ) << "a node that has ended keeps its services";
@@ -219,7 +191,7 @@ TEST_F( FlowNode, EndsCleanlyOnAStopAndTheEndOfData )
 TEST_F( FlowNode, OtherExceptionsPassOutAndLeaveNoServices )
 {
   m_Node.m_Process = &Read;
-  m_Node.m_PostProcess = []( VScriptedNode& ) { throw std::runtime_error( "broken" ); };
+  m_Node.m_PostProcess = []( VFunctionNode& ) { throw std::runtime_error( "broken" ); };
   EXPECT_EQ( m_Node.PreProcessChecked( m_pServices ), EFlowResult::Ok );
   m_pServices->m_Answer = EFlowResult::UnknownPort;
   EXPECT_THROW( m_Node.ProcessChecked(), VFlowException );
@@ -230,7 +202,7 @@ TEST_F( FlowNode, OtherExceptionsPassOutAndLeaveNoServices )
 TEST_F( FlowNode, FetchesTheOneItemOfAType )
 {
   const VThrown Thrown = ThrownBy(
-    []( VScriptedNode& i_rNode )
+    []( VFunctionNode& i_rNode )
     {
       const KVZ::VFlowStatePtr pState = i_rNode.CreateState();
       EXPECT_EQ( i_rNode.ItemOf<KVZ::VFlowGenericData>( *pState ), nullptr );

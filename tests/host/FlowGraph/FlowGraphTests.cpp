@@ -213,7 +213,7 @@ TEST_F( FlowGraph, TheEndOfDataRunsThroughTheGraph )
       i_rNode.Select( { 0, 1 }, {}, VFlowLimit::None(), i_rNode.m_Selection );
       EXPECT_TRUE( i_rNode.m_Selection.m_bInput );
       EXPECT_EQ( i_rNode.m_Selection.m_Index, 1u );
-      i_rNode.ReadOneOf( { 1 }, VFlowLimit::None(), i_rNode.m_Input, i_rNode.m_pState );
+      i_rNode.ReadOneOf( { 1 }, VFlowLimit::None(), i_rNode.m_Index, i_rNode.m_pState );
       i_rNode.Select( {}, { 0, 1 }, VFlowLimit::None(), i_rNode.m_Selection );
       EXPECT_FALSE( i_rNode.m_Selection.m_bInput );
       EXPECT_EQ( i_rNode.m_Selection.m_Index, 0u );
@@ -237,6 +237,8 @@ TEST_F( FlowGraph, AnExceptionEndsTheWholeRunWithItsText )
 {
   const VFlowNodeId Other = AddFunction( []( VFunctionNode& i_rNode ) { i_rNode.Sleep( VFlowLimit::None() ); } );
   const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& i_rNode ) { i_rNode.WaitInputConnected( 17, VFlowLimit::None() ); } );
+  int Ends = 0;
+  pFaulty->m_PostProcess = [&Ends]( VFunctionNode& ) { ++Ends; };
   const VFlowNodeId Faulty = Add( pFaulty );
   m_Graph.Start();
   WaitForState( Faulty, EFlowNodeState::Failed );
@@ -244,19 +246,22 @@ TEST_F( FlowGraph, AnExceptionEndsTheWholeRunWithItsText )
   WaitForState( m_Source, EFlowNodeState::Idle );
   EXPECT_EQ( m_Graph.GetFailure(), "WaitInputConnected: Unknown input - index = 17" );
   EXPECT_EQ( m_Graph.GetStatus( Faulty ).m_Failure, m_Graph.GetFailure() );
-  EXPECT_EQ( pFaulty->Ends(), 1 ) << "what it has set up stays";
+  EXPECT_EQ( Ends, 1 ) << "what it has set up stays";
 }
 
 TEST_F( FlowGraph, ANodeThatCannotBeStartedLeavesTheOthersAlone )
 {
-  const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& ) { ADD_FAILURE() << "runs"; }, EFlowResult::Failed );
+  const auto pFaulty = std::make_shared<VFunctionNode>( []( VFunctionNode& ) { ADD_FAILURE() << "runs"; } );
+  int Ends = 0;
+  pFaulty->m_Start = EFlowResult::Failed;
+  pFaulty->m_PostProcess = [&Ends]( VFunctionNode& ) { ++Ends; };
   const VFlowNodeId Faulty = Add( pFaulty );
   const auto [pCollector, Collector] = AddConsumer();
   m_Graph.Start();
   WaitForState( Faulty, EFlowNodeState::Failed );
   m_pSource->Allow( 1 );
   pCollector->WaitFor( 1 );
-  EXPECT_EQ( pFaulty->Ends(), 1 ) << "what it has set up stays";
+  EXPECT_EQ( Ends, 1 ) << "what it has set up stays";
   EXPECT_EQ( m_Graph.GetFailure(), "" );
 }
 
@@ -292,7 +297,7 @@ TEST_F( FlowGraph, StopsFromEveryWait )
   const VFunctionNode::VFunction Waits[] = {
     []( VFunctionNode& r ) { r.Read( 0, VFlowLimit::None(), r.m_pState ); },
     []( VFunctionNode& r ) {
-      r.ReadOneOf( { 0, 1 }, VFlowLimit::None(), r.m_Input, r.m_pState );
+      r.ReadOneOf( { 0, 1 }, VFlowLimit::None(), r.m_Index, r.m_pState );
     },
     []( VFunctionNode& r ) { r.Write( 0, MakeNumber( r, 1 ), VFlowLimit::None() ); },   // until its own queue is full
     []( VFunctionNode& r ) { r.Select( { 0 }, { 1 }, VFlowLimit::None(), r.m_Selection ); },

@@ -2,15 +2,14 @@
 #pragma once
 
 #include "Flow2/Flow2Utils/FlowException.h"
-#include "Flow2/Flow2Utils/FlowNode.h"
 #include "StageCoreRuntime/ThreadAnnotations.h"
 #include "host/FlowGraph.h"
+#include "tests/support/FunctionNode.h"
 
 #include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
 
-#include <atomic>
 #include <functional>
 #include <memory>
 #include <vector>
@@ -20,6 +19,7 @@ using KVZ::VFlowLimit;
 using StageHost::EFlowNodeState;
 using StageHost::VFlowNodeId;
 using StageHost::VFlowNodeStatus;
+using TestSupport::VFunctionNode;
 
 template<class TNode>
 KVZ::VFlowStatePtr MakeNumber( TNode& io_rNode, double i_Number )
@@ -30,36 +30,6 @@ KVZ::VFlowStatePtr MakeNumber( TNode& io_rNode, double i_Number )
   pState->AddItem( pItem );
   return pState;
 }
-
-// Runs the test's function round after round. Two inputs, two outputs.
-class VFunctionNode : public Flow2Utils::VFlowNode<VFunctionNode>
-{
-public:
-  using VFunction = std::function<void( VFunctionNode& )>;
-
-  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Function", "Runs a function", { "Left", "Right" }, { "Upper", "Lower" } }; }
-
-  explicit VFunctionNode( VFunction i_Process, uint32_t i_Start = EFlowResult::Ok ) : m_Process( std::move( i_Process ) ), m_Start( i_Start ) {}
-
-  // How often it has been run to its end. Any thread.
-  int Ends() const { return m_Ends; }
-
-  // Where the function may put what services bring
-  KVZ::VFlowStatePtr m_pState;
-  uint32_t m_Input = 0;
-  KVZ::VFlowSelection m_Selection;
-  KVZ::VFlowItemList m_Items;
-
-protected:
-  uint32_t PreProcess() override { return m_Start; }
-  void Process() override { m_Process( *this ); }
-  void PostProcess() override { ++m_Ends; }
-
-private:
-  const VFunction m_Process;
-  const uint32_t m_Start;
-  std::atomic<int> m_Ends{ 0 };
-};
 
 // Writes numbers from the first on to its output, as many as it has been allowed to, and sleeps in between.
 class VCountingNode : public Flow2Utils::VFlowNode<VCountingNode>
