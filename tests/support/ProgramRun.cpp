@@ -8,10 +8,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <chrono>
+#include <cerrno>
 #include <csignal>
 #include <cstdlib>
 #include <stdexcept>
+#include <utility>
 
 namespace TestSupport
 {
@@ -19,81 +20,41 @@ namespace TestSupport
 namespace
 {
 
-struct VPipe
+std::chrono::steady_clock::time_point DeadlineIn( double i_Seconds )
 {
-  VPipe()
-  {
-    if( pipe2( m_Ends, O_CLOEXEC ) != 0 )
-    {
-      throw std::runtime_error( "no pipe" );
-    }
-  }
-  ~VPipe()
-  {
-    CloseEnd( 0 );
-    CloseEnd( 1 );
-  }
-  void CloseEnd( int i_End )
-  {
-    if( m_Ends[i_End] >= 0 )
-    {
-      close( m_Ends[i_End] );
-      m_Ends[i_End] = -1;
-    }
-  }
+  return std::chrono::steady_clock::now() +
+    std::chrono::duration_cast<std::chrono::steady_clock::duration>( std::chrono::duration<double>( i_Seconds ) );
+}
 
-  int m_Ends[2];
-};
+// The end to write into; the other one is set.
+int MakePipe( int& o_rReadEnd )
+{
+  int Ends[2] = { -1, -1 };
+  if( pipe2( Ends, O_CLOEXEC ) != 0 )
+  {
+    throw std::runtime_error( "no pipe" );
+  }
+  o_rReadEnd = Ends[0];
+  return Ends[1];
+}
 
-// True while the end is open.
-bool Drain( int i_End, std::string& io_rText )
+// Closes at its end.
+void Drain( int& io_rEnd, std::string& io_rText )
 {
   char Bytes[65536];
-  const ssize_t Count = read( i_End, Bytes, sizeof( Bytes ) );
+  const ssize_t Count = read( io_rEnd, Bytes, sizeof( Bytes ) );
   if( Count > 0 )
   {
     io_rText.append( Bytes, static_cast<size_t>( Count ) );
   }
-  return Count > 0 || ( Count < 0 && errno == EINTR );
-}
-
-void Collect( pid_t i_Child, VPipe& i_rOutput, VPipe& i_rError, const VRunOptions& i_rOptions, VRunResult& o_rResult )
-{
-  const auto Deadline = std::chrono::steady_clock::now() + std::chrono::duration<double>( i_rOptions.m_Seconds );
-  while( i_rOutput.m_Ends[0] >= 0 || i_rError.m_Ends[0] >= 0 )
+  else if( Count == 0 || errno != EINTR )
   {
-    pollfd Ends[2] = { { i_rOutput.m_Ends[0], POLLIN, 0 }, { i_rError.m_Ends[0], POLLIN, 0 } };
-    const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( Deadline - std::chrono::steady_clock::now() ).count();
-    if( Left <= 0 && !o_rResult.m_bTimedOut )
-    {
-      o_rResult.m_bTimedOut = true;
-      kill( i_Child, SIGKILL );
-    }
-    poll( Ends, 2, Left > 0 ? static_cast<int>( Left ) : 1000 );
-    if( Ends[0].revents != 0 && !Drain( i_rOutput.m_Ends[0], o_rResult.m_Output ) )
-    {
-      i_rOutput.CloseEnd( 0 );
-    }
-    if( Ends[1].revents != 0 )
-    {
-      if( !Drain( i_rError.m_Ends[0], o_rResult.m_Error ) )
-      {
-        i_rError.CloseEnd( 0 );
-      }
-      i_rOptions.m_OnErrorText( i_Child, o_rResult.m_Error );
-    }
+    close( std::exchange( io_rEnd, -1 ) );
   }
 }
 
-}
-
-pid_t StartProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions, int i_Output, int i_Error )
+[[noreturn]] void Become( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions, int i_Output, int i_Error )
 {
-  const pid_t Child = fork();
-  if( Child != 0 )
-  {
-    return Child;
-  }
   dup2( open( "/dev/null", O_RDONLY ), STDIN_FILENO );
   dup2( i_Output, STDOUT_FILENO );
   dup2( i_Error, STDERR_FILENO );
@@ -117,29 +78,98 @@ pid_t StartProgram( const std::vector<std::string>& i_rArguments, const VRunOpti
   _exit( 127 );
 }
 
-void WaitForProgram( pid_t i_Child, VRunResult& o_rResult )
+}
+
+VProgram::VProgram( const std::vector<std::string>& i_rArguments, VRunOptions i_Options ) : m_Options( std::move( i_Options ) )
+{
+  const int Output = MakePipe( m_Output );
+  const int Error = MakePipe( m_Error );
+  m_Child = fork();
+  if( m_Child == 0 )
+  {
+    Become( i_rArguments, m_Options, Output, Error );
+  }
+  close( Output );
+  close( Error );
+}
+
+VProgram::~VProgram()
+{
+  close( m_Output );
+  close( m_Error );
+  if( m_Child > 0 )
+  {
+    kill( m_Child, SIGKILL );
+    Wait();
+  }
+}
+
+bool VProgram::ReadMore( std::chrono::steady_clock::time_point i_Deadline )
+{
+  const auto Left = std::chrono::duration_cast<std::chrono::milliseconds>( i_Deadline - std::chrono::steady_clock::now() ).count();
+  pollfd Ends[2] = { { m_Output, POLLIN, 0 }, { m_Error, POLLIN, 0 } };
+  if( !IsOpen() || Left <= 0 || poll( Ends, 2, static_cast<int>( Left ) ) == 0 )
+  {
+    return false;
+  }
+  if( Ends[0].revents != 0 )
+  {
+    Drain( m_Output, m_Result.m_Output );
+  }
+  if( Ends[1].revents != 0 )
+  {
+    Drain( m_Error, m_Result.m_Error );
+    m_Options.m_OnErrorText( m_Child, m_Result.m_Error );
+  }
+  return true;
+}
+
+bool VProgram::WaitFor( const std::string& i_rText, double i_Seconds )
+{
+  const auto Deadline = DeadlineIn( i_Seconds );
+  while( m_Result.m_Output.find( i_rText ) == std::string::npos && m_Result.m_Error.find( i_rText ) == std::string::npos )
+  {
+    if( !ReadMore( Deadline ) )
+    {
+      return false;
+    }
+  }
+  return true;
+}
+
+void VProgram::Interrupt() const { kill( m_Child, SIGINT ); }
+
+const VRunResult& VProgram::WaitForEnd( double i_Seconds )
+{
+  const auto Deadline = DeadlineIn( i_Seconds );
+  while( ReadMore( Deadline ) )
+  {
+  }
+  m_Result.m_bTimedOut = IsOpen();
+  if( m_Result.m_bTimedOut )
+  {
+    kill( m_Child, SIGKILL );
+  }
+  Wait();
+  return m_Result;
+}
+
+void VProgram::Wait()
 {
   int Status = 0;
   rusage Usage = {};
-  while( wait4( i_Child, &Status, 0, &Usage ) < 0 && errno == EINTR )
+  while( wait4( m_Child, &Status, 0, &Usage ) < 0 && errno == EINTR )
   {
   }
-  o_rResult.m_ExitCode = WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
-  o_rResult.m_Signal = WIFSIGNALED( Status ) ? WTERMSIG( Status ) : 0;
-  o_rResult.m_PeakResidentKiB = Usage.ru_maxrss;
+  m_Child = -1;
+  m_Result.m_ExitCode = WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
+  m_Result.m_Signal = WIFSIGNALED( Status ) ? WTERMSIG( Status ) : 0;
+  m_Result.m_PeakResidentKiB = Usage.ru_maxrss;
 }
 
 VRunResult RunProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions )
 {
-  VPipe Output;
-  VPipe Error;
-  const pid_t Child = StartProgram( i_rArguments, i_rOptions, Output.m_Ends[1], Error.m_Ends[1] );
-  Output.CloseEnd( 1 );
-  Error.CloseEnd( 1 );
-  VRunResult Result;
-  Collect( Child, Output, Error, i_rOptions, Result );
-  WaitForProgram( Child, Result );
-  return Result;
+  return VProgram( i_rArguments, i_rOptions ).WaitForEnd( i_rOptions.m_Seconds );
 }
 
 VRunResult RunStageHost( std::vector<std::string> i_Arguments, const VRunOptions& i_rOptions )

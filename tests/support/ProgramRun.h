@@ -5,6 +5,7 @@
 
 #include <sys/types.h>
 
+#include <chrono>
 #include <cstdint>
 #include <functional>
 #include <string>
@@ -32,12 +33,40 @@ struct VRunResult
   int64_t m_PeakResidentKiB = 0;
 };
 
-// Starts a program with its environment and limit; what it prints goes to these descriptors.
-pid_t StartProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions, int i_Output, int i_Error );
-// Waits for its end, and sets how it ended.
-void WaitForProgram( pid_t i_Child, VRunResult& o_rResult );
+// A program that runs beside the test, until the test lets go of it.
+class VProgram
+{
+public:
+  // The first argument is the program: a path, or a name that is looked up. Throws where there are no pipes.
+  explicit VProgram( const std::vector<std::string>& i_rArguments, VRunOptions i_Options = {} );
+  // Ends it and waits for its end.
+  ~VProgram();
+  VProgram( const VProgram& ) = delete;
+  VProgram& operator=( const VProgram& ) = delete;
 
-// The first argument is the program: a path, or a name that is looked up.
+  // Until it has printed this text. False when it ends or so many seconds pass before that.
+  bool WaitFor( const std::string& i_rText, double i_Seconds );
+  // Sends INT.
+  void Interrupt() const;
+  // Until it has ended and everything that it printed is here. Killed when so many seconds pass before that.
+  const VRunResult& WaitForEnd( double i_Seconds );
+  // So far; how it ended is not known before WaitForEnd.
+  const VRunResult& Result() const { return m_Result; }
+  std::string Printed() const { return m_Result.m_Output + m_Result.m_Error; }
+
+private:
+  bool IsOpen() const { return m_Output >= 0 || m_Error >= 0; }
+  // False at the end of all output or at the deadline.
+  bool ReadMore( std::chrono::steady_clock::time_point i_Deadline );
+  void Wait();
+
+  const VRunOptions m_Options;
+  VRunResult m_Result;
+  pid_t m_Child = -1;
+  int m_Output = -1;
+  int m_Error = -1;
+};
+
 VRunResult RunProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions = {} );
 
 // The same with stagehost. Unless the environment says where settings are kept, the run keeps its own in a folder that goes with it.

@@ -41,11 +41,8 @@ struct VImage
 // Holds every value of a channel.
 VImage MakeImage( IPixelFormat::Enum i_Format, uint32_t i_Width, uint32_t i_Height, uint32_t i_Seed = 1 )
 {
-  VImage Image;
-  Image.m_Info.m_ImageWidth = i_Width;
-  Image.m_Info.m_ImageHeight = i_Height;
-  Image.m_Info.m_PixelFormat = i_Format;
-  Image.m_Pixels.resize( KVZ::GetImageSize( i_Format, i_Width, i_Height ) );
+  VImage Image{ { .m_ImageWidth = i_Width, .m_ImageHeight = i_Height, .m_PixelFormat = i_Format },
+    VByteVector( KVZ::GetImageSize( i_Format, i_Width, i_Height ) ) };
   std::mt19937 Random( i_Seed );
   for( size_t Index = 0; Index < Image.m_Pixels.size(); ++Index )
   {

@@ -49,14 +49,7 @@ protected:
   int* m_pImageType = nullptr;
 };
 
-KVZ::VideoFrameInfo Info( IPixelFormat::Enum i_Format )
-{
-  KVZ::VideoFrameInfo Result;
-  Result.m_ImageWidth = 2;
-  Result.m_ImageHeight = 1;
-  Result.m_PixelFormat = i_Format;
-  return Result;
-}
+KVZ::VideoFrameInfo Info( IPixelFormat::Enum i_Format ) { return { .m_ImageWidth = 2, .m_ImageHeight = 1, .m_PixelFormat = i_Format }; }
 
 }
 

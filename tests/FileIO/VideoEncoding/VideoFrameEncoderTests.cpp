@@ -3,11 +3,11 @@
 
 #include "CoreVideoUtils/BurnInText.h"
 #include "CoreVideoUtils/FrameSize.h"
-#include "CoreVideoUtils/PixelFormatConverter.h"
 #include "FileIO/PNGIO/PNGIO.h"
 #include "FileIO/TIFFIO/TIFFIO.h"
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
+#include "tests/CoreVideoUtils/Conversions.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/Threads.h"
 #include "tests/support/TurboJPEG.h"
@@ -38,11 +38,7 @@ VBufferList InTwo( const VBytes& i_rBytes )
 
 VBytes Converted( IPixelFormat::Enum i_Source, const VBytes& i_rBytes, IPixelFormat::Enum i_Target, const VColourRecord& i_rColour = {} )
 {
-  CoreVideoUtils::VPixelFormatConverter Converter;
-  Converter.SetColourCorrection( i_rColour );
-  VBytes Target( CoreVideoUtils::GetFrameSize( Picture( i_Target ) ) );
-  EXPECT_TRUE( Converter.Convert( Picture( i_Source ), i_rBytes.data(), i_rBytes.size(), i_Target, Target.data(), Target.size() ) );
-  return Target;
+  return SoftwareTests::Convert( i_Source, i_rBytes, i_Target, { Width, Height }, i_rColour );
 }
 
 bool DrawText( IPixelFormatConverter& i_rConverter, const VideoFrameInfo& i_rInfo, const VBurnInSettings& i_rText, uint8_t* io_pPixels,

@@ -118,6 +118,13 @@ std::vector<VCounterFrame> ReadCounterFile( const std::string& i_rPath )
   return Frames;
 }
 
+std::vector<VCounterFrame> ReadUnbroken( const std::string& i_rPath, const VSignalRate& i_rRate )
+{
+  const std::vector<VCounterFrame> Frames = ReadCounterFile( i_rPath );
+  ExpectUnbroken( Frames, i_rRate );
+  return Frames;
+}
+
 std::vector<uint32_t> DecodeCounters( const std::string& i_rPath, uint32_t i_Width, uint32_t i_Height )
 {
   const VRunResult Run = TestSupport::RunProgram(

@@ -43,6 +43,9 @@ std::vector<VCounterFrame> ReadCounterFile( const std::string& i_rPath );
 // complain of a last one that was cut short.
 std::vector<uint32_t> DecodeCounters( const std::string& i_rPath, uint32_t i_Width, uint32_t i_Height );
 
+// The same where nothing is missing: ExpectUnbroken holds for them.
+std::vector<VCounterFrame> ReadUnbroken( const std::string& i_rPath, const VSignalRate& i_rRate );
+
 // Counters without a gap, sound without a break at the joints of frames, and as many samples in each frame as the cadence has there.
 void ExpectUnbroken( const std::vector<VCounterFrame>& i_rFrames, const VSignalRate& i_rRate );
 

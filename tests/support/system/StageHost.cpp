@@ -15,22 +15,27 @@ VArguments operator+( VArguments i_A, const VArguments& i_rB )
   return i_A;
 }
 
-const nlohmann::json& VRecordResult::Device( size_t i_Index ) const
+const nlohmann::json& VHostResult::Device( size_t i_Index ) const
 {
   static const nlohmann::json s_Nothing = nlohmann::json::object();
   return i_Index < m_Devices.size() ? m_Devices[i_Index] : s_Nothing;
 }
 
-VRecordResult Record( const std::string& i_rFolder, const VArguments& i_rArguments, const VRunOptions& i_rOptions )
+VHostResult RunForDevices( const VArguments& i_rArguments, const VRunOptions& i_rOptions )
 {
-  VRecordResult Result;
-  Result.m_Run = TestSupport::RunStageHost( VArguments{ "record", "--json", "--output", i_rFolder } + i_rArguments, i_rOptions );
+  VHostResult Result;
+  Result.m_Run = TestSupport::RunStageHost( i_rArguments, i_rOptions );
   nlohmann::json Document = nlohmann::json::parse( Result.m_Run.m_Output, nullptr, false );
   if( Document.is_array() )
   {
     Result.m_Devices = std::move( Document );
   }
   return Result;
+}
+
+VHostResult Record( const std::string& i_rFolder, const VArguments& i_rArguments, const VRunOptions& i_rOptions )
+{
+  return RunForDevices( VArguments{ "record", "--json", "--output", i_rFolder } + i_rArguments, i_rOptions );
 }
 
 nlohmann::json Inspect( const std::string& i_rPath, bool i_bFrames )

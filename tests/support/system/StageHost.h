@@ -19,8 +19,8 @@ using VArguments = std::vector<std::string>;
 
 VArguments operator+( VArguments i_A, const VArguments& i_rB );
 
-// "record --json --output FOLDER" and what is given. Without a result on standard output m_Devices is an empty list.
-struct VRecordResult
+// A run that answers with a list of devices. Without one on standard output m_Devices is an empty list.
+struct VHostResult
 {
   VRunResult m_Run;
   nlohmann::json m_Devices = nlohmann::json::array();
@@ -30,7 +30,9 @@ struct VRecordResult
   std::string Path( size_t i_Index = 0 ) const { return Device( i_Index ).value( "path", std::string() ); }
 };
 
-VRecordResult Record( const std::string& i_rFolder, const VArguments& i_rArguments, const VRunOptions& i_rOptions = {} );
+VHostResult RunForDevices( const VArguments& i_rArguments, const VRunOptions& i_rOptions = {} );
+// "record --json --output FOLDER" and what is given.
+VHostResult Record( const std::string& i_rFolder, const VArguments& i_rArguments, const VRunOptions& i_rOptions = {} );
 
 // "inspect --json" of a file, with its frames if asked for; an empty object with the run's text on a failure.
 nlohmann::json Inspect( const std::string& i_rPath, bool i_bFrames = false );

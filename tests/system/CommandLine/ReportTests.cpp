@@ -151,7 +151,7 @@ INSTANTIATE_TEST_SUITE_P( Kinds, SettingsReportTest, BothKinds, KindName );
 // Every sum and position is checked against a reader that shares no code with it.
 TEST_F( ReportTest, InspectTellsWhatTheFileHolds )
 {
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     { "--card", "decklink:standard=SD_720_486I_5994,timecode=10:00:00;00,speed=4", "--frames", "4", "--name", "shot" } );
   ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   TestSupport::VTvidParser File( Result.Path() );
@@ -185,9 +185,9 @@ TEST_F( ReportTest, InspectTellsWhatTheFileHolds )
 TEST_F( ReportTest, ProgressIsForWhoeverAskedForIt )
 {
   const VArguments Card = { "--card", "decklink:standard=SD_720_576I_5000,speed=4", "--frames", "250" };
-  const VRecordResult Quiet = Record( m_Folder.File( "quiet" ), Card );
+  const VHostResult Quiet = Record( m_Folder.File( "quiet" ), Card );
   EXPECT_EQ( "", Quiet.m_Run.m_Error );
-  const VRecordResult Blocks = Record( m_Folder.File( "blocks" ), Card + VArguments{ "--progress" } );
+  const VHostResult Blocks = Record( m_Folder.File( "blocks" ), Card + VArguments{ "--progress" } );
   const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", Blocks.m_Run.m_Error );
   EXPECT_GE( Captured.size(), 2u );
   EXPECT_TRUE( std::is_sorted( Captured.begin(), Captured.end() ) );

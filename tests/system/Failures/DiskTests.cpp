@@ -30,7 +30,7 @@ struct VLayout
 VLayout MeasureLayout()
 {
   const TestSupport::VTemporaryFolder Folder;
-  const VRecordResult Result = Record( Folder.File( "out" ), SmallCard() + VArguments{ "--frames", std::to_string( FrameCount ) } );
+  const VHostResult Result = Record( Folder.File( "out" ), SmallCard() + VArguments{ "--frames", std::to_string( FrameCount ) } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   const VTvidParser File( Result.Path() );
   const VTvidParser::VFrame& rFirst = File.Frames().at( 0 );
@@ -80,25 +80,41 @@ const VPlace Places[] = {
 
 }
 
-class DiskFullTest : public testing::TestWithParam<VPlace>
+class DiskTest : public testing::Test
 {
 protected:
+  VHostResult RecordWithin( uint64_t i_Bytes, const VArguments& i_rMore = {} ) const
+  {
+    VRunOptions Options;
+    Options.m_FileSizeLimit = i_Bytes;
+    return Record( m_Folder.File( "out" ), SmallCard() + VArguments{ "--frames", std::to_string( FrameCount ) } + i_rMore, Options );
+  }
+  // Told by the exit code, in words that name the file, and in its device's record.
+  static void ExpectFull( const VHostResult& i_rResult, const std::string& i_rPath )
+  {
+    EXPECT_EQ( 1, i_rResult.m_Run.m_ExitCode ) << Describe( i_rResult.m_Run );
+    for( const std::string& rWords : { std::string( "stagehost: vi:0: " ), "\"" + i_rPath + "\"", std::string( "File too large" ) } )
+    {
+      EXPECT_NE( std::string::npos, i_rResult.m_Run.m_Error.find( rWords ) ) << Describe( i_rResult.m_Run );
+    }
+    EXPECT_EQ( i_rPath, i_rResult.Path() );
+    EXPECT_NE( 0u, i_rResult.Device().value( "failure", 0u ) & 8 );
+    EXPECT_FALSE( i_rResult.Device().value( "errors", nlohmann::json::array() ).empty() ) << Describe( i_rResult.m_Run );
+  }
+
   const TestSupport::VTemporaryFolder m_Folder;
+};
+
+class DiskFullTest : public DiskTest, public testing::WithParamInterface<VPlace>
+{
 };
 
 TEST_P( DiskFullTest, NamesTheFileAndKeepsWhatFits )
 {
   const uint64_t Limit = GetParam().m_Offset();
-  VRunOptions Options;
-  Options.m_FileSizeLimit = Limit;
-  const VRecordResult Result = Record( m_Folder.File( "out" ), SmallCard() + VArguments{ "--frames", std::to_string( FrameCount ) }, Options );
+  const VHostResult Result = RecordWithin( Limit );
   const std::string Path = m_Folder.File( "out" ) + "/take_vi0.tvid";
-  EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: vi:0: " ) ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "\"" + Path + "\"" ) ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "File too large" ) ) << Describe( Result.m_Run );
-  EXPECT_EQ( Path, Result.Path() );
-  EXPECT_NE( 0u, Result.Device().value( "failure", 0u ) & 8 );
+  ExpectFull( Result, Path );
   EXPECT_EQ( Limit, boost::filesystem::file_size( Path ) );
   EXPECT_EQ( Limit, Result.Device().value( "bytes", uint64_t{ 0 } ) );
 
@@ -111,25 +127,32 @@ TEST_P( DiskFullTest, NamesTheFileAndKeepsWhatFits )
   const nlohmann::json Told = Inspect( Path, true );
   EXPECT_EQ( false, Told.value( "finished", true ) ) << Told;
   EXPECT_EQ( Whole, Told.value( "frame_count", 0u ) ) << Told;
-  const std::vector<VCounterFrame> Frames = ReadCounterFile( Path );
-  EXPECT_EQ( Whole, Frames.size() );
-  ExpectUnbroken( Frames, Rate2398 );
+  EXPECT_EQ( Whole, ReadUnbroken( Path, Rate2398 ).size() );
 }
 
 INSTANTIATE_TEST_SUITE_P( Places, DiskFullTest, testing::ValuesIn( Places ),
   []( const auto& i_rInfo ) { return std::string( i_rInfo.param.m_pName ); } );
 
-class DiskTest : public testing::Test
+class MovieDiskTest : public DiskTest, public testing::WithParamInterface<std::tuple<const char*, uint64_t>>
 {
-protected:
-  const TestSupport::VTemporaryFolder m_Folder;
 };
+
+TEST_P( MovieDiskTest, NamesTheFile )
+{
+  const auto& [pContainer, Limit] = GetParam();
+  const VHostResult Result = RecordWithin( Limit, { "--container", pContainer, "--audio-channels", "2" } );
+  ExpectFull( Result, m_Folder.File( "out" ) + "/take_vi0." + pContainer );
+  EXPECT_LT( Result.Device().value( "frames_written", FrameCount ), FrameCount );
+}
+
+// In the headers, in the second picture and in the third.
+INSTANTIATE_TEST_SUITE_P( Containers, MovieDiskTest,
+  testing::Combine( testing::Values( "mov", "mp4", "avi", "mkv" ), testing::Values( 20u, 900000u, 2000000u ) ),
+  []( const auto& i_rInfo ) { return std::get<0>( i_rInfo.param ) + std::to_string( std::get<1>( i_rInfo.param ) ); } );
 
 TEST_F( DiskTest, AFileThatFitsExactlyIsComplete )
 {
-  VRunOptions Options;
-  Options.m_FileSizeLimit = Layout().m_FileSize;
-  const VRecordResult Result = Record( m_Folder.File( "out" ), SmallCard() + VArguments{ "--frames", std::to_string( FrameCount ) }, Options );
+  const VHostResult Result = RecordWithin( Layout().m_FileSize );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_EQ( FrameCount, ReadCounterFile( Result.Path() ).size() );
 }
@@ -139,18 +162,14 @@ TEST_F( DiskTest, TheOtherCardGoesOn )
 {
   VRunOptions Options;
   Options.m_FileSizeLimit = 20'000'000;   // 25 small frames fit, 25 large ones do not
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     CounterCard( Bluefish60, "speed=2" ) + VArguments{ "--card", CounterCardText( Rate2398, "speed=2" ), "--frames", "25" }, Options );
   EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   ASSERT_EQ( 2u, Result.m_Devices.size() ) << Describe( Result.m_Run );
   EXPECT_NE( 0u, Result.Device( 0 ).value( "failure", 0u ) & 8 );
-  const std::vector<VCounterFrame> Kept = ReadCounterFile( Result.Path( 0 ) );
-  EXPECT_EQ( 10u, Kept.size() );
-  ExpectUnbroken( Kept, Bluefish60 );
+  EXPECT_EQ( 10u, ReadUnbroken( Result.Path( 0 ), Bluefish60 ).size() );
   EXPECT_EQ( 0u, Result.Device( 1 ).value( "failure", 1u ) );
-  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path( 1 ) );
-  EXPECT_EQ( 25u, Frames.size() );
-  ExpectUnbroken( Frames, Rate2398 );
+  EXPECT_EQ( 25u, ReadUnbroken( Result.Path( 1 ), Rate2398 ).size() );
   EXPECT_TRUE( VTvidParser( Result.Path( 1 ) ).IsFinished() );
 }
 
@@ -159,7 +178,7 @@ TEST_F( DiskTest, AFileThatCannotBeMadeIsNamed )
 {
   const std::string Path = m_Folder.File( "out" ) + "/take_vi0.tvid";
   boost::filesystem::create_directories( Path );
-  const VRecordResult Result = Record( m_Folder.File( "out" ), SmallCard() + VArguments{ "--frames", "4", "--overwrite" } );
+  const VHostResult Result = Record( m_Folder.File( "out" ), SmallCard() + VArguments{ "--frames", "4", "--overwrite" } );
   EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( Path ) ) << Describe( Result.m_Run );
   EXPECT_TRUE( boost::filesystem::is_directory( Path ) );

@@ -31,7 +31,7 @@ protected:
 TEST_P( MemoryTest, TheCaptureEndsWithWhatItHas )
 {
   const std::string Small = std::string( GetParam().m_pKind ) + ":pattern=counter,speed=8,standard=" + Rate25.m_pStandard;
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     { "--card", Small, "--pixel-format", "U8Y8V8Y8", "--container", "images", "--video", "png", "--memory", "120", "--pre-roll", "0.8", "--frames",
       "5000" } );
   EXPECT_EQ( 3, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -58,7 +58,7 @@ TEST_P( MemoryTest, TheBudgetHolds )
 {
   // A sanitizer's own memory is no part of the promise.
   constexpr int64_t OwnMiB = DebugServices::IsSanitizerBuild ? 4096 : 96;
-  const VRecordResult Result = Record( m_Folder.File( "out" ), CounterCard( GetParam() ) + Memory + VArguments{ "--frames", "60" } );
+  const VHostResult Result = Record( m_Folder.File( "out" ), CounterCard( GetParam() ) + Memory + VArguments{ "--frames", "60" } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   EXPECT_LT( Result.m_Run.m_PeakResidentKiB / 1024, static_cast<int64_t>( MemoryMiB ) + OwnMiB );
 }
@@ -69,7 +69,7 @@ INSTANTIATE_TEST_SUITE_P( Kinds, MemoryTest, testing::Values( FastDeckLink, Fast
 TEST( MemoryOfOneCard, APreRollThatItCannotHoldIsRefused )
 {
   const TestSupport::VTemporaryFolder Folder;
-  const VRecordResult Result = Record( Folder.File( "out" ),
+  const VHostResult Result = Record( Folder.File( "out" ),
     CounterCard( FastBluefish, "speed=2" ) + Memory + VArguments{ "--pre-roll", "20", "--frames", "10" } );
   EXPECT_NE( 0, Result.m_Run.m_ExitCode );
   EXPECT_FALSE( Result.m_Run.m_bTimedOut );

@@ -1,7 +1,9 @@
-// Pictures as 8-bit RGB, three bytes a pixel: read by outside programs, and made of a card's 4:2:2 by a conversion of the test's own.
+// Pictures as 8-bit RGB, three bytes a pixel, and what tells whether they are those of a card.
 #pragma once
 
-#include "tests/support/ProgramRun.h"
+#include "tests/support/OutsideReaders.h"
+#include "tests/support/TvidParser.h"
+#include "tests/support/system/StageHost.h"
 
 #include <gtest/gtest.h>
 
@@ -26,21 +28,15 @@ inline std::string FramePath( const std::string& i_rFolder, uint64_t i_Key, cons
   return i_rFolder + "/" + boost::filesystem::path( i_rFolder ).filename().string() + "_" + Number + "." + i_rExtension;
 }
 
-inline VPicture ToPicture( const TestSupport::VRunResult& i_rRun )
+// One frame of a recording: in RGB as FFmpeg reads it of an image file, or, without an extension, as it lies in a tvid.
+inline VPicture FrameOf( const VHostResult& i_rResult, uint64_t i_Key, const std::string& i_rExtension = {} )
 {
-  EXPECT_EQ( 0, i_rRun.m_ExitCode ) << i_rRun.m_Error;
-  EXPECT_EQ( "", i_rRun.m_Error );
-  return { i_rRun.m_Output.begin(), i_rRun.m_Output.end() };
-}
-
-inline VPicture DecodeByFFmpeg( const std::string& i_rPath )
-{
-  return ToPicture( TestSupport::RunProgram( { "ffmpeg", "-nostdin", "-v", "error", "-i", i_rPath, "-f", "rawvideo", "-pix_fmt", "rgb24", "-" } ) );
-}
-
-inline VPicture DecodeByImageMagick( const std::string& i_rPath )
-{
-  return ToPicture( TestSupport::RunProgram( { "convert", i_rPath, "-depth", "8", "rgb:-" } ) );
+  if( !i_rExtension.empty() )
+  {
+    return TestSupport::DecodeVideo( FramePath( i_rResult.Path(), i_Key, i_rExtension ), "rgb24" );
+  }
+  const TestSupport::VTvidParser File( i_rResult.Path() );
+  return i_Key < File.Frames().size() ? File.Video( File.Frames()[i_Key] ) : VPicture();
 }
 
 // ITU-R BT.601 in full range, 16 bits behind the point, the remainder dropped.

@@ -12,7 +12,6 @@
 
 #include <csignal>
 #include <cstdlib>
-#include <cstring>
 #include <iostream>
 #include <random>
 
@@ -44,29 +43,19 @@ constexpr VKillCase KillCases[] = {
   { "MP4", "mp4", "uncompressed", false },
 };
 
-uint32_t Number32( const std::vector<uint8_t>& i_rBytes, uint64_t i_Position )
-{
-  uint32_t Number = 0;
-  std::memcpy( &Number, i_rBytes.data() + i_Position, sizeof( Number ) );
-  return Number;
-}
-
 // In the first RIFF, which is all that so short a file has.
-uint64_t CountWholeInAvi( const std::vector<uint8_t>& i_rBytes )
+uint64_t CountWholeInAvi( const TestSupport::VFileBytes& i_rFile )
 {
   constexpr uint64_t ListHead = 12;
   uint64_t Position = ListHead;
   uint64_t Count = 0;
-  while( Position + ListHead <= i_rBytes.size() )
+  while( Position + ListHead <= i_rFile.Size() )
   {
-    const std::string Id( i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position ),
-      i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position + 4 ) );
-    const std::string Form( i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position + 8 ),
-      i_rBytes.begin() + static_cast<std::ptrdiff_t>( Position + ListHead ) );
-    const uint64_t Size = Number32( i_rBytes, Position + 4 );
-    const bool bMovi = Id == "LIST" && Form == "movi";
+    const std::string Id = i_rFile.Text( Position, 4 );
+    const uint64_t Size = i_rFile.Little( Position + 4, 4 );
+    const bool bMovi = Id == "LIST" && i_rFile.Text( Position + 8, 4 ) == "movi";
     Position += bMovi ? ListHead : 8 + Size + Size % 2;
-    Count += Id.substr( 0, 3 ) == "00d" && Position <= i_rBytes.size();
+    Count += Id.substr( 0, 3 ) == "00d" && Position <= i_rFile.Size();
   }
   return Count;
 }
@@ -79,7 +68,7 @@ uint64_t CountWhole( const std::string& i_rPath, const std::string& i_rContainer
   }
   if( i_rContainer == "avi" )
   {
-    return CountWholeInAvi( TestSupport::VRiffParser::ReadFile( i_rPath ) );
+    return CountWholeInAvi( TestSupport::VFileBytes::OfFile( i_rPath ) );
   }
   if( i_rContainer == "mkv" )
   {
@@ -127,7 +116,7 @@ TEST_P( KillTest, WholeFramesAreRead )
     const TestSupport::VTemporaryFolder Folder;
     const int64_t Captured = std::uniform_int_distribution<int64_t>( 20, 80 )( Random );
     SCOPED_TRACE( "from frame " + std::to_string( Captured ) + " on" );
-    const VRecordResult Result = Record( Folder.File( "out" ),
+    const VHostResult Result = Record( Folder.File( "out" ),
       { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_576I_5000,speed=4", "--frames", "100000", "--progress", "--container",
         rCase.m_pContainer, "--video", rCase.m_pVideo, "--audio-channels", "2" },
       SignalAfterFrames( { SIGKILL }, Captured ) );

@@ -50,7 +50,7 @@ const VMovieRow Movies[] = {
 
 std::string CardText( const VSignalRate& i_rRate, const std::string& i_rStartLabel )
 {
-  return std::string( "decklink:pattern=counter,audio=ramp,speed=2,standard=" ) + i_rRate.m_pStandard + ",timecode=" + i_rStartLabel;
+  return CounterCardText( i_rRate, "speed=2,timecode=" + i_rStartLabel );
 }
 
 // Samples of a card's frames before this one.
@@ -118,7 +118,7 @@ protected:
   // What the card shows below the counter, from a recording that keeps every byte.
   std::vector<uint8_t> BelowCounter( const VSignalRate& i_rRate )
   {
-    const VRecordResult Result = Record( m_Folder.File( "reference" ), { "--card", CardText( i_rRate, "01:00:00:00" ), "--frames", "2" } );
+    const VHostResult Result = Record( m_Folder.File( "reference" ), { "--card", CardText( i_rRate, "01:00:00:00" ), "--frames", "2" } );
     EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
     TestSupport::VTvidParser File( Result.Path() );
     const std::vector<uint8_t> Picture = File.Video( File.Frames().at( 0 ) );
@@ -132,7 +132,7 @@ TEST_P( MovieTest, HoldsTheCardsFramesSoundAndTimecode )
 {
   const VMovieRow& rRow = GetParam();
   const std::string StartLabel = "00:00:59;20";   // the recording passes labels that drop-frame leaves out
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     { "--card", CardText( Rate2997Drop, StartLabel ), "--frames", std::to_string( FrameCount ), "--container", rRow.m_pContainer, "--video",
       rRow.m_pVideo, "--audio-channels", std::to_string( Channels ) } );
   ASSERT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
@@ -209,45 +209,6 @@ TEST( MovieAttributesTest, MatroskaHoldsAllThatTheSystemsOwnContainerHolds )
   }
 }
 
-class MovieDiskTest : public testing::TestWithParam<std::pair<const char*, uint64_t>>
-{
-protected:
-  const TestSupport::VTemporaryFolder m_Folder;
-};
-
-TEST_P( MovieDiskTest, AFullDiskIsTold )
-{
-  const auto& [pContainer, Bytes] = GetParam();
-  VRunOptions Options;
-  Options.m_FileSizeLimit = Bytes;
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
-    { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "12", "--container", pContainer, "--audio-channels", "2" }, Options );
-  const std::string Path = m_Folder.File( "out" ) + "/take_vi0." + pContainer;
-  EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "stagehost: vi:0: " ) ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "\"" + Path + "\"" ) ) << Describe( Result.m_Run );
-  EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "File too large" ) ) << Describe( Result.m_Run );
-  EXPECT_FALSE( Result.Device().value( "errors", nlohmann::json::array() ).empty() ) << Describe( Result.m_Run );
-  EXPECT_LT( Result.Device().value( "frames_written", 12u ), 12u ) << Describe( Result.m_Run );
-}
-
-// In the headers, between two frames and in a picture.
-INSTANTIATE_TEST_SUITE_P( Containers, MovieDiskTest,
-  testing::ValuesIn(
-    []
-    {
-      std::vector<std::pair<const char*, uint64_t>> Cases;
-      for( const char* pContainer : { "mov", "mp4", "avi", "mkv" } )
-      {
-        for( const uint64_t Bytes : { 20u, 900000u, 5000000u } )
-        {
-          Cases.emplace_back( pContainer, Bytes );
-        }
-      }
-      return Cases;
-    }() ),
-  []( const auto& i_rInfo ) { return i_rInfo.param.first + std::to_string( i_rInfo.param.second ); } );
-
 // A place that takes everything and keeps nothing: the writer has no complaint, the file is wrong all the same.
 TEST( MovieCheckTest, AFinishedMovieThatCannotBeReadIsAFailure )
 {
@@ -256,7 +217,7 @@ TEST( MovieCheckTest, AFinishedMovieThatCannotBeReadIsAFailure )
     const TestSupport::VTemporaryFolder Folder;
     const std::string Path = Folder.File( "take_vi0." + Container );
     boost::filesystem::create_symlink( "/dev/null", Path );
-    const VRecordResult Result = Record( Folder.File( "" ),
+    const VHostResult Result = Record( Folder.File( "" ),
       { "--card", CardText( Rate25, "01:00:00:00" ), "--frames", "3", "--container", Container, "--overwrite" } );
     EXPECT_EQ( 1, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
     EXPECT_NE( std::string::npos, Result.m_Run.m_Error.find( "is not right: The file has no tracks: it was not finished." ) )
@@ -270,12 +231,12 @@ TEST( MovieLimitTest, ARecordingThatIsToBeLongerThanItsContainerIsWarnedOf )
   const TestSupport::VTemporaryFolder Folder;
   const VRunOptions Options = SignalAfterFrames( { SIGINT }, 0 );
   const VArguments Card = { "--card", CardText( Rate2997Drop, "01:00:00;00" ), "--progress" };
-  const VRecordResult Movie = Record( Folder.File( "mov" ), Card + VArguments{ "--seconds", "20000", "--container", "mov" }, Options );
+  const VHostResult Movie = Record( Folder.File( "mov" ), Card + VArguments{ "--seconds", "20000", "--container", "mov" }, Options );
   EXPECT_NEAR( Movie.Device().value( "longest_seconds", 0.0 ), 4294967295.0 / 240000.0, 0.01 ) << Describe( Movie.m_Run );
   EXPECT_NE( std::string::npos,
     Movie.m_Run.m_Error.find( "stagehost: vi:0: With these settings a MOV file is full after 5.0 hours. The recording is to be longer." ) )
     << Describe( Movie.m_Run );
-  const VRecordResult Plain = Record( Folder.File( "tvid" ), Card + VArguments{ "--seconds", "20000" }, Options );
+  const VHostResult Plain = Record( Folder.File( "tvid" ), Card + VArguments{ "--seconds", "20000" }, Options );
   EXPECT_TRUE( Plain.Device().contains( "longest_seconds" ) && Plain.Device()["longest_seconds"].is_null() ) << Describe( Plain.m_Run );
   EXPECT_EQ( std::string::npos, Plain.m_Run.m_Error.find( "is full" ) ) << Describe( Plain.m_Run );
 }

@@ -44,7 +44,7 @@ VArguments Card( const VRangeCase& i_rCase, const std::string& i_rSpeed )
   return CounterCard( i_rCase.m_Rate, std::string( "timecode=" ) + i_rCase.m_pStartLabel + ",speed=" + i_rSpeed );
 }
 
-void ExpectAllWritten( const VRecordResult& i_rRecord, uint64_t i_Frames )
+void ExpectAllWritten( const VHostResult& i_rRecord, uint64_t i_Frames )
 {
   const nlohmann::json& rDevice = i_rRecord.Device();
   EXPECT_EQ( 0, i_rRecord.m_Run.m_ExitCode ) << Describe( i_rRecord.m_Run );
@@ -74,12 +74,11 @@ TEST_P( RangeTest, HoldsTheFramesAskedForWithTheirSoundAndTimecode )
 {
   constexpr uint64_t FrameCount = 67;
   const VRangeCase& rCase = GetParam();
-  const VRecordResult Result = Record( m_Folder.File( "out" ), Card( rCase, "2" ) + VArguments{ "--frames", std::to_string( FrameCount ) } );
+  const VHostResult Result = Record( m_Folder.File( "out" ), Card( rCase, "2" ) + VArguments{ "--frames", std::to_string( FrameCount ) } );
   ExpectAllWritten( Result, FrameCount );
 
-  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
+  const std::vector<VCounterFrame> Frames = ReadUnbroken( Result.Path(), rCase.m_Rate );
   ASSERT_EQ( FrameCount, Frames.size() );
-  ExpectUnbroken( Frames, rCase.m_Rate );
 
   const uint32_t First = Frames.front().m_Counter;
   const std::string StartLabel = LabelOfFrame( rCase.m_pStartLabel, rCase.m_Rate, First );
@@ -113,7 +112,7 @@ TEST_P( PreRollTest, BeginsThatLongBeforeTheRequest )
   const VRangeCase& rCase = GetParam();
   const int64_t Period = rCase.m_Rate.m_Period;
   const int64_t FrameCount = PreRoll / Period + 40;   // the file reaches from before the request to after it
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     Card( rCase, "4" ) + VArguments{ "--frames", std::to_string( FrameCount ), "--pre-roll", std::to_string( PreRollSeconds ), "--verbose" } );
   ExpectAllWritten( Result, static_cast<uint64_t>( FrameCount ) );
 
@@ -125,9 +124,8 @@ TEST_P( PreRollTest, BeginsThatLongBeforeTheRequest )
   EXPECT_GE( Newest[0] - Starts[0], PreRoll - Period );
   EXPECT_LT( Newest[0] - Starts[0], PreRoll + 20 * int64_t{ 135000000 } );
 
-  const std::vector<VCounterFrame> Frames = ReadCounterFile( Result.Path() );
+  const std::vector<VCounterFrame> Frames = ReadUnbroken( Result.Path(), rCase.m_Rate );
   ASSERT_EQ( static_cast<size_t>( FrameCount ), Frames.size() );
-  ExpectUnbroken( Frames, rCase.m_Rate );
   const uint32_t First = Frames.front().m_Counter;
   EXPECT_EQ( LabelOfFrame( rCase.m_pStartLabel, rCase.m_Rate, First ), Result.Device().value( "start_timecode", "" ) );
   EXPECT_EQ( TickOfFrame( rCase.m_pStartLabel, rCase.m_Rate, First ), Result.Device().value( "start_tick", int64_t{ -1 } ) );
@@ -148,7 +146,7 @@ protected:
 // Seconds become whole frames: 1.5 s hold 90 frame starts at 59.94 and 37 or 38 at 25, whichever way the range lies on the grid.
 TEST_P( RangeFormTest, SecondsHoldAllFramesThatBeginInTheSpan )
 {
-  const VRecordResult Result = Record( m_Folder.File( "out" ),
+  const VHostResult Result = Record( m_Folder.File( "out" ),
     CounterCard( GetParam(), "speed=4" ) + VArguments{ "--card", CounterCardText( Rate5994, "speed=4" ), "--seconds", "1.5" } );
   EXPECT_EQ( 0, Result.m_Run.m_ExitCode ) << Describe( Result.m_Run );
   const size_t Slow = ReadCounterFile( Result.Path( 0 ) ).size();
@@ -164,7 +162,7 @@ TEST_P( RangeFormTest, FormatsAskedForAreInTheFile )
 {
   const std::string Kind = GetParam().m_pKind;
   const VArguments Card = { "--card", Kind + ":pattern=counter,audio=ramp,standard=SD_720_486I_5994,speed=4", "--frames", "10" };
-  const VRecordResult Wide = Record( m_Folder.File( "wide" ),
+  const VHostResult Wide = Record( m_Folder.File( "wide" ),
     Card + VArguments{ "--pixel-format", "U10Y10V10Y10", "--audio-format", "Int32", "--audio-channels", "8" } );
   EXPECT_EQ( 0, Wide.m_Run.m_ExitCode ) << Describe( Wide.m_Run );
   const TestSupport::VTvidParser WideFile( Wide.Path() );
@@ -176,13 +174,13 @@ TEST_P( RangeFormTest, FormatsAskedForAreInTheFile )
   const uint64_t Samples = WideFile.Frames().front().m_AudioSize / 8 / 4;
   EXPECT_TRUE( Samples == 1601 || Samples == 1602 ) << Samples;
 
-  const VRecordResult Silent = Record( m_Folder.File( "silent" ), Card + VArguments{ "--audio", "none", "--pixel-format", "U8Y8V8Y8" } );
+  const VHostResult Silent = Record( m_Folder.File( "silent" ), Card + VArguments{ "--audio", "none", "--pixel-format", "U8Y8V8Y8" } );
   EXPECT_EQ( 0, Silent.m_Run.m_ExitCode ) << Describe( Silent.m_Run );
   EXPECT_EQ( 0u, TestSupport::VTvidParser( Silent.Path() ).Channels() );
   EXPECT_EQ( 10u, ReadCounterFile( Silent.Path() ).size() );
 
   // A format that the container does not take gives way, and that is said.
-  const VRecordResult Movie = Record( m_Folder.File( "movie" ), Card + VArguments{ "--container", "mov" } );
+  const VHostResult Movie = Record( m_Folder.File( "movie" ), Card + VArguments{ "--container", "mov" } );
   EXPECT_EQ( 0, Movie.m_Run.m_ExitCode ) << Describe( Movie.m_Run );
   EXPECT_EQ( Kind != "decklink", Movie.m_Run.m_Error.find( "does not take Luminance8; U8Y8V8Y8 is captured" ) != std::string::npos )
     << Describe( Movie.m_Run );
