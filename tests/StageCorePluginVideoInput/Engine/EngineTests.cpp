@@ -3,15 +3,11 @@
 
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
-#include "cards/common/VirtualCardControl.h"
 #include "tests/StageCorePluginVideoInput/Engine/ListeningHost.h"
+#include "tests/cards/CardFixture.h"
 #include "tests/support/FakeFlowServices.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/Threads.h"
-
-#include <gtest/gtest.h>
-
-#include <dlfcn.h>
 
 #include <atomic>
 #include <future>
@@ -24,24 +20,14 @@ using TestSupport::WaitUntil;
 using EStatus = VideoInputHAL::IVideoInputDevice::EStatus;
 using VTexts = std::vector<std::string>;
 
-// Loaded before anybody looks for the vendor's library, which is then this one: it has the same file name.
-VirtualCards::IVirtualCardControl& Control()
-{
-  static VirtualCards::IVirtualCardControl* const s_pControl = []
-  {
-    void* const pLibrary = dlopen( VIRTUAL_DECKLINK_LIBRARY, RTLD_NOW | RTLD_GLOBAL );
-    void* const pFunction = pLibrary ? dlsym( pLibrary, VirtualCards::GetVirtualCardControlName ) : nullptr;
-    return pFunction ? reinterpret_cast<VirtualCards::GetVirtualCardControlFunction*>( pFunction )() : nullptr;
-  }();
-  return *s_pControl;
-}
-
-class VideoInputEngine : public ::testing::Test
+class VideoInputEngine : public VCardsFixture
 {
 protected:
+  // Loaded before anybody looks for the vendor's library, which is then this one: it has the same file name.
+  VideoInputEngine() : VCardsFixture( ControlOf( VIRTUAL_DECKLINK_LIBRARY ) ) {}
+
   void SetUp() override
   {
-    ASSERT_NE( &Control(), nullptr );
     m_Heard.Clear();
     m_pHost = std::make_unique<VListeningHost>();
   }
@@ -49,10 +35,7 @@ protected:
   void TearDown() override
   {
     End();
-    for( const VirtualCards::VCardId Card : m_Cards )
-    {
-      Control().RemoveCard( Card );
-    }
+    RemoveCards();
     m_Cards.clear();
     EXPECT_EQ( Control().ReferencesHeld(), 0 );
     EXPECT_EQ( Control().ReleaseErrors(), 0 );
@@ -84,13 +67,7 @@ protected:
       }
     }
   }
-  VirtualCards::VCardId AddCard()
-  {
-    std::string Error;
-    m_Cards.push_back( Control().AddCard( "decklink:standard=SD_720_576I_5000", { .m_bManualClock = true }, Error ) );
-    EXPECT_EQ( Error, "" );
-    return m_Cards.back();
-  }
+  void AddCard() { VCardsFixture::AddCard( "decklink:standard=SD_720_576I_5000" ); }
   void WaitFor( const std::string& i_rText )
   {
     WaitUntil( [&] { return m_Heard.Has( i_rText ); } );
@@ -107,10 +84,10 @@ protected:
     WaitUntil( IsCapturing );
   }
   // The device finds its signal, and the source begins a session with the next frame.
-  void StartCard( VirtualCards::VCardId i_Card )
+  void StartCard()
   {
     WaitUntilCapturing( "vi:0" );
-    EXPECT_TRUE( Control().Step( i_Card, 1 ) );
+    Step();
     WaitUntil( [this] { return Status().m_bEnabled; } );
   }
   // Of the only source.
@@ -118,12 +95,7 @@ protected:
   // Of its present session.
   uint64_t Frames() { return Status().m_Session.m_Id == 0 ? 0 : Status().m_LatestCounterFrames + 1; }
   // Frames that the card has handed to its client.
-  static uint64_t Delivered( VirtualCards::VCardId i_Card )
-  {
-    VirtualCards::VCardCounters Counters;
-    Control().GetCounters( i_Card, Counters );
-    return Counters.m_FramesDelivered;
-  }
+  uint64_t Delivered() { return Counters().m_FramesDelivered; }
   VTexts Sources( const std::string& i_rVerb ) const
   {
     VTexts Found = m_Heard.Texts();
@@ -134,7 +106,6 @@ protected:
   TestSupport::VLogCapture m_Heard{ "Host" };
   std::unique_ptr<VListeningHost> m_pHost;
   std::unique_ptr<VVideoInputEngine> m_pEngine;
-  std::vector<VirtualCards::VCardId> m_Cards;
 };
 
 TEST_F( VideoInputEngine, IsBuiltInOrderAndHandsItsOwnShutdownObjectOverLast )
@@ -179,23 +150,23 @@ TEST_F( VideoInputEngine, WiresADeviceOnItsOwnThreadAndRegistersItsSourceLast )
 
 TEST_F( VideoInputEngine, FramesReachTheSourceUntilItIsTakenOut )
 {
-  const auto Card = AddCard();
+  AddCard();
   MakeAndFindCards();
-  StartCard( Card );
-  Control().Step( Card, 6 );
+  StartCard();
+  Step( 6 );
   EXPECT_EQ( Frames(), 6u );
 
   EXPECT_TRUE( m_pEngine->StopCapture( "vi:0" ) );
-  Control().Step( Card, 3 );
+  Step( 3 );
   EXPECT_EQ( Frames(), 6u );
   EXPECT_TRUE( m_pEngine->StartCapture( "vi:0" ) );
   EXPECT_FALSE( m_pEngine->StartCapture( "vi:1" ) );
-  StartCard( Card );
+  StartCard();
   m_pHost->m_pSources->m_OnRemove = [&]( const std::string& )
   {
-    const uint64_t Before = Delivered( Card );
-    EXPECT_TRUE( Control().Step( Card, 3 ) );
-    EXPECT_EQ( Delivered( Card ), Before );
+    const uint64_t Before = Delivered();
+    Step( 3 );
+    EXPECT_EQ( Delivered(), Before );
   };
   m_pEngine.reset();
   EXPECT_TRUE( m_Heard.Has( "RemoveSource vi:0" ) );
@@ -265,28 +236,28 @@ TEST_F( VideoInputEngine, MayEndInMidStream )
   {
     SCOPED_TRACE( Round );
     SetUp();
-    const auto Card = AddCard();
+    AddCard();
     MakeAndFindCards();
-    StartCard( Card );
+    StartCard();
     std::promise<void> Streaming;
     std::atomic<bool> bEnd{ false };
     boost::thread Vendor(
       [&]
       {
-        Control().Step( Card, 1 );
+        Step();
         Streaming.set_value();
         while( !bEnd )
         {
-          Control().Step( Card, 1 );
+          Step();
         }
       } );
     Streaming.get_future().wait();
     End();
-    const uint64_t AtEnd = Delivered( Card );
+    const uint64_t AtEnd = Delivered();
     bEnd = true;
     Vendor.join();
-    Control().Step( Card, 2 );
-    EXPECT_EQ( Delivered( Card ), AtEnd );
+    Step( 2 );
+    EXPECT_EQ( Delivered(), AtEnd );
     TearDown();
   }
 }

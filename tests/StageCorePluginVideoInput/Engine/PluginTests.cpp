@@ -12,18 +12,16 @@ namespace
 {
 
 using StageCorePluginInterface::IHardwareManager;
-using StageHost::VStandAloneHost;
 
-// Writes down each call with its arguments.
-class VWrittenRegistry : public StageCorePluginInterface::IHardwareRegistry
+// Writes down what it is asked to show.
+class VWrittenRegistry : public StageHost::VHardwareRegistry
 {
 public:
   void RegisterManager( std::shared_ptr<IHardwareManager> i_pManager ) override
   {
-    m_pManager = i_pManager;
     m_Calls.push_back( "RegisterManager" );
+    VHardwareRegistry::RegisterManager( std::move( i_pManager ) );
   }
-  void UnregisterManager( const std::shared_ptr<IHardwareManager>& ) override { m_Calls.push_back( "UnregisterManager" ); }
   void SetSectionRoot( const std::string& i_rSection, const VDataPath& i_rPath ) override
   {
     m_Calls.push_back( "SetSectionRoot " + i_rSection + ": " + i_rPath.ToString() );
@@ -40,42 +38,37 @@ public:
   }
 
   std::vector<std::string> m_Calls;
-  std::shared_ptr<IHardwareManager> m_pManager;
   VSectionPredicate m_Predicate;
 };
 
-class VWrittenHardware : public StageCorePluginInterface::IHardwareHost
+class Plugin : public testing::Test
 {
-public:
-  std::shared_ptr<StageCorePluginInterface::IHardwareRegistry> GetHardwareRegistry() override { return m_pRegistry; }
+protected:
+  StageHost::VStandAloneHost m_Host{ {} };
   const std::shared_ptr<VWrittenRegistry> m_pRegistry = std::make_shared<VWrittenRegistry>();
+  StageHost::VHardwareHost m_Hardware{ m_pRegistry };
+  std::unique_ptr<VStageCorePluginVideoInput> m_pPlugin = std::make_unique<VStageCorePluginVideoInput>();
 };
 
-TEST( Plugin, WithoutAnEngineEachRegistrationAssertsAndRegistersNothing )
+TEST_F( Plugin, WithoutAnEngineEachRegistrationAssertsAndRegistersNothing )
 {
-  VStandAloneHost Host( {} );
-  VWrittenHardware Hardware;
   TestSupport::VAssertionCapture Assertions;
-  VStageCorePluginVideoInput Plugin;
-  EXPECT_FALSE( Plugin.RegisterHardware( nullptr, Hardware ) );
+  EXPECT_FALSE( m_pPlugin->RegisterHardware( nullptr, m_Hardware ) );
   EXPECT_EQ( Assertions.Expressions(), ( std::vector<std::string>{ "m_pEngine != nullptr" } ) );
-  EXPECT_TRUE( Hardware.m_pRegistry->m_Calls.empty() );
-  Plugin.RegisterFlowNodeFactories( *Host.GetFlowNodeRegistry() );
+  EXPECT_TRUE( m_pRegistry->m_Calls.empty() );
+  m_pPlugin->RegisterFlowNodeFactories( *m_Host.GetFlowNodeRegistry() );
   EXPECT_EQ( Assertions.Expressions().size(), 2u );
 }
 
-TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
+TEST_F( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
 {
-  VStandAloneHost Host( {} );
-  VWrittenHardware Hardware;
-  VStageCorePluginVideoInput Plugin;
-  ASSERT_TRUE( Plugin.Initialise( Host ) );
-  EXPECT_EQ( Host.FlowNodes().Count(), 1u ) << "the engine's own";
-  EXPECT_TRUE( Plugin.RegisterFlowNodeFactories( *Host.GetFlowNodeRegistry() ) );
-  EXPECT_EQ( Host.FlowNodes().Count(), 2u );
-  EXPECT_NE( Host.FlowNodes().Find( "VideoInputDataSource" ), nullptr );
-  EXPECT_TRUE( Plugin.RegisterHardware( nullptr, Hardware ) );
-  EXPECT_EQ( Hardware.m_pRegistry->m_Calls,
+  ASSERT_TRUE( m_pPlugin->Initialise( m_Host ) );
+  EXPECT_EQ( m_Host.FlowNodes().Count(), 1u ) << "the engine's own";
+  EXPECT_TRUE( m_pPlugin->RegisterFlowNodeFactories( *m_Host.GetFlowNodeRegistry() ) );
+  EXPECT_EQ( m_Host.FlowNodes().Count(), 2u );
+  EXPECT_NE( m_Host.FlowNodes().Find( "VideoInputDataSource" ), nullptr );
+  EXPECT_TRUE( m_pPlugin->RegisterHardware( nullptr, m_Hardware ) );
+  EXPECT_EQ( m_pRegistry->m_Calls,
     ( std::vector<std::string>{
       "RegisterManager",
       "AddSection Video Inputs: 30",
@@ -84,8 +77,8 @@ TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
       "AddCommand Devices:SelectAllCameras [Video Inputs] Select All Cameras (Ctrl+Shift+A)",
     } ) );
 
-  const VDataReader Reader( *Host.GetDataStore() );
-  const auto& rIsOurs = Hardware.m_pRegistry->m_Predicate;
+  const VDataReader Reader( *m_Host.GetDataStore() );
+  const auto& rIsOurs = m_pRegistry->m_Predicate;
   EXPECT_TRUE( rIsOurs( Reader, VDataPath{ "VideoInput" } ) );
   EXPECT_TRUE( rIsOurs( Reader, DeviceSchemas::Enabled( DeviceSchemas::VideoInput::Path( "vi:0" ) ) ) );
   EXPECT_FALSE( rIsOurs( Reader, VDataPath() ) );
@@ -93,22 +86,19 @@ TEST( Plugin, RegistersItsFlowNodesTwiceAndItsHardwareInOrder )
   EXPECT_FALSE( rIsOurs( Reader, VDataPath{ "Attributes", "VideoInput" } ) );
 }
 
-TEST( Plugin, ItsEngineLivesAsLongAsTheHostHoldsTheManagerOrAnotherReplacesIt )
+TEST_F( Plugin, ItsEngineLivesAsLongAsTheHostHoldsTheManagerOrAnotherReplacesIt )
 {
-  VStandAloneHost Host( {} );
-  VWrittenHardware Hardware;
-  auto pPlugin = std::make_unique<VStageCorePluginVideoInput>();
-  EXPECT_TRUE( pPlugin->Initialise( Host ) );
-  const auto First = Host.Parameters().GetGroups();
-  EXPECT_TRUE( pPlugin->Initialise( Host ) );
-  EXPECT_EQ( Host.Parameters().GetGroups().size(), 1u );
-  EXPECT_NE( Host.Parameters().GetGroups(), First );
+  EXPECT_TRUE( m_pPlugin->Initialise( m_Host ) );
+  const auto First = m_Host.Parameters().GetGroups();
+  EXPECT_TRUE( m_pPlugin->Initialise( m_Host ) );
+  EXPECT_EQ( m_Host.Parameters().GetGroups().size(), 1u );
+  EXPECT_NE( m_Host.Parameters().GetGroups(), First );
 
-  pPlugin->RegisterHardware( nullptr, Hardware );
-  pPlugin.reset();
-  EXPECT_EQ( Host.Parameters().GetGroups().size(), 1u );
-  Hardware.m_pRegistry->m_pManager.reset();
-  EXPECT_TRUE( Host.Parameters().GetGroups().empty() );
+  m_pPlugin->RegisterHardware( nullptr, m_Hardware );
+  m_pPlugin.reset();
+  EXPECT_EQ( m_Host.Parameters().GetGroups().size(), 1u );
+  m_pRegistry->ReleaseManagers();
+  EXPECT_TRUE( m_Host.Parameters().GetGroups().empty() );
 }
 
 }

@@ -2,12 +2,12 @@
 
 #include "StageCoreDataStore/DataVerifyWriter.h"
 #include "host/DataStore.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <future>
-#include <thread>
 
 namespace
 {
@@ -50,16 +50,13 @@ protected:
     std::atomic<bool> m_bTaken{ false };
     std::promise<void> m_Taken;
     std::promise<void> m_End;
-    std::thread m_Thread;
+    boost::thread m_Thread;
   };
 
   // Returns when the writer waits for its turn, or has wrongly got it.
   void WaitUntilWaiting( const VOtherThread& i_rWriter )
   {
-    while( m_Lock.WaitingWriters() == 0 && !i_rWriter.HasTaken() )
-    {
-      std::this_thread::yield();
-    }
+    TestSupport::WaitUntil( [&] { return m_Lock.WaitingWriters() != 0 || i_rWriter.HasTaken(); } );
     EXPECT_FALSE( i_rWriter.HasTaken() );
   }
 
@@ -151,11 +148,7 @@ TEST( DataStoreThreads, ReadersNeverSeeHalfAWrite )
       Torn += Reader.GetValue( First ) == Nested.GetValue( Second ) ? 0 : 1;
     }
   };
-  std::thread Threads[] = { std::thread( Write, 0 ), std::thread( Write, 1 ), std::thread( Read ), std::thread( Read ) };
-  for( std::thread& rThread : Threads )
-  {
-    rThread.join();
-  }
+  TestSupport::RunOnThreads( 4, [&]( int i_Thread ) { i_Thread < 2 ? Write( i_Thread ) : Read(); } );
   EXPECT_EQ( Torn, 0 );
   EXPECT_EQ( Heard, 2 * Rounds );
 }

@@ -114,6 +114,53 @@ TEST_F( SyncEngineTest, EachSourceGetsItsOwnReadingOfATimecodeClockThatTwoShare 
   EXPECT_EQ( GlobalTickOf( *pReference, Ten ), GlobalTickOf( *pForeign, Ten ) );
 }
 
+TEST_F( SyncEngineTest, SourcesAreLaidByTheirTimecodeWhereDeliveryDoesNotContradictIt )
+{
+  struct VLaying
+  {
+    VTick m_Timecode;
+    double m_Delivery;
+    VTick m_Start;
+    bool m_bByTimecode;
+  };
+  struct VCase
+  {
+    const char* m_pName;
+    VLaying m_Sources[2];
+  };
+  const VTick None = VTick::Invalid();
+  const VTick Second = KVZ::SecondsToTick135( 1 );
+  const VTick Quarter = KVZ::MillisecondsToTick135( 250 );
+  for( const VCase& rCase : {
+         VCase{ "delivered 100 ms late", { { OneHour, 10.0, OneHour, true }, { OneHour + Second, 11.1, OneHour + Second, true } } },
+         VCase{ "ten hours apart on paper, a quarter of a second in the room",
+           { { OneHour, 10.0, OneHour, true }, { OneHour * 11, 10.25, OneHour + Quarter, false } } },
+         VCase{ "without timecode beside one with it", { { None, 12.0, OneHour + Second * 2, false }, { OneHour, 10.0, OneHour, true } } },
+         VCase{ "by the host's clock", { { None, 12.0, Second * 12, false }, { None, 10.0, Second * 10, false } } },
+       } )
+  {
+    SCOPED_TRACE( rCase.m_pName );
+    for( const VLaying& rLaying : rCase.m_Sources )
+    {
+      const auto pSource = Add( "vi:0", Period25 );
+      pSource->BeginSession( rLaying.m_Delivery, rLaying.m_Timecode );
+      pSource->SetNewest( 2 );
+    }
+    m_pStrand->RunAll();
+    const auto pStarted = m_pEngine->GetStarted();
+    ASSERT_TRUE( pStarted );
+    EXPECT_EQ( rCase.m_Sources[0].m_bByTimecode || rCase.m_Sources[1].m_bByTimecode, pStarted->m_bByTimecode );
+    ASSERT_EQ( 2u, pStarted->m_Sources.size() );
+    for( size_t Index = 0; Index < 2; ++Index )
+    {
+      const auto& rSource = pStarted->m_Sources[Index];
+      EXPECT_EQ( rCase.m_Sources[Index].m_Start, rSource.m_Place.m_CounterStart );
+      EXPECT_EQ( rCase.m_Sources[Index].m_bByTimecode, rSource.m_Place.m_bByTimecode );
+      m_pEngine->RemoveSource( rSource.m_pSource );
+    }
+  }
+}
+
 TEST_F( SyncEngineTest, RemovedAndDisabledSourcesTakeNoPart )
 {
   const auto pStays = AddRunning( "vi:0", Period25, OneHour, 1 );
