@@ -141,10 +141,10 @@ TEST_P( PixelRows, EqualTheReferenceForAMillionColours )
 }
 
 // Five rows with their borders, and behind them what may be read
-class VMosaic
+class VMosaicRows
 {
 public:
-  VMosaic( size_t i_Width, std::mt19937& io_rRandom, bool i_bExtremes )
+  VMosaicRows( size_t i_Width, std::mt19937& io_rRandom, bool i_bExtremes )
     : m_Stride( BayerBorder + i_Width + BayerBorder + BayerSlack ), m_Bytes( 5 * m_Stride )
   {
     Fill( m_Bytes.Data(), m_Bytes.Size(), io_rRandom, i_bExtremes );
@@ -158,7 +158,7 @@ private:
   VGuardedBytes m_Bytes;
 };
 
-void CompareMosaicRow( size_t i_Width, VBayerRow i_Row, const VMosaic& i_rMosaic )
+void CompareMosaicRow( size_t i_Width, VBayerRow i_Row, const VMosaicRows& i_rMosaic )
 {
   for( const IPixelFormat::Enum Format : ColourTargets )
   {
@@ -184,7 +184,7 @@ TEST_P( PixelRows, EqualTheReferenceForBayerRows )
     for( unsigned Kind = 0; Kind < 8; ++Kind )
     {
       const VBayerRow Row = { ( Kind & 1 ) != 0, ( Kind & 2 ) != 0 };
-      const VMosaic Mosaic( Width, Random, ( Kind & 4 ) != 0 );
+      const VMosaicRows Mosaic( Width, Random, ( Kind & 4 ) != 0 );
       CompareMosaicRow( Width, Row, Mosaic );
       if( HasFatalFailure() )
       {
