@@ -1,12 +1,12 @@
 #include "CoreAudioUtils/AudioSampleFormatConverter.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/TestFrames.h"
 
 #include <gtest/gtest.h>
 
 #include <cmath>
 #include <limits>
-#include <random>
 
 using CoreAudioUtils::ConvertSamples;
 using KVZ::IAudioSampleFormat;
@@ -14,7 +14,7 @@ using KVZ::IAudioSampleFormat;
 namespace
 {
 
-using VBytes = std::vector<uint8_t>;
+using TestSupport::VBytes;
 
 // The arithmetic once more, on numbers instead of bytes: an integer sample as a fraction of full scale in 32 bits.
 int64_t ReadInteger( IAudioSampleFormat::Enum i_Format, const uint8_t* i_pBytes )
@@ -87,20 +87,12 @@ bool IsSupported( IAudioSampleFormat::Enum i_Source, IAudioSampleFormat::Enum i_
 
 VBytes MakeSource( IAudioSampleFormat::Enum i_Format, size_t i_Samples )
 {
-  std::mt19937 Random( 1 );
-  VBytes Bytes;
-  if( i_Format == IAudioSampleFormat::EFloat32 )
+  VBytes Bytes = TestSupport::Noise( i_Samples * KVZ::GetBytesPerSample( i_Format ), 1 );
+  for( size_t Byte = 0; i_Format == IAudioSampleFormat::EFloat32 && Byte < Bytes.size(); Byte += 4 )
   {
-    std::uniform_real_distribution<float> Values( -32767.f, 32767.f );
-    for( size_t Sample = 0; Sample < i_Samples; ++Sample )
-    {
-      const VBytes Value = FloatBytes( Values( Random ) );
-      Bytes.insert( Bytes.end(), Value.begin(), Value.end() );
-    }
-    return Bytes;
+    const auto Value = static_cast<float>( ReadInteger( IAudioSampleFormat::EInt32, &Bytes[Byte] ) / 65536.0 );   // what 16 bits hold, and a fraction
+    std::memcpy( &Bytes[Byte], &Value, 4 );
   }
-  Bytes.resize( i_Samples * KVZ::GetBytesPerSample( i_Format ) );
-  std::generate( Bytes.begin(), Bytes.end(), [&] { return static_cast<uint8_t>( Random() ); } );
   return Bytes;
 }
 
@@ -137,8 +129,7 @@ TEST( AudioSampleFormatConverter, EveryPairAgreesWithTheObviousArithmeticOrIsRef
       VBytes Expected;
       for( size_t Sample = 0; Sample < Samples; ++Sample )
       {
-        const VBytes Value = Reference( From, To, Input.data() + Sample * KVZ::GetBytesPerSample( From ) );
-        Expected.insert( Expected.end(), Value.begin(), Value.end() );
+        TestSupport::Append( Expected, Reference( From, To, Input.data() + Sample * KVZ::GetBytesPerSample( From ) ) );
       }
       Expected.push_back( 0xAA );
       EXPECT_TRUE( Output == Expected );
