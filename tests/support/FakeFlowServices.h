@@ -21,6 +21,7 @@ public:
   bool m_bBlockingCalls = true;
   bool m_bNoMemory = false;
   KVZ::VFlowItemList m_Global;   // handed over once, when not empty
+  KVZ::VFlowStatePtr m_pNext;    // likewise, by Read
 
   // What has happened
   std::vector<KVZ::VFlowStatePtr> m_Written;
@@ -30,7 +31,11 @@ public:
   uint64_t m_NextToken = 1;
   uint32_t m_LastCall = 0;   // the last answer of a blocking call's function
 
-  uint32_t Read( uint32_t, KVZ::VFlowLimit, KVZ::VFlowStatePtr& ) override { return m_Answer; }
+  uint32_t Read( uint32_t, KVZ::VFlowLimit, KVZ::VFlowStatePtr& o_rpState ) override
+  {
+    o_rpState = std::exchange( m_pNext, nullptr );
+    return m_Answer;
+  }
   uint32_t ReadOneOf( const std::vector<uint32_t>&, KVZ::VFlowLimit, uint32_t&, KVZ::VFlowStatePtr& ) override { return m_Answer; }
   uint32_t Write( uint32_t, const KVZ::VFlowStatePtr& i_pState, KVZ::VFlowLimit, uint32_t i_Flags ) override
   {

@@ -17,23 +17,11 @@ constexpr int64_t Period25 = 5400000;
 constexpr int64_t Period5994 = 2252250;
 inline const KVZ::VTick OneHour = KVZ::SecondsToTick135( 3600 );
 
-class VManualDelays : public StageHost::IDelayedCalls
+// Every wait ends when a test says so.
+class VManualDelays : public StageHost::IDelayedCalls, public TestSupport::VManualPostalService
 {
 public:
-  void CallAfter( double, std::function<void()> i_Function ) override { m_Calls.push_back( std::move( i_Function ) ); }
-
-  // One round: what a call asks for anew waits for the next.
-  void RunAll()
-  {
-    for( const auto& rCall : std::exchange( m_Calls, {} ) )
-    {
-      rCall();
-    }
-  }
-  size_t Count() const { return m_Calls.size(); }
-
-private:
-  std::vector<std::function<void()>> m_Calls;
+  void CallAfter( double, std::function<void()> i_Function ) override { Post( std::move( i_Function ) ); }
 };
 
 class VSyncEngineFixture : public testing::Test

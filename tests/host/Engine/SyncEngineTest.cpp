@@ -63,7 +63,7 @@ TEST_F( SyncEngineTest, ASourceThatIsRemovedWhileItsSessionWaitsIsLetGo )
   auto pLeaves = Add( "vi:1", Period25 );
   pLeaves->BeginSession( 100.0 );   // no second frame: the start waits
   m_pStrand->RunAll();
-  ASSERT_EQ( 1u, m_pDelays->Count() );
+  ASSERT_EQ( 1u, m_pDelays->Pending() );
 
   pLeaves->BeginSession( 101.0 );   // its request is under way
   m_pEngine->RemoveSource( pLeaves );
@@ -92,9 +92,8 @@ TEST_F( SyncEngineTest, ASourceThatIsLaidByDeliveryIsWaitedForAndGivenUp )
 
   pSilent->BeginSession( 200.0 );   // and no second frame
   m_pStrand->RunAll();
-  for( int Round = 0; Round < 1000 && m_pDelays->Count() != 0; ++Round )
+  for( int Attempt = 0; Attempt < 1000 && m_pDelays->RunOne(); ++Attempt )
   {
-    m_pDelays->RunAll();
   }
   EXPECT_EQ( 2, pTimed->m_Started );
   EXPECT_EQ( 1, pSilent->m_Started );

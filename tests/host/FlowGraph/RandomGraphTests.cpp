@@ -3,10 +3,9 @@
 #include "host/FlowGraph.h"
 
 #include "tests/host/FlowGraph/GraphNodes.h"
+#include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>
-
-#include <boost/thread/thread.hpp>
 
 #include <random>
 
@@ -111,9 +110,7 @@ TEST( RandomGraph, EndsCleanWhateverIsDoneToIt )
     StageHost::VFlowGraph Graph;
     VRandomDriver First( Graph, Seed );
     VRandomDriver Second( Graph, Seed + 1000 );
-    boost::thread Other( [&] { Second.Run(); } );
-    First.Run();
-    Other.join();
+    TestSupport::RunOnThreads( 2, [&]( uint32_t i_Thread ) { ( i_Thread == 0 ? First : Second ).Run(); } );
     First.ExpectFlow();
     Second.ExpectFlow();
     Graph.Stop();

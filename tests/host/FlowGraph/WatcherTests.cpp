@@ -15,17 +15,6 @@ using StageHost::VWatchFigures;
 
 constexpr int64_t Period = 5400000;
 
-class VOneStateServices : public TestSupport::VFakeFlowServices
-{
-public:
-  uint32_t Read( uint32_t, KVZ::VFlowLimit, KVZ::VFlowStatePtr& o_rpState ) override
-  {
-    o_rpState = std::move( m_pNext );
-    return o_rpState ? KVZ::EFlowResult::Ok : KVZ::EFlowResult::WouldBlock;
-  }
-  KVZ::VFlowStatePtr m_pNext;
-};
-
 struct VTestState
 {
   int64_t m_Frame = 0;   // its tick in periods
@@ -76,7 +65,7 @@ protected:
   }
 
   const std::shared_ptr<TestSupport::VHandTime> m_pTime = std::make_shared<TestSupport::VHandTime>();
-  const std::shared_ptr<VOneStateServices> m_pServices = std::make_shared<VOneStateServices>();
+  const std::shared_ptr<TestSupport::VFakeFlowServices> m_pServices = std::make_shared<TestSupport::VFakeFlowServices>();
   VFlowWatcher m_Watcher{ m_pTime };
 };
 

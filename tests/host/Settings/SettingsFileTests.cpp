@@ -7,8 +7,8 @@
 #include "host/DataStore.h"
 #include "tests/support/FileSizeLimit.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/Threads.h"
 
-#include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
@@ -264,9 +264,7 @@ TEST_F( SettingsFile, WritersLoseNothingOfEachOther )
       EXPECT_TRUE( File.Remove( { m_Device + "Common" }, Error ) ) << Error;
     }
   };
-  boost::thread Other( [&] { SaveMany( SavesEach ); } );
-  SaveMany( 0 );
-  Other.join();
+  TestSupport::RunOnThreads( 2, [&]( uint32_t i_Thread ) { SaveMany( static_cast<int>( i_Thread ) * SavesEach ); } );
   EXPECT_EQ( Restore(), VTexts() );
   for( int Number = 0; Number < 2 * SavesEach; ++Number )
   {
