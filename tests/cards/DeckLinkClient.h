@@ -29,14 +29,6 @@ constexpr int64_t Scale = 135000000;
 constexpr uint32_t Mode1080p25 = FourCharacterCode( "Hp25" );
 constexpr uint32_t ModeNTSC = FourCharacterCode( "ntsc" );
 
-// A function that the library exports
-template<class TFunction>
-TFunction* Exported( const char* i_pName )
-{
-  static void* const s_pLibrary = dlopen( VIRTUAL_DECKLINK, RTLD_NOW );
-  return s_pLibrary ? reinterpret_cast<TFunction*>( dlsym( s_pLibrary, i_pName ) ) : nullptr;
-}
-
 inline IVirtualCardControl& DeckLinkControl() { return ControlOf( VIRTUAL_DECKLINK ); }
 
 inline std::string TakeText( const char* i_pText )
@@ -46,11 +38,12 @@ inline std::string TakeText( const char* i_pText )
   return Text;
 }
 
-// An object of one of the library's factories
+// An object of one of the factories that the library exports
 template<class TInterface>
 VComPointer<TInterface> Make( const char* i_pFactory )
 {
-  return TakeReference( Exported<TInterface*()>( i_pFactory )() );
+  static void* const s_pLibrary = dlopen( VIRTUAL_DECKLINK, RTLD_NOW );
+  return TakeReference( reinterpret_cast<TInterface* (*)()>( dlsym( s_pLibrary, i_pFactory ) )() );
 }
 
 inline VComPointer<IDeckLinkDiscovery> MakeDiscovery() { return Make<IDeckLinkDiscovery>( "CreateDeckLinkDiscoveryInstance_0001" ); }
@@ -223,20 +216,20 @@ protected:
   }
 
   // What drivers do with a new format, inside the callback. The worst of the results.
-  HRESULT Restart( uint32_t i_Mode, uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  HRESULT Restart( uint32_t i_Mode )
   {
-    return std::min( { m_pInput->PauseStreams(), m_pInput->EnableVideoInput( i_Mode, i_PixelFormat, InputFlag::FormatDetection ),
+    return std::min( { m_pInput->PauseStreams(), m_pInput->EnableVideoInput( i_Mode, PixelFormat::YUV8Bit, InputFlag::FormatDetection ),
       m_pInput->FlushStreams(), m_pInput->StartStreams() } );
   }
-  void RestartOnFormat( uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  void RestartOnFormat()
   {
-    m_Client.m_OnFormat = [this, i_PixelFormat]( uint32_t i_Mode ) { EXPECT_EQ( Restart( i_Mode, i_PixelFormat ), S_OK ); };
+    m_Client.m_OnFormat = [this]( uint32_t i_Mode ) { EXPECT_EQ( Restart( i_Mode ), S_OK ); };
   }
 
   // A client that lets its card look for the signal's format.
-  void StartDetecting( uint32_t i_Mode = ModeNTSC, uint32_t i_PixelFormat = PixelFormat::YUV8Bit )
+  void StartDetecting()
   {
-    Enable( i_Mode, i_PixelFormat, InputFlag::FormatDetection );
+    Enable( ModeNTSC, PixelFormat::YUV8Bit, InputFlag::FormatDetection );
     Start();
   }
 

@@ -71,23 +71,6 @@ TEST_F( DeckLinkStream, ASignalInAnotherModeIsLookedForWhereDetectionIsAskedFor 
   EXPECT_EQ( m_Client.m_Seen[5].m_Counter, 5u );
 }
 
-TEST_F( DeckLinkStream, AClientThatInsistsOnTheWrongColourSpaceIsToldAgainAndAgain )
-{
-  Plug( "decklink:pattern=counter" );
-  RestartOnFormat( PixelFormat::BGRA8Bit );
-  m_Client.Record();
-  StartDetecting( Mode1080p25, PixelFormat::BGRA8Bit );
-  Step( 3 );
-  EXPECT_EQ( m_Client.m_FormatCalls, 3 );
-  EXPECT_EQ( m_Client.m_LastEvents, FormatChange::ColourSpace );
-  ASSERT_EQ( m_Client.m_Seen.size(), 3u ) << "and gets its pictures all the same";
-  EXPECT_EQ( m_Client.m_Seen[2].m_Counter, 2u );
-
-  m_Client.m_OnFormat = nullptr;
-  Step( 3 );
-  EXPECT_EQ( m_Client.m_FormatCalls, 4 ) << "one that does not answer is told once";
-}
-
 TEST_F( DeckLinkStream, TimecodeAnswersByTheSignalsPlaces )
 {
   using namespace TimecodeFormat;

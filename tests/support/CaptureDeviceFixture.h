@@ -87,11 +87,7 @@ public:
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     return m_Frames;
   }
-  size_t Count() const
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_Frames.size();
-  }
+  size_t Count() const { return Frames().size(); }
 
 private:
   mutable boost::mutex m_Mutex;

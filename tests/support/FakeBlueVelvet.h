@@ -132,22 +132,14 @@ struct VObject
 };
 
 // The cards in the machine, and the card objects that are alive.
-inline std::vector<VCard*>& Cards()
-{
-  static std::vector<VCard*> s_Cards;
-  return s_Cards;
-}
-inline std::atomic<int>& Objects()
-{
-  static std::atomic<int> s_Objects{ 0 };
-  return s_Objects;
-}
+inline std::vector<VCard*> s_Cards;
+inline std::atomic<int> s_Objects{ 0 };
 
 inline VCard* CardOf( VHandle i_Handle ) { return static_cast<VObject*>( i_Handle )->m_pCard; }
 
 inline BErr Attach( VHandle i_Handle, int i_Device )
 {
-  VCard* const pCard = Cards().at( static_cast<size_t>( i_Device ) - 1 );
+  VCard* const pCard = s_Cards.at( static_cast<size_t>( i_Device ) - 1 );
   static_cast<VObject*>( i_Handle )->m_pCard = pCard->m_bAttaches ? pCard : nullptr;
   return pCard->m_bAttaches ? 0 : 1;
 }
@@ -228,17 +220,17 @@ inline const VFlatFunctions& Functions()
     VFlatFunctions Functions;
     Functions.bfcFactory = []() -> VHandle
     {
-      ++Objects();
+      ++s_Objects;
       return new VObject;
     };
     Functions.bfcDestroy = []( VHandle i_Handle )
     {
-      --Objects();
+      --s_Objects;
       delete static_cast<VObject*>( i_Handle );
     };
     Functions.bfcEnumerate = []( VHandle, int* o_pCount ) -> BErr
     {
-      *o_pCount = static_cast<int>( Cards().size() );
+      *o_pCount = static_cast<int>( s_Cards.size() );
       return 0;
     };
     Functions.bfcAttach = Attach;

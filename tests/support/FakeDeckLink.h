@@ -97,26 +97,14 @@ public:
   bool m_bHoldsCallback = true;             // the runtime holds a reference of its own during a callback
 
   // What was called, in order, SetCallback and queries left out: "EnableVideoInput Hp25 2vuy 1".
-  std::vector<std::string> Calls() const
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_Calls;
-  }
+  std::vector<std::string> Calls() const { return Locked( m_Calls ); }
   void ForgetCalls()
   {
     boost::lock_guard<boost::mutex> Lock( m_Mutex );
     m_Calls.clear();
   }
-  bool IsRunning() const
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_State == EState::Running;
-  }
-  IDeckLinkInputCallback* Callback() const
-  {
-    boost::lock_guard<boost::mutex> Lock( m_Mutex );
-    return m_pCallback.get();
-  }
+  bool IsRunning() const { return Locked( m_State ) == EState::Running; }
+  IDeckLinkInputCallback* Callback() const { return Locked( m_pCallback ).get(); }
   // Until so many callbacks are under way at once.
   void WaitForCallbacks( size_t i_Count )
   {
@@ -242,6 +230,12 @@ private:
     Running
   };
 
+  template<class T>
+  T Locked( const T& i_rValue ) const
+  {
+    boost::lock_guard<boost::mutex> Lock( m_Mutex );
+    return i_rValue;
+  }
   HRESULT FailureOf( const char* i_pOperation ) const { return m_Failures.count( i_pOperation ) ? E_FAIL : S_OK; }
   static void Run( const std::function<void()>& i_rHook )
   {

@@ -59,22 +59,6 @@ TEST( DataSourceReading, ThinsABacklogAndSaysSo )
   EXPECT_TRUE( Log.Has( "Evenly dropped 30 frames" ) );
 }
 
-TEST( DataSourceReading, AReaderThatWasAwayFindsTheOldestFrameAtItsTrueTime )
-{
-  VSourceRig Rig( 40 );
-  Rig.m_pSource->AddMany( 1 );
-  Rig.Join( 1, VTick( 500 ) );
-  Rig.m_pSource->AddMany( 300 );
-  VReadFrames Read;
-  ASSERT_EQ( Rig.m_pSource->ReadFrames( Plenty, Read ), EReadResult::Frames );
-  ASSERT_LE( Read.m_Frames.size(), 40u );
-  for( const auto& rFrame : Read.m_Frames )
-  {
-    ASSERT_EQ( rFrame.m_Tick, VTick( 500 ) + Period * IndexOf( rFrame.m_Frame ) );
-  }
-  EXPECT_EQ( IndexOf( Read.m_Frames.back().m_Frame ), 300 );
-}
-
 TEST( DataSourceReading, ChangesOverWhenANewSessionHasStarted )
 {
   VSourceRig Rig;

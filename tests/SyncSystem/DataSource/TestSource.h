@@ -62,27 +62,22 @@ public:
   VTick m_BeatPeriod;
   double m_Now = 0.0;   // of frame 0
 
-  // What the hooks have seen, and what they answer
+  // What the hooks have seen
   std::vector<uint32_t> m_Begun;
-  bool m_bBegins = true;
-  std::vector<SyncSystem::VCaptureError> m_BeginErrors;
-  std::vector<uint32_t> m_CancelledCaptures;
   std::vector<VTick> m_Ends;
   std::vector<bool> m_Busy;
 
 protected:
   bool BeginCapture( const KVZ::ICaptureHeader& i_rHeader, const std::shared_ptr<const SyncSystem::VGlobalSyncSessionInfo>&, uint32_t,
-    std::vector<SyncSystem::VCaptureError>& o_rErrors ) override
+    std::vector<SyncSystem::VCaptureError>& ) override
   {
     m_Begun.push_back( i_rHeader.m_CaptureSessionId.Value() );
-    o_rErrors = m_BeginErrors;
-    return m_bBegins;
+    return true;
   }
   void OnCaptureEndChanged( KVZ::VCaptureSessionId, const IClock& i_rCounter, const KVZ::ITickInClocks& i_rEnd ) override
   {
     m_Ends.push_back( i_rEnd.Find( i_rCounter ) );
   }
-  void OnCaptureCancelled( KVZ::VCaptureSessionId i_Id ) override { m_CancelledCaptures.push_back( i_Id.Value() ); }
   void OnBusyChanged( bool i_bBusy ) override { m_Busy.push_back( i_bBusy ); }
 };
 

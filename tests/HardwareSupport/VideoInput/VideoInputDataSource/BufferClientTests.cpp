@@ -205,6 +205,7 @@ TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWrittenIfAnything )
   Write();
   EXPECT_EQ( Log.Texts(), ( std::vector<std::string>{ "Client 1 cancelled after writing 0 seconds of data." } ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_Start, VTick::Open() );
   EXPECT_TRUE( m_Rig.m_pDisk->empty() );
   EXPECT_TRUE( Reports().empty() );
 
@@ -216,6 +217,8 @@ TEST_F( BufferClient, ACancelledCaptureKeepsWhatItHasWrittenIfAnything )
   Write();
   EXPECT_TRUE( Log.Has( "Client 2 cancelled after writing 0.4 seconds of data." ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Cancelled );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::Cancelled );
+  EXPECT_EQ( Status().m_CapturedDuration, Period * 10 ) << "what there was when it was cancelled";
   EXPECT_EQ( File().m_Frames.size(), 10u );
   EXPECT_EQ( File().m_Closes, 1 );
   EXPECT_EQ( Reports().at( 0 ).m_FramesWritten, 10u );
@@ -237,20 +240,14 @@ TEST_F( BufferClient, TargetsThatCannotBeHadAreTold )
   Write();
   EXPECT_TRUE( Log.Has( "Unsupported video container format for capture." ) );
   EXPECT_EQ( Status().m_State, ECaptureState::Idle );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::ReportedErrors );
   EXPECT_EQ( Reports().size(), 1u );
-}
 
-TEST_F( BufferClient, ASourceThatGoesClosesItsFile )
-{
-  Start( 1, 0, 30 );
+  m_Rig.m_pTargets->m_Containers = { KVZ::IVideoContainer::ETVID };
+  Start( 2, 0, 4, "Second" );
   Write();
-  EXPECT_TRUE( File().m_bOpen );
-  m_Rig.m_pSource.reset();
-  m_pSource.reset();
-  EXPECT_EQ( File().m_Closes, 1 );
-  EXPECT_EQ( Reports().at( 0 ).m_FramesWritten, 10u );
-  Write();
-  EXPECT_EQ( Reports().size(), 1u );
+  EXPECT_EQ( Status().m_Failure, ECaptureFailure::None ) << "another try prepares anew";
+  EXPECT_EQ( Reports().size(), 2u );
 }
 
 }

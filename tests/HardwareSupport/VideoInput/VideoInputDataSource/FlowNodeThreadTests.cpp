@@ -5,6 +5,7 @@
 #include "host/FlowGraph.h"
 #include "tests/HardwareSupport/VideoInput/VideoInputDataSource/VideoRig.h"
 #include "tests/support/FakeDeckLink.h"
+#include "tests/support/FunctionNode.h"
 
 #include <boost/thread/thread.hpp>
 
@@ -16,19 +17,6 @@ namespace
 
 constexpr uint64_t Frames = 5000;
 
-class VTakingNode : public Flow2Utils::VFlowNode<VTakingNode>
-{
-public:
-  static KVZ::VFlowNodeInfo MakeNodeInfo() { return { "Taking", "Lets states go", { "Input" }, {} }; }
-
-protected:
-  void Process() override
-  {
-    KVZ::VFlowStatePtr pState;
-    Read( 0, KVZ::VFlowLimit::None(), pState );
-  }
-};
-
 // The source's node and one that takes its states.
 struct VLiveGraph
 {
@@ -37,7 +25,8 @@ struct VLiveGraph
     m_pSources->Insert( "vi:0", i_pSource );
     m_Node = m_Graph.AddNode( std::make_shared<VideoInputHAL::VFlowNodeVideoInputDataSource>( m_pSources ),
       { .m_Name = "Source", .m_Parameters = { { "DeviceURN", "vi:0" } } } );
-    const auto Sink = m_Graph.AddNode( std::make_shared<VTakingNode>(), { .m_Name = "Sink" } );
+    const auto Take = []( TestSupport::VFunctionNode& i_rNode ) { i_rNode.Read( 0, KVZ::VFlowLimit::None(), i_rNode.m_pState ); };
+    const auto Sink = m_Graph.AddNode( std::make_shared<TestSupport::VFunctionNode>( Take ), { .m_Name = "Sink" } );
     EXPECT_TRUE( m_Graph.Connect( { m_Node, 0 }, { Sink, 0 } ) );
   }
   ~VLiveGraph()

@@ -102,14 +102,6 @@ TEST_F( TriggeredSource, RunsOnceItsFramesHaveStoppedForFiveSeconds )
   EXPECT_EQ( Session.m_BeatPeriod, Period );
 }
 
-TEST( TriggeredSourceWithoutATimer, SaysSo )
-{
-  const TestSupport::VLogCapture Log( "Hal.vi:0", 2 );
-  VVideoRig Rig;
-  Rig.Make<VTestTriggeredSource>();   // on a postal service that has none
-  EXPECT_EQ( Log.Lines().size(), 1u );
-}
-
 TEST_F( TriggeredSource, OffersASessionOfItsOwnPeriod )
 {
   const TestSupport::VLogCapture Log( "Hal.vi:0" );

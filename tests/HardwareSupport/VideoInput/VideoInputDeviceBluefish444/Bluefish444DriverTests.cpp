@@ -27,14 +27,14 @@ protected:
     }
     m_pDriver.reset();
     m_Arrived.clear();
-    Fake::Cards().clear();
-    EXPECT_EQ( Fake::Objects(), 0 );
+    Fake::s_Cards.clear();
+    EXPECT_EQ( Fake::s_Objects, 0 );
   }
 
   Fake::VCard& AddCard( uint32_t i_Streams = 0x10 )
   {
     Fake::VCard& rCard = m_Cards.emplace_back();
-    Fake::Cards().push_back( &rCard );
+    Fake::s_Cards.push_back( &rCard );
     rCard.m_Properties[Property::CardFeatureStreamInfo] = i_Streams;
     return rCard;
   }
@@ -106,7 +106,7 @@ TEST_F( Bluefish444Driver, ItsEndClosesItsDevices )
   Discover();
   m_Cards.front().Freely();
   m_pDriver.reset();
-  EXPECT_EQ( Fake::Objects(), 0 );
+  EXPECT_EQ( Fake::s_Objects, 0 );
   EXPECT_EQ( m_Arrived.front()->StartCapture( KVZ::IPixelFormat::EU8Y8V8Y8, KVZ::ITimecodeSource::EAny, KVZ::IAudioSampleFormat::EInt16, 0 ).m_Code,
     0 );
   EXPECT_EQ( m_Arrived.front()->GetStatus(), VideoInputHAL::IVideoInputDevice::EStatus::EReady );

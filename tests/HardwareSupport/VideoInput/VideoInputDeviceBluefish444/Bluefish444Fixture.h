@@ -17,15 +17,15 @@ protected:
   static constexpr uint32_t Mode1556PsF15 = 15;
   static constexpr uint32_t NoSignal = 46;
 
-  Bluefish444Device() : VCaptureDeviceFixture( "VideoInputDeviceBluefish444" ) { Fake::Cards() = { &m_Card }; }
+  Bluefish444Device() : VCaptureDeviceFixture( "VideoInputDeviceBluefish444" ) { Fake::s_Cards = { &m_Card }; }
 
   // Nothing of the library's is left when the device has gone, and every block came back.
   void TearDown() override
   {
     m_Card.Freely();
     m_pDevice.reset();
-    Fake::Cards().clear();
-    EXPECT_EQ( Fake::Objects(), 0 );
+    Fake::s_Cards.clear();
+    EXPECT_EQ( Fake::s_Objects, 0 );
     EXPECT_EQ( m_pAllocator->m_Outstanding, 0 );
   }
 

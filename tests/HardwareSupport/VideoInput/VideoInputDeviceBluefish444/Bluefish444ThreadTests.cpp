@@ -79,7 +79,7 @@ TEST_F( Bluefish444Device, MayEndOnItsOwnThread )
   pOwner->m_pDevice = std::move( m_pDevice );
   pOwner->m_OnFrame = [&] { pOwner->m_pDevice.reset(); };
   m_Card.Release();
-  while( Fake::Objects() != 0 )
+  while( Fake::s_Objects != 0 )
   {
     boost::this_thread::yield();   // until the thread has let the card go
   }
