@@ -215,49 +215,47 @@ inline BErr GetVideoInfo( int i_Mode, int, int, uint32_t* o_pWidth, uint32_t* o_
 
 inline const VFlatFunctions& Functions()
 {
-  static const VFlatFunctions s_Functions = []
-  {
-    VFlatFunctions Functions;
-    Functions.bfcFactory = []() -> VHandle
+  static const VFlatFunctions s_Functions{
+    .bfcFactory = []() -> VHandle
     {
       ++s_Objects;
       return new VObject;
-    };
-    Functions.bfcDestroy = []( VHandle i_Handle )
+    },
+    .bfcDestroy =
+      []( VHandle i_Handle )
     {
       --s_Objects;
       delete static_cast<VObject*>( i_Handle );
-    };
-    Functions.bfcEnumerate = []( VHandle, int* o_pCount ) -> BErr
+    },
+    .bfcEnumerate = []( VHandle, int* o_pCount ) -> BErr
     {
       *o_pCount = static_cast<int>( s_Cards.size() );
       return 0;
-    };
-    Functions.bfcAttach = Attach;
-    Functions.bfcDetach = []( VHandle ) -> BErr { return 0; };
-    Functions.bfcQueryCardType = []( VHandle i_Handle, int* o_pType, int ) -> BErr
+    },
+    .bfcAttach = Attach,
+    .bfcDetach = []( VHandle ) -> BErr { return 0; },
+    .bfcQueryCardType = []( VHandle i_Handle, int* o_pType, int ) -> BErr
     {
       *o_pType = CardOf( i_Handle )->m_Type;
       return 0;
-    };
-    Functions.bfcQueryCardProperty32 = Query;
-    Functions.bfcSetCardProperty32 = Set;
-    Functions.bfcVideoCaptureStop = []( VHandle i_Handle ) -> BErr
+    },
+    .bfcQueryCardProperty32 = Query,
+    .bfcSetCardProperty32 = Set,
+    .bfcVideoCaptureStop = []( VHandle i_Handle ) -> BErr
     {
       CardOf( i_Handle )->Log( "Stop" );
       return 0;
-    };
-    Functions.bfcWaitVideoInputSync = Wait;
-    Functions.bfcRenderBufferCapture = []( VHandle i_Handle, unsigned long i_BufferId ) -> BErr
+    },
+    .bfcWaitVideoInputSync = Wait,
+    .bfcRenderBufferCapture = []( VHandle i_Handle, unsigned long i_BufferId ) -> BErr
     {
       CardOf( i_Handle )->Log( "Capture", { i_BufferId } );
       return 0;
-    };
-    Functions.bfcSystemBufferRead = Read;
-    Functions.bfcDecodeHancFrameEx = Decode;
-    Functions.bfcGetVideoInfo = GetVideoInfo;
-    return Functions;
-  }();
+    },
+    .bfcSystemBufferRead = Read,
+    .bfcDecodeHancFrameEx = Decode,
+    .bfcGetVideoInfo = GetVideoInfo,
+  };
   return s_Functions;
 }
 

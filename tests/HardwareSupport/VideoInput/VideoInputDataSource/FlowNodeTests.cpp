@@ -73,13 +73,6 @@ protected:
     Item<KVZ::VFlowGenericData>( i_pState ).GetNumber( i_pName, Number );
     return Number;
   }
-  double UsedMemory()
-  {
-    double Total = 0.0;
-    double Used = 0.0;
-    m_Rig.m_Memory.m_pAllocator->GetMemoryStats( Total, Used );
-    return Used;
-  }
 
   VVideoRig m_Rig{ 160 };
   std::shared_ptr<VTestVideoSource> m_pSource = m_Rig.Make();
@@ -247,10 +240,10 @@ TEST_F( FlowNodeVideoInput, AFrameIsPinnedExactlyAsLongAsItsStateLives )
   m_Rig.m_pSource.reset();
   m_pSource.reset();
   m_Rig.m_pStrand->RunAll();
-  EXPECT_GT( UsedMemory(), 0.0 );
+  EXPECT_GT( m_Rig.m_Memory.m_pClient->GetHeldBlocks(), 0u );
   EXPECT_EQ( pSound->Data()[0], 4 );
   pSound.reset();
-  EXPECT_EQ( UsedMemory(), 0.0 );
+  EXPECT_EQ( m_Rig.m_Memory.m_pClient->GetHeldBlocks(), 0u );
 }
 
 TEST_F( FlowNodeVideoInput, TakesItsDeviceFromGlobalItemsToo )

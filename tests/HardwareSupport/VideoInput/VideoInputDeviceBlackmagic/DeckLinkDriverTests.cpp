@@ -28,11 +28,7 @@ protected:
   std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
   std::vector<std::shared_ptr<IVideoInputDevice>> m_Arrived;
   std::shared_ptr<VBlackmagicDeckLinkDriver> m_pDriver = KVZ::MakeShared<VBlackmagicDeckLinkDriver>(
-    [this]
-    {
-      m_pDiscovery->AddRef();
-      return m_pDiscovery.get();
-    } );
+    [this] { return VComPointer( m_pDiscovery ).detach(); } );
 
   void SetUp() override
   {
