@@ -165,6 +165,8 @@ void VProgram::Wait()
   m_Result.m_ExitCode = WIFEXITED( Status ) ? WEXITSTATUS( Status ) : -1;
   m_Result.m_Signal = WIFSIGNALED( Status ) ? WTERMSIG( Status ) : 0;
   m_Result.m_PeakResidentKiB = Usage.ru_maxrss;
+  m_Result.m_ProcessorSeconds = static_cast<double>( Usage.ru_utime.tv_sec + Usage.ru_stime.tv_sec ) +
+    static_cast<double>( Usage.ru_utime.tv_usec + Usage.ru_stime.tv_usec ) * 1e-6;
 }
 
 VRunResult RunProgram( const std::vector<std::string>& i_rArguments, const VRunOptions& i_rOptions )

@@ -31,6 +31,7 @@ struct VRunResult
   std::string m_Output;
   std::string m_Error;
   int64_t m_PeakResidentKiB = 0;
+  double m_ProcessorSeconds = 0.0;   // user and system
 };
 
 // A program that runs beside the test, until the test lets go of it.
