@@ -2,7 +2,7 @@
 #pragma once
 
 #include "VendorInterfaces/BlueVelvetLoader.h"
-#include "tests/cards/CardFixture.h"
+#include "tests/support/CardFixture.h"
 #include "tests/support/CounterReader.h"
 #include "tests/support/RampReader.h"
 

@@ -4,7 +4,7 @@
 #include "HardwareSupport/VideoInput/VideoInputHAL/DeviceStatusSchema.h"
 #include "StageCoreDataStoreTypes/DeviceSchemas.h"
 #include "tests/StageCorePluginVideoInput/Engine/ListeningHost.h"
-#include "tests/cards/CardFixture.h"
+#include "tests/support/CardFixture.h"
 #include "tests/support/FakeFlowServices.h"
 #include "tests/support/LogCapture.h"
 #include "tests/support/Threads.h"
