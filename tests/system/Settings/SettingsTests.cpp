@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <fstream>
+#include <list>
 
 using namespace SystemTests;
 
@@ -198,6 +199,24 @@ TEST_F( SettingsTest, TheUsersFolderIsWhereTheDesktopSaysItIs )
     EXPECT_EQ( 0, Run.m_ExitCode ) << Describe( Run );
     EXPECT_NE( std::string::npos, ReadFile( Home + "/.config/stagehost/settings.json" ).find( pConfig ) );
   }
+}
+
+TEST_F( SettingsTest, ProcessesLoseNothingOfEachOther )
+{
+  const std::vector<VArguments> Wishes = { { Key( "Name" ), "A" }, { Key( "AudioChannelCount" ), "8" }, { Key( "Threshold" ), "0.5" },
+    { Key( "MaximumBlobHeight" ), "7" }, { Key( "TimeOffsetTicks" ), "5" }, { Key( "UseTimecodeForSync" ), "false" } };
+  std::list<TestSupport::VProgram> Programs;
+  for( const VArguments& rWish : Wishes )
+  {
+    const VArguments Command = { std::string( std::getenv( "STAGECORE_BIN" ) ) + "/stagehost", "params", "--settings", m_Path, "set" };
+    Programs.emplace_back( Command + Card + rWish );
+  }
+  for( const VArguments& rWish : Wishes )
+  {
+    EXPECT_EQ( rWish[1] + "\n", Programs.front().WaitForEnd( 30.0 ).m_Output ) << Programs.front().Printed();
+    Programs.pop_front();
+  }
+  EXPECT_EQ( Wishes.size(), Saved().size() ) << Saved();
 }
 
 TEST_F( SettingsTest, ChangesArePrintedUntilInterrupted )
