@@ -28,7 +28,7 @@ protected:
   std::shared_ptr<TestSupport::VManualPostalService> m_pService = std::make_shared<TestSupport::VManualPostalService>();
   std::vector<std::shared_ptr<IVideoInputDevice>> m_Arrived;
   std::shared_ptr<VBlackmagicDeckLinkDriver> m_pDriver = KVZ::MakeShared<VBlackmagicDeckLinkDriver>(
-    [this] { return VComPointer( m_pDiscovery ).detach(); } );
+    [this] { return VComPointer<Fake::VDiscovery>( m_pDiscovery ).detach(); } );
 
   void SetUp() override
   {
