@@ -40,7 +40,6 @@ public:
   const ISchema* Element() const override { return m_Content.m_pElement; }
 
   const std::string& NameFromValue( int32_t i_Value ) const override { return Find( i_Value ).m_Name; }
-  const std::string& DescriptionFromValue( int32_t i_Value ) const override { return Find( i_Value ).m_Description; }
 
   std::optional<int32_t> ValueFromName( std::string_view i_Name ) const override
   {

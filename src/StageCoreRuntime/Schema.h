@@ -67,7 +67,6 @@ public:
 
   // The empty string for a value that is not in the table.
   virtual const std::string& NameFromValue( int32_t i_Value ) const = 0;
-  virtual const std::string& DescriptionFromValue( int32_t i_Value ) const = 0;
   virtual std::optional<int32_t> ValueFromName( std::string_view i_Name ) const = 0;
 
 protected:

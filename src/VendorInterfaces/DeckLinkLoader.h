@@ -13,8 +13,6 @@ public:
   // A bare name is looked for on the loader's normal path. One that is already loaded under this name is used as it is.
   explicit VRuntimeLibrary( const char* i_pName );
 
-  bool IsLoaded() const { return m_pHandle != nullptr; }
-
   // Carries one reference for the caller. Null without the library, or when it knows none of the factories' generations.
   IDeckLinkDiscovery* CreateDiscovery() const;
 

@@ -1,4 +1,4 @@
-#include "tests/CoreVideoUtils/Conversions.h"
+#include "tests/support/SoftwareConversions.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 #include "CoreVideoUtils/BurnInText.h"
-#include "tests/CoreVideoUtils/Conversions.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SoftwareConversions.h"
 
 #include <gtest/gtest.h>
 

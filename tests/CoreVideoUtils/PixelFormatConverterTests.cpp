@@ -1,9 +1,9 @@
 #include "CoreVideoUtils/PixelConversions.h"
 #include "CoreVideoUtils/ReferencePixels.h"
-#include "tests/CoreVideoUtils/Conversions.h"
 #include "tests/CoreVideoUtils/GuardedBytes.h"
 #include "tests/support/AssertionCapture.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SoftwareConversions.h"
 #include "tests/support/Threads.h"
 
 #include <gtest/gtest.h>

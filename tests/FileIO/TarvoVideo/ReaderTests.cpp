@@ -1,4 +1,4 @@
-#include "tests/FileIO/TarvoVideo/SmallFile.h"
+#include "tests/support/SmallTvidFile.h"
 #include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>

@@ -1,5 +1,5 @@
-#include "tests/FileIO/TarvoVideo/SmallFile.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SmallTvidFile.h"
 
 #include <gtest/gtest.h>
 

@@ -7,8 +7,8 @@
 #include "FileIO/TIFFIO/TIFFIO.h"
 #include "FileIO/VideoEncoding/ImageCompressors.h"
 #include "Utils/UtilsMemory/StandardBufferAllocator.h"
-#include "tests/CoreVideoUtils/Conversions.h"
 #include "tests/support/LogCapture.h"
+#include "tests/support/SoftwareConversions.h"
 #include "tests/support/Threads.h"
 #include "tests/support/TurboJPEG.h"
 

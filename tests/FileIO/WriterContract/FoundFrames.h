@@ -1,7 +1,7 @@
 // What a reader finds in a file that may end anywhere.
 #pragma once
 
-#include "tests/FileIO/TarvoVideo/SmallFile.h"
+#include "tests/support/SmallTvidFile.h"
 
 #include <optional>
 
