@@ -96,6 +96,26 @@ constexpr bool Waiting = false;
 
 }
 
+// Two equal stamps mean that nothing has changed between them, there or below.
+TEST_F( DataStore, AStampTellsOfChangesBelow )
+{
+  const auto Stamps = [this]
+  {
+    const VDataReader Reader( m_Store );
+    return std::array{ Reader.GetChangeStamp( VDataPath() ), Reader.GetChangeStamp( m_Path ), Reader.GetChangeStamp( VDataPath{ "Other" } ) };
+  };
+  const auto Before = Stamps();
+  EXPECT_EQ( Stamps(), Before );
+  EXPECT_TRUE( Set( m_Path, 7 ) );
+  const auto After = Stamps();
+  EXPECT_NE( After[0], Before[0] );
+  EXPECT_NE( After[1], Before[1] );
+  EXPECT_EQ( After[2], Before[2] );
+  EXPECT_EQ( VDataReader( m_Store ).FindNode( m_Path ), nullptr ) << "nobody has asked for the place itself";
+  IDataNode* const pNode = VDataWriter( m_Store ).GetNode( m_Path );
+  EXPECT_EQ( VDataReader( m_Store ).FindNode( m_Path ), pNode );
+}
+
 TEST_F( DataStore, HoldsValuesAtConcretePathsOnly )
 {
   EXPECT_FALSE( VDataReader( m_Store ).Exists( m_Path ) );
