@@ -54,7 +54,7 @@ protected:
 // the one that takes what there is goes on without.
 TEST_F( LensTest, IsLeftFromWhereTheDisplayEnds )
 {
-  for( const auto& [pConverter, Wanted, ExitCode] : { std::tuple{ "opengl", 1000u, 1 }, { "auto", 100u, 0 } } )
+  for( const auto& [pConverter, Wanted, ExitCode] : { std::tuple{ "opengl", 200u, 1 }, { "auto", 100u, 0 } } )
   {
     VPrivateDisplay Display;
     VRunOptions Options;

@@ -15,7 +15,7 @@ namespace
 
 constexpr uint32_t Every = 100;           // frames from event to event
 constexpr uint32_t TheOnly = 4 * Every;   // of an event that comes once: late enough for a slow machine to be recording
-constexpr uint64_t FarBeyond = 1000;      // frames of a recording that meets it
+constexpr uint64_t FarBeyond = 600;       // frames of a recording that meets it
 
 constexpr int FailureEndMoved = 2;
 
