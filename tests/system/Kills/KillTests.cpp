@@ -108,20 +108,27 @@ class KillTest : public testing::TestWithParam<VKillCase>
 TEST_P( KillTest, WholeFramesAreRead )
 {
   const VKillCase& rCase = GetParam();
+  constexpr uint64_t LeastFile = 131072;   // headers, and a compressed frame and more
   std::mt19937 Random( static_cast<uint32_t>( rCase.m_pName[0] + KillCount() ) );
   uint64_t AllWhole = 0;
   uint64_t AllRead = 0;
   for( size_t Kill = 0; Kill < KillCount(); ++Kill )
   {
     const TestSupport::VTemporaryFolder Folder;
+    const std::string Path = Folder.File( "out" ) + "/take_vi0." + rCase.m_pContainer;
     const int64_t Captured = std::uniform_int_distribution<int64_t>( 20, 80 )( Random );
     SCOPED_TRACE( "from frame " + std::to_string( Captured ) + " on" );
+    const auto IsUnderWay = [&]( const std::string& i_rText )
+    {
+      boost::system::error_code Missing;
+      const std::vector<int64_t> Told = NumbersBehind( "frames_captured=", i_rText );
+      return !Told.empty() && Told.back() >= Captured && boost::filesystem::file_size( Path, Missing ) >= LeastFile && !Missing;
+    };
     const VHostResult Result = Record( Folder.File( "out" ),
       { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_576I_5000,speed=4", "--frames", "100000", "--progress", "--container",
         rCase.m_pContainer, "--video", rCase.m_pVideo, "--audio-channels", "2" },
-      SignalAfterFrames( { SIGKILL }, Captured ) );
+      SignalOnce( { SIGKILL }, IsUnderWay ) );
     ASSERT_EQ( SIGKILL, Result.m_Run.m_Signal ) << Describe( Result.m_Run );
-    const std::string Path = Folder.File( "out" ) + "/take_vi0." + rCase.m_pContainer;
     const uint64_t Whole = CountWhole( Path, rCase.m_pContainer );
     const uint64_t Read = CountRead( Path, rCase.m_pContainer );
     EXPECT_GE( Read, rCase.m_bReadable ? Whole : 0 );
