@@ -89,14 +89,15 @@ VRunOptions SignalOnce( std::vector<int> i_Signals, std::function<bool( const st
   return Options;
 }
 
+bool HasCaptured( const std::string& i_rText, int64_t i_Frames )
+{
+  const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", i_rText );
+  return !Captured.empty() && Captured.back() >= i_Frames;
+}
+
 VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames )
 {
-  return SignalOnce( std::move( i_Signals ),
-    [i_Frames]( const std::string& i_rText )
-    {
-      const std::vector<int64_t> Captured = NumbersBehind( "frames_captured=", i_rText );
-      return !Captured.empty() && Captured.back() >= i_Frames;
-    } );
+  return SignalOnce( std::move( i_Signals ), [i_Frames]( const std::string& i_rText ) { return HasCaptured( i_rText, i_Frames ); } );
 }
 
 std::string ReadFile( const std::string& i_rPath )

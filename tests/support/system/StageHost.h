@@ -48,6 +48,8 @@ nlohmann::json EveryFrames( uint64_t i_Every, const nlohmann::json& i_rEvent );
 
 // Sends these signals to the program, once, as soon as what it has printed to standard error is as wanted.
 VRunOptions SignalOnce( std::vector<int> i_Signals, std::function<bool( const std::string& )> i_IsTime );
+// Whether a program with --progress has told by now that so many frames are captured.
+bool HasCaptured( const std::string& i_rText, int64_t i_Frames );
 // As soon as the program, which needs --progress, tells that so many frames are captured.
 VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames );
 

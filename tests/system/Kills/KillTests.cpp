@@ -121,8 +121,7 @@ TEST_P( KillTest, WholeFramesAreRead )
     const auto IsUnderWay = [&]( const std::string& i_rText )
     {
       boost::system::error_code Missing;
-      const std::vector<int64_t> Told = NumbersBehind( "frames_captured=", i_rText );
-      return !Told.empty() && Told.back() >= Captured && boost::filesystem::file_size( Path, Missing ) >= LeastFile && !Missing;
+      return HasCaptured( i_rText, Captured ) && boost::filesystem::file_size( Path, Missing ) >= LeastFile && !Missing;
     };
     const VHostResult Result = Record( Folder.File( "out" ),
       { "--card", "decklink:pattern=counter,audio=ramp,standard=SD_720_576I_5000,speed=4", "--frames", "100000", "--progress", "--container",
