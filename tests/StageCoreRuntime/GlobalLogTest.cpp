@@ -3,11 +3,11 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/Threads.h"
+#include "tests/support/WholeFile.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <fstream>
 #include <iterator>
 
 namespace
@@ -99,11 +99,7 @@ class LogFile : public testing::Test
 protected:
   ~LogFile() override { KVZ::ConfigureLog( {} ); }
 
-  std::string Content() const
-  {
-    std::ifstream File( m_Folder.File( "host.log" ) );
-    return std::string( std::istreambuf_iterator<char>( File ), {} );
-  }
+  std::string Content() const { return TestSupport::ReadFile( m_Folder.File( "host.log" ) ); }
 
   const TestSupport::VTemporaryFolder m_Folder;
 };

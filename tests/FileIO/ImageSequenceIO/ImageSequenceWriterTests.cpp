@@ -6,6 +6,7 @@
 #include "tests/support/LogCapture.h"
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/TestFrames.h"
+#include "tests/support/WholeFile.h"
 
 #include <gtest/gtest.h>
 
@@ -22,11 +23,7 @@ using ImageSequenceIO::VImageSequenceWriter;
 namespace
 {
 
-std::string Content( const std::string& i_rPath )
-{
-  std::ifstream File( i_rPath, std::ios::binary );
-  return { std::istreambuf_iterator<char>( File ), {} };
-}
+using TestSupport::ReadFile;
 
 // An image is its payload's letter and the pixels; pixels that begin with '!' cannot be compressed.
 std::shared_ptr<VideoEncoding::VVideoFrameEncoder> FakeEncoder()
@@ -74,8 +71,8 @@ TEST_F( ImageSequence, EachFrameIsAFileOfItsOwnInAFolderThatIsMade )
   EXPECT_TRUE( m_Writer.IsOpen() );
   EXPECT_TRUE( WriteFrame( m_Writer, 12, "abcd" ) );
   EXPECT_TRUE( WriteFrame( m_Writer, 3, "efgh" ) ) << "in any order";
-  EXPECT_EQ( Content( Path( "take_00000012.png" ) ), "Pabcd" );
-  EXPECT_EQ( Content( Path( "take_00000003.png" ) ), "Pefgh" );
+  EXPECT_EQ( ReadFile( Path( "take_00000012.png" ) ), "Pabcd" );
+  EXPECT_EQ( ReadFile( Path( "take_00000003.png" ) ), "Pefgh" );
   EXPECT_TRUE( m_Writer.Close() );
   EXPECT_FALSE( m_Writer.IsOpen() );
 
@@ -83,8 +80,8 @@ TEST_F( ImageSequence, EachFrameIsAFileOfItsOwnInAFolderThatIsMade )
   EXPECT_TRUE( WriteFrame( m_Writer, 0, "ijkl" ) );
   ASSERT_TRUE( m_Writer.Close() && OpenAndWriteHeader( m_Writer, IVideoPayload::EImageTIFF ) );
   EXPECT_TRUE( WriteFrame( m_Writer, 0, "mnop" ) );
-  EXPECT_EQ( Content( Path( "take_00000000.jpg" ) ), "Jijkl" );
-  EXPECT_EQ( Content( Path( "take_00000000.tiff" ) ), "Tmnop" );
+  EXPECT_EQ( ReadFile( Path( "take_00000000.jpg" ) ), "Jijkl" );
+  EXPECT_EQ( ReadFile( Path( "take_00000000.tiff" ) ), "Tmnop" );
   std::set<std::string> Names;
   for( const auto& rEntry : boost::filesystem::directory_iterator( m_Folder.File( "shots" ) ) )
   {
@@ -104,7 +101,7 @@ TEST_F( ImageSequence, TheNameFollowsTheTimecode )
   ASSERT_TRUE( m_Writer.Open( m_Folder.File( "%TIMECODE%" ) ) );
   ASSERT_TRUE( m_Writer.WriteHeader( VideoInfo(), {}, { 135000000, 5400000, 0 }, Start, {}, {}, IVideoPayload::EImagePNG, IAudioPayload::ENone ) );
   EXPECT_TRUE( WriteFrame( m_Writer, 26, "abcd" ) );
-  EXPECT_EQ( Content( m_Folder.File( "00010001.png" ) ), "Pabcd" );
+  EXPECT_EQ( ReadFile( m_Folder.File( "00010001.png" ) ), "Pabcd" );
 }
 
 TEST_F( ImageSequence, RefusalsSayWhy )
@@ -131,7 +128,7 @@ TEST_F( ImageSequence, AFrameThatCannotBeEncodedLeavesAnEmptyFile )
   EXPECT_FALSE( m_Writer.WriteFrame( Video, Largest, Audio, {}, 3 ) );
   for( const char* pName : { "take_00000001.png", "take_00000003.png" } )
   {
-    EXPECT_TRUE( boost::filesystem::exists( Path( pName ) ) && Content( Path( pName ) ).empty() ) << pName;
+    EXPECT_TRUE( boost::filesystem::exists( Path( pName ) ) && ReadFile( Path( pName ) ).empty() ) << pName;
   }
   const std::string Failed = "Encoding to 'ImagePNG' failed.";
   EXPECT_EQ( m_Log.Texts(), ( std::vector<std::string>{ Failed, "Could not create buffer of size 18446744065119617025 bytes.", Failed } ) );
@@ -148,7 +145,7 @@ TEST_F( ImageSequence, AFileThatCannotBeWrittenIsNamedAndKeepsWhatFits )
   VImageSequenceWriter Writer( FakeEncoder(), MakeStream );
   ASSERT_TRUE( OpenAndWriteHeader( Writer ) );
   EXPECT_FALSE( WriteFrame( Writer, 2, "efgh" ) );
-  EXPECT_EQ( Content( Path( "take_00000002.png" ) ), "Pef" );
+  EXPECT_EQ( ReadFile( Path( "take_00000002.png" ) ), "Pef" );
   ASSERT_TRUE( Writer.Close() );
   EXPECT_FALSE( OpenAndWriteHeader( Writer ) );
 
@@ -184,6 +181,6 @@ TEST_F( ImageSequence, ManyThreadsWriteAtOnce )
   Group.join_all();
   for( uint64_t Key = 0; Key < FramesEach * Threads; ++Key )
   {
-    EXPECT_EQ( Content( Path( ImageSequenceIO::MakeFileName( "take_%FRAME%", { Key } ) + ".png" ) ), "P" + PixelsOf( Key ) );
+    EXPECT_EQ( ReadFile( Path( ImageSequenceIO::MakeFileName( "take_%FRAME%", { Key } ) + ".png" ) ), "P" + PixelsOf( Key ) );
   }
 }

@@ -4,11 +4,11 @@
 #include "tests/support/OutsideReaders.h"
 #include "tests/support/ProgramRun.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/WholeFile.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <fstream>
 #include <iterator>
 
 using namespace KVZ;
@@ -72,8 +72,7 @@ protected:
     const VRunResult Run = RunProgram( { "ffmpeg", "-nostdin", "-v", "error", "-f", "lavfi", "-i", "testsrc2=size=64x48:rate=25", "-frames:v", "12",
       "-pix_fmt", "yuv420p", "-c:v", "libx264", "-threads", "1", "-x264-params", "slices=1:" + i_rOptions, m_StreamPath } );
     ASSERT_EQ( Run.m_ExitCode, 0 ) << Run.m_Error;
-    std::ifstream File( m_StreamPath, std::ios::binary );
-    m_Units = SplitUnits( std::string( std::istreambuf_iterator<char>( File ), {} ) );
+    m_Units = SplitUnits( TestSupport::ReadFile( m_StreamPath ) );
   }
 
   // Gives the types of the frames.

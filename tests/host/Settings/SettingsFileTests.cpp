@@ -8,6 +8,7 @@
 #include "tests/support/FileSizeLimit.h"
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/Threads.h"
+#include "tests/support/WholeFile.h"
 
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
@@ -26,11 +27,7 @@ using VTexts = std::vector<std::string>;
 namespace
 {
 
-std::string ReadFile( const std::string& i_rPath )
-{
-  std::ifstream File( i_rPath, std::ios::binary );
-  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
-}
+using TestSupport::ReadFile;
 
 class SettingsFile : public testing::Test
 {

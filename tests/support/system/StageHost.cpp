@@ -3,7 +3,6 @@
 #include <csignal>
 #include <cstdlib>
 #include <fstream>
-#include <iterator>
 #include <utility>
 
 namespace SystemTests
@@ -98,12 +97,6 @@ bool HasCaptured( const std::string& i_rText, int64_t i_Frames )
 VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames )
 {
   return SignalOnce( std::move( i_Signals ), [i_Frames]( const std::string& i_rText ) { return HasCaptured( i_rText, i_Frames ); } );
-}
-
-std::string ReadFile( const std::string& i_rPath )
-{
-  std::ifstream File( i_rPath, std::ios::binary );
-  return { std::istreambuf_iterator<char>( File ), std::istreambuf_iterator<char>() };
 }
 
 std::vector<int64_t> NumbersBehind( const std::string& i_rWords, const std::string& i_rText )

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "tests/support/ProgramRun.h"
+#include "tests/support/WholeFile.h"
 
 #include <nlohmann/json.hpp>
 
@@ -12,6 +13,7 @@
 namespace SystemTests
 {
 
+using TestSupport::ReadFile;
 using TestSupport::VRunOptions;
 using TestSupport::VRunResult;
 
@@ -52,9 +54,6 @@ VRunOptions SignalOnce( std::vector<int> i_Signals, std::function<bool( const st
 bool HasCaptured( const std::string& i_rText, int64_t i_Frames );
 // As soon as the program, which needs --progress, tells that so many frames are captured.
 VRunOptions SignalAfterFrames( std::vector<int> i_Signals, int64_t i_Frames );
-
-// All bytes of a file; none where it cannot be read.
-std::string ReadFile( const std::string& i_rPath );
 
 // The whole numbers behind each occurrence of a text: NumbersBehind( "frames_captured=", ... ).
 std::vector<int64_t> NumbersBehind( const std::string& i_rWords, const std::string& i_rText );
